@@ -1,0 +1,57 @@
+// The two predicates over numeric arrays. This header is the contract; the rule of comparison is
+// written out in `compare.h` (scalars) and `talnumericarray_sameq_test.h` (elements).
+//
+// Both predicates only read the records and what they point to, and take no reference on them; the
+// caller keeps them alive and unchanged for the length of a call. Any number of threads may compare
+// the same records at once. Neither predicate allocates, throws, locks or logs.
+//
+// Nothing but what is said below is checked: a null handle, a null `dims` with a rank above 0, a
+// null `data` with a count above 0, a negative rank or count, or an `nelems` of the first array
+// that its dimensions do not bear out, is undefined behaviour.
+//
+// Both are for use within the library or program that links them in; neither is exported from a
+// shared object.
+
+#ifndef TALNUMERICARRAY_COMPARE_H
+#define TALNUMERICARRAY_COMPARE_H
+
+#include "taldata_array.h"
+#include "type_properties.h"
+
+// Returns 1 when the two arrays have the same rank and dimensions and hold, position by position,
+// the same numbers; else 0.
+//
+// `tol` is the tolerance for reals, a count of binary digits: two nonzero reals of one sign are the
+// same when they differ by less than 2^(tol - bits) times the larger magnitude, `bits` being 53
+// where doubles are compared and 24 where singles are. A `tol` of 0 or less asks for equality; one
+// of `bits` or more makes any two nonzero reals of one sign the same. Zero is never the same as
+// another number, nor a number the same as one of the other sign. Integers are compared exactly.
+//
+// `compare_different_types` nonzero lets arrays of different element types be compared by value; if
+// it is 0, such arrays are not the same. Where either value is a double or a part of a complex of
+// doubles, the two are compared as doubles; otherwise, where either is a single, as singles, an
+// integer of any width included; two integers are compared as mathematical integers. A complex
+// number is compared part by part, and is the same as a real or an integer only if its imaginary
+// part is zero.
+//
+// Two arrays of one real or complex type under a `tol` of zero are compared bit by bit: then +0 and
+// -0 are different, and two NaNs of the same bits are the same. Under any other `tol`, and for
+// different types, +0 and -0 are the same and a NaN is never the same as anything, but for a `tol`
+// of `bits` or more, under which it is the same as every nonzero number that is not negative.
+//
+// Two arrays of one shape without elements are the same whatever their types. Otherwise an array
+// whose `data_type` is outside 1 to 12 is the same as none.
+//
+// Only the first array's `nelems` is read. Elements behind the first pair that is not the same are
+// not read, unless the arrays are compared as bytes.
+extern "C" [[gnu::visibility("hidden")]] int TalNumericArray_sameQ(talreal tol,
+                                                                   int compare_different_types,
+                                                                   TalNumericArray na1,
+                                                                   TalNumericArray na2) noexcept;
+
+// Returns 1 when the two arrays have the same rank, the same `data_type` (whatever int it is) and
+// the same dimensions; else 0. Neither elements nor their number are read.
+[[gnu::visibility("hidden")]] int TalNumericArray_equivalentQ(TalNumericArray na1,
+                                                              TalNumericArray na2) noexcept;
+
+#endif

@@ -1,0 +1,57 @@
+// The element tests: are one element of each array the same?
+//
+// A complex number is a pair of reals, each judged on its own against the full tolerance; an
+// integer or a real stands for a complex number whose imaginary part is zero.
+
+#ifndef TALNUMERICARRAY_SAMEQ_TEST_H
+#define TALNUMERICARRAY_SAMEQ_TEST_H
+
+#include "compare.h"
+#include "to_type.h"
+#include "type_properties.h"
+
+#include <type_traits>
+
+#pragma GCC visibility push(hidden)
+
+// Integer or real against integer or real.
+template <typename T1, typename T2,
+          std::enable_if_t<!is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
+inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+    return nesk::compare(tol, data1, data2) == 0;
+}
+
+// Integer or real against complex. No tolerance makes a nonzero value the same as zero, so that the
+// imaginary part is tested for zero outright.
+template <typename T1, typename T2,
+          std::enable_if_t<!is_complex_v<T1> && is_complex_v<T2>, int> = 0>
+inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+    const T1& rdata1 = data1;
+    const to_real_type_t<T2> rdata2 = data2.real();
+    const to_real_type_t<T2> idata2 = data2.imag();
+    return sameQ_test(tol, rdata1, rdata2) && idata2 == 0;
+}
+
+// Complex against integer or real.
+template <typename T1, typename T2,
+          std::enable_if_t<is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
+inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+    const to_real_type_t<T1> rdata1 = data1.real();
+    const to_real_type_t<T1> idata1 = data1.imag();
+    const T2& rdata2 = data2;
+    return sameQ_test(tol, rdata1, rdata2) && idata1 == 0;
+}
+
+// Complex against complex.
+template <typename T1, typename T2, std::enable_if_t<is_complex_v<T1> && is_complex_v<T2>, int> = 0>
+inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+    const to_real_type_t<T1> rdata1 = data1.real();
+    const to_real_type_t<T1> idata1 = data1.imag();
+    const to_real_type_t<T2> rdata2 = data2.real();
+    const to_real_type_t<T2> idata2 = data2.imag();
+    return sameQ_test(tol, rdata1, rdata2) && sameQ_test(tol, idata1, idata2);
+}
+
+#pragma GCC visibility pop
+
+#endif

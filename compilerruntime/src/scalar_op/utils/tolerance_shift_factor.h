@@ -1,0 +1,57 @@
+// The factor that a tolerance in binary digits stands for.
+
+#ifndef TOLERANCE_SHIFT_FACTOR_H
+#define TOLERANCE_SHIFT_FACTOR_H
+
+#include "strict_floating_point.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+#include <type_traits>
+
+#pragma GCC visibility push(hidden)
+
+namespace nesk {
+namespace detail {
+
+template <typename T, std::enable_if_t<std::is_floating_point_v<T>, int> = 0>
+inline T ToleranceShiftFactor_impl(const T& tol) noexcept {
+    T tolfactor = 1;
+    constexpr int bits = std::numeric_limits<T>::digits;
+    T itol = 0;
+    const T ftol = std::modf(tol, &itol);
+
+    // Beyond 2^20 digits either way ldexp has long overflowed or underflowed, so that the bound
+    // changes no result and the conversion to int is defined for every tolerance. In this order of
+    // operands a NaN, whose factor is NaN whatever the shift, is bounded too.
+    constexpr T limit = 1 << 20;
+    const T whole = std::max(-limit, std::min(limit, itol));
+    const int tolshift = static_cast<int>(whole) - bits;
+
+    if (ftol != 0) {
+        // Some compilers turn pow(2, x) into exp2(x), or fold it when x is known too. Either can
+        // differ from the library's pow in the last place, and the answers of two builds with it:
+        // hide the base from them.
+        const volatile T two = 2;
+        tolfactor = std::pow(two, ftol);
+    }
+    return std::ldexp(tolfactor, tolshift);
+}
+
+} // namespace detail
+
+// Returns 2^(arg - bits), where `arg` is a tolerance in binary digits and `bits` the number of
+// significand digits of `T`: 53 for double, 24 for float. Exact for a whole `arg`; for a fractional
+// one the error is that of the library's pow. Overflows to infinity and underflows to zero as ldexp
+// does; NaN yields NaN.
+template <typename T, std::enable_if_t<std::is_floating_point_v<T>, int> = 0>
+inline T ToleranceShiftFactor(const T& arg) noexcept {
+    return detail::ToleranceShiftFactor_impl<T>(arg);
+}
+
+} // namespace nesk
+
+#pragma GCC visibility pop
+
+#endif
