@@ -1,0 +1,31 @@
+// The command line of talcmp.
+
+#ifndef TALCMP_COMMAND_LINE_H
+#define TALCMP_COMMAND_LINE_H
+
+#include "difference.h"
+
+#include <optional>
+#include <stdexcept>
+#include <string>
+
+namespace talcmp {
+
+struct CommandLine {
+    Question question;
+    std::string first;  // path of the first file
+    std::string second; // path of the second file
+};
+
+// Returns what is asked; nothing where that was help or the version, which are printed already.
+// Throws UsageError.
+std::optional<CommandLine> read_command_line(int argc, const char* const* argv);
+
+// A command line that asks for nothing that talcmp does. The text says what is wrong.
+struct UsageError : std::runtime_error {
+    using std::runtime_error::runtime_error;
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,76 @@
+#include "element_type.h"
+
+#include "to_type.h"
+
+#include <charconv>
+#include <cmath>
+#include <cstdint>
+#include <cstring>
+#include <type_traits>
+
+namespace talcmp {
+namespace {
+
+constexpr int hexadecimal = 16;
+
+template <typename Number, typename... Base>
+std::string digits(const Number number, const Base... base) {
+    std::array<char, 32> buffer = {}; // a double takes 24 characters, a 64-bit integer 20
+    const auto end = std::to_chars(buffer.begin(), buffer.end(), number, base...).ptr;
+    return {buffer.begin(), end};
+}
+
+template <typename T>
+std::string number_text(const T value) {
+    if constexpr (std::is_floating_point_v<T>) {
+        if (std::isnan(value)) {
+            std::conditional_t<sizeof(T) == 4, std::uint32_t, std::uint64_t> bits = 0;
+            std::memcpy(&bits, &value, sizeof bits);
+            return "nan(0x" + digits(bits, hexadecimal) + ")";
+        }
+    }
+    return digits(value);
+}
+
+template <typename T>
+std::string element_text(const void* element) {
+    T value = {};
+    std::memcpy(&value, element, sizeof value);
+    if constexpr (is_complex_v<T>) {
+        const std::string imaginary = number_text(value.imag());
+        const char* const sign = imaginary.front() == '-' ? "" : "+";
+        return number_text(value.real()) + sign + imaginary + "j";
+    } else {
+        return number_text(value);
+    }
+}
+
+template <typename T>
+ElementType describe() {
+    constexpr bool real = std::is_floating_point_v<T>;
+    constexpr char kind = is_complex_v<T> ? 'c' : real ? 'f' : std::is_signed_v<T> ? 'i' : 'u';
+    constexpr const char* family = is_complex_v<T>       ? "complex"
+                                   : real                ? "float"
+                                   : std::is_signed_v<T> ? "int"
+                                                         : "uint";
+    return {element_type_id<T>, kind, sizeof(T), alignof(T), family + std::to_string(8 * sizeof(T)),
+            element_text<T>};
+}
+
+template <typename... Types>
+std::array<ElementType, sizeof...(Types)> describe_all(type_list<Types...> /*types*/) {
+    return {describe<Types>()...};
+}
+
+} // namespace
+
+const std::array<ElementType, element_type_list::size>& element_types() {
+    static const auto types = describe_all(element_type_list{});
+    return types;
+}
+
+const ElementType& element_type(const type_t id) {
+    return element_types().at(static_cast<std::size_t>(id - 1));
+}
+
+} // namespace talcmp

@@ -1,0 +1,36 @@
+#include "npy_file.h"
+
+#include "element_type.h"
+#include "trouble.h"
+
+#include <cstring>
+
+namespace talcmp {
+namespace {
+
+NpyHeader header_of(const std::string& path, const FileMapping& file) {
+    try {
+        return read_npy_header(file.data(), file.size());
+    } catch (const NpyError& error) {
+        throw Trouble(path, error.what());
+    }
+}
+
+} // namespace
+
+NpyFile::NpyFile(const std::string& path) : file_(path), header_(header_of(path, file_)) {}
+
+const void* NpyFile::elements(const std::uint64_t first, const std::uint64_t count) {
+    const ElementType& type = talcmp::element_type(header_.element_type);
+    // The elements lie in the file, so that both products are below its size.
+    const unsigned char* const slice = file_.data() + header_.data_offset + first * type.size;
+    if (header_.data_offset % type.alignment == 0) {
+        return slice;
+    }
+    const std::size_t bytes = static_cast<std::size_t>(count) * type.size;
+    aligned_copy_.resize(bytes / sizeof(std::max_align_t) + 1);
+    std::memcpy(aligned_copy_.data(), slice, bytes);
+    return aligned_copy_.data();
+}
+
+} // namespace talcmp

@@ -1,0 +1,339 @@
+#include "npy_header.h"
+
+#include "element_type.h"
+
+#include <algorithm>
+#include <array>
+#include <limits>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace talcmp {
+namespace {
+
+// ---- The dictionary: the few Python literals that NumPy writes there
+
+struct Dictionary {
+    std::string_view descr;
+    bool fortran_order = false;
+    Shape shape;
+};
+
+class DictionaryReader {
+  public:
+    explicit DictionaryReader(const std::string_view text) : text_(text) {}
+
+    Dictionary read() {
+        expect('{', "a dictionary");
+        while (!accept('}')) {
+            read_entry();
+            if (!accept(',')) {
+                expect('}', "',' or '}'");
+                break;
+            }
+        }
+        skip_space();
+        if (position_ != text_.size()) {
+            fail("nothing behind the dictionary");
+        }
+        return {required(descr_, "descr"), required(fortran_order_, "fortran_order"),
+                required(shape_, "shape")};
+    }
+
+  private:
+    void read_entry() {
+        const std::string_view key = string();
+        expect(':', "':'");
+        if (key == "descr") {
+            set(descr_, key, element_type_code());
+        } else if (key == "fortran_order") {
+            set(fortran_order_, key, boolean());
+        } else if (key == "shape") {
+            set(shape_, key, dimensions());
+        } else {
+            throw NpyError("its header has the unknown key '" + printable(key) + "'");
+        }
+    }
+
+    template <typename Value>
+    static void set(std::optional<Value>& entry, const std::string_view key, Value value) {
+        if (entry.has_value()) {
+            throw NpyError("its header has the key '" + std::string(key) + "' twice");
+        }
+        entry = std::move(value);
+    }
+
+    template <typename Value>
+    static Value required(const std::optional<Value>& entry, const std::string& key) {
+        if (!entry.has_value()) {
+            throw NpyError("its header lacks the key '" + key + "'");
+        }
+        return *entry;
+    }
+
+    std::string_view string() {
+        skip_space();
+        const char quote = peek();
+        if (quote != '\'' && quote != '"') {
+            fail("a string in quotes");
+        }
+        const std::size_t end = text_.find(quote, position_ + 1);
+        if (end == std::string_view::npos) {
+            fail("a string with a closing quote");
+        }
+        const std::string_view contents = text_.substr(position_ + 1, end - position_ - 1);
+        position_ = end + 1;
+        return contents;
+    }
+
+    std::string_view element_type_code() {
+        skip_space();
+        if (peek() == '[' || peek() == '(' || peek() == '{') {
+            throw NpyError("its elements are structured; save each field as an array of its own");
+        }
+        return string();
+    }
+
+    bool boolean() {
+        if (accept_word("True")) {
+            return true;
+        }
+        if (!accept_word("False")) {
+            fail("True or False");
+        }
+        return false;
+    }
+
+    Shape dimensions() {
+        expect('(', "a shape in parentheses");
+        Shape shape;
+        bool comma_behind = true;
+        while (!accept(')')) {
+            if (!comma_behind) {
+                fail("',' or ')'");
+            }
+            shape.push_back(dimension());
+            comma_behind = accept(',');
+        }
+        if (shape.size() == 1 && !comma_behind) {
+            fail("a shape of one dimension with a ',' behind it");
+        }
+        return shape;
+    }
+
+    std::uint64_t dimension() {
+        skip_space();
+        if (peek() == '-') {
+            throw NpyError("its shape has a negative dimension");
+        }
+        if (!is_digit(peek())) {
+            fail("a dimension");
+        }
+        std::uint64_t value = 0;
+        for (; is_digit(peek()); ++position_) {
+            const auto digit = static_cast<std::uint64_t>(peek() - '0');
+            if (value > (std::numeric_limits<std::uint64_t>::max() - digit) / 10) {
+                throw NpyError("its shape has a dimension above 2^64 - 1");
+            }
+            value = 10 * value + digit;
+        }
+        accept('L'); // a long integer of Python 2
+        return value;
+    }
+
+    // Moves behind the next character if it is `character`.
+    bool accept(const char character) {
+        skip_space();
+        const bool there = position_ < text_.size() && text_[position_] == character;
+        position_ += there ? 1 : 0;
+        return there;
+    }
+
+    bool accept_word(const std::string_view word) {
+        skip_space();
+        const bool there = text_.substr(position_, word.size()) == word;
+        position_ += there ? word.size() : 0;
+        return there;
+    }
+
+    void expect(const char character, const char* description) {
+        if (!accept(character)) {
+            fail(description);
+        }
+    }
+
+    void skip_space() {
+        position_ = std::min(text_.find_first_not_of(" \t\r\n\f", position_), text_.size());
+    }
+
+    // The next character; a zero at the end.
+    char peek() const { return position_ < text_.size() ? text_[position_] : '\0'; }
+
+    static bool is_digit(const char character) { return character >= '0' && character <= '9'; }
+
+    // What a file says is shown in a message only as far as it can be read there.
+    static std::string printable(const std::string_view text) {
+        constexpr std::size_t longest = 40;
+        std::string shown(text.substr(0, longest));
+        std::replace_if(
+            shown.begin(), shown.end(), [](const char c) { return c < ' ' || c > '~'; }, '?');
+        return shown + (text.size() > longest ? "..." : "");
+    }
+
+    [[noreturn]] void fail(const char* expected) const {
+        throw NpyError("its header is broken: expected " + std::string(expected) + " at byte "
+                       + std::to_string(position_) + " of the dictionary");
+    }
+
+    std::string_view text_;
+    std::size_t position_ = 0;
+    std::optional<std::string_view> descr_;
+    std::optional<bool> fortran_order_;
+    std::optional<Shape> shape_;
+};
+
+// ---- What the dictionary means
+
+// The kinds of elements that NumPy has and talcmp has not.
+std::string_view kind_name(const char kind) {
+    switch (kind) {
+    case 'b':
+    case '?':
+        return "boolean";
+    case 'O':
+        return "Python objects";
+    case 'S':
+    case 'a':
+    case 'U':
+        return "text";
+    case 'V':
+        return "raw bytes";
+    case 'M':
+    case 'm':
+        return "dates or times";
+    case 'f':
+    case 'c':
+        return "reals or complex numbers of a width other than single and double";
+    default:
+        return "of an unknown type";
+    }
+}
+
+constexpr char native_byte_order = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '<' : '>';
+
+const ElementType& element_type_of(const std::string_view descr) {
+    const std::string_view code = descr.substr(std::min<std::size_t>(1, descr.size()));
+    const auto& types = element_types();
+    const auto type = std::find_if(types.begin(), types.end(), [code](const ElementType& each) {
+        return code == each.kind + std::to_string(each.size);
+    });
+    if (type == types.end()) {
+        throw NpyError("its elements are " + std::string(kind_name(code.empty() ? ' ' : code[0]))
+                       + "; save them as integers of 8 to 64 bits, float32, float64, complex64 or "
+                         "complex128");
+    }
+    const char byte_order = descr[0];
+    if (byte_order == '|' ? type->size != 1 : byte_order != '<' && byte_order != '>') {
+        throw NpyError("its elements have no byte order; save them again with NumPy");
+    }
+    if (type->size != 1 && byte_order != native_byte_order) {
+        throw NpyError("its elements are not in this machine's byte order; save them as '"
+                       + (native_byte_order + std::string(code)) + "'");
+    }
+    return *type;
+}
+
+// The product of `shape`; nothing where it is 2^64 or more. One zero makes it zero.
+std::optional<std::uint64_t> product(const Shape& shape) {
+    if (std::find(shape.begin(), shape.end(), 0U) != shape.end()) {
+        return 0;
+    }
+    std::uint64_t count = 1;
+    for (const std::uint64_t dimension : shape) {
+        if (count > std::numeric_limits<std::uint64_t>::max() / dimension) {
+            return std::nullopt;
+        }
+        count *= dimension;
+    }
+    return count;
+}
+
+// Checks that `count` elements of `element_size` bytes are exactly `available` bytes.
+void check_data_size(const std::optional<std::uint64_t> count, const std::size_t element_size,
+                     const std::uint64_t available) {
+    if (!count.has_value() || *count > available / element_size) {
+        throw NpyError("its data is shorter than its shape says ("
+                       + (count.has_value() ? std::to_string(*count) : "more than 2^64 - 1")
+                       + " elements of " + std::to_string(element_size) + " bytes, but "
+                       + std::to_string(available) + " bytes); is the file complete?");
+    }
+    const std::uint64_t surplus = available - *count * element_size;
+    if (surplus != 0) {
+        throw NpyError("it goes on for " + std::to_string(surplus)
+                       + " bytes behind its array; save one array a file");
+    }
+}
+
+// ---- The bytes in front of the dictionary
+
+constexpr std::string_view magic = "\x93NUMPY";
+constexpr std::string_view zip_magic = "PK\x03\x04";
+
+void check_magic(const std::string_view file) {
+    if (file.empty()) {
+        throw NpyError("it is empty; an .npy file was expected");
+    }
+    if (file.substr(0, zip_magic.size()) == zip_magic) {
+        throw NpyError("it is an archive of arrays (.npz); save each array as an .npy file");
+    }
+    if (file.substr(0, magic.size()) != magic) {
+        throw NpyError("it is no .npy file: it does not begin with \\x93NUMPY");
+    }
+}
+
+std::size_t little_endian(const std::string_view bytes) {
+    std::size_t value = 0;
+    for (std::size_t i = bytes.size(); i-- > 0;) {
+        value = value << 8U | static_cast<unsigned char>(bytes[i]);
+    }
+    return value;
+}
+
+} // namespace
+
+NpyHeader read_npy_header(const unsigned char* bytes, const std::size_t size) {
+    const std::string_view file(reinterpret_cast<const char*>(bytes), size);
+    check_magic(file);
+    std::size_t position = magic.size();
+    const auto take = [&](const std::size_t length, const char* what) {
+        if (length > file.size() - position) {
+            throw NpyError("it ends inside its header: " + std::to_string(length) + " bytes of "
+                           + what + " expected, " + std::to_string(file.size() - position)
+                           + " there; is the file complete?");
+        }
+        position += length;
+        return file.substr(position - length, length);
+    };
+
+    const std::string_view version = take(2, "version");
+    const int major = static_cast<unsigned char>(version[0]);
+    const int minor = static_cast<unsigned char>(version[1]);
+    if (major < 1 || major > 3 || minor != 0) {
+        throw NpyError("it has format version " + std::to_string(major) + "."
+                       + std::to_string(minor) + "; versions 1.0, 2.0 and 3.0 are supported");
+    }
+    const std::size_t length = little_endian(take(major == 1 ? 2 : 4, "header length"));
+    const Dictionary dictionary = DictionaryReader(take(length, "dictionary")).read();
+
+    const ElementType& type = element_type_of(dictionary.descr);
+    if (dictionary.fortran_order) {
+        throw NpyError("its elements are in Fortran order; save it with "
+                       "numpy.ascontiguousarray to have them in C order");
+    }
+    const std::optional<std::uint64_t> count = product(dictionary.shape);
+    check_data_size(count, type.size, file.size() - position);
+    return {type.id, dictionary.shape, *count, position};
+}
+
+} // namespace talcmp

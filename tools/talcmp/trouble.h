@@ -1,0 +1,21 @@
+// What keeps talcmp from an answer.
+
+#ifndef TALCMP_TROUBLE_H
+#define TALCMP_TROUBLE_H
+
+#include <stdexcept>
+#include <string>
+
+namespace talcmp {
+
+// A file that cannot be compared. The text names the file, what is wrong and, where there is
+// something to do, what to do.
+class Trouble : public std::runtime_error {
+  public:
+    Trouble(const std::string& file, const std::string& what_is_wrong)
+        : std::runtime_error(file + ": " + what_is_wrong) {}
+};
+
+} // namespace talcmp
+
+#endif
