@@ -1,0 +1,104 @@
+// Integers of up to 16 bits: all values against all values. The suites whose names begin with
+// Exhaustive take most of a minute each, as they call memcmp four thousand million times.
+
+#include "talnumericarray_compare.h"
+#include "talnumericarray_sameq_impl.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <limits>
+
+namespace {
+
+// A record of one element.
+template <typename T>
+st_TalDataArray record_of(T* element) {
+    static talint one = 1;
+    st_TalDataArray record = {};
+    record.dims = &one;
+    record.rank = 1;
+    record.data_type = element_type_id<T>;
+    record.nelems = one;
+    record.data = element;
+    return record;
+}
+
+// Calls `answer` for every pair of values and returns how many answers are wrong.
+template <typename T1, typename T2, typename Answer>
+std::uint64_t wrong_answers(const Answer& answer) {
+    T1 element1 = 0;
+    T2 element2 = 0;
+    auto record1 = record_of(&element1);
+    auto record2 = record_of(&element2);
+    std::uint64_t wrong = 0;
+    std::uint64_t answers = 0;
+    for (int value1 = std::numeric_limits<T1>::min(); value1 <= std::numeric_limits<T1>::max();
+         ++value1) {
+        element1 = static_cast<T1>(value1);
+        for (int value2 = std::numeric_limits<T2>::min(); value2 <= std::numeric_limits<T2>::max();
+             ++value2) {
+            element2 = static_cast<T2>(value2);
+            const int expected = value1 == value2 ? 1 : 0;
+            wrong += answer(&record1, &record2) != expected ? 1U : 0U;
+            ++answers;
+        }
+    }
+    EXPECT_EQ(answers, std::uint64_t{1} << (8 * (sizeof(T1) + sizeof(T2))));
+    return wrong;
+}
+
+template <typename T1, typename T2>
+std::uint64_t wrong_answers_of_predicate() {
+    return wrong_answers<T1, T2>([](TalNumericArray na1, TalNumericArray na2) {
+        return TalNumericArray_sameQ(10, 1, na1, na2);
+    });
+}
+
+// Below the checks of shape and type, which have no values to try.
+template <typename T1, typename T2>
+std::uint64_t wrong_answers_of_pair_routine() {
+    return wrong_answers<T1, T2>([](TalNumericArray na1, TalNumericArray na2) {
+        const talreal tol = 10;
+        return TalNumericArray_sameQ_impl<T1, T2>(tol, na1, na2);
+    });
+}
+
+TEST(AllValues, Of8BitsAgainst8Bits) {
+    EXPECT_EQ((wrong_answers_of_predicate<BIT8, BIT8>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<BIT8, UBIT8>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, BIT8>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, UBIT8>()), 0U);
+}
+
+TEST(AllValues, Of8BitsAgainst16Bits) {
+    EXPECT_EQ((wrong_answers_of_predicate<BIT8, BIT16>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<BIT8, UBIT16>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, BIT16>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, UBIT16>()), 0U);
+}
+
+TEST(AllValues, Of16BitsAgainst8Bits) {
+    EXPECT_EQ((wrong_answers_of_predicate<BIT16, BIT8>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<BIT16, UBIT8>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<UBIT16, BIT8>()), 0U);
+    EXPECT_EQ((wrong_answers_of_predicate<UBIT16, UBIT8>()), 0U);
+}
+
+TEST(ExhaustiveAllValuesOf16Bits, SignedAgainstSigned) {
+    EXPECT_EQ((wrong_answers_of_pair_routine<BIT16, BIT16>()), 0U);
+}
+
+TEST(AllValuesOf16Bits, SignedAgainstUnsigned) {
+    EXPECT_EQ((wrong_answers_of_pair_routine<BIT16, UBIT16>()), 0U);
+}
+
+TEST(AllValuesOf16Bits, UnsignedAgainstSigned) {
+    EXPECT_EQ((wrong_answers_of_pair_routine<UBIT16, BIT16>()), 0U);
+}
+
+TEST(ExhaustiveAllValuesOf16Bits, UnsignedAgainstUnsigned) {
+    EXPECT_EQ((wrong_answers_of_pair_routine<UBIT16, UBIT16>()), 0U);
+}
+
+} // namespace

@@ -1,0 +1,60 @@
+// Arrays for tests: records that own their dimensions and elements, and short ways to compare them.
+
+#ifndef TALNUMERICARRAY_TESTS_ARRAYS_H
+#define TALNUMERICARRAY_TESTS_ARRAYS_H
+
+#include "taldata_array_element_types.h"
+#include "talnumericarray_compare.h"
+
+#include <initializer_list>
+#include <thread>
+#include <utility>
+#include <vector>
+
+template <typename T>
+class Array {
+  public:
+    // Rank 1.
+    Array(std::initializer_list<T> elements)
+        : Array({static_cast<talint>(elements.size())}, std::vector<T>(elements)) {}
+
+    Array(std::vector<talint> dimensions, std::vector<T> elements)
+        : dimensions_(std::move(dimensions)), elements_(std::move(elements)) {
+        record.dims = dimensions_.data();
+        record.rank = static_cast<talint>(dimensions_.size());
+        record.data_type = element_type_id<T>;
+        record.nelems = static_cast<talint>(elements_.size());
+        record.data = elements_.data();
+    }
+    Array(const Array&) = delete;
+    Array& operator=(const Array&) = delete;
+
+    TalNumericArray handle() const { return const_cast<TalNumericArray>(&record); }
+
+    st_TalDataArray record = {};
+
+  private:
+    std::vector<talint> dimensions_;
+    std::vector<T> elements_;
+};
+
+// The answer for arrays that may be of different types.
+template <typename T1, typename T2>
+int sameQ(const talreal tol, const Array<T1>& array1, const Array<T2>& array2) {
+    return TalNumericArray_sameQ(tol, 1, array1.handle(), array2.handle());
+}
+
+// The answer for arrays of one element each.
+template <typename T1, typename T2>
+int sameQ_of(const talreal tol, const T1 element1, const T2 element2) {
+    return sameQ(tol, Array<T1>{element1}, Array<T2>{element2});
+}
+
+// Runs `check` in a thread of its own, which has compared nothing yet: what it remembers of
+// tolerances is as at the start of a program.
+template <typename Check>
+void in_new_thread(const Check& check) {
+    std::thread(check).join();
+}
+
+#endif

@@ -1,0 +1,198 @@
+#include "checked_calls.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <iomanip>
+#include <random>
+#include <sstream>
+#include <string>
+
+#include "oracle.h"
+#include "random_arrays.h"
+#include "talnumericarray_compare.h"
+
+namespace oracle {
+namespace {
+
+constexpr std::uint64_t most_mismatches = 10;
+constexpr std::size_t largest_element = 16;
+
+// An array at the end of its storage, where a sanitizer sees a read past the last element, and
+// where the alignment follows from the count.
+class Operand {
+  public:
+    Operand() : storage_(largest_element * static_cast<std::size_t>(largest_count)) {}
+
+    void reset(int type_id, std::int32_t count) {
+        array_.type_id = type_id;
+        array_.element_count = count;
+        array_.dimensions.assign(1, count);
+        size_ = element_size(type_id) * static_cast<std::size_t>(count);
+        array_.data = data();
+    }
+
+    unsigned char* data() { return storage_.data() + storage_.size() - size_; }
+    std::size_t size() const { return size_; }
+    Array& array() { return array_; }
+    const Array& array() const { return array_; }
+
+    st_TalDataArray record() {
+        st_TalDataArray result{};
+        result.rank = static_cast<talint>(array_.dimensions.size());
+        result.dims = array_.dimensions.data();
+        result.data_type = array_.type_id;
+        result.nelems = array_.element_count;
+        result.data = data();
+        return result;
+    }
+
+  private:
+    std::vector<unsigned char> storage_;
+    std::size_t size_ = 0;
+    Array array_{};
+};
+
+struct Call {
+    double tolerance = 0;
+    int compare_different_types = 0;
+    Operand first;
+    Operand second;
+};
+
+// Reals and complex numbers come twice as often as integers.
+int random_type_id(Random& random) {
+    const int id = random.between(1, 16);
+    return id > 12 ? id - 4 : id;
+}
+
+void disturb(Random& random, Call& call) {
+    static const int unknown_ids[] = {-1, 0, 13, 256 + 5};
+    Array& victim = random.one_in(2) ? call.first.array() : call.second.array();
+    switch (random.below(5)) {
+    case 0:
+        victim.type_id = random.pick(unknown_ids);
+        break;
+    case 1:
+        victim.element_count = 0;
+        break;
+    case 2:
+        victim.dimensions.push_back(1);
+        break;
+    case 3:
+        victim.dimensions.back() += 1;
+        break;
+    default:
+        call.first.array().dimensions.clear();
+        call.second.array().dimensions.clear();
+    }
+}
+
+void draw(Random& random, double tolerance, Call& call) {
+    const std::int32_t count = random_count(random);
+    call.tolerance = tolerance;
+    call.compare_different_types = random.one_in(32) ? 0 : random.pick({1, 1, 1, -1, 256});
+    call.first.reset(random_type_id(random), count);
+    call.second.reset(random_type_id(random), count);
+    fill_arrays(random, call.tolerance, call.first.array().type_id, call.second.array().type_id,
+                count, call.first.data(), call.second.data());
+    if (random.one_in(64)) {
+        disturb(random, call);
+    }
+}
+
+std::string described(const char* name, Operand& operand) {
+    std::ostringstream text;
+    text << "\n  " << name << ": type " << operand.array().type_id << ", count "
+         << operand.array().element_count << ", dimensions";
+    for (const std::int32_t dimension : operand.array().dimensions) {
+        text << ' ' << dimension;
+    }
+    text << ", bytes" << std::hex << std::setfill('0');
+    for (std::size_t i = 0; i < operand.size(); ++i) {
+        text << ' ' << std::setw(2) << static_cast<unsigned>(operand.data()[i]);
+    }
+    return text.str();
+}
+
+std::string described(const State& state, Call& call) {
+    std::ostringstream text;
+    text << std::hexfloat << "\n  tolerance " << call.tolerance << ", compare_different_types "
+         << call.compare_different_types << "\n  cached before the call: single "
+         << state.single.last_tolerance << " -> " << state.single.factor << ", double "
+         << state.dual.last_tolerance << " -> " << state.dual.factor;
+    return text.str() + described("first", call.first) + described("second", call.second);
+}
+
+bool is_known(int type_id) {
+    return type_id >= 1 && type_id <= 12;
+}
+
+void count(Tally& tally, const Call& call, bool answer) {
+    const int first = call.first.array().type_id;
+    const int second = call.second.array().type_id;
+    ++tally.calls;
+    tally.same += answer ? 1 : 0;
+    if (is_known(first) && is_known(second)) {
+        tally.answered[answer ? 1 : 0][first - 1][second - 1] = true;
+    }
+}
+
+// Returns what is wrong, or nothing.
+std::string check(State& state, Call& call, Tally& tally) {
+    const State before = state;
+    st_TalDataArray first = call.first.record();
+    st_TalDataArray second = call.second.record();
+    const int answer =
+        TalNumericArray_sameQ(call.tolerance, call.compare_different_types, &first, &second);
+    const int equivalence = TalNumericArray_equivalentQ(&first, &second);
+    const bool expected = same(state, call.tolerance, call.compare_different_types != 0,
+                               call.first.array(), call.second.array());
+    const bool expected_equivalence = equivalent(call.first.array(), call.second.array());
+    count(tally, call, expected);
+    if (answer == (expected ? 1 : 0) && equivalence == (expected_equivalence ? 1 : 0)) {
+        return {};
+    }
+    std::ostringstream text;
+    text << "sameQ " << answer << ", expected " << expected << "; equivalentQ " << equivalence
+         << ", expected " << expected_equivalence;
+    return text.str() + described(before, call);
+}
+
+std::uint64_t from_environment(const char* name, std::uint64_t otherwise) {
+    const char* text = std::getenv(name);
+    return text == nullptr ? otherwise : std::strtoull(text, nullptr, 0);
+}
+
+} // namespace
+
+std::uint64_t requested_calls() {
+    return from_environment("TALNUMERICARRAY_RANDOM_CALLS", 2000000);
+}
+
+std::uint64_t requested_seed() {
+    return from_environment("TALNUMERICARRAY_SEED", std::random_device{}());
+}
+
+Tally run_checked_calls(std::uint64_t seed, std::uint64_t calls,
+                        const std::vector<double>& tolerances) {
+    Random random(seed);
+    RandomTolerances random_tolerances;
+    State state;
+    Call call;
+    Tally tally;
+    const auto choices = static_cast<std::uint32_t>(tolerances.size());
+    while (tally.calls < calls && tally.mismatches < most_mismatches) {
+        const double tolerance =
+            choices == 0 ? random_tolerances.next(random) : tolerances[random.below(choices)];
+        draw(random, tolerance, call);
+        const std::string wrong = check(state, call, tally);
+        if (!wrong.empty()) {
+            ++tally.mismatches;
+            ADD_FAILURE() << "seed " << seed << ", call " << tally.calls << ": " << wrong;
+        }
+    }
+    return tally;
+}
+
+} // namespace oracle

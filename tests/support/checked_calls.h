@@ -1,0 +1,29 @@
+// Random calls of the module, each of them checked against the oracle.
+
+#ifndef TALNUMERICARRAY_TESTS_CHECKED_CALLS_H
+#define TALNUMERICARRAY_TESTS_CHECKED_CALLS_H
+
+#include <cstdint>
+#include <vector>
+
+namespace oracle {
+
+// From TALNUMERICARRAY_RANDOM_CALLS and TALNUMERICARRAY_SEED; the seed is otherwise a new one.
+std::uint64_t requested_calls();
+std::uint64_t requested_seed();
+
+struct Tally {
+    std::uint64_t calls = 0;
+    std::uint64_t same = 0;
+    std::uint64_t mismatches = 0;
+    bool answered[2][12][12] = {};
+};
+
+// Must run in a thread that has not compared reals yet, as the oracle starts with a new State.
+// Tolerances are random unless a list is given. Stops after ten mismatches.
+Tally run_checked_calls(std::uint64_t seed, std::uint64_t calls,
+                        const std::vector<double>& tolerances = {});
+
+} // namespace oracle
+
+#endif

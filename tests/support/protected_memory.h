@@ -1,0 +1,48 @@
+// Memory that ends where nothing can be read, or that cannot be written.
+
+#ifndef TALNUMERICARRAY_TESTS_PROTECTED_MEMORY_H
+#define TALNUMERICARRAY_TESTS_PROTECTED_MEMORY_H
+
+#include <cstddef>
+#include <cstring>
+#include <new>
+
+#include <sys/mman.h>
+#include <unistd.h>
+
+// Readable pages with an unreadable page behind them.
+class ProtectedMemory {
+  public:
+    explicit ProtectedMemory(const std::size_t bytes)
+        : page_(static_cast<std::size_t>(::sysconf(_SC_PAGESIZE))),
+          readable_((bytes + page_ - 1) / page_ * page_) {
+        void* const address = ::mmap(nullptr, readable_ + page_, PROT_READ | PROT_WRITE,
+                                     MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+        if (address == MAP_FAILED) {
+            throw std::bad_alloc();
+        }
+        begin_ = static_cast<unsigned char*>(address);
+        protect(begin_ + readable_, page_, PROT_NONE);
+    }
+    ProtectedMemory(const ProtectedMemory&) = delete;
+    ProtectedMemory& operator=(const ProtectedMemory&) = delete;
+    ~ProtectedMemory() { ::munmap(begin_, readable_ + page_); }
+
+    // The place from which `bytes` bytes reach up to the unreadable page.
+    void* before_end(const std::size_t bytes) const { return begin_ + readable_ - bytes; }
+
+    void make_read_only() const { protect(begin_, readable_, PROT_READ); }
+
+  private:
+    static void protect(void* address, const std::size_t bytes, const int protection) {
+        if (::mprotect(address, bytes, protection) != 0) {
+            throw std::bad_alloc();
+        }
+    }
+
+    std::size_t page_;
+    std::size_t readable_;
+    unsigned char* begin_ = nullptr;
+};
+
+#endif
