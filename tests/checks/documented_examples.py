@@ -1,0 +1,59 @@
+#!/usr/bin/python3
+"""Checks that the examples in a document are true.
+
+    documented_examples.py DOCUMENT ROOT BIN
+
+Each ```console block is a session: its lines behind "$ " are run one after the other by bash in
+ROOT, with BIN first in the path, and must print the lines that follow them. Each ```cpp block must
+stand, line by line, in one of the files of ROOT/examples.
+"""
+
+import os
+import re
+import subprocess
+import sys
+import textwrap
+from pathlib import Path
+
+
+def blocks(document, language):
+    pattern = rf"^( *)```{language}\n(.*?)^ *```$"
+    found = re.findall(pattern, document, flags=re.MULTILINE | re.DOTALL)
+    return [textwrap.dedent(body) for _, body in found]
+
+
+def run_session(commands, root, folder):
+    """The text as a terminal would show it."""
+    script = "".join(f"printf '%s\\n' {quoted(f'$ {c}')}\n(exit $s)\n{c}\ns=$?\n" for c in commands)
+    environment = {**os.environ, "PATH": f"{folder}:{os.environ['PATH']}"}
+    result = subprocess.run(["bash", "-c", "s=0\n" + script], cwd=root, env=environment, text=True,
+                            stdout=subprocess.PIPE, stderr=subprocess.STDOUT, check=False)
+    return result.stdout
+
+
+def quoted(text):
+    return "'" + text.replace("'", "'\\''") + "'"
+
+
+def main():
+    document = Path(sys.argv[1]).read_text(encoding="utf-8")
+    root, folder = Path(sys.argv[2]), sys.argv[3]
+    sessions, snippets = blocks(document, "console"), blocks(document, "cpp")
+    failures = 0
+    for session in sessions:
+        commands = [line[2:] for line in session.splitlines() if line.startswith("$ ")]
+        shown = run_session(commands, root, folder)
+        if shown != session:
+            failures += 1
+            print(f"-- documented:\n{session}-- found:\n{shown}")
+    sources = [path.read_text(encoding="utf-8") for path in root.glob("examples/*.cpp")]
+    for snippet in snippets:
+        if not any(snippet in source for source in sources):
+            failures += 1
+            print(f"-- not in any file of examples/:\n{snippet}")
+    print(f"{len(sessions)} sessions and {len(snippets)} snippets, {failures} wrong")
+    sys.exit(1 if failures or not sessions else 0)
+
+
+if __name__ == "__main__":
+    main()
