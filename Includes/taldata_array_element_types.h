@@ -29,7 +29,7 @@ using element_type_list = type_list<BIT8, UBIT8, BIT16, UBIT16, BIT32, UBIT32, B
 
 // The number of types in front of `T` in the list.
 template <typename T, typename... Types>
-constexpr int position_in_list(type_list<Types...>) noexcept {
+constexpr int position_in_list(type_list<Types...> /*types*/) noexcept {
     int position = 0;
     (void)(... || (std::is_same_v<T, Types> || (++position, false)));
     return position;

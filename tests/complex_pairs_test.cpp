@@ -124,7 +124,7 @@ TEST(Unknown, TypeOfTheSecondArrayIsNeverTheSame) {
     for (const type_t type : {0, 13, 100}) {
         const Array<Complex64> array1 = {Complex64(1, 0)};
         Array<Complex64> array2 = {Complex64(1, 0)};
-        array2.record.data_type = type;
+        array2.record().data_type = type;
         EXPECT_EQ(sameQ(10, array1, array2), 0) << type;
     }
 }

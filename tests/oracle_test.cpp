@@ -62,8 +62,8 @@ TEST(Oracle, ComparesDoubles) {
 
 TEST(Oracle, ComparesSingles) {
     oracle::State state;
-    EXPECT_EQ(oracle::compare_singles(state, 10, 1, 1 + 0x1p-15f), 0);
-    EXPECT_EQ(oracle::compare_singles(state, 10, 1, 1 + 0x1p-13f), -1);
+    EXPECT_EQ(oracle::compare_singles(state, 10, 1, 1 + 0x1p-15F), 0);
+    EXPECT_EQ(oracle::compare_singles(state, 10, 1, 1 + 0x1p-13F), -1);
     EXPECT_EQ(oracle::compare_singles(state, static_cast<float>(23.99999999), 1, 3), 0);
 }
 
@@ -71,7 +71,7 @@ TEST(Oracle, ComputesFactors) {
     EXPECT_EQ(oracle::double_factor(10), 1.1368683772161603e-13);
     EXPECT_EQ(oracle::double_factor(10.5), 1.6077746776921858e-13);
     EXPECT_EQ(oracle::double_factor(53), 1);
-    EXPECT_EQ(oracle::single_factor(10), 6.103515625e-05f);
+    EXPECT_EQ(oracle::single_factor(10), 6.103515625e-05F);
     EXPECT_TRUE(std::isnan(oracle::double_factor(nan)));
 }
 
@@ -105,32 +105,32 @@ TEST(Oracle, ComparesIntegersByValue) {
 }
 
 TEST(Oracle, ComparesIntegersWithReals) {
-    EXPECT_TRUE(same(0, 5, std::int32_t{16777217}, 9, 16777216.0f));
+    EXPECT_TRUE(same(0, 5, std::int32_t{16777217}, 9, 16777216.0F));
     EXPECT_FALSE(same(0, 5, std::int32_t{16777217}, 10, 16777216.0));
     EXPECT_TRUE(same(0, 8, std::uint64_t{9007199254740993}, 10, 9007199254740992.0));
     EXPECT_TRUE(same(0, 5, std::int32_t{0}, 10, -0.0));
     EXPECT_TRUE(same(30, 5, std::int32_t{5}, 10, 5.0000001));
     EXPECT_FALSE(same(30, 5, std::int32_t{5}, 10, 5.00001));
-    EXPECT_TRUE(same(30, 7, std::int64_t{1}, 9, 1000.0f));
+    EXPECT_TRUE(same(30, 7, std::int64_t{1}, 9, 1000.0F));
     EXPECT_FALSE(same(30, 7, std::int64_t{1}, 10, 1000.0));
 }
 
 // Rounded by way of a double it would lie midway between two singles and go to the even one.
 TEST(Oracle, RoundsAnIntegerToSingleOnce) {
     const std::int64_t above_midway = (std::int64_t{1} << 60) + (std::int64_t{1} << 36) + 1;
-    EXPECT_TRUE(same(0, 7, above_midway, 9, 0x1.000002p60f));
-    EXPECT_FALSE(same(0, 7, above_midway, 9, 0x1p60f));
+    EXPECT_TRUE(same(0, 7, above_midway, 9, 0x1.000002p60F));
+    EXPECT_FALSE(same(0, 7, above_midway, 9, 0x1p60F));
 }
 
 TEST(Oracle, ComparesReals) {
-    EXPECT_TRUE(same(30, 9, 0.1f, 10, 0.1));
-    EXPECT_FALSE(same(20, 9, 0.1f, 10, 0.1));
+    EXPECT_TRUE(same(30, 9, 0.1F, 10, 0.1));
+    EXPECT_FALSE(same(20, 9, 0.1F, 10, 0.1));
     EXPECT_FALSE(same(0, 10, 0.0, 10, -0.0));
     EXPECT_FALSE(same(-0.0, 10, 0.0, 10, -0.0));
-    EXPECT_TRUE(same(1e-300, 9, 0.0f, 9, -0.0f));
+    EXPECT_TRUE(same(1e-300, 9, 0.0F, 9, -0.0F));
     EXPECT_TRUE(same(0, 10, nan, 10, nan));
     EXPECT_FALSE(same(1e-10, 10, nan, 10, nan));
-    EXPECT_TRUE(same(0, 9, 1.0f, 10, 1.0));
+    EXPECT_TRUE(same(0, 9, 1.0F, 10, 1.0));
 }
 
 TEST(Oracle, ComparesComplexNumbersPartByPart) {
@@ -143,11 +143,11 @@ TEST(Oracle, ComparesComplexNumbersPartByPart) {
     EXPECT_FALSE(same(60, 12, Complex{5, 0}, 12, Complex{5, 1e-300}));
     EXPECT_FALSE(same(0, 12, Complex{0.0, 0}, 12, Complex{-0.0, 0}));
     EXPECT_TRUE(same(1e-10, 12, Complex{0.0, 0}, 12, Complex{-0.0, 0}));
-    EXPECT_TRUE(same(0, 11, SingleComplex{1, 0.0f}, 12, Complex{1, -0.0}));
+    EXPECT_TRUE(same(0, 11, SingleComplex{1, 0.0F}, 12, Complex{1, -0.0}));
     EXPECT_TRUE(same(0, 5, std::int32_t{16777217}, 11, SingleComplex{16777216, 0}));
     EXPECT_FALSE(same(0, 5, std::int32_t{16777217}, 12, Complex{16777216, 0}));
-    EXPECT_TRUE(same(1e-46, 11, SingleComplex{0.0f, 0}, 11, SingleComplex{-0.0f, 0}));
-    EXPECT_FALSE(same(1e-46, 11, SingleComplex{1, 0}, 11, SingleComplex{1.0000001f, 0}));
+    EXPECT_TRUE(same(1e-46, 11, SingleComplex{0.0F, 0}, 11, SingleComplex{-0.0F, 0}));
+    EXPECT_FALSE(same(1e-46, 11, SingleComplex{1, 0}, 11, SingleComplex{1.0000001F, 0}));
 }
 
 TEST(Oracle, LooksAtShapesBeforeTypes) {

@@ -30,7 +30,7 @@ TEST(RandomCalls, AnswerAsTheOracle) {
     std::cout << tally.calls << " calls, " << tally.same << " the same, " << pairs
               << " pairs of types" << std::endl;
     EXPECT_EQ(pairs, 144);
-    EXPECT_EQ(tally.mismatches, 0u);
+    EXPECT_EQ(tally.mismatches, 0U);
 }
 
 } // namespace

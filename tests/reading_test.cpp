@@ -17,6 +17,9 @@ namespace {
 // Equal and different values, tolerances that compare elements in every way there is.
 constexpr double tolerances[] = {0.0, -1.0, 10.0, 10.5, 53.0};
 
+// Room for the longest arrays below, of 134 elements, of the widest type.
+constexpr std::size_t longest_bytes = 4096;
+
 template <typename T>
 T* fill(T* elements, const std::size_t count, const T value) {
     std::fill_n(elements, count, value);
@@ -36,8 +39,8 @@ st_TalDataArray record_of(T* elements, talint* dimensions) {
 
 TEST(Reading, EndsWithTheArrays) {
     constexpr talint longest = 70;
-    const ProtectedMemory memory1(longest * 16);
-    const ProtectedMemory memory2(longest * 16);
+    const ProtectedMemory memory1(longest_bytes);
+    const ProtectedMemory memory2(longest_bytes);
     for_each_pair([&](const auto tag1, const auto tag2) {
         using T1 = typename decltype(tag1)::type;
         using T2 = typename decltype(tag2)::type;
@@ -87,8 +90,8 @@ void expect_to_stop_at(const talint position, const ProtectedMemory& memory1,
 
 TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
     constexpr talint positions = 70;
-    const ProtectedMemory memory1(200 * 16);
-    const ProtectedMemory memory2(200 * 16);
+    const ProtectedMemory memory1(longest_bytes);
+    const ProtectedMemory memory2(longest_bytes);
     int pairs_with_a_loop = 0;
     for_each_pair([&](const auto tag1, const auto tag2) {
         using T1 = typename decltype(tag1)::type;

@@ -22,7 +22,7 @@ TEST(Threads, KeepTheirTolerancesApart) {
         while (waiting > 0) {
             std::this_thread::yield();
         }
-        EXPECT_EQ(oracle::run_checked_calls(own_seed, calls, tolerances).mismatches, 0u);
+        EXPECT_EQ(oracle::run_checked_calls(own_seed, calls, tolerances).mismatches, 0U);
     };
     std::thread one(run, seed, std::vector<double>{52.75, 23.75, 50.3, 17.5});
     std::thread other(run, seed + 1, std::vector<double>{52.25, 23.25, 49.5, 10.75});

@@ -43,12 +43,14 @@ TEST(ToleranceShiftFactor, NaN) {
 
 TEST(ToleranceShiftFactor, EveryWholeToleranceIsAnExactPowerOfTwo) {
     double expected = 0x1p-53;
-    for (int digits = 0; digits <= 1000; ++digits, expected *= 2) {
+    for (int digits = 0; digits <= 1000; ++digits) {
         EXPECT_EQ(ToleranceShiftFactor(static_cast<double>(digits)), expected) << digits;
+        expected *= 2;
     }
     float expected_single = 0x1p-24F;
-    for (int digits = 0; digits <= 140; ++digits, expected_single *= 2) {
+    for (int digits = 0; digits <= 140; ++digits) {
         EXPECT_EQ(ToleranceShiftFactor(static_cast<float>(digits)), expected_single) << digits;
+        expected_single *= 2;
     }
 }
 

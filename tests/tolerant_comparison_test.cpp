@@ -136,7 +136,8 @@ TEST(RememberedFactor, IsNotForgottenByComparisonsThatNeedNone) {
         EXPECT_EQ(compare_impl(52.5, 1.0, 1.1), 0);
         EXPECT_EQ(compare_impl(10.0, 1.0, 2.5), -1) << "differs in the leading digit";
         EXPECT_EQ(compare_impl(60.0, 1.0, 2.5), 0);
-        EXPECT_EQ(compare_impl(0.0, 1.0, 2.5), -1);
+        EXPECT_EQ(compare_impl(0.0, 1.0, 1.1), -1);
+        EXPECT_EQ(compare_impl(-3.0, 1.0, 1.1), -1);
         EXPECT_EQ(compare_impl(23.5F, 1.0F, 1.1F), 0) << "singles remember on their own";
         EXPECT_EQ(compare_impl(52.5, 1.0, 2.5), 0);
     });

@@ -20,20 +20,23 @@ class Array {
 
     Array(std::vector<talint> dimensions, std::vector<T> elements)
         : dimensions_(std::move(dimensions)), elements_(std::move(elements)) {
-        record.dims = dimensions_.data();
-        record.rank = static_cast<talint>(dimensions_.size());
-        record.data_type = element_type_id<T>;
-        record.nelems = static_cast<talint>(elements_.size());
-        record.data = elements_.data();
+        record_.dims = dimensions_.data();
+        record_.rank = static_cast<talint>(dimensions_.size());
+        record_.data_type = element_type_id<T>;
+        record_.nelems = static_cast<talint>(elements_.size());
+        record_.data = elements_.data();
     }
     Array(const Array&) = delete;
     Array& operator=(const Array&) = delete;
+    ~Array() = default;
 
-    TalNumericArray handle() const { return const_cast<TalNumericArray>(&record); }
+    // To be changed by tests that need a record that is not as it should be.
+    st_TalDataArray& record() { return record_; }
 
-    st_TalDataArray record = {};
+    TalNumericArray handle() const { return const_cast<TalNumericArray>(&record_); }
 
   private:
+    st_TalDataArray record_ = {};
     std::vector<talint> dimensions_;
     std::vector<T> elements_;
 };

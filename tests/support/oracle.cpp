@@ -1,7 +1,5 @@
 #include "oracle.h"
 
-#include <math.h>
-
 #include <algorithm>
 #include <cmath>
 #include <cstring>
@@ -159,8 +157,8 @@ double value_of(const Number& number, int digits) {
 
 // Called through volatile pointers, because a compiler may put exp2(x) in the place of pow(2, x),
 // and the two differ in the last digit.
-double (*volatile power_of_doubles)(double, double) = pow;
-float (*volatile power_of_singles)(float, float) = powf;
+double (*volatile power_of_doubles)(double, double) = std::pow;
+float (*volatile power_of_singles)(float, float) = std::pow;
 
 // The factor is looked up last, and a pair whose leading digits differ returns before it replaces
 // the cached one. Doubling the difference rounds only when it overflows, and then it is the larger.

@@ -4,8 +4,8 @@
 
 #include <cerrno>
 #include <cstdint>
-#include <cstring>
 #include <limits>
+#include <system_error>
 
 #include <fcntl.h>
 #include <sys/mman.h>
@@ -34,7 +34,7 @@ class Descriptor {
 };
 
 [[noreturn]] void throw_system_trouble(const std::string& path, const char* what_failed) {
-    throw Trouble(path, std::string(what_failed) + ": " + std::strerror(errno));
+    throw Trouble(path, std::string(what_failed) + ": " + std::generic_category().message(errno));
 }
 
 } // namespace

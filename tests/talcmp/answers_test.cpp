@@ -1,0 +1,421 @@
+// What talcmp answers about arrays that it can read, and to command lines that it cannot.
+
+#include "taldata_array_element_types.h"
+
+#include "../support/element_pairs.h"
+#include "support/npy_bytes.h"
+#include "support/run_talcmp.h"
+#include "support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <complex>
+#include <cstddef>
+#include <cstdint>
+#include <filesystem>
+#include <limits>
+#include <ostream>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace {
+
+using npy::array;
+using Options = std::vector<std::string>;
+using Reals = std::vector<double>;
+
+// Arrays of rank 1.
+const auto i8 = npy::row<std::int8_t>;
+const auto u8 = npy::row<std::uint8_t>;
+const auto i16 = npy::row<std::int16_t>;
+const auto i32 = npy::row<std::int32_t>;
+const auto i64 = npy::row<std::int64_t>;
+const auto u64 = npy::row<std::uint64_t>;
+const auto f32 = npy::row<float>;
+const auto f64 = npy::row<double>;
+const auto c64 = npy::row<std::complex<float>>;
+const auto c128 = npy::row<std::complex<double>>;
+
+// Writes both files and expects the answer: nothing where `difference` is empty.
+void expect_answer(const TemporaryFolder& folder, Options arguments, const std::string& first,
+                   const std::string& second, const std::string& difference) {
+    const std::string path1 = folder.write("a.npy", first);
+    const std::string path2 = folder.write("b.npy", second);
+    arguments.insert(arguments.end(), {path1, path2});
+    const Outcome outcome = run_talcmp(arguments);
+    const bool same = difference.empty();
+    EXPECT_EQ(outcome.status, same ? 0 : 1);
+    EXPECT_EQ(outcome.output, same ? "" : path1 + " " + path2 + " differ: " + difference + "\n");
+    EXPECT_EQ(outcome.errors, "");
+}
+
+// ---- Pairs of files
+
+struct Answer {
+    const char* name;
+    std::string first; // the bytes of the files
+    std::string second;
+    std::string difference = {}; // empty where the arrays are the same
+    Options options = {};
+};
+
+void PrintTo(const Answer& answer, std::ostream* out) {
+    *out << answer.name;
+}
+
+// Arrays of one element, of which the bits are given.
+std::string real_of_bits(const std::uint64_t bits) {
+    return npy::header(npy::dictionary(npy::descr<double>(), "False", "(1,)")) + npy::element(bits);
+}
+
+std::string single_of_bits(const std::uint32_t bits) {
+    return npy::header(npy::dictionary(npy::descr<float>(), "False", "(1,)")) + npy::element(bits);
+}
+
+const std::string nan1 = real_of_bits(0x7FF8000000000123);
+const std::string nan2 = real_of_bits(0xFFF8000000000456);
+constexpr double infinity = std::numeric_limits<double>::infinity();
+
+const Answer values[] = {
+    {"SeveralDifferences", f64({1, 2, 3, 4}), f64({1, 9, 8, 4}), "[1]: 2 and 9"},
+    {"TenthAsSingle", f32({0.1F}), f32({0.3F}), "[0]: 0.1 and 0.3"},
+    {"TenthAsDouble", f64({0.1}), f64({0.1F}), "[0]: 0.1 and 0.10000000149011612"},
+    {"LeastSingle", f32({1e-45F}), f32({std::nextafter(1.0F, 2.0F)}), "[0]: 1e-45 and 1.0000001"},
+    {"NextDouble", f64({1}), f64({std::nextafter(1.0, 2.0)}), "[0]: 1 and 1.0000000000000002"},
+    {"LimitsOfDouble", f64({5e-324}), f64({-1.7976931348623157e308}),
+     "[0]: 5e-324 and -1.7976931348623157e+308"},
+    {"Infinities", f64({infinity}), f64({-infinity}), "[0]: inf and -inf"},
+    {"Bytes", i8({-128}), i8({127}), "[0]: -128 and 127"},
+    {"UnsignedBytes", u8({65}), u8({255}), "[0]: 65 and 255"},
+    {"LimitsOfInt64", i64({INT64_MIN}), i64({INT64_MAX}),
+     "[0]: -9223372036854775808 and 9223372036854775807"},
+    {"LimitOfUint64", u64({UINT64_MAX}), u64({0}), "[0]: 18446744073709551615 and 0"},
+    {"ComplexSingles", c64({{0.1F, -2}}), c64({{0.1F, 2}}), "[0]: 0.1-2j and 0.1+2j"},
+    {"ComplexMinusZero", c128({{1, -0.0}}), c128({{1, 0.0}}), "[0]: 1-0j and 1+0j"},
+    {"Zeros", f64({-0.0}), f64({0.0}), "[0]: -0 and 0"},
+    {"EqualNaNs", nan1, nan1},
+    {"UnequalNaNs", nan1, nan2, "[0]: nan(0x7ff8000000000123) and nan(0xfff8000000000456)"},
+    {"SingleNaN", single_of_bits(0x7FC00ABC), f32({1}), "[0]: nan(0x7fc00abc) and 1"},
+};
+
+const std::string near_far = f64({1.1, 2.5});
+const std::string far_near = f64({2.5, 1.1});
+
+const Answer tolerances[] = {
+    {"Within", f64({1}), f64({1 + 0x1p-52}), "", {"--tol", "2"}},
+    {"Outside", f64({1}), f64({1 + 0x1p-51}), "[0]: 1 and 1.0000000000000004", {"--tol", "1"}},
+    {"WithinAsSingles", f32({1}), f32({1 + 0x1p-23F}), "", {"--tol", "2"}},
+    {"OutsideAsSingles", f32({1}), f32({1 + 0x1p-22F}), "[0]: 1 and 1.0000002", {"--tol", "1"}},
+    {"Half", f64({1, 1}), f64({1, 2}), "[1]: 1 and 2", {"--tol", "0.5"}},
+    {"WithEqualsSign", f64({1}), f64({2}), "", {"--tol=53"}},
+    {"Negative", f64({-0.0}), f64({0.0}), "", {"--tol", "-1"}},
+    {"NegativeWithEqualsSign",
+     f64({1}),
+     f64({1 + 0x1p-52}),
+     "[0]: 1 and 1.0000000000000002",
+     {"--tol=-1"}},
+    {"Huge", f64({1}), f64({1e300}), "", {"--tol", "1e300"}},
+    {"Infinite", f64({1}), f64({1e300}), "", {"--tol", "inf"}},
+    {"InfiniteForZero", f64({1}), f64({0}), "[0]: 1 and 0", {"--tol", "inf"}},
+    {"ZerosUnderZero", f64({-0.0}), f64({0.0}), "[0]: -0 and 0", {"--tol", "0"}},
+    {"ZerosUnderTiny", f64({-0.0}), f64({0.0}), "", {"--tol", "1e-10"}},
+    {"NaNsUnderZero", nan1, nan1, "", {"--tol", "0.0"}},
+    {"NaNsUnderOne",
+     nan1,
+     nan1,
+     "[0]: nan(0x7ff8000000000123) and nan(0x7ff8000000000123)",
+     {"--tol", "1"}},
+    {"Integers", i32({7}), i32({8}), "[0]: 7 and 8", {"--tol", "100"}},
+    {"NearThenFar", f64({1, 1}), near_far, "", {"--tol", "52.5"}},
+    {"FarThenNear", f64({1, 1}), far_near, "[0]: 1 and 2.5", {"--tol", "52.5"}},
+    {"NearFarThenNegative",
+     f64({1, 1, 1, 1, 1}),
+     f64({1, 1.1, 2.5, 2.5, -1}),
+     "[4]: 1 and -1",
+     {"--tol", "52.5"}},
+};
+
+const std::string no_singles = f32({});
+const std::string no_doubles = f64({});
+
+const Answer types_and_shapes[] = {
+    {"IntegersAndReals", i16({-3, 0}), f32({-3, -0.0F})},
+    {"IntegerAndReal", u8({3}), f64({3.5}), "[0]: 3 and 3.5"},
+    {"IntegersOfOnePattern", i64({-1}), u64({UINT64_MAX}), "[0]: -1 and 18446744073709551615"},
+    {"RealsAndComplex", f32({2}), c128({{2, -0.0}})},
+    {"RealAndComplex", f64({2}), c64({{2, 1}}), "[0]: 2 and 2+1j"},
+    {"TwoTypesWithinTolerance", f64({0.1}), f32({0.1F}), "", {"--tol", "30"}},
+    {"StrictType", f32({1}), f64({1}), "type float32 and float64", {"--strict-type"}},
+    {"StrictTypeOfOneType", f32({1}), f32({1}), "", {"--strict-type"}},
+    {"NoElements", no_singles, no_doubles},
+    {"StrictTypeOfNoElements",
+     no_singles,
+     no_doubles,
+     "type float32 and float64",
+     {"--strict-type"}},
+    {"Shapes", array("(2, 3)", Reals(6)), array("(3, 2)", Reals(6)), "shape (2, 3) and (3, 2)"},
+    {"Ranks", array("(1,)", Reals(1)), array("()", Reals(1)), "shape (1,) and ()"},
+    {"ShapesBeforeTypes", f32({1}), f64({1, 2}), "shape (1,) and (2,)", {"--strict-type"}},
+    {"ShapesWithoutElements", array("(0, 2)", Reals()), array("(0, 3)", Reals()),
+     "shape (0, 2) and (0, 3)"},
+    {"ShapesEqualIn32Bits", array("(0, 4294967297)", Reals()), array("(0, 1)", Reals()),
+     "shape (0, 4294967297) and (0, 1)"},
+    {"HugeShapesWithoutElements", array("(0, 18446744073709551615, 2)", Reals()),
+     array("(0, 18446744073709551615, 2)", Reals())},
+    {"Scalars", array("()", Reals{1}), array("()", Reals{1})},
+    {"DifferentScalars", array("()", Reals{1}), array("()", Reals{2}), "[]: 1 and 2"},
+};
+
+// The array [1. 2.] with a dictionary of its element type and what is around that.
+std::string spelled(const std::string& before, const std::string& behind) {
+    const std::string descr = npy::byte_order + std::string("f8");
+    return npy::header(before + descr + behind) + npy::elements<double>({1, 2});
+}
+
+const std::string one_two = f64({1, 2});
+
+const Answer spellings[] = {
+    {"LongOfPython2", one_two,
+     spelled("{'descr': '", "', 'fortran_order': False, 'shape': (2L,), }")},
+    {"DoubleQuotes", one_two,
+     spelled(R"({"descr": ")", R"(", "fortran_order": False, "shape": (2,)})")},
+    {"OtherOrder", one_two, spelled("{'shape': (2,), 'fortran_order': False, 'descr': '", "'}")},
+    {"NoSpaces", one_two, spelled("{'descr':'", "','fortran_order':False,'shape':(2,)}")},
+    {"ManySpaces", one_two,
+     spelled("  { 'descr'\t: '", "' , 'fortran_order' : False , 'shape' : ( 2 , ) , }  \n \n")},
+    {"LeadingZeros", one_two,
+     spelled("{'descr': '", "', 'fortran_order': False, 'shape': (00000000000000000000002,)}")},
+    {"ScalarWithSpace", array("()", Reals{1}), array("( )", Reals{1})},
+};
+
+class Answers : public testing::TestWithParam<Answer> {};
+
+TEST_P(Answers, AreGiven) {
+    const Answer& answer = GetParam();
+    expect_answer(TemporaryFolder(), answer.options, answer.first, answer.second,
+                  answer.difference);
+}
+
+template <typename Case>
+std::string name_of(const testing::TestParamInfo<Case>& info) {
+    return info.param.name;
+}
+
+INSTANTIATE_TEST_SUITE_P(Value, Answers, testing::ValuesIn(values), name_of<Answer>);
+INSTANTIATE_TEST_SUITE_P(Tolerance, Answers, testing::ValuesIn(tolerances), name_of<Answer>);
+INSTANTIATE_TEST_SUITE_P(Record, Answers, testing::ValuesIn(types_and_shapes), name_of<Answer>);
+INSTANTIATE_TEST_SUITE_P(Spelling, Answers, testing::ValuesIn(spellings), name_of<Answer>);
+
+// ---- All types, versions, places and alignments
+
+const char* const type_names[] = {"int8",    "uint8",   "int16",     "uint16",
+                                  "int32",   "uint32",  "int64",     "uint64",
+                                  "float32", "float64", "complex64", "complex128"};
+
+std::string name_of_type(const type_t id) {
+    return type_names[id - 1];
+}
+
+TEST(EveryType, IsReadInEveryVersionAndAtEveryOffset) {
+    const TemporaryFolder folder;
+    for_each_type(element_type_list{}, [&](const auto tag) {
+        using T = typename decltype(tag)::type;
+        const std::vector<T> elements = {T(1), T(2)};
+        for (std::size_t variant = 0; variant < 24; ++variant) {
+            SCOPED_TRACE(name_of_type(element_type_id<T>) + std::to_string(variant));
+            const std::string dictionary = npy::dictionary(npy::descr<T>(), "False", "(2,)");
+            const std::string header = npy::header(dictionary + std::string(variant / 3, ' '),
+                                                   1 + static_cast<int>(variant % 3));
+            const std::string file = header + npy::elements(elements);
+            expect_answer(folder, {"--strict-type"}, npy::row(elements), file, "");
+        }
+    });
+}
+
+TEST(EveryType, IsComparedByValueWithEveryOther) {
+    const TemporaryFolder folder;
+    for_each_pair([&](const auto tag1, const auto tag2) {
+        using T1 = typename decltype(tag1)::type;
+        using T2 = typename decltype(tag2)::type;
+        const std::string name1 = name_of_type(element_type_id<T1>);
+        const std::string name2 = name_of_type(element_type_id<T2>);
+        const std::string first = npy::row<T1>({T1(1), T1(100)});
+        const std::string second = npy::row<T2>({T2(1), T2(100)});
+        expect_answer(folder, {}, first, second, "");
+        expect_answer(folder, {"--strict-type"}, first, second,
+                      name1 == name2 ? "" : "type " + name1 + " and " + name2);
+    });
+}
+
+TEST(Files, MayBeOneAndTheSame) {
+    const TemporaryFolder folder;
+    const std::string path = folder.write("a.npy", f64({1, 2}));
+    const Outcome outcome = run_talcmp({path, path});
+    EXPECT_EQ(outcome.status, 0);
+    EXPECT_EQ(outcome.output + outcome.errors, "");
+}
+
+TEST(Files, MayHaveNamesThatLookLikeOptions) {
+    const TemporaryFolder folder;
+    folder.write("-x", f64({1, 2}));
+    const auto old_folder = std::filesystem::current_path();
+    std::filesystem::current_path(folder.path_of(""));
+    EXPECT_EQ(run_talcmp({"--", "-x", "-x"}).status, 0);
+    std::filesystem::current_path(old_folder);
+}
+
+TEST(Index, IsThatOfTheFirstDifferenceInRowMajorOrder) {
+    const TemporaryFolder folder;
+    const auto zeros = array("(2, 3, 4)", std::vector<std::int16_t>(24));
+    for (std::size_t position = 0; position < 24; ++position) {
+        std::vector<std::int16_t> elements(24);
+        elements[position] = 5;
+        elements[23] = 5; // a second one
+        const std::string index = std::to_string(position / 12) + ", "
+                                  + std::to_string(position / 4 % 3) + ", "
+                                  + std::to_string(position % 4);
+        expect_answer(folder, {}, zeros, array("(2, 3, 4)", elements), "[" + index + "]: 0 and 5");
+    }
+}
+
+// Far more than are compared at once, at an offset that is a multiple of 8 or is not.
+class Slices : public testing::TestWithParam<std::size_t> {
+  protected:
+    static std::string file(const Reals& elements) {
+        const std::string shape = "(" + std::to_string(elements.size()) + ",)";
+        std::string dictionary = npy::dictionary(npy::descr<double>(), "False", shape);
+        while (npy::header(dictionary).size() % 8 != GetParam()) {
+            dictionary += ' ';
+        }
+        return npy::header(dictionary) + npy::elements(elements);
+    }
+};
+
+TEST_P(Slices, DifferWhereTheArraysDo) {
+    const TemporaryFolder folder;
+    const Reals ones(200000, 1.0);
+    const std::size_t last = ones.size() - 1;
+    expect_answer(folder, {}, file(ones), file(ones), "");
+    for (const std::size_t position :
+         {std::size_t{0}, std::size_t{65535}, std::size_t{65536}, std::size_t{65537}, last}) {
+        Reals elements = ones;
+        elements[position] = elements[last] = 2.5;
+        const std::string index = "[" + std::to_string(position) + "]";
+        expect_answer(folder, {}, file(ones), file(elements), index + ": 1 and 2.5");
+    }
+}
+
+// With this tolerance, arrays that begin with a near pair may have far pairs behind it.
+TEST_P(Slices, AreComparedInOneCourse) {
+    const TemporaryFolder folder;
+    const Reals ones(131072, 1.0);
+    Reals elements = ones;
+    elements[70000] = 2.5;
+    expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "[70000]: 1 and 2.5");
+    elements[10] = 1.1;
+    expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "");
+    elements[5] = 2.5;
+    expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "[5]: 1 and 2.5");
+}
+
+INSTANTIATE_TEST_SUITE_P(Offset, Slices, testing::Values(0U, 1U, 4U));
+
+// ---- Command lines
+
+struct BadUsage {
+    const char* name;
+    Options arguments;
+    std::string message; // a part of it
+};
+
+void PrintTo(const BadUsage& usage, std::ostream* out) {
+    *out << usage.name;
+}
+
+const BadUsage bad_usages[] = {
+    {"NoFiles", {}, "A is required"},
+    {"OneFile", {"a"}, "B is required"},
+    {"ThreeFiles", {"a", "b", "c"}, "not expected: c"},
+    {"UnknownOption", {"--fast", "a", "b"}, "--fast"},
+    {"UnknownShortOption", {"-t", "a", "b"}, "-t"},
+    {"AbbreviatedOption", {"--strict", "a", "b"}, "--strict"},
+    {"TolWithoutNumber", {"a", "b", "--tol"}, "--tol"},
+    {"TolTwice", {"--tol", "1", "--tol", "2", "a", "b"}, "--tol"},
+    {"TolOfText", {"--tol", "x", "a", "b"}, "not 'x'"},
+    {"TolOfNothing", {"--tol", "", "a", "b"}, "not ''"},
+    {"TolOfNaN", {"--tol", "nan", "a", "b"}, "not 'nan'"},
+    {"TolOutOfRange", {"--tol", "1e999", "a", "b"}, "1e999"},
+    {"TolWithSpace", {"--tol", "10 ", "a", "b"}, "not '10 '"},
+    {"TolWithUnit", {"--tol=10bits", "a", "b"}, "not '10bits'"},
+    {"TolWithDecimalComma", {"--tol=2,5", "a", "b"}, "not '2,5'"},
+};
+
+class BadUsages : public testing::TestWithParam<BadUsage> {};
+
+TEST_P(BadUsages, AreRefusedWithAHint) {
+    const Outcome outcome = run_talcmp(GetParam().arguments);
+    expect_trouble(outcome, "", GetParam().message);
+    EXPECT_NE(outcome.errors.find("see 'talcmp --help'"), std::string::npos) << outcome.errors;
+}
+
+INSTANTIATE_TEST_SUITE_P(CommandLine, BadUsages, testing::ValuesIn(bad_usages), name_of<BadUsage>);
+
+TEST(CommandLine, AsksForHelpOrTheVersion) {
+    const std::pair<const char*, const char*> questions[] = {
+        {"--help", "--strict-type"}, {"-h", "Exit status: 0"}, {"--version", "talcmp "}};
+    for (const auto& [option, answer] : questions) {
+        const Outcome outcome = run_talcmp({option});
+        EXPECT_EQ(outcome.status, 0) << option;
+        EXPECT_NE(outcome.output.find(answer), std::string::npos) << outcome.output;
+        EXPECT_EQ(outcome.errors, "");
+    }
+}
+
+// ---- A standard output that takes nothing
+
+class Outputs : public testing::TestWithParam<Output> {
+  protected:
+    void SetUp() override {
+        if (GetParam() == Output::full && !std::filesystem::exists("/dev/full")) {
+            GTEST_SKIP() << "there is no /dev/full";
+        }
+    }
+
+    static void expect_no_answer(const std::vector<std::string>& arguments) {
+        SCOPED_TRACE(arguments[0].substr(0, 40));
+        expect_trouble(run_talcmp(arguments, GetParam()), "standard output: ", "");
+    }
+};
+
+TEST_P(Outputs, AreTroubleWhenThereIsSomethingToSay) {
+    const TemporaryFolder folder;
+    const std::string one = folder.write("a.npy", f64({1}));
+    const std::string two = folder.write("b.npy", f64({2}));
+    expect_no_answer({one, two});
+    expect_no_answer({"--help"});
+    expect_no_answer({"--version"});
+    EXPECT_EQ(run_talcmp({one, one}, GetParam()).status, 0);
+}
+
+// An answer that does not fit the buffer of standard output is written before it is complete.
+TEST_P(Outputs, AreTroubleForALongAnswer) {
+    const TemporaryFolder folder;
+    folder.write("a.npy", f64({1}));
+    folder.write("b.npy", f64({2}));
+    std::string detour = folder.path_of("");
+    while (detour.size() < 3900) {
+        detour += "./";
+    }
+    expect_no_answer({detour + "a.npy", detour + "b.npy"});
+}
+
+std::string name_of_output(const testing::TestParamInfo<Output>& output) {
+    return output.param == Output::full ? "Full" : "Closed";
+}
+
+INSTANTIATE_TEST_SUITE_P(Standard, Outputs, testing::Values(Output::closed, Output::full),
+                         name_of_output);
+
+} // namespace

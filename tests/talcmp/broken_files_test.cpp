@@ -1,0 +1,326 @@
+// Files that talcmp refuses: each with a message that names the file and says what is wrong.
+
+#include "npy_header.h"
+
+#include "../support/protected_memory.h"
+#include "support/npy_bytes.h"
+#include "support/run_talcmp.h"
+#include "support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstddef>
+#include <ostream>
+#include <string>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace {
+
+const std::string two_reals = npy::elements<double>({1, 2});
+const std::string real = npy::descr<double>();
+const std::string good_dictionary = npy::dictionary(real, "False", "(2,)");
+
+std::string file(const std::string& dictionary) {
+    return npy::header(dictionary) + two_reals;
+}
+
+std::string with_descr(const std::string& descr) {
+    return file(npy::dictionary(descr, "False", "(2,)"));
+}
+
+std::string with_order(const std::string& fortran_order) {
+    return file(npy::dictionary(real, fortran_order, "(2,)"));
+}
+
+std::string with_shape(const std::string& shape) {
+    return file(npy::dictionary(real, "False", shape));
+}
+
+std::string with_version(const int major, const int minor) {
+    return npy::magic + npy::version(major, minor) + npy::little_endian(good_dictionary.size(), 2)
+           + good_dictionary + two_reals;
+}
+
+// A file whose header says that its dictionary has `length` bytes.
+std::string with_length(const int major, const std::string& length) {
+    return npy::magic + npy::version(major, 0) + length + good_dictionary + two_reals;
+}
+
+std::string quoted(const char byte_order, const std::string& code) {
+    return "'" + (byte_order + code) + "'";
+}
+
+void expect_refused(const TemporaryFolder& folder, const std::string& broken,
+                    const std::string& message) {
+    const std::string good = folder.write("good.npy", file(good_dictionary));
+    expect_trouble(run_talcmp({broken, good}), broken + ": ", message);
+    expect_trouble(run_talcmp({good, broken}), broken + ": ", message);
+}
+
+// ---- Files with something wrong in them
+
+struct BrokenFile {
+    const char* name;
+    std::string bytes;
+    std::string message; // a part of it
+};
+
+void PrintTo(const BrokenFile& broken, std::ostream* out) {
+    *out << broken.name;
+}
+
+const BrokenFile beginnings[] = {
+    {"Empty", "", "it is empty"},
+    {"WrongMagic", "\x93NUMPI" + file(good_dictionary).substr(6), "does not begin with"},
+    {"OneByteShortOfMagic", "\x93NUMP", "does not begin with"},
+    {"Archive", "PK\x03\x04 and so on", ".npz"},
+    {"OnlyMagic", npy::magic, "2 bytes of version expected, 0 there"},
+    {"HalfAVersion", npy::magic + std::string("\1"), "2 bytes of version expected, 1 there"},
+    {"Version0", with_version(0, 0), "version 0.0"},
+    {"Version4", with_version(4, 0), "version 4.0"},
+    {"Version1_1", with_version(1, 1), "version 1.1"},
+    {"Version255", with_version(255, 255), "version 255.255"},
+    {"NoLength", npy::magic + npy::version(1, 0), "2 bytes of header length expected, 0 there"},
+    {"HalfALength1", npy::magic + npy::version(1, 0) + "v", "length expected, 1 there"},
+    {"HalfALength2", npy::magic + npy::version(2, 0) + "abc", "4 bytes of header length expected"},
+    {"Length0", with_length(1, npy::little_endian(0, 2)), "expected a dictionary at byte 0"},
+    {"Length0Version3", with_length(3, npy::little_endian(0, 4)), "expected a dictionary"},
+    {"LengthBeyondTheFile", with_length(1, "\xFF\xFF"), "65535 bytes of dictionary expected"},
+    {"LengthOf4GiB", with_length(2, "\xFF\xFF\xFF\xFF"), "4294967295 bytes of dictionary"},
+    {"LengthOneTooLong",
+     npy::magic + npy::version(1, 0) + npy::little_endian(good_dictionary.size() + 1, 2)
+         + good_dictionary,
+     "ends inside its header"},
+};
+
+const BrokenFile dictionaries[] = {
+    {"List", file("['descr', 'fortran_order', 'shape']"), "expected a dictionary"},
+    {"Spaces", file("      "), "expected a dictionary at byte 6"},
+    {"Unclosed", file(good_dictionary.substr(0, good_dictionary.size() - 1)), "expected"},
+    {"UnclosedString", file("{'descr: "), "a closing quote"},
+    {"MismatchedQuotes", file("{'descr\": 0}"), "a closing quote"},
+    {"NoColon", file("{'descr' " + real + "}"), "expected ':'"},
+    {"NoComma", file("{'descr': " + real + " 'shape': (2,)}"), "expected ','"},
+    {"LeadingComma", file("{, 'descr': " + real + "}"), "expected a string"},
+    {"NumberAsKey", file("{1: 2}"), "expected a string"},
+    {"Nothing", file("{}"), "lacks the key 'descr'"},
+    {"NoDescr", file("{'fortran_order': False, 'shape': (2,)}"), "lacks the key 'descr'"},
+    {"NoOrder", file("{'descr': " + real + ", 'shape': (2,)}"), "lacks the key 'fortran_order'"},
+    {"NoShape", file("{'descr': " + real + ", 'fortran_order': False}"), "lacks the key 'shape'"},
+    {"DoubledKey", file("{'shape': (2,), 'shape': (2,)}"), "'shape' twice"},
+    {"UnknownKey", file("{'colour': 'red'}"), "unknown key 'colour'"},
+    {"LongKey", file("{'" + std::string(60000, 'k') + "': 1}"), "unknown key 'kkk"},
+    {"TrailingRubbish", file(good_dictionary + " rubbish"), "nothing behind the dictionary"},
+    {"TrailingNul", file(good_dictionary + '\0'), "nothing behind the dictionary"},
+    {"NulsOnly", file(std::string(20, '\0')), "expected a dictionary"},
+    {"NulInKey", file(std::string("{'sha\0pe': 1}", 13)), "unknown key 'sha?pe'"},
+    {"NonAsciiKey", file("{'sh\xC3\xA4pe': 1}"), "unknown key 'sh??pe'"},
+    {"NonAsciiDescr", with_descr("'\xC3\xA4'"), "its elements are"},
+    {"EscapeInKey", file("{'\x1B[31m\n': 1}"), "unknown key '?[31m?'"},
+};
+
+const BrokenFile shapes[] = {
+    {"NoCommaForOneDimension", with_shape("(2)"), "expected a shape of one dimension with a ','"},
+    {"List", with_shape("[2]"), "expected a shape in parentheses"},
+    {"Number", with_shape("2"), "expected a shape in parentheses"},
+    {"String", with_shape("'(2,)'"), "expected a shape in parentheses"},
+    {"Unclosed", with_shape("(2, "), "expected a dimension"},
+    {"OnlyComma", with_shape("(,)"), "expected a dimension"},
+    {"TwoCommas", with_shape("(2,,)"), "expected a dimension"},
+    {"NoCommaBetween", with_shape("(1 2)"), "expected ',' or ')'"},
+    {"Nested", with_shape("((2,),)"), "expected a dimension"},
+    {"NameAsDimension", with_shape("(two,)"), "expected a dimension"},
+    {"FloatDimension", with_shape("(2.0,)"), "expected ',' or ')'"},
+    {"HexadecimalDimension", with_shape("(0x2,)"), "expected ',' or ')'"},
+    {"NegativeDimension", with_shape("(-2,)"), "negative dimension"},
+    {"TwoNegativeDimensions", with_shape("(-1, -2)"), "negative dimension"},
+    {"MinusZero", with_shape("(-0,)"), "negative dimension"},
+    {"DimensionOf2To64And2", with_shape("(18446744073709551618,)"), "above 2^64 - 1"},
+    {"DimensionOf30Digits", with_shape("(" + std::string(30, '9') + ",)"), "above 2^64 - 1"},
+    {"CountOf2To65", with_shape("(4294967296, 4294967296, 2)"), "more than 2^64 - 1 elements"},
+    {"CountOf2To64And2", with_shape("(9223372036854775809, 2)"), "more than 2^64 - 1 elements"},
+    {"BytesOf2To64", with_shape("(2305843009213693952,)"), "data is shorter than its shape"},
+    {"BytesOf2To64And16", with_shape("(2305843009213693954,)"), "data is shorter than its shape"},
+    {"Zero", with_shape("(2, 0)"), "16 bytes behind its array"},
+    {"ZeroTimes2To64", with_shape("(0, 4294967296, 4294967296)"), "16 bytes behind its array"},
+    {"NoData", npy::header(good_dictionary), "but 0 bytes"},
+    {"DataOneByteShort", npy::header(good_dictionary) + two_reals.substr(1), "but 15 bytes"},
+    {"DataOneByteLong", file(good_dictionary) + 'x', "1 bytes behind its array"},
+    {"ScalarOneByteLong", with_shape("()") + 'x', "9 bytes behind its array"},
+};
+
+const BrokenFile unsupported[] = {
+    {"FortranOrder", with_order("True"), "Fortran order"},
+    {"OrderAsString", with_order("'False'"), "expected True or False"},
+    {"OrderAsNumber", with_order("0"), "expected True or False"},
+    {"OrderInLowerCase", with_order("false"), "expected True or False"},
+    {"OrderWithTail", with_order("Falsehood"), "expected ','"},
+    {"Objects", with_descr("'|O'"), "Python objects"},
+    {"Structure", with_descr("[('x', '<f8'), ('y', '<f8')]"), "structured"},
+    {"NestedStructure", with_descr("[('x', [('y', '<f8')])]"), "structured"},
+    {"Subarray", with_descr("('<f8', (2,))"), "structured"},
+    {"Boolean", with_descr("'|b1'"), "boolean"},
+    {"Half", with_descr(npy::descr_of('f', 2)), "reals"},
+    {"LongDouble", with_descr(npy::descr_of('f', 16)), "reals"},
+    {"LongComplex", with_descr(npy::descr_of('c', 32)), "complex"},
+    {"WideInteger", with_descr(npy::descr_of('i', 16)), "its elements are"},
+    {"OddInteger", with_descr(npy::descr_of('i', 3)), "its elements are"},
+    {"Bytes", with_descr("'|S8'"), "text"},
+    {"Characters", with_descr("'<U2'"), "text"},
+    {"Void", with_descr("'|V8'"), "raw bytes"},
+    {"Dates", with_descr("'<M8[ns]'"), "dates or times"},
+    {"Durations", with_descr("'<m8[s]'"), "dates or times"},
+    {"OtherByteOrder", with_descr(quoted(npy::other_byte_order, "f8")),
+     "this machine's byte order"},
+    {"NativeByteOrder", with_descr("'=f8'"), "no byte order"},
+    {"NotApplicableByteOrder", with_descr("'|f8'"), "no byte order"},
+    {"NoByteOrder", with_descr("'f8'"), "its elements"},
+    {"OneCharacter", with_descr("'f'"), "its elements are"},
+    {"OnlyByteOrder", with_descr(quoted(npy::byte_order, "")), "its elements are"},
+    {"EmptyDescr", with_descr("''"), "its elements are"},
+    {"SpaceBehindDescr", with_descr(quoted(npy::byte_order, "f8 ")), "its elements are"},
+    {"NumberAsDescr", with_descr("8"), "expected a string"},
+    {"NoneAsDescr", with_descr("None"), "expected a string"},
+};
+
+class BrokenFiles : public testing::TestWithParam<BrokenFile> {};
+
+TEST_P(BrokenFiles, AreRefused) {
+    const TemporaryFolder folder;
+    const std::string broken = folder.write("broken.npy", GetParam().bytes);
+    expect_refused(folder, broken, GetParam().message);
+}
+
+template <typename Case>
+std::string name_of(const testing::TestParamInfo<Case>& info) {
+    return info.param.name;
+}
+
+INSTANTIATE_TEST_SUITE_P(Beginning, BrokenFiles, testing::ValuesIn(beginnings),
+                         name_of<BrokenFile>);
+INSTANTIATE_TEST_SUITE_P(Dictionary, BrokenFiles, testing::ValuesIn(dictionaries),
+                         name_of<BrokenFile>);
+INSTANTIATE_TEST_SUITE_P(Shape, BrokenFiles, testing::ValuesIn(shapes), name_of<BrokenFile>);
+INSTANTIATE_TEST_SUITE_P(Elements, BrokenFiles, testing::ValuesIn(unsupported),
+                         name_of<BrokenFile>);
+
+// ---- What is no file that can be read
+
+struct NoFile {
+    const char* name;
+    void (*make)(const TemporaryFolder& folder, const std::string& path);
+    std::string message;
+};
+
+void PrintTo(const NoFile& no_file, std::ostream* out) {
+    *out << no_file.name;
+}
+
+void make_nothing(const TemporaryFolder& /*folder*/, const std::string& /*path*/) {}
+
+void make_folder(const TemporaryFolder& /*folder*/, const std::string& path) {
+    ASSERT_EQ(::mkdir(path.c_str(), 0700), 0);
+}
+
+void make_pipe(const TemporaryFolder& /*folder*/, const std::string& path) {
+    ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+}
+
+void make_link_to_itself(const TemporaryFolder& /*folder*/, const std::string& path) {
+    ASSERT_EQ(::symlink(path.c_str(), path.c_str()), 0);
+}
+
+void make_unreadable(const TemporaryFolder& folder, const std::string& path) {
+    if (::geteuid() == 0) {
+        GTEST_SKIP() << "the superuser can read any file";
+    }
+    folder.write("broken.npy", file(good_dictionary));
+    ASSERT_EQ(::chmod(path.c_str(), 0), 0);
+}
+
+const NoFile no_files[] = {
+    {"Missing", make_nothing, "No such file"},
+    {"Folder", make_folder, "not a regular file"},
+    {"Pipe", make_pipe, "not a regular file"},
+    {"LinkToItself", make_link_to_itself, "cannot be opened"},
+    {"Unreadable", make_unreadable, "Permission denied"},
+};
+
+class NoFiles : public testing::TestWithParam<NoFile> {};
+
+TEST_P(NoFiles, AreRefused) {
+    const TemporaryFolder folder;
+    const std::string path = folder.path_of("broken.npy");
+    GetParam().make(folder, path);
+    if (!IsSkipped() && !HasFatalFailure()) {
+        expect_refused(folder, path, GetParam().message);
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Operand, NoFiles, testing::ValuesIn(no_files), name_of<NoFile>);
+
+// ---- Systematically broken files
+
+TEST(Truncations, AreRefusedAtEveryLength) {
+    const TemporaryFolder folder;
+    const std::string whole = file(good_dictionary);
+    const std::string good = folder.write("good.npy", whole);
+    for (std::size_t length = 0; length < whole.size(); ++length) {
+        SCOPED_TRACE(length);
+        const std::string broken = folder.write("broken.npy", whole.substr(0, length));
+        expect_trouble(run_talcmp({broken, good}), broken + ": it", "");
+    }
+}
+
+bool is_printable(const std::string& text) {
+    return std::all_of(text.begin(), text.end(), [](const char c) { return c >= ' ' && c <= '~'; });
+}
+
+// Reads the header where no memory follows, so that a read behind the file is noticed.
+talcmp::NpyHeader read_at_end(const ProtectedMemory& memory, const std::string& bytes) {
+    auto* const place = static_cast<unsigned char*>(memory.before_end(bytes.size()));
+    std::copy(bytes.begin(), bytes.end(), place);
+    return talcmp::read_npy_header(place, bytes.size());
+}
+
+// Anything that is thrown but NpyError fails the test.
+void expect_header_or_error(const ProtectedMemory& memory, const std::string& bytes) {
+    try {
+        const talcmp::NpyHeader header = read_at_end(memory, bytes);
+        EXPECT_TRUE(header.element_type >= 1 && header.element_type <= 12) << header.element_type;
+        EXPECT_LE(header.element_count, bytes.size() - header.data_offset);
+    } catch (const talcmp::NpyError& error) {
+        EXPECT_FALSE(std::string(error.what()).empty());
+        EXPECT_TRUE(is_printable(error.what())) << error.what();
+    }
+}
+
+class Headers : public testing::TestWithParam<int> {};
+
+TEST_P(Headers, AreReadOrRefusedWithAnyByteChanged) {
+    const std::string header = npy::header(good_dictionary, GetParam());
+    const ProtectedMemory memory(header.size() + two_reals.size());
+    for (std::size_t position = 0; position < header.size(); ++position) {
+        for (int value = 0; value < 256; ++value) {
+            SCOPED_TRACE("byte " + std::to_string(position) + " is " + std::to_string(value));
+            std::string changed = header + two_reals;
+            changed[position] = static_cast<char>(value);
+            expect_header_or_error(memory, changed);
+        }
+    }
+}
+
+TEST_P(Headers, AreRefusedWithTheDictionaryCutAnywhere) {
+    const ProtectedMemory memory(npy::header(good_dictionary, GetParam()).size());
+    for (std::size_t length = 0; length <= good_dictionary.size(); ++length) {
+        const std::string header = npy::header(good_dictionary.substr(0, length), GetParam());
+        EXPECT_THROW(read_at_end(memory, header), talcmp::NpyError) << length;
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Version, Headers, testing::Values(1, 2, 3));
+
+} // namespace

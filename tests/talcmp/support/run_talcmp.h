@@ -1,0 +1,26 @@
+// Runs talcmp as a child process, without a shell.
+
+#ifndef TALNUMERICARRAY_TESTS_RUN_TALCMP_H
+#define TALNUMERICARRAY_TESTS_RUN_TALCMP_H
+
+#include <string>
+#include <vector>
+
+struct Outcome {
+    int status = -1;    // the exit status
+    std::string output; // on standard output
+    std::string errors; // on standard error
+};
+
+// Where the child's standard output goes.
+enum class Output { captured, closed, full };
+
+// Fails the test when the child is ended by a signal, which it is too when it takes too long.
+Outcome run_talcmp(const std::vector<std::string>& arguments, Output output = Output::captured);
+
+// Expects exit status 2, nothing on standard output, and on standard error one line of printable
+// characters that begins with "talcmp: " and `beginning` and contains `fragment`.
+void expect_trouble(const Outcome& outcome, const std::string& beginning,
+                    const std::string& fragment);
+
+#endif

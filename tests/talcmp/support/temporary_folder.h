@@ -1,0 +1,44 @@
+// A folder for the files of one test, removed with all that is in it at the end.
+
+#ifndef TALNUMERICARRAY_TESTS_TEMPORARY_FOLDER_H
+#define TALNUMERICARRAY_TESTS_TEMPORARY_FOLDER_H
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <stdexcept>
+#include <string>
+#include <system_error>
+
+class TemporaryFolder {
+  public:
+    TemporaryFolder()
+        : path_((std::filesystem::temp_directory_path() / "talcmp-test-XXXXXX").string()) {
+        if (::mkdtemp(path_.data()) == nullptr) {
+            throw std::runtime_error("no temporary folder " + path_);
+        }
+    }
+    TemporaryFolder(const TemporaryFolder&) = delete;
+    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+    ~TemporaryFolder() {
+        std::error_code ignored;
+        std::filesystem::remove_all(path_, ignored);
+    }
+
+    std::string path_of(const std::string& name) const { return path_ + '/' + name; }
+
+    // Returns the path of the file.
+    std::string write(const std::string& name, const std::string& bytes) const {
+        std::string path = path_of(name);
+        std::ofstream file(path, std::ios::binary);
+        if (!(file << bytes).flush()) {
+            throw std::runtime_error("cannot write " + path);
+        }
+        return path;
+    }
+
+  private:
+    std::string path_;
+};
+
+#endif
