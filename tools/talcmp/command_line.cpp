@@ -22,6 +22,9 @@ talreal tolerance_from(const std::string& text) {
     talreal tolerance = 0;
     const char* const end = text.data() + text.size();
     const auto [rest, error] = std::from_chars(text.data(), end, tolerance);
+    if (error == std::errc::result_out_of_range) {
+        throw UsageError("--tol " + text + " is beyond the numbers that a double holds");
+    }
     if (error != std::errc{} || rest != end || std::isnan(tolerance)) {
         throw UsageError("--tol takes a number of binary digits, such as 10 or 2.5, not '" + text
                          + "'");

@@ -55,8 +55,10 @@ class Slice {
     // The position in the slice of the first pair that differs, given that there is one.
     //
     // Halving asks about the pairs in the order in which they were compared. That matters for
-    // tolerances whose answers depend on what has been compared: a pair that was the same is so
-    // again, and the first pair that was not is not, since nothing in front of it has changed.
+    // tolerances whose answers depend on whether a factor is remembered. A pair that was the same
+    // is so with the factor remembered too. The first pair that was not either needed the factor,
+    // and then is not the same with it, or did not; and then it left the factor as the pairs in
+    // front of it had made it, which they make it again.
     std::uint64_t first_different() const {
         std::uint64_t start = 0;
         for (std::uint64_t left = count_; left > 1;) {

@@ -31,8 +31,12 @@ Shape index_of(std::uint64_t position, const Shape& shape) {
     return index;
 }
 
-std::string value_text(ArraySource& source, const std::uint64_t position) {
-    return element_type(source.element_type()).text(source.elements(position, 1));
+// Where the types differ a single is written as a double, or 0.1 in singles and 0.1 in doubles
+// would look alike.
+std::string value_text(ArraySource& source, const ArraySource& other,
+                       const std::uint64_t position) {
+    const bool as_doubles = source.element_type() != other.element_type();
+    return element_type(source.element_type()).text(source.elements(position, 1), as_doubles);
 }
 
 } // namespace
@@ -48,8 +52,8 @@ std::string difference_text(const Difference& difference, ArraySource& first, Ar
         break;
     }
     return "[" + joined(index_of(difference.position, first.shape()))
-           + "]: " + value_text(first, difference.position) + " and "
-           + value_text(second, difference.position);
+           + "]: " + value_text(first, second, difference.position) + " and "
+           + value_text(second, first, difference.position);
 }
 
 } // namespace talcmp

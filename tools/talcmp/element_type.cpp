@@ -33,15 +33,25 @@ std::string number_text(const T value) {
 }
 
 template <typename T>
-std::string element_text(const void* element) {
+std::string part_text(const T value, const bool as_doubles) {
+    if constexpr (std::is_same_v<T, float>) {
+        if (as_doubles && !std::isnan(value)) {
+            return number_text(static_cast<double>(value));
+        }
+    }
+    return number_text(value);
+}
+
+template <typename T>
+std::string element_text(const void* element, const bool as_doubles) {
     T value = {};
     std::memcpy(&value, element, sizeof value);
     if constexpr (is_complex_v<T>) {
-        const std::string imaginary = number_text(value.imag());
+        const std::string imaginary = part_text(value.imag(), as_doubles);
         const char* const sign = imaginary.front() == '-' ? "" : "+";
-        return number_text(value.real()) + sign + imaginary + "j";
+        return part_text(value.real(), as_doubles) + sign + imaginary + "j";
     } else {
-        return number_text(value);
+        return part_text(value, as_doubles);
     }
 }
 

@@ -19,8 +19,8 @@ struct ElementType {
     std::string name;      // as NumPy says it: int8, float64, complex128
 
     // Writes the element at `element` in the fewest digits that read back as the same value; a NaN
-    // with its bits.
-    std::string (*text)(const void* element);
+    // with its bits. `as_doubles` does so for the double of the same value, if it is of singles.
+    std::string (*text)(const void* element, bool as_doubles);
 };
 
 // All element types, in the order of their ids.

@@ -45,6 +45,9 @@ FileMapping::FileMapping(const std::string& path) {
     if (file.number() < 0 || ::fstat(file.number(), &status) != 0) {
         throw_system_trouble(path, "cannot be opened");
     }
+    if (S_ISDIR(status.st_mode)) {
+        throw Trouble(path, "is a folder; name a file in it");
+    }
     if (!S_ISREG(status.st_mode)) {
         throw Trouble(path, "is not a regular file; save the array to a file first");
     }

@@ -8,6 +8,8 @@
 
 namespace talcmp {
 
+// A file that is cut short while it is mapped ends the program by a signal when the missing part is
+// read; nothing else may be writing it.
 class FileMapping {
   public:
     // Throws Trouble when `path` is no regular file that can be read.

@@ -35,9 +35,9 @@ ExitStatus run(const int argc, const char* const* argv) {
     try {
         const auto command_line = talcmp::read_command_line(argc, argv);
         const ExitStatus status = command_line ? compare(*command_line) : same;
-        if (std::fflush(stdout) != 0) {
-            std::perror("talcmp: standard output");
-            return trouble;
+        // A line too long for the buffer may have failed before the flush.
+        if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
+            throw talcmp::Trouble("standard output", "cannot be written");
         }
         return status;
     } catch (const talcmp::UsageError& error) {

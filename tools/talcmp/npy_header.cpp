@@ -12,7 +12,19 @@
 namespace talcmp {
 namespace {
 
+// What a file says is shown in a message only as far as it can be read there.
+std::string printable(const std::string_view text) {
+    constexpr std::size_t longest = 40;
+    std::string shown(text.substr(0, longest));
+    std::replace_if(
+        shown.begin(), shown.end(), [](const char c) { return c < ' ' || c > '~'; }, '?');
+    return "'" + shown + (text.size() > longest ? "...'" : "'");
+}
+
 // ---- The dictionary: the few Python literals that NumPy writes there
+
+// The most dimensions that NumPy makes.
+constexpr std::size_t highest_rank = 64;
 
 struct Dictionary {
     std::string_view descr;
@@ -52,22 +64,22 @@ class DictionaryReader {
         } else if (key == "shape") {
             set(shape_, key, dimensions());
         } else {
-            throw NpyError("its header has the unknown key '" + printable(key) + "'");
+            throw NpyError("has a header with the unknown key " + printable(key));
         }
     }
 
     template <typename Value>
     static void set(std::optional<Value>& entry, const std::string_view key, Value value) {
         if (entry.has_value()) {
-            throw NpyError("its header has the key '" + std::string(key) + "' twice");
+            throw NpyError("has a header with the key " + printable(key) + " twice");
         }
         entry = std::move(value);
     }
 
     template <typename Value>
-    static Value required(const std::optional<Value>& entry, const std::string& key) {
+    static Value required(const std::optional<Value>& entry, const std::string_view key) {
         if (!entry.has_value()) {
-            throw NpyError("its header lacks the key '" + key + "'");
+            throw NpyError("has a header without the key " + printable(key));
         }
         return *entry;
     }
@@ -90,7 +102,7 @@ class DictionaryReader {
     std::string_view element_type_code() {
         skip_space();
         if (peek() == '[' || peek() == '(' || peek() == '{') {
-            throw NpyError("its elements are structured; save each field as an array of its own");
+            throw NpyError("has structured elements; save each field as an array of its own");
         }
         return string();
     }
@@ -113,6 +125,9 @@ class DictionaryReader {
             if (!comma_behind) {
                 fail("',' or ')'");
             }
+            if (shape.size() == highest_rank) {
+                throw NpyError("has a shape of more than 64 dimensions");
+            }
             shape.push_back(dimension());
             comma_behind = accept(',');
         }
@@ -125,7 +140,7 @@ class DictionaryReader {
     std::uint64_t dimension() {
         skip_space();
         if (peek() == '-') {
-            throw NpyError("its shape has a negative dimension");
+            throw NpyError("has a shape with a negative dimension");
         }
         if (!is_digit(peek())) {
             fail("a dimension");
@@ -134,7 +149,7 @@ class DictionaryReader {
         for (; is_digit(peek()); ++position_) {
             const auto digit = static_cast<std::uint64_t>(peek() - '0');
             if (value > (std::numeric_limits<std::uint64_t>::max() - digit) / 10) {
-                throw NpyError("its shape has a dimension above 2^64 - 1");
+                throw NpyError("has a shape with a dimension above 2^64 - 1");
             }
             value = 10 * value + digit;
         }
@@ -172,17 +187,8 @@ class DictionaryReader {
 
     static bool is_digit(const char character) { return character >= '0' && character <= '9'; }
 
-    // What a file says is shown in a message only as far as it can be read there.
-    static std::string printable(const std::string_view text) {
-        constexpr std::size_t longest = 40;
-        std::string shown(text.substr(0, longest));
-        std::replace_if(
-            shown.begin(), shown.end(), [](const char c) { return c < ' ' || c > '~'; }, '?');
-        return shown + (text.size() > longest ? "..." : "");
-    }
-
     [[noreturn]] void fail(const char* expected) const {
-        throw NpyError("its header is broken: expected " + std::string(expected) + " at byte "
+        throw NpyError("has a broken header: expected " + std::string(expected) + " at byte "
                        + std::to_string(position_) + " of the dictionary");
     }
 
@@ -195,51 +201,49 @@ class DictionaryReader {
 
 // ---- What the dictionary means
 
-// The kinds of elements that NumPy has and talcmp has not.
-std::string_view kind_name(const char kind) {
-    switch (kind) {
+// What the kinds of elements are that NumPy has and talcmp has not.
+std::string kind_name(const std::string& code) {
+    switch (code.empty() ? '\0' : code[0]) {
     case 'b':
     case '?':
-        return "boolean";
+        return " (boolean)";
     case 'O':
-        return "Python objects";
+        return " (Python objects)";
     case 'S':
     case 'a':
     case 'U':
-        return "text";
+        return " (text)";
     case 'V':
-        return "raw bytes";
+        return " (raw bytes)";
     case 'M':
     case 'm':
-        return "dates or times";
-    case 'f':
-    case 'c':
-        return "reals or complex numbers of a width other than single and double";
+        return " (dates or times)";
     default:
-        return "of an unknown type";
+        return ""; // a width that talcmp has not, or nothing that NumPy has
     }
 }
 
 constexpr char native_byte_order = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '<' : '>';
 
 const ElementType& element_type_of(const std::string_view descr) {
-    const std::string_view code = descr.substr(std::min<std::size_t>(1, descr.size()));
+    const std::string has_elements = "has elements of type " + printable(descr);
+    if (descr.empty() || std::string_view("<>|").find(descr[0]) == std::string_view::npos) {
+        throw NpyError(has_elements + ", which tells no byte order; save the array with NumPy");
+    }
+    const char byte_order = descr[0];
+    const std::string code(descr.substr(1));
     const auto& types = element_types();
-    const auto type = std::find_if(types.begin(), types.end(), [code](const ElementType& each) {
+    const auto type = std::find_if(types.begin(), types.end(), [&code](const ElementType& each) {
         return code == each.kind + std::to_string(each.size);
     });
     if (type == types.end()) {
-        throw NpyError("its elements are " + std::string(kind_name(code.empty() ? ' ' : code[0]))
-                       + "; save them as integers of 8 to 64 bits, float32, float64, complex64 or "
-                         "complex128");
-    }
-    const char byte_order = descr[0];
-    if (byte_order == '|' ? type->size != 1 : byte_order != '<' && byte_order != '>') {
-        throw NpyError("its elements have no byte order; save them again with NumPy");
+        throw NpyError(has_elements + kind_name(code)
+                       + ", which is not supported; save them as integers of 8 to 64 bits, "
+                         "float32, float64, complex64 or complex128");
     }
     if (type->size != 1 && byte_order != native_byte_order) {
-        throw NpyError("its elements are not in this machine's byte order; save them as '"
-                       + (native_byte_order + std::string(code)) + "'");
+        throw NpyError(has_elements + ", which is not in this machine's byte order; save them as '"
+                       + native_byte_order + code + "'");
     }
     return *type;
 }
@@ -263,32 +267,32 @@ std::optional<std::uint64_t> product(const Shape& shape) {
 void check_data_size(const std::optional<std::uint64_t> count, const std::size_t element_size,
                      const std::uint64_t available) {
     if (!count.has_value() || *count > available / element_size) {
-        throw NpyError("its data is shorter than its shape says ("
+        throw NpyError("has less data than its shape says ("
                        + (count.has_value() ? std::to_string(*count) : "more than 2^64 - 1")
                        + " elements of " + std::to_string(element_size) + " bytes, but "
                        + std::to_string(available) + " bytes); is the file complete?");
     }
     const std::uint64_t surplus = available - *count * element_size;
     if (surplus != 0) {
-        throw NpyError("it goes on for " + std::to_string(surplus)
-                       + " bytes behind its array; save one array a file");
+        throw NpyError("has more data than its shape says (bytes behind the array: "
+                       + std::to_string(surplus) + "); save one array a file");
     }
 }
 
 // ---- The bytes in front of the dictionary
 
 constexpr std::string_view magic = "\x93NUMPY";
-constexpr std::string_view zip_magic = "PK\x03\x04";
+constexpr std::string_view zip_magic = "PK";
 
 void check_magic(const std::string_view file) {
     if (file.empty()) {
-        throw NpyError("it is empty; an .npy file was expected");
+        throw NpyError("is empty; an .npy file was expected");
     }
     if (file.substr(0, zip_magic.size()) == zip_magic) {
-        throw NpyError("it is an archive of arrays (.npz); save each array as an .npy file");
+        throw NpyError("is an archive of arrays (.npz); save each array as an .npy file");
     }
     if (file.substr(0, magic.size()) != magic) {
-        throw NpyError("it is no .npy file: it does not begin with \\x93NUMPY");
+        throw NpyError("is no .npy file: it does not begin with \\x93NUMPY");
     }
 }
 
@@ -308,8 +312,8 @@ NpyHeader read_npy_header(const unsigned char* bytes, const std::size_t size) {
     std::size_t position = magic.size();
     const auto take = [&](const std::size_t length, const char* what) {
         if (length > file.size() - position) {
-            throw NpyError("it ends inside its header: " + std::to_string(length) + " bytes of "
-                           + what + " expected, " + std::to_string(file.size() - position)
+            throw NpyError("ends inside its header: " + std::to_string(length) + " bytes of " + what
+                           + " expected, " + std::to_string(file.size() - position)
                            + " there; is the file complete?");
         }
         position += length;
@@ -320,16 +324,16 @@ NpyHeader read_npy_header(const unsigned char* bytes, const std::size_t size) {
     const int major = static_cast<unsigned char>(version[0]);
     const int minor = static_cast<unsigned char>(version[1]);
     if (major < 1 || major > 3 || minor != 0) {
-        throw NpyError("it has format version " + std::to_string(major) + "."
-                       + std::to_string(minor) + "; versions 1.0, 2.0 and 3.0 are supported");
+        throw NpyError("has format version " + std::to_string(major) + "." + std::to_string(minor)
+                       + "; versions 1.0, 2.0 and 3.0 are supported");
     }
     const std::size_t length = little_endian(take(major == 1 ? 2 : 4, "header length"));
     const Dictionary dictionary = DictionaryReader(take(length, "dictionary")).read();
 
     const ElementType& type = element_type_of(dictionary.descr);
     if (dictionary.fortran_order) {
-        throw NpyError("its elements are in Fortran order; save it with "
-                       "numpy.ascontiguousarray to have them in C order");
+        throw NpyError("has its elements in Fortran order; save what "
+                       "numpy.ascontiguousarray makes of the array");
     }
     const std::optional<std::uint64_t> count = product(dictionary.shape);
     check_data_size(count, type.size, file.size() - position);

@@ -22,7 +22,7 @@ struct NpyHeader {
     std::size_t data_offset = 0;     // bytes from the beginning of the file to the first element
 };
 
-// What is wrong with a header, or not supported.
+// What is wrong with a header, or not supported, as a sentence without its subject, the file.
 struct NpyError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };

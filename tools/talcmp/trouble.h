@@ -13,7 +13,7 @@ namespace talcmp {
 class Trouble : public std::runtime_error {
   public:
     Trouble(const std::string& file, const std::string& what_is_wrong)
-        : std::runtime_error(file + ": " + what_is_wrong) {}
+        : std::runtime_error((file.empty() ? "''" : file) + ": " + what_is_wrong) {}
 };
 
 } // namespace talcmp
