@@ -42,11 +42,7 @@ inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
 template <typename... Types, typename Routine>
 inline int with_element_type(const type_t id, type_list<Types...> /*types*/,
                              const Routine& routine) noexcept {
-    // Ids below 1 become large unsigned numbers, so that one comparison tests both ends.
-    if (static_cast<unsigned int>(id) - 1U > sizeof...(Types) - 1U) {
-        return 0;
-    }
-    // Compilers make a jump table of this chain of equalities.
+    // Compilers make one unsigned range test and a jump table of this chain of equalities.
     int answer = 0;
     (void)(... || (id == element_type_id<Types> && (answer = routine(type_tag<Types>{}), true)));
     return answer;
