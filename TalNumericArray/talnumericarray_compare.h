@@ -1,5 +1,5 @@
 // The two predicates over numeric arrays. This header is the contract; the rule of comparison is
-// written out in `compare.h` (scalars) and `talnumericarray_sameq_test.h` (elements).
+// written out in `compare.h` (scalars) and `talnumericarray_sameq_elements.h` (elements).
 //
 // Both predicates only read the records and what they point to, and take no reference on them; the
 // caller keeps them alive and unchanged for the length of a call. Any number of threads may compare
@@ -23,9 +23,10 @@
 //
 // `tol` is the tolerance for reals, a count of binary digits: two nonzero reals of one sign are the
 // same when they differ by less than 2^(tol - bits) times the larger magnitude, `bits` being 53
-// where doubles are compared and 24 where singles are. A `tol` of 0 or less asks for equality; one
-// of `bits` or more makes any two nonzero reals of one sign the same. Zero is never the same as
-// another number, nor a number the same as one of the other sign. Integers are compared exactly.
+// where doubles are compared and 24 where singles are. A `tol` of 0 or less, or NaN, asks for
+// equality; one of `bits` or more makes any two nonzero reals of one sign the same. Zero is never
+// the same as another number, nor a number the same as one of the other sign. Integers are compared
+// exactly.
 //
 // `compare_different_types` nonzero lets arrays of different element types be compared by value; if
 // it is 0, such arrays are not the same. Where either value is a double or a part of a complex of
@@ -38,6 +39,11 @@
 // -0 are different, and two NaNs of the same bits are the same. Under any other `tol`, and for
 // different types, +0 and -0 are the same and a NaN is never the same as anything, but for a `tol`
 // of `bits` or more, under which it is the same as every nonzero number that is not negative.
+//
+// The last factor 2^(tol - bits) that was needed is remembered, for each real type and thread. That
+// shows in an answer only where `tol` lies between `bits` - 1 and `bits`: then two numbers that
+// differ by half the larger or more are the same only if this factor is remembered already, be it
+// from an earlier pair of the same arrays or from an earlier call.
 //
 // Two arrays of one shape without elements are the same whatever their types. Otherwise an array
 // whose `data_type` is outside 1 to 12 is the same as none.

@@ -8,7 +8,7 @@
 
 #include "taldata_array.h"
 #include "taldata_array_element_types.h"
-#include "talnumericarray_sameq_test.h"
+#include "talnumericarray_sameq_elements.h"
 #include "type_properties.h"
 
 #include <cstddef>

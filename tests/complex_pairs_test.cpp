@@ -3,6 +3,7 @@
 #include "talnumericarray_compare.h"
 
 #include "support/arrays.h"
+#include "support/tolerances.h"
 
 #include <gtest/gtest.h>
 
@@ -15,19 +16,6 @@ using Complex32 = std::complex<float>;
 using Complex64 = std::complex<double>;
 
 constexpr double nan = std::numeric_limits<double>::quiet_NaN();
-constexpr double tolerances[] = {0, -1, 0.5, 1, 10, 23.5, 24, 30, 52.5, 53, 60, 1e300};
-
-// The answer under every tolerance; 99 where they disagree.
-template <typename T1, typename T2>
-int sameQ_under_all(const T1 element1, const T2 element2) {
-    const int answer = sameQ_of(tolerances[0], element1, element2);
-    for (const double tol : tolerances) {
-        if (sameQ_of(tol, element1, element2) != answer) {
-            return 99;
-        }
-    }
-    return answer;
-}
 
 TEST(RealAgainstComplex, ImaginaryPartMustBeZero) {
     EXPECT_EQ(sameQ_under_all(BIT8{5}, Complex64(5, 0)), 1);

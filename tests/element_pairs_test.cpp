@@ -1,9 +1,10 @@
 // Integer and real elements of each pair of types.
 
 #include "compare.h"
-#include "talnumericarray_sameq_test.h"
+#include "talnumericarray_sameq_elements.h"
 
 #include "support/arrays.h"
+#include "support/tolerances.h"
 
 #include <gtest/gtest.h>
 
@@ -14,19 +15,6 @@ namespace {
 
 constexpr double nan = std::numeric_limits<double>::quiet_NaN();
 constexpr double infinity = std::numeric_limits<double>::infinity();
-constexpr double tolerances[] = {0, -1, 0.5, 1, 10, 23.5, 24, 30, 52.5, 53, 60, 1e300};
-
-// The answer under every tolerance; 99 where they disagree.
-template <typename T1, typename T2>
-int sameQ_under_all(const T1 element1, const T2 element2) {
-    const int answer = sameQ_of(tolerances[0], element1, element2);
-    for (const double tol : tolerances) {
-        if (sameQ_of(tol, element1, element2) != answer) {
-            return 99;
-        }
-    }
-    return answer;
-}
 
 TEST(Integers, OfOneTypeIgnoreTheTolerance) {
     for (const double tol : {-3.0, nan, 1e300, 0.0}) {
@@ -105,7 +93,7 @@ TEST(Mixed, LargeIntegerRoundsToDouble) {
 
 TEST(Mixed, AnIntegerIsComparedAsTheRealOfItsValue) {
     in_new_thread([] {
-        for (const double tol : tolerances) {
+        for (const double tol : every_tolerance) {
             for (const double x : {3.0, 3.0000001, std::nextafter(3.0, 4.0), 2.9, -3.0, 0.0, nan,
                                    infinity, 6.5, 1e-20}) {
                 const int expected = nesk::detail::compare_impl(tol, 3.0, x) == 0 ? 1 : 0;

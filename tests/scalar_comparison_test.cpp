@@ -4,7 +4,7 @@
 #include "promotion_rules.h"
 #include "to_type.h"
 
-#include "support/element_pairs.h"
+#include "support/tolerances.h"
 
 #include <gtest/gtest.h>
 
@@ -17,18 +17,9 @@ namespace {
 
 using nesk::compare;
 
-constexpr double tolerances[] = {0, -1, 0.5, 1, 10, 23.5, 24, 30, 52.5, 53, 60, 1e300};
-
-// The result under every tolerance; 99 where they disagree.
 template <typename T1, typename T2>
 int compare_under_all(const T1 arg1, const T2 arg2) {
-    const int result = compare(tolerances[0], arg1, arg2);
-    for (const double tol : tolerances) {
-        if (compare(tol, arg1, arg2) != result) {
-            return 99;
-        }
-    }
-    return result;
+    return under_every_tolerance([&](const double tol) { return compare(tol, arg1, arg2); });
 }
 
 // ---- Integers

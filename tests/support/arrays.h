@@ -6,6 +6,8 @@
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
 
+#include "tolerances.h"
+
 #include <initializer_list>
 #include <thread>
 #include <utility>
@@ -51,6 +53,13 @@ int sameQ(const talreal tol, const Array<T1>& array1, const Array<T2>& array2) {
 template <typename T1, typename T2>
 int sameQ_of(const talreal tol, const T1 element1, const T2 element2) {
     return sameQ(tol, Array<T1>{element1}, Array<T2>{element2});
+}
+
+// The answer for them under every tolerance; 99 where that is not one answer.
+template <typename T1, typename T2>
+int sameQ_under_all(const T1 element1, const T2 element2) {
+    return under_every_tolerance(
+        [&](const talreal tol) { return sameQ_of(tol, element1, element2); });
 }
 
 // Runs `check` in a thread of its own, which has compared nothing yet: what it remembers of

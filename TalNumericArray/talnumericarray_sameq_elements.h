@@ -3,8 +3,8 @@
 // A complex number is a pair of reals, each judged on its own against the full tolerance; an
 // integer or a real stands for a complex number whose imaginary part is zero.
 
-#ifndef TALNUMERICARRAY_SAMEQ_TEST_H
-#define TALNUMERICARRAY_SAMEQ_TEST_H
+#ifndef TALNUMERICARRAY_SAMEQ_ELEMENTS_H
+#define TALNUMERICARRAY_SAMEQ_ELEMENTS_H
 
 #include "compare.h"
 #include "to_type.h"

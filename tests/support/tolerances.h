@@ -1,0 +1,20 @@
+// Tolerances of every kind, for answers that must not depend on them.
+
+#ifndef TALNUMERICARRAY_TESTS_TOLERANCES_H
+#define TALNUMERICARRAY_TESTS_TOLERANCES_H
+
+inline constexpr double every_tolerance[] = {0, -1, 0.5, 1, 10, 23.5, 24, 30, 52.5, 53, 60, 1e300};
+
+// What `ask(tol)` answers under every tolerance; 99 where that is not one answer.
+template <typename Ask>
+int under_every_tolerance(const Ask& ask) {
+    const int answer = ask(every_tolerance[0]);
+    for (const double tol : every_tolerance) {
+        if (ask(tol) != answer) {
+            return 99;
+        }
+    }
+    return answer;
+}
+
+#endif
