@@ -5,7 +5,7 @@
 #include "talnumericarray.h"
 #include "taltensor.h"
 
-#include "support/element_pairs.h"
+#include "support/element_types.h"
 
 #include <gtest/gtest.h>
 
@@ -47,10 +47,9 @@ TEST(EquivalentDimensions, SeesADifferenceInAnyByte) {
 }
 
 TEST(ElementTypes, TableHoldsTheSizeOfEachType) {
-    for_each_type(element_type_list{}, [](const auto tag) {
-        using Element = typename decltype(tag)::type;
-        EXPECT_EQ(TalNumericArray_typeSizeTable[element_type_id<Element>], sizeof(Element));
-    });
+    for (const ElementType& type : element_types) {
+        EXPECT_EQ(TalNumericArray_typeSizeTable[type.id], type.size) << type.id;
+    }
 }
 
 TEST(ElementTypes, TableIsTheOneThatIsDocumented) {
@@ -62,7 +61,7 @@ TEST(ElementTypes, TableIsTheOneThatIsDocumented) {
 
 TEST(ElementTypes, ListMakes144Pairs) {
     int pairs = 0;
-    for_each_pair([&](auto /*tag1*/, auto /*tag2*/) { ++pairs; });
+    for_each_pair([&](const ElementType& /*type1*/, const ElementType& /*type2*/) { ++pairs; });
     EXPECT_EQ(pairs, 144);
 }
 

@@ -6,6 +6,7 @@
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
 
+#include "element_types.h"
 #include "tolerances.h"
 
 #include <initializer_list>
@@ -41,6 +42,33 @@ class Array {
     st_TalDataArray record_ = {};
     std::vector<talint> dimensions_;
     std::vector<T> elements_;
+};
+
+// Rank 1, of a type that is chosen at run time.
+class AnyArray {
+  public:
+    AnyArray(const ElementType& type, const std::vector<int>& values)
+        : count_(static_cast<talint>(values.size())), bytes_(values.size() * type.size) {
+        for (std::size_t i = 0; i < values.size(); ++i) {
+            type.store(bytes_.data() + i * type.size, values[i]);
+        }
+        record_.dims = &count_;
+        record_.rank = 1;
+        record_.data_type = type.id;
+        record_.nelems = count_;
+        record_.data = bytes_.data();
+    }
+    AnyArray(const AnyArray&) = delete;
+    AnyArray& operator=(const AnyArray&) = delete;
+    ~AnyArray() = default;
+
+    unsigned char* bytes() { return bytes_.data(); }
+    TalNumericArray handle() const { return const_cast<TalNumericArray>(&record_); }
+
+  private:
+    talint count_;
+    std::vector<unsigned char> bytes_;
+    st_TalDataArray record_ = {};
 };
 
 // The answer for arrays that may be of different types.

@@ -2,7 +2,7 @@
 
 #include "taldata_array_element_types.h"
 
-#include "../support/element_pairs.h"
+#include "../support/element_types.h"
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
 #include "support/temporary_folder.h"
@@ -213,39 +213,46 @@ INSTANTIATE_TEST_SUITE_P(Spelling, Answers, testing::ValuesIn(spellings), name_o
 
 // ---- All types, versions, places and alignments
 
-const char* const type_names[] = {"int8",    "uint8",   "int16",     "uint16",
+const std::string type_names[] = {"int8",    "uint8",   "int16",     "uint16",
                                   "int32",   "uint32",  "int64",     "uint64",
                                   "float32", "float64", "complex64", "complex128"};
 
-std::string name_of_type(const type_t id) {
+const std::string& name_of_type(const type_t id) {
     return type_names[id - 1];
+}
+
+// The array [1, 100] of each type, with as many spaces behind the dictionary.
+template <typename... Types>
+std::vector<std::string> files_of(type_list<Types...> /*types*/, const int version,
+                                  const std::size_t spaces) {
+    const auto header = [&](const std::string& descr) {
+        const std::string dictionary = npy::dictionary(descr, "False", "(2,)");
+        return npy::header(dictionary + std::string(spaces, ' '), version);
+    };
+    return {header(npy::descr<Types>()) + npy::elements<Types>({Types(1), Types(100)})...};
 }
 
 TEST(EveryType, IsReadInEveryVersionAndAtEveryOffset) {
     const TemporaryFolder folder;
-    for_each_type(element_type_list{}, [&](const auto tag) {
-        using T = typename decltype(tag)::type;
-        const std::vector<T> elements = {T(1), T(2)};
-        for (std::size_t variant = 0; variant < 24; ++variant) {
-            SCOPED_TRACE(name_of_type(element_type_id<T>) + std::to_string(variant));
-            const std::string dictionary = npy::dictionary(npy::descr<T>(), "False", "(2,)");
-            const std::string header = npy::header(dictionary + std::string(variant / 3, ' '),
-                                                   1 + static_cast<int>(variant % 3));
-            const std::string file = header + npy::elements(elements);
-            expect_answer(folder, {"--strict-type"}, npy::row(elements), file, "");
+    const auto plain = files_of(element_type_list{}, 1, 0);
+    for (std::size_t variant = 0; variant < 24; ++variant) {
+        const int version = 1 + static_cast<int>(variant % 3);
+        const auto files = files_of(element_type_list{}, version, variant / 3);
+        for (std::size_t i = 0; i < files.size(); ++i) {
+            SCOPED_TRACE(type_names[i] + std::to_string(variant));
+            expect_answer(folder, {"--strict-type"}, plain[i], files[i], "");
         }
-    });
+    }
 }
 
 TEST(EveryType, IsComparedByValueWithEveryOther) {
     const TemporaryFolder folder;
-    for_each_pair([&](const auto tag1, const auto tag2) {
-        using T1 = typename decltype(tag1)::type;
-        using T2 = typename decltype(tag2)::type;
-        const std::string name1 = name_of_type(element_type_id<T1>);
-        const std::string name2 = name_of_type(element_type_id<T2>);
-        const std::string first = npy::row<T1>({T1(1), T1(100)});
-        const std::string second = npy::row<T2>({T2(1), T2(100)});
+    const auto files = files_of(element_type_list{}, 1, 0);
+    for_each_pair([&](const ElementType& type1, const ElementType& type2) {
+        const std::string name1 = name_of_type(type1.id);
+        const std::string name2 = name_of_type(type2.id);
+        const std::string& first = files[static_cast<std::size_t>(type1.id - 1)];
+        const std::string& second = files[static_cast<std::size_t>(type2.id - 1)];
         expect_answer(folder, {}, first, second, "");
         expect_answer(folder, {"--strict-type"}, first, second,
                       name1 == name2 ? "" : "type " + name1 + " and " + name2);

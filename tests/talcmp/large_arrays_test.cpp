@@ -1,4 +1,5 @@
-// Arrays with more elements than one record holds, in sparse files.
+// Arrays with more elements than one record holds, in sparse files. They take seconds to read, and
+// more memory than a machine may have under a sanitizer.
 
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
@@ -15,7 +16,7 @@ namespace {
 
 constexpr std::uint64_t element_count = (std::uint64_t{1} << 31U) + 10;
 
-class LargeArrays : public testing::Test {
+class ExhaustiveLargeArrays : public testing::Test {
   protected:
     void SetUp() override {
         if (sizeof(void*) < 8) {
@@ -38,14 +39,14 @@ class LargeArrays : public testing::Test {
     TemporaryFolder folder_;
 };
 
-TEST_F(LargeArrays, AreTheSame) {
+TEST_F(ExhaustiveLargeArrays, AreTheSame) {
     const std::string path = write("a.npy", "(2147483658,)", 1);
     const Outcome outcome = run_talcmp({path, path});
     EXPECT_EQ(outcome.status, 0);
     EXPECT_EQ(outcome.output + outcome.errors, "");
 }
 
-TEST_F(LargeArrays, DifferInTheLastElement) {
+TEST_F(ExhaustiveLargeArrays, DifferInTheLastElement) {
     const std::string first = write("a.npy", "(1, 2147483658)", 0);
     const std::string second = write("b.npy", "(1, 2147483658)", 1);
     const Outcome outcome = run_talcmp({first, second});
