@@ -12,7 +12,8 @@
 // it checks them:
 //   rank >= 0, and `dims` points to `rank` dimensions;
 //   nelems >= 0 is the product of the dimensions (1 for rank 0);
-//   `data` points to `nelems` elements of the type that `data_type` names, without gaps.
+//   `data` points to `nelems` elements of the type that `data_type` names, without gaps and aligned
+//   for that type.
 struct st_TalDataArray {
     talreal prec;                // a precision that the runtime keeps with the array
     talint* dims;                // the dimensions, `rank` of them

@@ -1,7 +1,7 @@
 // The list of the element types, in the order of their ids.
 //
-// Whatever has to be done once an element type (the dispatch, a table, a test, a benchmark) is
-// generated from this list.
+// Whatever has to be done once per element type (the dispatch, a table, a test) is generated from
+// this list.
 
 #ifndef TALDATA_ARRAY_ELEMENT_TYPES_H
 #define TALDATA_ARRAY_ELEMENT_TYPES_H

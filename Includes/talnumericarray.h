@@ -5,7 +5,7 @@
 
 #include <cstddef>
 
-// Bytes an element, indexed by `TalNumericArrayTypeId`; entry 0 (`UNINITIALIZED_TYPE`) names no
+// Bytes per element, indexed by `TalNumericArrayTypeId`; entry 0 (`UNINITIALIZED_TYPE`) names no
 // element type and is not to be relied on. The runtime defines the table; the library brings a
 // definition of its own for a program that has none.
 extern const std::size_t TalNumericArray_typeSizeTable[13];

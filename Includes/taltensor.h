@@ -8,7 +8,7 @@
 #include <cstddef>
 #include <cstring>
 
-// Bytes an element of a tensor; the runtime defines it.
+// Bytes per element of a tensor; the runtime defines it.
 extern const std::size_t TalTensor_typeSizeTable[];
 
 #pragma GCC visibility push(hidden)

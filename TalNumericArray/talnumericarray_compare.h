@@ -1,13 +1,15 @@
 // The two predicates over numeric arrays. This header is the contract; the rule of comparison is
-// written out in `compare.h` (scalars) and `talnumericarray_sameq_elements.h` (elements).
+// written out in `compare.h` (scalars), `talnumericarray_sameq_elements.h` (elements) and
+// `talnumericarray_sameq_impl.h` (what is compared as bytes).
 //
 // Both predicates only read the records and what they point to, and take no reference on them; the
 // caller keeps them alive and unchanged for the length of a call. Any number of threads may compare
 // the same records at once. Neither predicate allocates, throws, locks or logs.
 //
 // Nothing but what is said below is checked: a null handle, a null `dims` with a rank above 0, a
-// null `data` with a count above 0, a negative rank or count, or an `nelems` of the first array
-// that its dimensions do not bear out, is undefined behaviour.
+// null `data` with a count above 0, a `data` that is not aligned for its elements, a negative rank
+// or count, or an `nelems` of the first array that is not the product of its dimensions, is
+// undefined behaviour.
 //
 // Both are for use within the library or program that links them in; neither is exported from a
 // shared object.
@@ -21,12 +23,13 @@
 // Returns 1 when the two arrays have the same rank and dimensions and hold, position by position,
 // the same numbers; else 0.
 //
-// `tol` is the tolerance for reals, a count of binary digits: two nonzero reals of one sign are the
-// same when they differ by less than 2^(tol - bits) times the larger magnitude, `bits` being 53
-// where doubles are compared and 24 where singles are. A `tol` of 0 or less, or NaN, asks for
-// equality; one of `bits` or more makes any two nonzero reals of one sign the same. Zero is never
-// the same as another number, nor a number the same as one of the other sign. Integers are compared
-// exactly.
+// `tol` is the tolerance for reals, a count of binary digits: two nonzero reals of the same sign
+// are the same when they differ by less than 2^(tol - bits) times the larger magnitude, `bits`
+// being 53 where doubles are compared and 24 where singles are; there `tol` is first rounded to a
+// single, so that 23.99999999 counts as 24 and 1e-46 as 0. A `tol` of 0 or less, or NaN, asks for
+// equality; one of `bits` or more makes any two nonzero reals of the same sign the same. Zero is
+// never the same as another number, nor a number the same as one of the other sign. Integers are
+// compared exactly.
 //
 // `compare_different_types` nonzero lets arrays of different element types be compared by value; if
 // it is 0, such arrays are not the same. Where either value is a double or a part of a complex of
@@ -38,7 +41,7 @@
 // Two arrays of one real or complex type under a `tol` of zero are compared bit by bit: then +0 and
 // -0 are different, and two NaNs of the same bits are the same. Under any other `tol`, and for
 // different types, +0 and -0 are the same and a NaN is never the same as anything, but for a `tol`
-// of `bits` or more, under which it is the same as every nonzero number that is not negative.
+// of `bits` or more, under which it is the same as every NaN and every positive number.
 //
 // The last factor 2^(tol - bits) that was needed is remembered, for each real type and thread. That
 // shows in an answer only where `tol` lies between `bits` - 1 and `bits`: then two numbers that

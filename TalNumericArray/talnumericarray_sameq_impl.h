@@ -42,7 +42,8 @@ inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
 template <typename... Types, typename Routine>
 inline int with_element_type(const type_t id, type_list<Types...> /*types*/,
                              const Routine& routine) noexcept {
-    // Compilers make one unsigned range test and a jump table of this chain of equalities.
+    // Optimising compilers make one unsigned range test and a jump table of this chain of
+    // equalities.
     int answer = 0;
     (void)(... || (id == element_type_id<Types> && (answer = routine(type_tag<Types>{}), true)));
     return answer;

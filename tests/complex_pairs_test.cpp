@@ -110,10 +110,12 @@ TEST(ComplexAgainstComplex, ImaginaryPartsComeSecond) {
 
 TEST(Unknown, TypeOfTheSecondArrayIsNeverTheSame) {
     for (const type_t type : {0, 13, 100}) {
-        const Array<Complex64> array1 = {Complex64(1, 0)};
-        Array<Complex64> array2 = {Complex64(1, 0)};
-        array2.record().data_type = type;
-        EXPECT_EQ(sameQ(10, array1, array2), 0) << type;
+        const Array<Complex32> singles = {Complex32(1, 0)};
+        const Array<Complex64> doubles = {Complex64(1, 0)};
+        Array<Complex64> unknown = {Complex64(1, 0)};
+        unknown.record().data_type = type;
+        EXPECT_EQ(sameQ(10, singles, unknown), 0) << type;
+        EXPECT_EQ(sameQ(10, doubles, unknown), 0) << type;
     }
 }
 

@@ -32,7 +32,6 @@ TEST(Integers, MinusOneIsNoUnsignedNumber) {
 }
 
 TEST(Integers, FiveIsFiveInEveryPairOfTypes) {
-    using integers = type_list<BIT8, UBIT8, BIT16, UBIT16, BIT32, UBIT32, BIT64, UBIT64>;
     int pairs = 0;
     const auto check = [&](const auto element1, const auto element2) {
         EXPECT_EQ(sameQ_under_all(element1, element2), 1);
@@ -43,7 +42,7 @@ TEST(Integers, FiveIsFiveInEveryPairOfTypes) {
     };
     const auto check_all = [&](auto... elements) { (..., check_row(elements, elements...)); };
     check_all(BIT8{5}, UBIT8{5}, BIT16{5}, UBIT16{5}, BIT32{5}, UBIT32{5}, BIT64{5}, UBIT64{5});
-    EXPECT_EQ(pairs, static_cast<int>(integers::size * integers::size));
+    EXPECT_EQ(pairs, 64);
 }
 
 TEST(Integers, AreNotCutToTheNarrowerWidth) {

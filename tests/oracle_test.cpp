@@ -1,11 +1,11 @@
 // Worked examples, by which a reader can trust the oracle before the oracle judges anything.
 
+#include "support/oracle.h"
+
 #include <gtest/gtest.h>
 
 #include <cmath>
 #include <limits>
-
-#include "support/oracle.h"
 
 namespace {
 
@@ -78,13 +78,13 @@ TEST(Oracle, ComputesFactors) {
 TEST(Oracle, LetsTheCacheDecideBetweenHalfAndTheFactor) {
     oracle::State state;
     EXPECT_EQ(oracle::compare_doubles(state, 52.5, 1, 2.5), -1);
-    EXPECT_EQ(state.dual.last_tolerance, 53);
+    EXPECT_EQ(state.of_doubles.last_tolerance, 53);
     EXPECT_EQ(oracle::compare_doubles(state, 52.5, 1, 1.1), 0);
-    EXPECT_EQ(state.dual.last_tolerance, 52.5);
+    EXPECT_EQ(state.of_doubles.last_tolerance, 52.5);
     EXPECT_EQ(oracle::compare_doubles(state, 52.5, 1, 2.5), 0);
     EXPECT_EQ(oracle::compare_doubles(state, nan, 1, 1.1), -1);
     EXPECT_EQ(oracle::compare_doubles(state, 52.5, 1, 2.5), -1);
-    EXPECT_EQ(state.single.last_tolerance, 24);
+    EXPECT_EQ(state.of_singles.last_tolerance, 24);
 }
 
 template <typename First, typename Second>

@@ -1,12 +1,12 @@
 // A long sequence of random calls over all pairs of element types. Some tens of thousands of calls
 // are needed before every pair has given both answers.
 
+#include "support/checked_calls.h"
+
 #include <gtest/gtest.h>
 
 #include <iostream>
 #include <thread>
-
-#include "support/checked_calls.h"
 
 namespace {
 

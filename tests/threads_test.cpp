@@ -1,19 +1,20 @@
 // Two threads compare at once under tolerances of their own. A factor that leaks from one to the
 // other changes answers, as all pairs lie close to the limit.
 
+#include "support/checked_calls.h"
+
 #include <gtest/gtest.h>
 
 #include <atomic>
 #include <iostream>
 #include <thread>
 
-#include "support/checked_calls.h"
-
 namespace {
 
 TEST(Threads, KeepTheirTolerancesApart) {
     const std::uint64_t seed = oracle::requested_seed();
     const std::uint64_t calls = oracle::requested_calls() / 4;
+    ASSERT_GT(calls, 0U);
     std::cout << "TALNUMERICARRAY_SEED=" << seed << ", " << calls << " calls a thread" << std::endl;
 
     std::atomic<int> waiting{2};

@@ -1,8 +1,8 @@
 // The runtime's machine types: fixed-width integers, the machine integer `talint`, the machine
 // real `talreal` and `type_t`, which holds an element type id.
 
-#ifndef TYPE_PROPERTIES_H
-#define TYPE_PROPERTIES_H
+#ifndef TAL_TYPE_PROPERTIES_H
+#define TAL_TYPE_PROPERTIES_H
 
 #include <cstdint>
 #include <limits>

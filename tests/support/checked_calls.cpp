@@ -1,5 +1,9 @@
 #include "checked_calls.h"
 
+#include "oracle.h"
+#include "random_arrays.h"
+#include "talnumericarray_compare.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdlib>
@@ -7,10 +11,6 @@
 #include <random>
 #include <sstream>
 #include <string>
-
-#include "oracle.h"
-#include "random_arrays.h"
-#include "talnumericarray_compare.h"
 
 namespace oracle {
 namespace {
@@ -119,8 +119,8 @@ std::string described(const State& state, Call& call) {
     std::ostringstream text;
     text << std::hexfloat << "\n  tolerance " << call.tolerance << ", compare_different_types "
          << call.compare_different_types << "\n  cached before the call: single "
-         << state.single.last_tolerance << " -> " << state.single.factor << ", double "
-         << state.dual.last_tolerance << " -> " << state.dual.factor;
+         << state.of_singles.last_tolerance << " -> " << state.of_singles.factor << ", double "
+         << state.of_doubles.last_tolerance << " -> " << state.of_doubles.factor;
     return text.str() + described("first", call.first) + described("second", call.second);
 }
 
@@ -161,13 +161,13 @@ std::string check(State& state, Call& call, Tally& tally) {
 
 std::uint64_t from_environment(const char* name, std::uint64_t otherwise) {
     const char* text = std::getenv(name);
-    return text == nullptr ? otherwise : std::strtoull(text, nullptr, 0);
+    return text == nullptr ? otherwise : std::stoull(text);
 }
 
 } // namespace
 
 std::uint64_t requested_calls() {
-    return from_environment("TALNUMERICARRAY_RANDOM_CALLS", 2000000);
+    return from_environment("TALNUMERICARRAY_RANDOM_CALLS", DEFAULT_RANDOM_CALLS);
 }
 
 std::uint64_t requested_seed() {

@@ -8,7 +8,8 @@
 
 namespace oracle {
 
-// From TALNUMERICARRAY_RANDOM_CALLS and TALNUMERICARRAY_SEED; the seed is otherwise a new one.
+// From the environment, TALNUMERICARRAY_RANDOM_CALLS and TALNUMERICARRAY_SEED; otherwise the number
+// that the build was configured with, and a new seed. Throws for what is no number.
 std::uint64_t requested_calls();
 std::uint64_t requested_seed();
 

@@ -8,7 +8,7 @@
 namespace oracle {
 namespace {
 
-// Element types.
+// ---- Element types
 
 enum class Kind { signed_integer, unsigned_integer, real, complex };
 
@@ -41,7 +41,7 @@ bool is_wide_real(ElementType type) {
     return !is_integer(type) && type.part_size == 8;
 }
 
-// Numbers: an integer by its sign and magnitude, a real by its value.
+// ---- Numbers: an integer by its sign and magnitude, a real by its value
 
 struct Number {
     bool is_integer;
@@ -68,7 +68,7 @@ struct Element {
     Number imaginary;
 };
 
-// Decoding.
+// ---- Decoding
 
 template <typename T>
 T load(const unsigned char* at) {
@@ -153,7 +153,7 @@ double value_of(const Number& number, int digits) {
     return number.negative ? -magnitude : magnitude;
 }
 
-// Tolerant comparison.
+// ---- Tolerant comparison
 
 // Called through volatile pointers, because a compiler may put exp2(x) in the place of pow(2, x),
 // and the two differ in the last digit.
@@ -210,7 +210,7 @@ bool same_numbers(State& state, double tolerance, bool wide, const Number& x, co
            == 0;
 }
 
-// Arrays.
+// ---- Arrays
 
 bool same_elements(State& state, double tolerance, const Array& first, const Array& second,
                    std::int32_t index) {
@@ -268,11 +268,11 @@ bool equivalent(const Array& first, const Array& second) {
 }
 
 int compare_doubles(State& state, double tolerance, double x, double y) {
-    return compare_reals(state.dual, double_factor, tolerance, x, y);
+    return compare_reals(state.of_doubles, double_factor, tolerance, x, y);
 }
 
 int compare_singles(State& state, float tolerance, float x, float y) {
-    return compare_reals(state.single, single_factor, tolerance, x, y);
+    return compare_reals(state.of_singles, single_factor, tolerance, x, y);
 }
 
 double double_factor(double tolerance) {

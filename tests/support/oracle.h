@@ -18,8 +18,8 @@ struct FactorCache {
 
 // What a thread remembers from call to call; a new State is that of a new thread.
 struct State {
-    FactorCache single{24, 1};
-    FactorCache dual{53, 1};
+    FactorCache of_singles{24, 1};
+    FactorCache of_doubles{53, 1};
 };
 
 // The rank is the number of dimensions. The data may have any alignment.

@@ -10,7 +10,7 @@
 namespace oracle {
 namespace {
 
-// Reals.
+// ---- Reals
 
 template <typename Real>
 using BitsOf = std::conditional_t<sizeof(Real) == 4, std::uint32_t, std::uint64_t>;
@@ -107,7 +107,7 @@ Real random_real(Random& random) {
     return random.one_in(3) ? -magnitude : magnitude;
 }
 
-// Integers.
+// ---- Integers
 
 struct Integer {
     bool negative;
@@ -202,7 +202,7 @@ std::uint64_t hard_pattern(Random& random, std::uint64_t first, std::uint32_t fi
     }
 }
 
-// Memory.
+// ---- Memory
 
 template <typename T>
 void store(void* at, T value) {

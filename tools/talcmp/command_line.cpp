@@ -23,7 +23,7 @@ talreal tolerance_from(const std::string& text) {
     const char* const end = text.data() + text.size();
     const auto [rest, error] = std::from_chars(text.data(), end, tolerance);
     if (error == std::errc::result_out_of_range) {
-        throw UsageError("--tol " + text + " is beyond the numbers that a double holds");
+        throw UsageError("--tol " + text + " is too large or too small for a double");
     }
     if (error != std::errc{} || rest != end || std::isnan(tolerance)) {
         throw UsageError("--tol takes a number of binary digits, such as 10 or 2.5, not '" + text
@@ -43,7 +43,8 @@ std::optional<CommandLine> read_command_line(const int argc, const char* const* 
     app.add_option("--tol", tolerance, "Tolerance for reals, in binary digits; 0 if not given")
         ->type_name("DIGITS");
     app.add_flag("--strict-type", command_line.question.strict_type,
-                 "Arrays of different element types differ");
+                 "Arrays of different element types differ")
+        ->disable_flag_override();
     app.add_option("A", command_line.first, "The first array, an .npy file")
         ->type_name("")
         ->required();

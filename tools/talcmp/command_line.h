@@ -21,7 +21,7 @@ struct CommandLine {
 // Throws UsageError.
 std::optional<CommandLine> read_command_line(int argc, const char* const* argv);
 
-// A command line that asks for nothing that talcmp does. The text says what is wrong.
+// A command line that talcmp does not understand. The text says what is wrong.
 struct UsageError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };

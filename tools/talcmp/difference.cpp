@@ -34,12 +34,6 @@ class Record {
     st_TalDataArray record_ = {};
 };
 
-bool same_type(const ArraySource& first, const ArraySource& second) {
-    Record none1(first.element_type(), nullptr, 0);
-    Record none2(second.element_type(), nullptr, 0);
-    return TalNumericArray_equivalentQ(none1.handle(), none2.handle()) != 0;
-}
-
 // One slice of both arrays, for questions about its parts.
 class Slice {
   public:
@@ -54,23 +48,17 @@ class Slice {
 
     // The position in the slice of the first pair that differs, given that there is one.
     //
-    // Halving asks about the pairs in the order in which they were compared. That matters for
-    // tolerances whose answers depend on whether a factor is remembered. A pair that was the same
-    // is so with the factor remembered too. The first pair that was not either needed the factor,
-    // and then is not the same with it, or did not; and then it left the factor as the pairs in
-    // front of it had made it, which they make it again.
+    // The pairs are asked about once more, in order. That matters for tolerances whose answers
+    // depend on whether a factor is remembered. A pair that was the same is so with the factor
+    // remembered too. The first pair that was not either needed the factor, and then is not the
+    // same with it, or did not; and then it left the factor as the pairs in front of it had made
+    // it, which they make it again.
     std::uint64_t first_different() const {
-        std::uint64_t start = 0;
-        for (std::uint64_t left = count_; left > 1;) {
-            const std::uint64_t half = left / 2;
-            if (same(start, half)) {
-                start += half;
-                left -= half;
-            } else {
-                left = half;
-            }
+        std::uint64_t position = 0;
+        while (same(position, 1)) {
+            ++position;
         }
-        return start;
+        return position;
     }
 
   private:
@@ -99,7 +87,7 @@ std::optional<Difference> first_difference(ArraySource& first, ArraySource& seco
     if (first.shape() != second.shape()) {
         return Difference{Difference::Kind::shape, 0};
     }
-    if (question.strict_type && !same_type(first, second)) {
+    if (question.strict_type && first.element_type() != second.element_type()) {
         return Difference{Difference::Kind::type, 0};
     }
     const std::uint64_t total = first.element_count();

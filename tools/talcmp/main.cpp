@@ -15,7 +15,7 @@
 
 namespace {
 
-// The exit states of cmp and diff.
+// The exit statuses of cmp and diff.
 enum ExitStatus { same = 0, different = 1, trouble = 2 };
 
 ExitStatus compare(const talcmp::CommandLine& command_line) {

@@ -275,24 +275,26 @@ void check_data_size(const std::optional<std::uint64_t> count, const std::size_t
     const std::uint64_t surplus = available - *count * element_size;
     if (surplus != 0) {
         throw NpyError("has more data than its shape says (bytes behind the array: "
-                       + std::to_string(surplus) + "); save one array a file");
+                       + std::to_string(surplus) + "); save one array per file");
     }
 }
 
 // ---- The bytes in front of the dictionary
 
 constexpr std::string_view magic = "\x93NUMPY";
-constexpr std::string_view zip_magic = "PK";
+constexpr std::string_view zip_magic = "PK\x03\x04";
+constexpr std::string_view empty_zip_magic = "PK\x05\x06";
 
 void check_magic(const std::string_view file) {
     if (file.empty()) {
         throw NpyError("is empty; an .npy file was expected");
     }
-    if (file.substr(0, zip_magic.size()) == zip_magic) {
+    const std::string_view beginning = file.substr(0, zip_magic.size());
+    if (beginning == zip_magic || beginning == empty_zip_magic) {
         throw NpyError("is an archive of arrays (.npz); save each array as an .npy file");
     }
     if (file.substr(0, magic.size()) != magic) {
-        throw NpyError("is no .npy file: it does not begin with \\x93NUMPY");
+        throw NpyError("is not an .npy file: it does not begin with \\x93NUMPY");
     }
 }
 

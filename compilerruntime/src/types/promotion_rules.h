@@ -1,7 +1,7 @@
 // The common type of two scalar types.
 
-#ifndef PROMOTION_RULES_H
-#define PROMOTION_RULES_H
+#ifndef NESK_PROMOTION_RULES_H
+#define NESK_PROMOTION_RULES_H
 
 #include <type_traits>
 

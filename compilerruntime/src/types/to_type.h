@@ -1,7 +1,7 @@
 // The real-part type of a scalar type.
 
-#ifndef TO_TYPE_H
-#define TO_TYPE_H
+#ifndef NESK_TO_TYPE_H
+#define NESK_TO_TYPE_H
 
 #include <complex>
 #include <type_traits>

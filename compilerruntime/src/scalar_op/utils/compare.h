@@ -1,7 +1,7 @@
 // Three-way comparison of two scalars of any two non-complex element types.
 
-#ifndef COMPARE_H
-#define COMPARE_H
+#ifndef NESK_COMPARE_H
+#define NESK_COMPARE_H
 
 #include "promotion_rules.h"
 #include "strict_floating_point.h"
@@ -16,11 +16,12 @@ namespace nesk {
 namespace detail {
 
 template <typename T1, typename T2>
-inline constexpr bool both_integral_v = std::is_integral_v<T1>&& std::is_integral_v<T2>;
+inline constexpr bool both_integral_v =
+    std::conjunction_v<std::is_integral<T1>, std::is_integral<T2>>;
 
 template <typename T1, typename T2>
 inline constexpr bool either_floating_v =
-    std::is_floating_point_v<T1> || std::is_floating_point_v<T2>;
+    std::disjunction_v<std::is_floating_point<T1>, std::is_floating_point<T2>>;
 
 // ---- Integers: -1, 0 or +1 as `arg1` is below, equal to or above `arg2` as a mathematical
 // integer.
@@ -66,7 +67,7 @@ inline int compare_impl(const T1& arg1, const T2& arg2) noexcept {
 // ---- Reals: the tolerant comparison.
 
 // Returns 0 when `x` and `y` are the same under `tol`, else +1 when `x` is the greater and -1 when
-// it is not.
+// `y` is. A NaN is ordered as the steps happen to leave it, to either side.
 //
 // Two nonzero reals of one sign are the same when they differ by less than 2^(tol - bits) times the
 // larger magnitude. No tolerance makes zero the same as another number, nor a number the same as
@@ -116,8 +117,10 @@ inline int compare_impl(const T& tol, const T& x, const T y) noexcept {
     // and ldexp out of the element loops. The initial pair is a true one (2^0 is 1) that is never
     // looked up, as tolerances of `bits` or more have been answered above. Each thread remembers
     // its own: nothing is shared, nothing is locked.
-    static thread_local T lasttol = bits;
-    static thread_local T tolfactor = 1;
+    //
+    // Initial-exec: in a shared object the general model would allocate on a thread's first use.
+    [[gnu::tls_model("initial-exec")]] static thread_local T lasttol = bits;
+    [[gnu::tls_model("initial-exec")]] static thread_local T tolfactor = 1;
 
     if (tol != lasttol) {
         // A pair that differs in its leading binary digit needs no factor. For tolerances up to

@@ -1,11 +1,12 @@
 // Stops a build in which floating-point arithmetic does not mean what is written.
 //
 // The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width. A
-// compiler that is allowed to assume that there are no NaNs, to reassociate, to take reciprocals or
-// to keep excess precision gives other answers, silently.
+// compiler that may assume that there are no NaNs, reassociate, take reciprocals or keep excess
+// precision can give other answers, silently. GCC tells of each of these; Clang only of -ffast-math
+// and -ffinite-math-only.
 
-#ifndef STRICT_FLOATING_POINT_H
-#define STRICT_FLOATING_POINT_H
+#ifndef NESK_STRICT_FLOATING_POINT_H
+#define NESK_STRICT_FLOATING_POINT_H
 
 #include <cfloat>
 

@@ -1,7 +1,7 @@
 // The factor that a tolerance in binary digits stands for.
 
-#ifndef TOLERANCE_SHIFT_FACTOR_H
-#define TOLERANCE_SHIFT_FACTOR_H
+#ifndef NESK_TOLERANCE_SHIFT_FACTOR_H
+#define NESK_TOLERANCE_SHIFT_FACTOR_H
 
 #include "strict_floating_point.h"
 
