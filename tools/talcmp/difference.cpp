@@ -52,10 +52,10 @@ class Slice {
     // depend on whether a factor is remembered. A pair that was the same is so with the factor
     // remembered too. The first pair that was not either needed the factor, and then is not the
     // same with it, or did not; and then it left the factor as the pairs in front of it had made
-    // it, which they make it again.
+    // it, which they make it again. Only a file that changes meanwhile can leave no pair to find.
     std::uint64_t first_different() const {
         std::uint64_t position = 0;
-        while (same(position, 1)) {
+        while (position + 1 < count_ && same(position, 1)) {
             ++position;
         }
         return position;
