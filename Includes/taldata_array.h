@@ -31,7 +31,7 @@ using TalTensor = st_TalDataArray*;
 using TalNumericArray = st_TalDataArray*;
 
 // Separately built parts of the runtime pass records to each other, so the layout is fixed. The
-// first six fields lie alike everywhere but for the width of a pointer.
+// first seven fields lie alike everywhere but for the width of a pointer.
 static_assert(offsetof(st_TalDataArray, prec) == 0);
 static_assert(offsetof(st_TalDataArray, dims) == 8);
 static_assert(offsetof(st_TalDataArray, rank) == 8 + sizeof(void*));

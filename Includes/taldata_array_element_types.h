@@ -24,8 +24,8 @@ struct type_tag {
     using type = T;
 };
 
-using element_type_list = type_list<BIT8, UBIT8, BIT16, UBIT16, BIT32, UBIT32, BIT64, UBIT64, //
-                                    float, double, std::complex<float>, std::complex<double>>;
+using element_type_list = type_list<BIT8, UBIT8, BIT16, UBIT16, BIT32, UBIT32, BIT64, UBIT64, float,
+                                    double, std::complex<float>, std::complex<double>>;
 
 // The number of types in front of `T` in the list.
 template <typename T, typename... Types>
