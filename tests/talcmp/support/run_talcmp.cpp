@@ -49,16 +49,17 @@ class Capture {
     } else {
         ::dup2(output, STDOUT_FILENO);
     }
-    ::execv(TALCMP_PATH, arguments);
+    ::execv(arguments[0], arguments);
     ::_exit(not_started);
 }
 
-int start_and_wait(std::vector<std::string> arguments, const int output, const int errors) {
-    arguments.insert(arguments.begin(), TALCMP_PATH);
+int start_and_wait(const std::vector<std::string>& arguments, const int output, const int errors) {
+    std::vector<std::string> command = {TALCMP_COMMAND};
+    command.insert(command.end(), arguments.begin(), arguments.end());
     std::vector<char*> pointers;
-    pointers.reserve(arguments.size() + 1);
-    for (std::string& argument : arguments) {
-        pointers.push_back(argument.data());
+    pointers.reserve(command.size() + 1);
+    for (std::string& word : command) {
+        pointers.push_back(word.data());
     }
     pointers.push_back(nullptr);
     const pid_t child = ::fork();

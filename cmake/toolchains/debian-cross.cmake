@@ -1,0 +1,45 @@
+# What the toolchain files beside this one share: Debian's cross compilers, with QEMU to run what
+# they make. A platform's file sets
+#
+#   TALNUMERICARRAY_TRIPLE   how Debian calls the platform's tools: arm-linux-gnueabihf
+#   TALNUMERICARRAY_QEMU     its emulator: qemu-arm
+#   CMAKE_SYSTEM_PROCESSOR   as uname -m says it there
+#
+# and includes this one. GCC is used unless CMAKE_CXX_COMPILER is Clang, which has all its targets in
+# one program.
+
+set(CMAKE_SYSTEM_NAME Linux)
+
+# Says what is missing here and now, rather than by a test that cannot start.
+function(talnumericarray_require variable program package)
+  find_program(${variable} ${program})
+  if(NOT ${variable})
+    message(FATAL_ERROR "${program} is not installed; Debian has it in the package ${package}")
+  endif()
+endfunction()
+
+talnumericarray_require(TALNUMERICARRAY_CROSS_GCC ${TALNUMERICARRAY_TRIPLE}-gcc
+                        g++-${TALNUMERICARRAY_TRIPLE})
+talnumericarray_require(TALNUMERICARRAY_CROSS_GXX ${TALNUMERICARRAY_TRIPLE}-g++
+                        g++-${TALNUMERICARRAY_TRIPLE})
+talnumericarray_require(TALNUMERICARRAY_EMULATOR ${TALNUMERICARRAY_QEMU} qemu-user)
+
+if(NOT CMAKE_CXX_COMPILER)
+  set(CMAKE_CXX_COMPILER ${TALNUMERICARRAY_CROSS_GXX})
+endif()
+# GoogleTest names C among its languages.
+set(CMAKE_C_COMPILER ${TALNUMERICARRAY_CROSS_GCC})
+set(CMAKE_CXX_COMPILER_TARGET ${TALNUMERICARRAY_TRIPLE})
+# Clang would be paired with the host's.
+foreach(tool AR RANLIB NM READELF OBJDUMP STRIP)
+  string(TOLOWER ${tool} program)
+  find_program(CMAKE_${tool} ${TALNUMERICARRAY_TRIPLE}-${program})
+endforeach()
+
+# Only the architecture's own libraries are taken; headers and packages without machine code, like
+# those of CLI11, are the host's.
+set(CMAKE_FIND_ROOT_PATH /usr/${TALNUMERICARRAY_TRIPLE})
+set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
+set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
+
+set(CMAKE_CROSSCOMPILING_EMULATOR ${TALNUMERICARRAY_EMULATOR} -L /usr/${TALNUMERICARRAY_TRIPLE})
