@@ -42,4 +42,8 @@ set(CMAKE_FIND_ROOT_PATH /usr/${TALNUMERICARRAY_TRIPLE})
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
 
-set(CMAKE_CROSSCOMPILING_EMULATOR ${TALNUMERICARRAY_EMULATOR} -L /usr/${TALNUMERICARRAY_TRIPLE})
+# The library path keeps the emulated loader from libraries of the host for the same architecture,
+# which 64-bit x86 may have for 32-bit programs, of another build of libc than the loader.
+set(CMAKE_CROSSCOMPILING_EMULATOR
+    ${TALNUMERICARRAY_EMULATOR} -E LD_LIBRARY_PATH=/usr/${TALNUMERICARRAY_TRIPLE}/lib -L
+    /usr/${TALNUMERICARRAY_TRIPLE})

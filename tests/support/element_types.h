@@ -17,7 +17,8 @@
 
 struct ElementType {
     type_t id;
-    std::size_t size; // bytes
+    std::size_t size;      // bytes
+    std::size_t part_size; // bytes of a real or imaginary part; those of the element without parts
     bool is_integer;
     void (*store)(void* element, int value);
 };
@@ -31,8 +32,8 @@ void store_element(void* element, const int value) {
 template <typename... Types>
 constexpr std::array<ElementType, sizeof...(Types)>
 make_element_types(type_list<Types...> /*list*/) {
-    return {ElementType{element_type_id<Types>, sizeof(Types), std::is_integral_v<Types>,
-                        store_element<Types>}...};
+    return {ElementType{element_type_id<Types>, sizeof(Types), sizeof(to_real_type_t<Types>),
+                        std::is_integral_v<Types>, store_element<Types>}...};
 }
 
 inline constexpr auto element_types = make_element_types(element_type_list{});

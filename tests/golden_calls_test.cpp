@@ -1,0 +1,41 @@
+// The recorded calls, answered here.
+
+#include "support/arrays.h"
+#include "support/golden_calls.h"
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <iostream>
+#include <sstream>
+
+namespace {
+
+TEST(GoldenCalls, AreAnsweredAsOnThePlatformThatRecordedThem) {
+    std::ifstream records(GOLDEN_CALLS);
+    ASSERT_TRUE(records.is_open()) << GOLDEN_CALLS;
+    golden::Tally tally;
+    in_new_thread([&] { tally = golden::check(records); });
+
+    std::cout << tally.calls << " calls, " << tally.same << " the same, " << tally.factors
+              << " factors; with another pow " << tally.factors_of_other_pow << " factors and "
+              << tally.calls_of_other_pow << " answers" << std::endl;
+    EXPECT_GE(tally.calls, 100000U);
+    EXPECT_GT(tally.same, tally.calls / 5);
+    EXPECT_LT(tally.same, tally.calls / 5 * 4);
+    EXPECT_EQ(tally.pairs_of_types, 144U);
+    // Of a million random fractions one libm differed from another in less than a thousand.
+    EXPECT_LE(tally.factors_of_other_pow, tally.factors / 200);
+    EXPECT_LE(tally.calls_of_other_pow, tally.factors_of_other_pow);
+}
+
+TEST(GoldenCalls, AreReadAsTheyAreRecorded) {
+    std::stringstream records;
+    golden::Tally tally;
+    in_new_thread([&] { golden::record(records, 1, 5000); });
+    in_new_thread([&] { tally = golden::check(records); });
+    EXPECT_EQ(tally.calls, 5000U);
+    EXPECT_EQ(tally.factors_of_other_pow, 0U);
+}
+
+} // namespace
