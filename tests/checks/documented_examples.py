@@ -1,10 +1,11 @@
 #!/usr/bin/python3
 """Checks that the examples in a document are true.
 
-    documented_examples.py DOCUMENT ROOT BIN
+    documented_examples.py DOCUMENT ROOT BIN [EMULATOR ARGUMENT...]
 
 Each ```console block is a session: its lines behind "$ " are run one after the other by bash in
-ROOT, with BIN first in the path, and must print the lines that follow them. Each ```cpp block must
+ROOT, with the programs of BIN first in the path, behind their emulator if one is given, and must
+print the lines that follow them. Each ```cpp block must
 stand, line by line, in one of the files of ROOT/examples.
 """
 
@@ -12,6 +13,7 @@ import os
 import re
 import subprocess
 import sys
+import tempfile
 import textwrap
 from pathlib import Path
 
@@ -31,21 +33,32 @@ def run_session(commands, root, folder):
     return result.stdout
 
 
+def emulated(programs, emulator, folder):
+    """Fills the folder with commands that run the programs under the emulator."""
+    for program in Path(programs).iterdir():
+        words = " ".join(quoted(word) for word in [*emulator, str(program)])
+        command = Path(folder, program.name)
+        command.write_text(f'#!/bin/sh\nexec {words} "$@"\n', encoding="utf-8")
+        command.chmod(0o755)
+
+
 def quoted(text):
     return "'" + text.replace("'", "'\\''") + "'"
 
 
 def main():
     document = Path(sys.argv[1]).read_text(encoding="utf-8")
-    root, folder = Path(sys.argv[2]), sys.argv[3]
+    root, programs, emulator = Path(sys.argv[2]), sys.argv[3], sys.argv[4:]
     sessions, snippets = blocks(document, "console"), blocks(document, "cpp")
     failures = 0
-    for session in sessions:
-        commands = [line[2:] for line in session.splitlines() if line.startswith("$ ")]
-        shown = run_session(commands, root, folder)
-        if shown != session:
-            failures += 1
-            print(f"-- documented:\n{session}-- found:\n{shown}")
+    with tempfile.TemporaryDirectory() as commands_folder:
+        emulated(programs, emulator, commands_folder)
+        for session in sessions:
+            commands = [line[2:] for line in session.splitlines() if line.startswith("$ ")]
+            shown = run_session(commands, root, commands_folder)
+            if shown != session:
+                failures += 1
+                print(f"-- documented:\n{session}-- found:\n{shown}")
     sources = [path.read_text(encoding="utf-8") for path in root.glob("examples/*.cpp")]
     for snippet in snippets:
         if not any(snippet in source for source in sources):

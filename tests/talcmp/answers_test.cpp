@@ -173,7 +173,7 @@ const Answer types_and_shapes[] = {
 
 // The array [1. 2.] with a dictionary of its element type and what is around that.
 std::string spelled(const std::string& before, const std::string& behind) {
-    const std::string descr = npy::byte_order + std::string("f8");
+    const std::string descr = npy::native + std::string("f8");
     return npy::header(before + descr + behind) + npy::elements<double>({1, 2});
 }
 
@@ -224,12 +224,13 @@ const std::string& name_of_type(const type_t id) {
 // The array [1, 100] of each type, with as many spaces behind the dictionary.
 template <typename... Types>
 std::vector<std::string> files_of(type_list<Types...> /*types*/, const int version,
-                                  const std::size_t spaces) {
+                                  const std::size_t spaces, const char byte_order = npy::native) {
     const auto header = [&](const std::string& descr) {
         const std::string dictionary = npy::dictionary(descr, "False", "(2,)");
         return npy::header(dictionary + std::string(spaces, ' '), version);
     };
-    return {header(npy::descr<Types>()) + npy::elements<Types>({Types(1), Types(100)})...};
+    return {header(npy::descr<Types>(byte_order))
+            + npy::elements<Types>({Types(1), Types(100)}, byte_order)...};
 }
 
 TEST(EveryType, IsReadInEveryVersionAndAtEveryOffset) {
@@ -243,6 +244,30 @@ TEST(EveryType, IsReadInEveryVersionAndAtEveryOffset) {
             expect_answer(folder, {"--strict-type"}, plain[i], files[i], "");
         }
     }
+}
+
+TEST(EveryType, IsReadInEitherByteOrder) {
+    const TemporaryFolder folder;
+    const auto native = files_of(element_type_list{}, 1, 0);
+    for (const std::size_t spaces : {0, 1}) {
+        const auto swapped = files_of(element_type_list{}, 1, spaces, npy::swapped);
+        for (std::size_t i = 0; i < swapped.size(); ++i) {
+            SCOPED_TRACE(type_names[i] + std::to_string(spaces));
+            expect_answer(folder, {"--strict-type"}, native[i], swapped[i], "");
+            expect_answer(folder, {"--strict-type"}, swapped[i], native[i], "");
+        }
+    }
+}
+
+TEST(OtherByteOrder, ValuesAreToldAsWhatTheyAre) {
+    const TemporaryFolder folder;
+    using Complex = std::complex<float>;
+    std::vector<Complex> row(200000, Complex(1, 2));
+    const std::string dictionary =
+        npy::dictionary(npy::descr<Complex>(npy::swapped), "False", "(200000,)");
+    const std::string first = npy::header(dictionary) + npy::elements(row, npy::swapped);
+    row[199998] = Complex(1, 3);
+    expect_answer(folder, {}, first, npy::row(row), "[199998]: 1+2j and 1+3j");
 }
 
 TEST(EveryType, IsComparedByValueWithEveryOther) {

@@ -63,7 +63,9 @@ ElementType describe() {
                                    : real                ? "float"
                                    : std::is_signed_v<T> ? "int"
                                                          : "uint";
-    return {element_type_id<T>, kind, sizeof(T), alignof(T), family + std::to_string(8 * sizeof(T)),
+    return {element_type_id<T>, kind,
+            sizeof(T),          sizeof(to_real_type_t<T>),
+            alignof(T),         family + std::to_string(8 * sizeof(T)),
             element_text<T>};
 }
 

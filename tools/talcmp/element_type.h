@@ -15,6 +15,7 @@ struct ElementType {
     type_t id;             // of `TalNumericArrayTypeId`
     char kind;             // 'i' signed, 'u' unsigned, 'f' real, 'c' complex: the letters of .npy
     std::size_t size;      // bytes
+    std::size_t part_size; // bytes of a real or imaginary part; those of an element without parts
     std::size_t alignment; // bytes
     std::string name;      // as NumPy says it: int8, float64, complex128
 

@@ -3,6 +3,7 @@
 #include "element_type.h"
 #include "trouble.h"
 
+#include <algorithm>
 #include <cstring>
 
 namespace talcmp {
@@ -16,6 +17,13 @@ NpyHeader header_of(const std::string& path, const FileMapping& file) {
     }
 }
 
+void reverse_each(unsigned char* const parts, const std::size_t bytes,
+                  const std::size_t part_size) {
+    for (std::size_t i = 0; i < bytes; i += part_size) {
+        std::reverse(parts + i, parts + i + part_size);
+    }
+}
+
 } // namespace
 
 NpyFile::NpyFile(const std::string& path) : file_(path), header_(header_of(path, file_)) {}
@@ -24,13 +32,17 @@ const void* NpyFile::elements(const std::uint64_t first, const std::uint64_t cou
     const ElementType& type = talcmp::element_type(header_.element_type);
     // The elements lie in the file, so that both products are below its size.
     const unsigned char* const slice = file_.data() + header_.data_offset + first * type.size;
-    if (header_.data_offset % type.alignment == 0) {
+    if (header_.data_offset % type.alignment == 0 && !header_.bytes_swapped) {
         return slice;
     }
     const std::size_t bytes = static_cast<std::size_t>(count) * type.size;
-    aligned_copy_.resize(bytes / sizeof(std::max_align_t) + 1);
-    std::memcpy(aligned_copy_.data(), slice, bytes);
-    return aligned_copy_.data();
+    copy_.resize(bytes / sizeof(std::max_align_t) + 1);
+    auto* const copy = reinterpret_cast<unsigned char*>(copy_.data());
+    std::memcpy(copy, slice, bytes);
+    if (header_.bytes_swapped) {
+        reverse_each(copy, bytes, type.part_size);
+    }
+    return copy;
 }
 
 } // namespace talcmp

@@ -26,7 +26,7 @@ class NpyFile : public ArraySource {
   private:
     FileMapping file_;
     NpyHeader header_;
-    std::vector<std::max_align_t> aligned_copy_;
+    std::vector<std::max_align_t> copy_; // of elements that cannot be used where they lie
 };
 
 } // namespace talcmp

@@ -225,7 +225,12 @@ std::string kind_name(const std::string& code) {
 
 constexpr char native_byte_order = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '<' : '>';
 
-const ElementType& element_type_of(const std::string_view descr) {
+struct Elements {
+    const ElementType& type;
+    bool bytes_swapped;
+};
+
+Elements elements_of(const std::string_view descr) {
     const std::string has_elements = "has elements of type " + printable(descr);
     if (descr.empty() || std::string_view("<>|").find(descr[0]) == std::string_view::npos) {
         throw NpyError(has_elements + ", which tells no byte order; save the array with NumPy");
@@ -241,11 +246,10 @@ const ElementType& element_type_of(const std::string_view descr) {
                        + ", which is not supported; save them as integers of 8 to 64 bits, "
                          "float32, float64, complex64 or complex128");
     }
-    if (type->size != 1 && byte_order != native_byte_order) {
-        throw NpyError(has_elements + ", which is not in this machine's byte order; save them as '"
-                       + native_byte_order + code + "'");
+    if (type->size != 1 && byte_order == '|') {
+        throw NpyError(has_elements + ", which tells no byte order; save the array with NumPy");
     }
-    return *type;
+    return {*type, type->size != 1 && byte_order != native_byte_order};
 }
 
 // The product of `shape`; nothing where it is 2^64 or more. One zero makes it zero.
@@ -332,14 +336,14 @@ NpyHeader read_npy_header(const unsigned char* bytes, const std::size_t size) {
     const std::size_t length = little_endian(take(major == 1 ? 2 : 4, "header length"));
     const Dictionary dictionary = DictionaryReader(take(length, "dictionary")).read();
 
-    const ElementType& type = element_type_of(dictionary.descr);
+    const auto [type, bytes_swapped] = elements_of(dictionary.descr);
     if (dictionary.fortran_order) {
         throw NpyError("has its elements in Fortran order; save what "
                        "numpy.ascontiguousarray makes of the array");
     }
     const std::optional<std::uint64_t> count = product(dictionary.shape);
     check_data_size(count, type.size, file.size() - position);
-    return {type.id, dictionary.shape, *count, position};
+    return {type.id, dictionary.shape, *count, position, bytes_swapped};
 }
 
 } // namespace talcmp

@@ -20,6 +20,7 @@ struct NpyHeader {
     Shape shape;                     // outermost dimension first
     std::uint64_t element_count = 0; // the product of `shape`
     std::size_t data_offset = 0;     // bytes from the beginning of the file to the first element
+    bool bytes_swapped = false;      // whether the elements are in the other byte order than ours
 };
 
 // What is wrong with a header, or not supported, as a sentence without its subject, the file.

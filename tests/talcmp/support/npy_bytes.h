@@ -17,9 +17,9 @@ namespace npy {
 
 constexpr const char* magic = "\x93NUMPY";
 
-// Elements are written in this machine's byte order, the only one that talcmp reads.
-constexpr char byte_order = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '<' : '>';
-constexpr char other_byte_order = byte_order == '<' ? '>' : '<';
+// This machine's byte order, in which elements are written unless the other is asked for.
+constexpr char native = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '<' : '>';
+constexpr char swapped = native == '<' ? '>' : '<';
 
 // The lowest `width` bytes of `value`.
 inline std::string little_endian(std::uint64_t value, const std::size_t width) {
@@ -48,24 +48,25 @@ inline std::string header(const std::string& dictionary, const int major = 1) {
 }
 
 // The literal for elements of `size` bytes: '<f8', '|i1'.
-inline std::string descr_of(const char kind, const std::size_t size) {
+inline std::string descr_of(const char kind, const std::size_t size,
+                            const char byte_order = native) {
     return std::string{'\'', size == 1 ? '|' : byte_order, kind} + std::to_string(size) + "'";
 }
 
 template <typename T>
-std::string descr() {
+std::string descr(const char byte_order = native) {
     constexpr bool real = std::is_floating_point_v<T>;
     return descr_of(is_complex_v<T>       ? 'c'
                     : real                ? 'f'
                     : std::is_signed_v<T> ? 'i'
                                           : 'u',
-                    sizeof(T));
+                    sizeof(T), byte_order);
 }
 
 template <typename T>
-std::string element(const T value) {
+std::string element(const T value, const char byte_order = native) {
     if constexpr (is_complex_v<T>) {
-        return element(value.real()) + element(value.imag());
+        return element(value.real(), byte_order) + element(value.imag(), byte_order);
     } else {
         std::conditional_t<sizeof(T) == 8, std::uint64_t, std::uint32_t> bits = 0;
         if constexpr (std::is_integral_v<T>) {
@@ -82,10 +83,10 @@ std::string element(const T value) {
 }
 
 template <typename T>
-std::string elements(const std::vector<T>& values) {
+std::string elements(const std::vector<T>& values, const char byte_order = native) {
     std::string bytes;
     for (const T value : values) {
-        bytes += element(value);
+        bytes += element(value, byte_order);
     }
     return bytes;
 }
