@@ -10,9 +10,27 @@
 #include "to_type.h"
 #include "type_properties.h"
 
+#include <complex>
 #include <type_traits>
 
 #pragma GCC visibility push(hidden)
+NESK_STRICT_SINGLES_BEGIN
+
+namespace talnumericarray {
+
+// The parts of a complex number. Not by its own functions: those of the standard library are
+// compiled with other features than these on 32-bit ARM, and so would not be inlined.
+template <typename T>
+inline T real_part(const std::complex<T>& number) noexcept {
+    return reinterpret_cast<const T(&)[2]>(number)[0];
+}
+
+template <typename T>
+inline T imaginary_part(const std::complex<T>& number) noexcept {
+    return reinterpret_cast<const T(&)[2]>(number)[1];
+}
+
+} // namespace talnumericarray
 
 // Integer or real against integer or real.
 template <typename T1, typename T2,
@@ -27,8 +45,8 @@ template <typename T1, typename T2,
           std::enable_if_t<!is_complex_v<T1> && is_complex_v<T2>, int> = 0>
 inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const T1& rdata1 = data1;
-    const to_real_type_t<T2> rdata2 = data2.real();
-    const to_real_type_t<T2> idata2 = data2.imag();
+    const to_real_type_t<T2> rdata2 = talnumericarray::real_part(data2);
+    const to_real_type_t<T2> idata2 = talnumericarray::imaginary_part(data2);
     return sameQ_test(tol, rdata1, rdata2) && idata2 == 0;
 }
 
@@ -36,8 +54,8 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 template <typename T1, typename T2,
           std::enable_if_t<is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
 inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
-    const to_real_type_t<T1> rdata1 = data1.real();
-    const to_real_type_t<T1> idata1 = data1.imag();
+    const to_real_type_t<T1> rdata1 = talnumericarray::real_part(data1);
+    const to_real_type_t<T1> idata1 = talnumericarray::imaginary_part(data1);
     const T2& rdata2 = data2;
     return sameQ_test(tol, rdata1, rdata2) && idata1 == 0;
 }
@@ -45,13 +63,14 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 // Complex against complex.
 template <typename T1, typename T2, std::enable_if_t<is_complex_v<T1> && is_complex_v<T2>, int> = 0>
 inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
-    const to_real_type_t<T1> rdata1 = data1.real();
-    const to_real_type_t<T1> idata1 = data1.imag();
-    const to_real_type_t<T2> rdata2 = data2.real();
-    const to_real_type_t<T2> idata2 = data2.imag();
+    const to_real_type_t<T1> rdata1 = talnumericarray::real_part(data1);
+    const to_real_type_t<T1> idata1 = talnumericarray::imaginary_part(data1);
+    const to_real_type_t<T2> rdata2 = talnumericarray::real_part(data2);
+    const to_real_type_t<T2> idata2 = talnumericarray::imaginary_part(data2);
     return sameQ_test(tol, rdata1, rdata2) && sameQ_test(tol, idata1, idata2);
 }
 
+NESK_STRICT_SINGLES_END
 #pragma GCC visibility pop
 
 #endif

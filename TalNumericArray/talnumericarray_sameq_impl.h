@@ -16,6 +16,7 @@
 #include <type_traits>
 
 #pragma GCC visibility push(hidden)
+NESK_STRICT_SINGLES_BEGIN
 
 namespace talnumericarray {
 
@@ -87,6 +88,7 @@ inline int TalNumericArray_sameQ_impl(const talreal& tol, TalNumericArray na1,
         });
 }
 
+NESK_STRICT_SINGLES_END
 #pragma GCC visibility pop
 
 #endif

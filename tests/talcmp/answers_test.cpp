@@ -249,7 +249,7 @@ TEST(EveryType, IsReadInEveryVersionAndAtEveryOffset) {
 TEST(EveryType, IsReadInEitherByteOrder) {
     const TemporaryFolder folder;
     const auto native = files_of(element_type_list{}, 1, 0);
-    for (const std::size_t spaces : {0, 1}) {
+    for (const std::size_t spaces : {0U, 1U}) {
         const auto swapped = files_of(element_type_list{}, 1, spaces, npy::swapped);
         for (std::size_t i = 0; i < swapped.size(); ++i) {
             SCOPED_TRACE(type_names[i] + std::to_string(spaces));

@@ -11,6 +11,7 @@
 #include <type_traits>
 
 #pragma GCC visibility push(hidden)
+NESK_STRICT_SINGLES_BEGIN
 
 namespace nesk {
 namespace detail {
@@ -170,6 +171,7 @@ inline int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept 
 
 } // namespace nesk
 
+NESK_STRICT_SINGLES_END
 #pragma GCC visibility pop
 
 #endif

@@ -21,4 +21,23 @@
         "array comparison needs arithmetic without excess precision (FLT_EVAL_METHOD 0): on x86 build with -msse2 -mfpmath=sse"
 #endif
 
+// Between these two, functions compare singles as IEEE says on 32-bit ARM too.
+//
+// There NEON takes subnormal numbers for zero. GCC leaves floating point to VFP for that reason,
+// whereas Clang vectorises loops of comparisons, in whose answers 1e-40 is then the same as 0. So
+// these functions are compiled without NEON, and are not inlined where it is on: LLVM inlines a
+// function only where all features that are not in a list of its own agree, and this way to hand
+// out VFP registers, which changes no result, is not in the list and on by default for no Linux
+// target.
+#if defined(__clang__) && defined(__arm__) && defined(__ARM_NEON)
+// clang-format off
+#    define NESK_STRICT_SINGLES_BEGIN \
+        _Pragma("clang attribute push(__attribute__((target(\"no-neon,wide-stride-vfp\"))), apply_to = function)")
+// clang-format on
+#    define NESK_STRICT_SINGLES_END _Pragma("clang attribute pop")
+#else
+#    define NESK_STRICT_SINGLES_BEGIN
+#    define NESK_STRICT_SINGLES_END
+#endif
+
 #endif

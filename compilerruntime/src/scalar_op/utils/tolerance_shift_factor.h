@@ -29,6 +29,7 @@ inline T ToleranceShiftFactor_impl(const T& tol) noexcept {
     const T whole = std::max(-limit, std::min(limit, itol));
     const int tolshift = static_cast<int>(whole) - bits;
 
+    // A subnormal `ftol` may be taken for zero, as NEON does: its power is 1 too.
     if (ftol != 0) {
         // Some compilers turn pow(2, x) into exp2(x), or fold it when x is known too. Either can
         // differ from the library's pow in the last place, and the answers of two builds with it:
