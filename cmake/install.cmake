@@ -1,6 +1,11 @@
 # What `cmake --install` lays down: the library, in the component Development, and talcmp, in the
 # component Runtime. Nothing of it knows the prefix, which may be moved afterwards.
 
+option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
+       OFF)
+if(TALNUMERICARRAY_DEBIAN_PACKAGES)
+  include(${CMAKE_CURRENT_LIST_DIR}/debian_packages.cmake)
+endif()
 include(CMakePackageConfigHelpers)
 include(GNUInstallDirs)
 

@@ -1,0 +1,55 @@
+# Debian packages by CPack: libtalnumericarray-dev and talcmp, for whatever architecture is built.
+
+find_program(TALNUMERICARRAY_DPKG_ARCHITECTURE dpkg-architecture)
+if(NOT TALNUMERICARRAY_DPKG_ARCHITECTURE)
+  message(FATAL_ERROR "dpkg-architecture is not installed; Debian has it in the package dpkg-dev")
+endif()
+
+# What Debian calls the architecture: amd64 or x86_64-linux-gnu, armhf or arm-linux-gnueabihf.
+function(talnumericarray_debian_name variable key)
+  execute_process(
+    COMMAND ${TALNUMERICARRAY_DPKG_ARCHITECTURE} ${ARGN} -q${key}
+    OUTPUT_VARIABLE name
+    OUTPUT_STRIP_TRAILING_WHITESPACE ERROR_QUIET COMMAND_ERROR_IS_FATAL ANY)
+  set(${variable} ${name} PARENT_SCOPE)
+endfunction()
+
+if(CMAKE_CROSSCOMPILING)
+  set(target -t${CMAKE_CXX_COMPILER_TARGET})
+endif()
+talnumericarray_debian_name(CPACK_DEBIAN_PACKAGE_ARCHITECTURE DEB_HOST_ARCH ${target})
+talnumericarray_debian_name(multiarch DEB_HOST_MULTIARCH ${target})
+set(CMAKE_INSTALL_LIBDIR lib/${multiarch})
+
+# ---- The two packages
+
+set(CPACK_GENERATOR DEB)
+set(CPACK_COMPONENTS_ALL Development Runtime)
+set(CPACK_DEB_COMPONENT_INSTALL ON)
+set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
+set(CPACK_STRIP_FILES ON)
+set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
+set(CPACK_DEBIAN_PACKAGE_MAINTAINER "TalNumericArray developers <talnumericarray@localhost>")
+# Each package has a description of its own.
+set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "")
+
+set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_NAME libtalnumericarray-dev)
+set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
+set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
+    "${PROJECT_DESCRIPTION}
+ The headers, the static library and what CMake and pkg-config need to find them.")
+
+set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME talcmp)
+set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION math)
+if(CMAKE_CROSSCOMPILING)
+  # dpkg-shlibdeps would name the packages of the cross compiler, which the architecture itself has
+  # not. These are Debian 12's, to which the cross compiler links.
+  set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS "libc6 (>= 2.36), libgcc-s1 (>= 12), libstdc++6 (>= 12)")
+else()
+  set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)
+endif()
+set(CPACK_COMPONENT_RUNTIME_DESCRIPTION
+    "Compare the arrays in two .npy files
+ talcmp says how two arrays of numbers first differ, under a tolerance in binary digits.")
+
+include(CPack)
