@@ -5,8 +5,8 @@
 
 Each ```console block is a session: its lines behind "$ " are run one after the other by bash in
 ROOT, with the programs of BIN first in the path, behind their emulator if one is given, and must
-print the lines that follow them. Each ```cpp block must
-stand, line by line, in one of the files of ROOT/examples.
+print the lines that follow them. Each ```cpp block must stand, line by line, in one of the files of
+ROOT/examples, and each ```cmake block in one of the projects of ROOT/tests/outside.
 """
 
 import os
@@ -49,7 +49,7 @@ def quoted(text):
 def main():
     document = Path(sys.argv[1]).read_text(encoding="utf-8")
     root, programs, emulator = Path(sys.argv[2]), sys.argv[3], sys.argv[4:]
-    sessions, snippets = blocks(document, "console"), blocks(document, "cpp")
+    sessions = blocks(document, "console")
     failures = 0
     with tempfile.TemporaryDirectory() as commands_folder:
         emulated(programs, emulator, commands_folder)
@@ -59,12 +59,15 @@ def main():
             if shown != session:
                 failures += 1
                 print(f"-- documented:\n{session}-- found:\n{shown}")
-    sources = [path.read_text(encoding="utf-8") for path in root.glob("examples/*.cpp")]
-    for snippet in snippets:
-        if not any(snippet in source for source in sources):
-            failures += 1
-            print(f"-- not in any file of examples/:\n{snippet}")
-    print(f"{len(sessions)} sessions and {len(snippets)} snippets, {failures} wrong")
+    snippets = 0
+    for language, pattern in (("cpp", "examples/*.cpp"), ("cmake", "tests/outside/*/CMakeLists.txt")):
+        sources = [path.read_text(encoding="utf-8") for path in root.glob(pattern)]
+        for snippet in blocks(document, language):
+            snippets += 1
+            if not any(snippet in source for source in sources):
+                failures += 1
+                print(f"-- not in any file of {pattern}:\n{snippet}")
+    print(f"{len(sessions)} sessions and {snippets} snippets, {failures} wrong")
     sys.exit(1 if failures or not sessions else 0)
 
 
