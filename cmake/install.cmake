@@ -1,5 +1,6 @@
 # What `cmake --install` lays down: the library, in the component Development, and talcmp, in the
-# component Runtime. Nothing of it knows the prefix, which may be moved afterwards.
+# component Runtime. Nothing of it knows the prefix, which may be moved
+# afterwards, unless CMAKE_INSTALL_LIBDIR is absolute.
 
 option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
        OFF)

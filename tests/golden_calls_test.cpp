@@ -18,15 +18,13 @@ TEST(GoldenCalls, AreAnsweredAsOnThePlatformThatRecordedThem) {
     in_new_thread([&] { tally = golden::check(records); });
 
     std::cout << tally.calls << " calls, " << tally.same << " the same, " << tally.factors
-              << " factors; with another pow " << tally.factors_of_other_pow << " factors and "
-              << tally.calls_of_other_pow << " answers" << std::endl;
+              << " factors, " << tally.factors_of_other_pow << " of another pow" << std::endl;
     EXPECT_GE(tally.calls, 100000U);
     EXPECT_GT(tally.same, tally.calls / 5);
     EXPECT_LT(tally.same, tally.calls / 5 * 4);
     EXPECT_EQ(tally.pairs_of_types, 144U);
     // Of a million random fractions one libm differed from another in less than a thousand.
     EXPECT_LE(tally.factors_of_other_pow, tally.factors / 200);
-    EXPECT_LE(tally.calls_of_other_pow, tally.factors_of_other_pow);
 }
 
 TEST(GoldenCalls, AreReadAsTheyAreRecorded) {

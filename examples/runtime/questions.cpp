@@ -1,5 +1,6 @@
 // The questions of both programs, with their answers. The threads ask about numbers so close to the
-// limits of their tolerances that the factor of one thread would change the answers of another.
+// limits of their tolerances that the factor of one thread would change the answers of another; but
+// for the first, whose tolerance of zero needs none.
 
 #include "questions.h"
 

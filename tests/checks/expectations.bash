@@ -1,23 +1,16 @@
 #!/usr/bin/env bash
-# What the checks of built files share; they source it.
+# What the checks share that are scripts; they source it.
 
-failures=0
 fail() {
-    echo "FAILED: $*"
-    failures=$((failures + 1))
+    echo "FAILED: $*" >&2
+    exit 1
 }
 
 # expect_same WHAT EXPECTED FOUND
 expect_same() {
-    if [[ $2 != "$3" ]]; then
-        fail "$1"
-        diff <(echo "$2") <(echo "$3") || true
-    fi
-}
-
-# conclude MESSAGE: prints it and succeeds when nothing has failed.
-conclude() {
-    ((failures == 0)) && echo "$1"
+    [[ $2 == "$3" ]] && return
+    diff <(echo "$2") <(echo "$3") || true
+    fail "$1"
 }
 
 # Of the names on standard input, those that neither the module nor a compiler may call.

@@ -29,14 +29,14 @@ struct Tally {
     std::uint64_t same = 0;
     std::uint64_t pairs_of_types = 0;
 
-    // The factor of a fractional tolerance is made with the C library's pow, and two libraries may
-    // differ in its last place. Such factors, and the calls that such a factor made differ:
+    // Factors that differ in their last place alone, as those of fractional tolerances may: they
+    // are made with the C library's pow.
     std::uint64_t factors_of_other_pow = 0;
-    std::uint64_t calls_of_other_pow = 0;
 };
 
-// Makes the recorded calls again, and fails the test where an answer or a factor is not the
-// recorded one. Must run in a thread that has not compared reals.
+// Makes the recorded calls again, and fails the test where an answer is not the recorded one, or a
+// factor differs from it otherwise than by another pow. Must run in a thread that has not compared
+// reals.
 Tally check(std::istream& records);
 
 } // namespace golden

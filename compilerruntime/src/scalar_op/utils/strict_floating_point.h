@@ -1,4 +1,5 @@
-// Stops a build in which floating-point arithmetic does not mean what is written.
+// Stops a build in which floating-point arithmetic does not mean what is written, and keeps NEON
+// from taking part where it does not.
 //
 // The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width. A
 // compiler that may assume that there are no NaNs, reassociate, take reciprocals or keep excess
@@ -21,18 +22,27 @@
         "array comparison needs arithmetic without excess precision (FLT_EVAL_METHOD 0): on x86 build with -msse2 -mfpmath=sse"
 #endif
 
-// Between these two, functions compare singles as IEEE says on 32-bit ARM too.
+// Between NESK_STRICT_SINGLES_BEGIN and its end, functions compare singles as IEEE says on 32-bit
+// ARM too.
 //
 // There NEON takes subnormal numbers for zero. GCC leaves floating point to VFP for that reason,
 // whereas Clang vectorises loops of comparisons, in whose answers 1e-40 is then the same as 0. So
-// these functions are compiled without NEON, and are not inlined where it is on: LLVM inlines a
-// function only where all features that are not in a list of its own agree, and this way to hand
-// out VFP registers, which changes no result, is not in the list and on by default for no Linux
-// target.
-#if defined(__clang__) && defined(__arm__) && defined(__ARM_NEON)
+// these functions are compiled without NEON, and are not inlined into code that has it: LLVM
+// inlines a function only where all features outside a list of its own agree with the caller's. One
+// that is not in the list, and changes no result, is how registers of VFP are handed out; it is the
+// other way round here than by default, which is on for one processor alone. The same goes without
+// NEON, as other files of a program that is optimised when it is linked may have it. Only a caller
+// marked
+// [[gnu::flatten]] takes these functions in all the same.
+#if defined(__clang__) && defined(__arm__)
 // clang-format off
-#    define NESK_STRICT_SINGLES_BEGIN \
-        _Pragma("clang attribute push(__attribute__((target(\"no-neon,wide-stride-vfp\"))), apply_to = function)")
+#    if defined(__ARM_ARCH_7S__)
+#        define NESK_STRICT_SINGLES_BEGIN \
+            _Pragma("clang attribute push(__attribute__((target(\"no-neon,no-wide-stride-vfp\"))), apply_to = function)")
+#    else
+#        define NESK_STRICT_SINGLES_BEGIN \
+            _Pragma("clang attribute push(__attribute__((target(\"no-neon,wide-stride-vfp\"))), apply_to = function)")
+#    endif
 // clang-format on
 #    define NESK_STRICT_SINGLES_END _Pragma("clang attribute pop")
 #else
