@@ -92,13 +92,13 @@ struct Call {
     int any_type;
     Elements first;
     Elements second;
-
-    int answer() {
-        st_TalDataArray record1 = first.record();
-        st_TalDataArray record2 = second.record();
-        return TalNumericArray_sameQ(tolerance, any_type, &record1, &record2);
-    }
 };
+
+int answer_to(Call& call) {
+    st_TalDataArray record1 = call.first.record();
+    st_TalDataArray record2 = call.second.record();
+    return TalNumericArray_sameQ(call.tolerance, call.any_type, &record1, &record2);
+}
 
 // Whether comparisons of this type ask for the factor of this tolerance.
 template <typename Real>
@@ -195,7 +195,7 @@ class Checker {
         Call call = read_call(line);
         int recorded = -1;
         line >> recorded;
-        const int answer = call.answer();
+        const int answer = answer_to(call);
         ++tally_.calls;
         tally_.same += answer == 1 ? 1U : 0U;
         pairs_.insert({call.first.type_id(), call.second.type_id()});
@@ -222,7 +222,7 @@ void record(std::ostream& records, const std::uint64_t seed, const std::uint64_t
         Call call = random_call(random, tolerance);
         records << "call " << tolerance << ' ' << call.any_type << ' ' << call.first.type_id()
                 << ' ' << call.first.text() << ' ' << call.second.type_id() << ' '
-                << call.second.text() << ' ' << call.answer() << '\n';
+                << call.second.text() << ' ' << answer_to(call) << '\n';
     }
 }
 
