@@ -147,10 +147,12 @@ TEST(RememberedFactor, MakesAPairTheSameThatDiffersInItsLeadingDigit) {
 // A factor that nothing has computed would make these numbers the same: they differ by less than
 // the larger, but by more than a quarter of it.
 TEST(RememberedFactor, IsInANewThreadThatOfNoToleranceThatNeedsOne) {
-    for (double tol = 0.25; tol <= 51; tol += 0.25) {
+    for (int quarters = 1; quarters <= 4 * 51; ++quarters) {
+        const double tol = quarters * 0.25;
         in_new_thread([=] { EXPECT_EQ(compare_impl(tol, 1.0, 1.75), -1) << tol; });
     }
-    for (float tol = 0.25F; tol <= 22; tol += 0.25F) {
+    for (int quarters = 1; quarters <= 4 * 22; ++quarters) {
+        const float tol = static_cast<float>(quarters) * 0.25F;
         in_new_thread([=] { EXPECT_EQ(compare_impl(tol, 1.0F, 1.75F), -1) << tol; });
     }
 }
