@@ -29,11 +29,10 @@
 // whereas Clang vectorises loops of comparisons, in whose answers 1e-40 is then the same as 0. So
 // these functions are compiled without NEON, and are not inlined into code that has it: LLVM
 // inlines a function only where all features outside a list of its own agree with the caller's. One
-// that is not in the list, and changes no result, is how registers of VFP are handed out; it is the
-// other way round here than by default, which is on for one processor alone. The same goes without
-// NEON, as other files of a program that is optimised when it is linked may have it. Only a caller
-// marked
-// [[gnu::flatten]] takes these functions in all the same.
+// that is not in the list, and changes no result, says how registers of VFP are handed out; here it
+// is set against the default, which is off but for one processor. The same goes for files compiled
+// without NEON, as a program that is optimised when it is linked may have others with it. Only a
+// caller marked [[gnu::flatten]] takes these functions in all the same.
 #if defined(__clang__) && defined(__arm__)
 // clang-format off
 #    if defined(__ARM_ARCH_7S__)
