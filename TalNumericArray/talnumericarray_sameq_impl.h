@@ -8,9 +8,11 @@
 
 #include "taldata_array.h"
 #include "taldata_array_element_types.h"
+#include "talnumericarray_instruction_sets.h"
 #include "talnumericarray_sameq_elements.h"
 #include "type_properties.h"
 
+#include <algorithm>
 #include <cstddef>
 #include <cstring>
 #include <type_traits>
@@ -26,15 +28,46 @@ inline bool compared_as_bytes(const talreal& tol) noexcept {
     return std::is_integral_v<T> || tol == 0.0;
 }
 
-// The elements in order, up to the first pair that is not the same. A count below 1 is no elements.
+// The elements one by one, in order, up to the first pair that is not the same. A count below 1 is
+// no elements.
 template <typename T1, typename T2>
-inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
-                          const talint len) noexcept {
+inline bool each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                       const talint len) noexcept {
     for (talint i = 0; i < len; ++i) {
         if (!sameQ_test(tol, data1[i], data2[i])) {
-            return 0;
+            return false;
         }
     }
+    return true;
+}
+
+// The same answer, and the same factor remembered after it, with the element test asked only where
+// blocks are not certainly the same.
+//
+// A stretch of elements is judged, then blocks are passed over up to one that is in doubt. The
+// first stretch is one pair, which may put the factor in the cache. As long as no block can be
+// passed the stretches grow, so that asking in vain costs next to nothing.
+template <typename Sets, typename T1, typename T2>
+inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                          const talint len) noexcept {
+    constexpr talint block = static_cast<talint>(block_length<T1, T2>);
+    constexpr talint longest_stretch = 64 * block;
+    talint i = 0;
+    talint stretch = Sets::size == 0 || len <= block ? len : 1;
+    do {
+        const talint judged = std::min(stretch, len - i);
+        if (!each_sameQ(tol, data1 + i, data2 + i, judged)) {
+            return 0;
+        }
+        i += judged;
+        if (i >= len) {
+            break;
+        }
+        const talint passed = static_cast<talint>(
+            passed_over<Sets>(tol, data1 + i, data2 + i, static_cast<std::size_t>(len - i)));
+        i += passed;
+        stretch = passed > 0 ? block : std::clamp(2 * stretch, block, longest_stretch);
+    } while (i < len);
     return 1;
 }
 
@@ -66,7 +99,8 @@ inline int TalNumericArray_sameQ_impl(const talreal& tol, TalNumericArray na1,
             return std::memcmp(data1, data2, bytes) == 0 ? 1 : 0;
         }
     }
-    return talnumericarray::elements_sameQ(tol, data1, data2, len);
+    return talnumericarray::elements_sameQ<talnumericarray::instruction_sets>(tol, data1, data2,
+                                                                              len);
 }
 
 // The row: selects the pair routine by the type of `na2`.

@@ -67,6 +67,25 @@ inline int compare_impl(const T1& arg1, const T2& arg2) noexcept {
 
 // ---- Reals: the tolerant comparison.
 
+// A tolerance and its factor 2^(lasttol - bits).
+template <typename T>
+struct remembered_factor {
+    T lasttol;
+    T tolfactor;
+};
+
+// The last factor that was needed. All elements of an array are compared under one tolerance, so
+// one remembered factor keeps pow and ldexp out of the element loops. The initial pair is a true
+// one (2^0 is 1) that the comparison never looks up, as it answers for tolerances of `bits` or more
+// before. Each thread remembers its own: nothing is shared, nothing is locked.
+template <typename T>
+inline remembered_factor<T>& factor_cache() noexcept {
+    // Initial-exec: in a shared object the general model would allocate on a thread's first use.
+    [[gnu::tls_model("initial-exec")]] static thread_local remembered_factor<T> cache{
+        std::numeric_limits<T>::digits, 1};
+    return cache;
+}
+
 // Returns 0 when `x` and `y` are the same under `tol`, else +1 when `x` is the greater and -1 when
 // `y` is. A NaN is ordered as the steps happen to leave it, to either side.
 //
@@ -114,15 +133,7 @@ inline int compare_impl(const T& tol, const T& x, const T y) noexcept {
         return s;
     }
 
-    // All elements of an array are compared under one tolerance, so one remembered factor keeps pow
-    // and ldexp out of the element loops. The initial pair is a true one (2^0 is 1) that is never
-    // looked up, as tolerances of `bits` or more have been answered above. Each thread remembers
-    // its own: nothing is shared, nothing is locked.
-    //
-    // Initial-exec: in a shared object the general model would allocate on a thread's first use.
-    [[gnu::tls_model("initial-exec")]] static thread_local T lasttol = bits;
-    [[gnu::tls_model("initial-exec")]] static thread_local T tolfactor = 1;
-
+    auto& [lasttol, tolfactor] = factor_cache<T>();
     if (tol != lasttol) {
         // A pair that differs in its leading binary digit needs no factor. For tolerances up to
         // `bits` - 1 the factor is at most 1/2 and this changes no answer; above, it is part of the
