@@ -15,18 +15,6 @@
 
 namespace talnumericarray {
 
-#if defined(__clang__)
-inline constexpr bool compiled_by_gcc = false;
-#else
-inline constexpr bool compiled_by_gcc = true;
-#endif
-
-#if defined(__arm__)
-inline constexpr bool vectors_have_reals = false;
-#else
-inline constexpr bool vectors_have_reals = true;
-#endif
-
 // ---- The sets
 //
 // Each has one function, which is `leading_certainly_same` compiled for it. What that calls is
@@ -39,19 +27,23 @@ struct baseline {
 
     static bool supported() noexcept { return true; }
 
-    // NEON on 32-bit ARM takes subnormal singles for zero and knows no doubles. GCC makes slow work
-    // of testing the lanes of two doubles for equality.
+    // NEON on 32-bit ARM takes subnormal singles for zero and knows no doubles; on 64-bit ARM it
+    // does not convert 64-bit integers to singles. SSE2 converts no 64-bit integers at all, and GCC
+    // is slow at testing a vector of two doubles.
     template <typename Bound, typename T1, typename T2>
     static constexpr bool pays() noexcept {
-        constexpr bool integers = std::is_integral_v<comparison_t<T1, T2>>;
-        constexpr bool slow_lanes =
-            compiled_by_gcc
-            && std::is_same_v<
-                Bound,
-                equality> && std::is_same_v<comparison_t<T1, T2>, double> && !std::is_same_v<T1, T2>;
-        constexpr bool slow_conversion =
-            compiled_by_gcc && std::is_same_v<Bound, equality> && sizeof(T1) == 8;
-        return integers || (vectors_have_reals && !slow_lanes && !slow_conversion);
+        [[maybe_unused]] constexpr bool integers = std::is_integral_v<comparison_t<T1, T2>>;
+        [[maybe_unused]] constexpr bool singles = std::is_same_v<comparison_t<T1, T2>, float>;
+        [[maybe_unused]] constexpr bool near = !std::is_same_v<Bound, equality>;
+#if defined(__arm__)
+        return integers;
+#elif defined(__aarch64__)
+        return integers || near || !singles || sizeof(T1) < 8;
+#elif defined(__SSE2__) && !defined(__clang__)
+        return integers || near || std::is_same_v<T1, T2> || (singles && sizeof(T1) < 8);
+#else
+        return true;
+#endif
     }
 
     template <typename Bound, typename T1, typename T2>
@@ -69,12 +61,16 @@ struct avx2 {
 
     static bool supported() noexcept { return __builtin_cpu_supports("avx2") != 0; }
 
-    // There are no instructions that convert 64-bit integers to reals.
+    // There is no instruction that converts 64-bit integers, and GCC does so one at a time.
     template <typename Bound, typename T1, typename T2>
     static constexpr bool pays() noexcept {
+#    if defined(__clang__)
+        return true;
+#    else
         constexpr bool converts = std::is_integral_v<T1> && sizeof(T1) == 8
                                   && std::is_floating_point_v<comparison_t<T1, T2>>;
-        return !(compiled_by_gcc && std::is_same_v<Bound, equality> && converts);
+        return !converts || !std::is_same_v<Bound, equality>;
+#    endif
     }
 
     template <typename Bound, typename T1, typename T2>
@@ -130,6 +126,20 @@ using instruction_sets = type_list<>;
 
 // ---- The choice
 
+// Whether a block test of any of the sets is ever faster than the element test.
+template <typename T1, typename T2, typename... Sets>
+constexpr bool blocks_pay(type_list<Sets...> /*sets*/) noexcept {
+    if constexpr ((element_type_id<T1>) > element_type_id<T2>) {
+        return blocks_pay<T2, T1>(type_list<Sets...>{});
+    } else if constexpr (is_complex_v<T1>) {
+        return blocks_pay<to_real_type_t<T1>, to_real_type_t<T2>>(type_list<Sets...>{});
+    } else {
+        return (...
+                || (Sets::template pays<equality, T1, T2>()
+                    || Sets::template pays<nearness<comparison_t<T1, T2>>, T1, T2>()));
+    }
+}
+
 // `leading_certainly_same` by the best set that the processor has; 0 where it does not pay.
 template <typename... Sets, typename Bound, typename T1, typename T2>
 inline std::size_t by_best_set(type_list<Sets...> /*sets*/, const Bound bound, const T1* data1,
@@ -146,6 +156,20 @@ inline std::size_t by_best_set(type_list<Sets...> /*sets*/, const Bound bound, c
     return passed;
 }
 
+// By what is known of the tolerance at this moment. For a pair of types in the order of the list.
+template <typename Sets, typename T1, typename T2>
+[[gnu::noinline]] std::size_t by_known_bound(const talreal& tol, const T1* data1, const T2* data2,
+                                             const std::size_t len) noexcept {
+    using T = comparison_t<T1, T2>;
+    if constexpr (std::is_floating_point_v<T>) {
+        const T divisor = certain_divisor(static_cast<T>(tol));
+        if (divisor != 0) {
+            return by_best_set(Sets{}, nearness<T>{divisor}, data1, data2, len);
+        }
+    }
+    return by_best_set(Sets{}, equality{}, data1, data2, len);
+}
+
 // The number of leading elements of two arrays of `len` that can be passed over as the same.
 //
 // Being certainly the same is symmetric, so that a pair of types and its reverse share a loop; and
@@ -153,19 +177,14 @@ inline std::size_t by_best_set(type_list<Sets...> /*sets*/, const Bound bound, c
 template <typename Sets, typename T1, typename T2>
 inline std::size_t passed_over(const talreal& tol, const T1* data1, const T2* data2,
                                const std::size_t len) noexcept {
-    using T = comparison_t<T1, T2>;
     if constexpr (is_complex_v<T1> && is_complex_v<T2>) {
         return passed_over<Sets>(tol, reinterpret_cast<const to_real_type_t<T1>*>(data1),
                                  reinterpret_cast<const to_real_type_t<T2>*>(data2), 2 * len)
                / 2;
-    } else if constexpr ((element_type_id<T1> > element_type_id<T2>)) {
-        return passed_over<Sets>(tol, data2, data1, len);
-    } else if constexpr (std::is_integral_v<T>) {
-        return by_best_set(Sets{}, equality{}, data1, data2, len);
+    } else if constexpr ((element_type_id<T1>) > element_type_id<T2>) {
+        return by_known_bound<Sets>(tol, data2, data1, len);
     } else {
-        const T divisor = certain_divisor(static_cast<T>(tol));
-        return divisor == 0 ? by_best_set(Sets{}, equality{}, data1, data2, len)
-                            : by_best_set(Sets{}, nearness<T>{divisor}, data1, data2, len);
+        return by_known_bound<Sets>(tol, data1, data2, len);
     }
 }
 

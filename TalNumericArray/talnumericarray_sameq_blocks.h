@@ -136,7 +136,7 @@ template <typename T1, typename T2, std::enable_if_t<compared_as_reals_v<T1, T2>
     using D = doubt_t<T1, T2>;
     const T x = static_cast<T>(x_);
     const T y = static_cast<T>(y_);
-    const T magnitude_x = std::fabs(x);
+    const T magnitude_x = std::is_unsigned_v<T1> ? x : std::fabs(x);
     const T magnitude_y = std::fabs(y);
     // The least number above zero in the place of zero: two zeros are near, and nothing else is
     // nearer to a zero than that. It saves a test for equality, which only two infinities miss.

@@ -31,44 +31,52 @@ inline bool compared_as_bytes(const talreal& tol) noexcept {
 // The elements one by one, in order, up to the first pair that is not the same. A count below 1 is
 // no elements.
 template <typename T1, typename T2>
-inline bool each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
-                       const talint len) noexcept {
+[[gnu::noinline]] int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                                 const talint len) noexcept {
     for (talint i = 0; i < len; ++i) {
         if (!sameQ_test(tol, data1[i], data2[i])) {
-            return false;
-        }
-    }
-    return true;
-}
-
-// The same answer, and the same factor remembered after it, with the element test asked only where
-// blocks are not certainly the same.
-//
-// A stretch of elements is judged, then blocks are passed over up to one that is in doubt. The
-// first stretch is one pair, which may put the factor in the cache. As long as no block can be
-// passed the stretches grow, so that asking in vain costs next to nothing.
-template <typename Sets, typename T1, typename T2>
-inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
-                          const talint len) noexcept {
-    constexpr talint block = static_cast<talint>(block_length<T1, T2>);
-    constexpr talint longest_stretch = 64 * block;
-    talint i = 0;
-    talint stretch = Sets::size == 0 || len <= block ? len : 1;
-    do {
-        const talint judged = std::min(stretch, len - i);
-        if (!each_sameQ(tol, data1 + i, data2 + i, judged)) {
             return 0;
         }
-        i += judged;
-        if (i >= len) {
-            break;
-        }
+    }
+    return 1;
+}
+
+// The same answer for arrays whose first pair is the same, and the same factor remembered after it.
+//
+// Blocks that are certainly the same are passed over up to one that is in doubt, from which on a
+// stretch of elements is judged. As long as no block can be passed the stretches grow, so that
+// asking in vain costs next to nothing.
+template <typename Sets, typename T1, typename T2>
+[[gnu::noinline]] int rest_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                                 const talint len) noexcept {
+    constexpr talint block = static_cast<talint>(block_length<T1, T2>);
+    talint stretch = block;
+    for (talint i = 1; i < len;) {
         const talint passed = static_cast<talint>(
             passed_over<Sets>(tol, data1 + i, data2 + i, static_cast<std::size_t>(len - i)));
         i += passed;
-        stretch = passed > 0 ? block : std::clamp(2 * stretch, block, longest_stretch);
-    } while (i < len);
+        stretch = passed > 0 ? block : std::min(2 * stretch, 64 * block);
+        const talint judged = std::min(stretch, len - i);
+        if (each_sameQ(tol, data1 + i, data2 + i, judged) == 0) {
+            return 0;
+        }
+        i += judged;
+    }
     return 1;
+}
+
+// The elements of both arrays, with blocks passed over if there are as many. The first pair is
+// judged before: it is where most different arrays differ, and it may put the factor in the cache.
+template <typename Sets, typename T1, typename T2>
+inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                          const talint len) noexcept {
+    if constexpr (blocks_pay<T1, T2>(Sets{})) {
+        if (len > static_cast<talint>(block_length<T1, T2>)) {
+            return sameQ_test(tol, data1[0], data2[0]) ? rest_sameQ<Sets>(tol, data1, data2, len)
+                                                       : 0;
+        }
+    }
+    return each_sameQ(tol, data1, data2, len);
 }
 
 // Calls `routine` with the tag of the element type that `id` names and returns its answer; 0 for an

@@ -10,6 +10,13 @@
 #include <limits>
 #include <type_traits>
 
+// Expanded into each element loop the comparison is fast; Clang would do so for small code as well.
+#if defined(__OPTIMIZE_SIZE__)
+#    define NESK_EXPANDED [[gnu::noinline]] inline
+#else
+#    define NESK_EXPANDED inline
+#endif
+
 #pragma GCC visibility push(hidden)
 NESK_STRICT_SINGLES_BEGIN
 
@@ -93,7 +100,7 @@ inline remembered_factor<T>& factor_cache() noexcept {
 // larger magnitude. No tolerance makes zero the same as another number, nor a number the same as
 // one of the other sign.
 template <typename T, std::enable_if_t<std::is_floating_point_v<T>, int> = 0>
-inline int compare_impl(const T& tol, const T& x, const T y) noexcept {
+NESK_EXPANDED int compare_impl(const T& tol, const T& x, const T y) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
 
     if (x == y) {
@@ -184,5 +191,6 @@ inline int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept 
 
 NESK_STRICT_SINGLES_END
 #pragma GCC visibility pop
+#undef NESK_EXPANDED
 
 #endif
