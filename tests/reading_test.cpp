@@ -8,22 +8,30 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <cstddef>
+#include <iterator>
+#include <set>
+#include <vector>
+
 namespace {
 
 // Tolerances that compare elements in every way there is.
 constexpr double tolerances[] = {0.0, -1.0, 10.0, 10.5, 53.0};
 
-// Room for the longest arrays below, of 134 elements, of the widest type.
-constexpr std::size_t longest_bytes = 4096;
+constexpr std::size_t page = 4096;
+constexpr std::size_t longest_block = 128;
 
-// `count` threes that end where the memory does.
-unsigned char* threes_before_end(const ProtectedMemory& memory, const ElementType& type,
-                                 const std::size_t count) {
-    auto* const data = static_cast<unsigned char*>(memory.before_end(count * type.size));
+// `count` elements of one value that end `phase` bytes in front of the end of the memory. Returns
+// the end of the last one.
+unsigned char* fill_before_end(const ProtectedMemory& memory, const std::size_t phase,
+                               const ElementType& type, const std::size_t count,
+                               const double value) {
+    auto* const data = static_cast<unsigned char*>(memory.before_end(phase + count * type.size));
     for (std::size_t i = 0; i < count; ++i) {
-        type.store(data + i * type.size, 3);
+        type.store(data + i * type.size, value);
     }
-    return data;
+    return data + count * type.size;
 }
 
 st_TalDataArray record_of(const ElementType& type, void* data, talint* dimensions) {
@@ -36,19 +44,105 @@ st_TalDataArray record_of(const ElementType& type, void* data, talint* dimension
     return record;
 }
 
-TEST(Reading, EndsWithTheArrays) {
-    constexpr talint longest = 70;
-    const ProtectedMemory memory1(longest_bytes);
-    const ProtectedMemory memory2(longest_bytes);
-    for_each_pair([&](const ElementType& type1, const ElementType& type2) {
-        for (talint count = 1; count <= longest; ++count) {
-            const auto size = static_cast<std::size_t>(count);
-            auto record1 = record_of(type1, threes_before_end(memory1, type1, size), &count);
-            auto record2 = record_of(type2, threes_before_end(memory2, type2, size), &count);
-            for (const double tol : tolerances) {
-                EXPECT_EQ(TalNumericArray_sameQ(tol, 1, &record1, &record2), 1) << count;
+// ---- Arrays of one value each
+
+struct Filling {
+    double value1, value2;
+    std::vector<double> same_under;
+};
+
+// Threes, and threes beside numbers that are near three.
+std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2) {
+    if (type1.is_integer && type2.is_integer) {
+        return {{3, 3, {0.0, 10.0}}};
+    }
+    const auto is_double = [](const ElementType& type) {
+        return !type.is_integer && type.part_size == sizeof(double);
+    };
+    const bool doubles = is_double(type1) || is_double(type2);
+    const double near_three = doubles ? 3 + 0x1p-44 : 3 + 0x1p-15;
+    const bool second_holds_it = doubles ? is_double(type2) : !type2.is_integer;
+    return {{3, 3, {std::begin(tolerances), std::end(tolerances)}},
+            {second_holds_it ? 3 : near_three, second_holds_it ? near_three : 3, {10, 10.5, 53}}};
+}
+
+// How far behind its last element an array's page may end: one of complex numbers need only be
+// aligned as its parts are, so that an element may lie in two pages.
+std::vector<std::size_t> phases(const ElementType& type) {
+    return type.size == type.part_size ? std::vector<std::size_t>{0}
+                                       : std::vector<std::size_t>{0, type.part_size};
+}
+
+// All up to behind two blocks, those around the ends of two pages, and some between.
+std::vector<std::size_t> positions(const ElementType& type1, const ElementType& type2) {
+    std::set<std::size_t> chosen;
+    const auto choose = [&chosen](const std::size_t first, const std::size_t last,
+                                  const std::size_t step) {
+        for (std::size_t position = first; position <= last; position += step) {
+            chosen.insert(position);
+        }
+    };
+    choose(0, 2 * longest_block + 2, 1);
+    choose(0, 2 * page / std::min(type1.size, type2.size), 97);
+    for (const ElementType& type : {type1, type2}) {
+        for (const std::size_t edge : {page / type.size, 2 * page / type.size}) {
+            choose(edge - 2, edge + 2, 1);
+        }
+    }
+    return {chosen.begin(), chosen.end()};
+}
+
+// Room for the longest arrays of the widest type, and for as much behind them.
+class TwoMemories {
+  public:
+    // The ends of the arrays' last elements.
+    struct Ends {
+        unsigned char *end1, *end2;
+    };
+
+    // Calls `check(ends, filling)` for both arrays filled up to the end of readable memory in every
+    // way, with `count` elements and two pages more.
+    template <typename Check>
+    void for_each_filling(const ElementType& type1, const ElementType& type2,
+                          const std::size_t count, const Check& check) const {
+        for (const std::size_t phase1 : phases(type1)) {
+            for (const std::size_t phase2 : phases(type2)) {
+                for (const Filling& filling : fillings(type1, type2)) {
+                    const Ends ends = {
+                        fill_before_end(memory1_, phase1, type1, count + 2 * page / type1.size,
+                                        filling.value1),
+                        fill_before_end(memory2_, phase2, type2, count + 2 * page / type2.size,
+                                        filling.value2)};
+                    check(ends, filling);
+                }
             }
         }
+    }
+
+  private:
+    static constexpr std::size_t widest = 16;
+    static constexpr std::size_t bytes = (2 * page + 3) * widest + 3 * page;
+
+    ProtectedMemory memory1_{bytes};
+    ProtectedMemory memory2_{bytes};
+};
+
+TEST(Reading, EndsWithTheArrays) {
+    const TwoMemories memories;
+    for_each_pair([&](const ElementType& type1, const ElementType& type2) {
+        const std::vector<std::size_t> counts = positions(type1, type2);
+        const auto check = [&](const TwoMemories::Ends& ends, const Filling& filling) {
+            for (const std::size_t count : counts) {
+                auto length = static_cast<talint>(count);
+                auto record1 = record_of(type1, ends.end1 - count * type1.size, &length);
+                auto record2 = record_of(type2, ends.end2 - count * type2.size, &length);
+                for (const double tol : filling.same_under) {
+                    EXPECT_EQ(TalNumericArray_sameQ(tol, 1, &record1, &record2), 1)
+                        << count << " elements, tolerance " << tol;
+                }
+            }
+        };
+        memories.for_each_filling(type1, type2, counts.back(), check);
     });
 }
 
@@ -57,39 +151,58 @@ struct Behind {
     std::size_t elements1, elements2;
 };
 
+// All but the last few end in one of the arrays within the page in which that pair is. In the
+// course of the runs it gets to every place in a page.
+std::vector<Behind> behind(const ElementType& type1, const ElementType& type2,
+                           const std::size_t run) {
+    const std::size_t in_page1 = page / type1.size;
+    const std::size_t in_page2 = page / type2.size;
+    const std::size_t some1 = run * 5 % in_page1;
+    const std::size_t some2 = (run * 11 + run / 64) % in_page2;
+    const std::size_t more1 = in_page1 + some1;
+    const std::size_t more2 = in_page2 + some2;
+    return {{0, 0}, {0, more2}, {more1, 0}, {some1, some2}, {some1, more2}, {more1, some2}};
+}
+
 // The arrays go on behind the readable memory.
-void expect_to_stop_at(const talint position, const ElementType& type1, const ElementType& type2,
-                       const ProtectedMemory& memory1, const ProtectedMemory& memory2) {
-    const auto index = static_cast<std::size_t>(position);
-    for (const Behind& behind : {Behind{0, 0}, Behind{64, 0}, Behind{0, 64}}) {
-        auto* const data1 = threes_before_end(memory1, type1, index + 1 + behind.elements1);
-        auto* const data2 = threes_before_end(memory2, type2, index + 1 + behind.elements2);
-        type1.store(data1 + index * type1.size, 0);
-        talint count = position + 100;
-        auto record1 = record_of(type1, data1, &count);
-        auto record2 = record_of(type2, data2, &count);
-        for (const double tol : tolerances) {
-            if (type1.id == type2.id && tol == 0.0) {
-                continue; // compared as bytes, of which memcmp may read all
-            }
-            EXPECT_EQ(TalNumericArray_sameQ(tol, 1, &record1, &record2), 0)
-                << "position " << position << ", tolerance " << tol;
+void expect_to_stop_at(const std::size_t position, const ElementType& type1,
+                       const ElementType& type2, const TwoMemories::Ends& ends,
+                       const Filling& filling, const Behind& readable) {
+    unsigned char* const last1 = ends.end1 - (readable.elements1 + 1) * type1.size;
+    unsigned char* const last2 = ends.end2 - (readable.elements2 + 1) * type2.size;
+    auto count = static_cast<talint>(position + 4 * page);
+    auto record1 = record_of(type1, last1 - position * type1.size, &count);
+    auto record2 = record_of(type2, last2 - position * type2.size, &count);
+    type1.store(last1, 0);
+    for (const double tol : filling.same_under) {
+        if (type1.id == type2.id && tol == 0.0) {
+            continue; // compared as bytes, of which memcmp may read all
         }
+        EXPECT_EQ(TalNumericArray_sameQ(tol, 1, &record1, &record2), 0)
+            << "position " << position << ", tolerance " << tol << ", behind it "
+            << readable.elements1 << " and " << readable.elements2;
     }
+    type1.store(last1, filling.value1);
 }
 
 TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
-    constexpr talint positions = 70;
-    const ProtectedMemory memory1(longest_bytes);
-    const ProtectedMemory memory2(longest_bytes);
+    const TwoMemories memories;
     int pairs_with_a_loop = 0;
+    std::size_t runs = 0;
     for_each_pair([&](const ElementType& type1, const ElementType& type2) {
         if (type1.id == type2.id && type1.is_integer) {
             return; // compared as bytes under every tolerance
         }
-        for (talint position = 0; position < positions; ++position) {
-            expect_to_stop_at(position, type1, type2, memory1, memory2);
-        }
+        const std::vector<std::size_t> places = positions(type1, type2);
+        const auto check = [&](const TwoMemories::Ends& ends, const Filling& filling) {
+            for (const std::size_t position : places) {
+                for (const Behind& readable : behind(type1, type2, runs)) {
+                    expect_to_stop_at(position, type1, type2, ends, filling, readable);
+                }
+                ++runs;
+            }
+        };
+        memories.for_each_filling(type1, type2, places.back(), check);
         ++pairs_with_a_loop;
     });
     EXPECT_EQ(pairs_with_a_loop, 136);
@@ -99,11 +212,11 @@ TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
 TEST(Reading, WritesNothing) {
     constexpr talint count = 40;
     for_each_pair([&](const ElementType& type1, const ElementType& type2) {
-        const ProtectedMemory records_memory(longest_bytes);
-        const ProtectedMemory memory1(longest_bytes);
-        const ProtectedMemory memory2(longest_bytes);
-        auto* const data1 = threes_before_end(memory1, type1, count);
-        auto* const data2 = threes_before_end(memory2, type2, count);
+        const ProtectedMemory records_memory(page);
+        const ProtectedMemory memory1(page);
+        const ProtectedMemory memory2(page);
+        auto* const data1 = fill_before_end(memory1, 0, type1, count, 3) - count * type1.size;
+        auto* const data2 = fill_before_end(memory2, 0, type2, count, 3) - count * type2.size;
         type2.store(data2 + (count - 1) * type2.size, 0);
         auto* const records = static_cast<st_TalDataArray*>(records_memory.before_end(2048));
         auto* const dimensions = static_cast<talint*>(records_memory.before_end(1024));

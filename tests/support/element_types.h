@@ -20,11 +20,11 @@ struct ElementType {
     std::size_t size;      // bytes
     std::size_t part_size; // bytes of a real or imaginary part; those of the element without parts
     bool is_integer;
-    void (*store)(void* element, int value);
+    void (*store)(void* element, double value); // an integer holds no fraction
 };
 
 template <typename T>
-void store_element(void* element, const int value) {
+void store_element(void* element, const double value) {
     const T stored = static_cast<to_real_type_t<T>>(value);
     std::memcpy(element, &stored, sizeof stored);
 }
