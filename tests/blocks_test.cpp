@@ -1,0 +1,772 @@
+// The loops that pass over blocks, of every instruction set that the build has and the processor
+// supports, against the element test: the same answers, and the same factor remembered after them.
+
+#include "talnumericarray_sameq_impl.h"
+
+#include "support/checked_calls.h"
+#include "support/element_types.h"
+#include "support/hard_pairs.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cfenv>
+#include <cmath>
+#include <cstring>
+#include <iostream>
+#include <limits>
+#include <string>
+#include <vector>
+
+namespace {
+
+using talnumericarray::instruction_sets;
+
+constexpr double infinity = std::numeric_limits<double>::infinity();
+constexpr double nan = std::numeric_limits<double>::quiet_NaN();
+
+// ---- The instruction sets
+
+struct SetOfBuild {
+    std::string name;
+    bool supported;
+};
+
+template <typename... Sets>
+std::vector<SetOfBuild> sets_in(type_list<Sets...> /*sets*/) {
+    return {SetOfBuild{Sets::name, Sets::supported()}...};
+}
+
+TEST(InstructionSets, StandBestFirstAndOneIsSupported) {
+    const char* const best_first[] = {"AVX-512", "AVX2", "baseline"};
+    const auto* expected = std::begin(best_first);
+    int supported = 0;
+    for (const SetOfBuild& set : sets_in(instruction_sets{})) {
+        std::cout << "block tests for " << set.name << ": "
+                  << (set.supported ? "tested here" : "NOT TESTED, not supported here")
+                  << std::endl;
+        RecordProperty(set.name, set.supported ? "tested" : "NOT TESTED");
+        expected = std::find(expected, std::end(best_first), set.name);
+        ASSERT_NE(expected, std::end(best_first)) << set.name << " is not expected here";
+        ++expected;
+        supported += set.supported ? 1 : 0;
+    }
+    EXPECT_TRUE(supported > 0 || instruction_sets::size == 0);
+}
+
+// Skipped where it is not so, which CTest reports after all tests.
+TEST(InstructionSets, AreAllTested) {
+    std::string untested = instruction_sets::size == 0 ? " any block test, as there is none" : "";
+    for (const SetOfBuild& set : sets_in(instruction_sets{})) {
+        untested += set.supported ? "" : " " + set.name;
+    }
+    if (!untested.empty()) {
+        GTEST_SKIP() << "NOT TESTED:" << untested;
+    }
+}
+
+// ---- What a thread remembers
+
+struct Remembered {
+    nesk::detail::remembered_factor<float> of_singles;
+    nesk::detail::remembered_factor<double> of_doubles;
+};
+
+Remembered remembered() {
+    return {nesk::detail::factor_cache<float>(), nesk::detail::factor_cache<double>()};
+}
+
+void remember(const Remembered& factors) {
+    nesk::detail::factor_cache<float>() = factors.of_singles;
+    nesk::detail::factor_cache<double>() = factors.of_doubles;
+}
+
+template <typename T>
+nesk::detail::remembered_factor<T> factor_of(const double tol) {
+    constexpr int bits = std::numeric_limits<T>::digits;
+    const T rounded = static_cast<T>(tol);
+    return rounded > 0 && rounded < bits
+               ? nesk::detail::remembered_factor<T>{rounded, nesk::ToleranceShiftFactor(rounded)}
+               : nesk::detail::remembered_factor<T>{bits, 1};
+}
+
+Remembered factors_of(const double tol) {
+    return {factor_of<float>(tol), factor_of<double>(tol)};
+}
+
+template <typename T>
+bool same_factor(const nesk::detail::remembered_factor<T>& factor1,
+                 const nesk::detail::remembered_factor<T>& factor2) {
+    const auto same = [](const T x, const T y) {
+        return x == y || (std::isnan(x) && std::isnan(y));
+    };
+    return same(factor1.lasttol, factor2.lasttol) && same(factor1.tolfactor, factor2.tolfactor);
+}
+
+bool same_factors(const Remembered& factors1, const Remembered& factors2) {
+    return same_factor(factors1.of_singles, factors2.of_singles)
+           && same_factor(factors1.of_doubles, factors2.of_doubles);
+}
+
+// ---- The loops of every ordered pair of element types
+
+using Loop = bool (*)(double tol, const void* data1, const void* data2, talint count);
+
+template <typename T1, typename T2>
+bool element_loop(const double tol, const void* data1, const void* data2, const talint count) {
+    return talnumericarray::each_sameQ(tol, static_cast<const T1*>(data1),
+                                       static_cast<const T2*>(data2), count);
+}
+
+template <typename Set, typename T1, typename T2>
+bool block_loop(const double tol, const void* data1, const void* data2, const talint count) {
+    return talnumericarray::elements_sameQ<type_list<Set>>(tol, static_cast<const T1*>(data1),
+                                                           static_cast<const T2*>(data2), count)
+           == 1;
+}
+
+struct BlockLoop {
+    const char* set;
+    Loop loop;
+};
+
+template <typename T1, typename T2, typename... Sets>
+std::vector<BlockLoop> block_loops(type_list<Sets...> /*sets*/) {
+    std::vector<BlockLoop> loops;
+    (void)(...,
+           (Sets::supported() ? loops.push_back({Sets::name, block_loop<Sets, T1, T2>}) : void()));
+    return loops;
+}
+
+// One side of a pair.
+struct Side {
+    std::size_t size;
+    std::size_t alignment;
+    bool is_complex;
+    bool is_signed;
+    bool has_comparison_type; // its parts need no conversion
+    void (*store)(void* element, double real, double imaginary);
+};
+
+// Integers stand in for what they do not hold.
+template <typename T>
+T part_of(const double value) {
+    if constexpr (std::is_integral_v<T>) {
+        return std::isfinite(value) ? static_cast<T>(static_cast<std::int64_t>(value)) : T{1};
+    } else {
+        return static_cast<T>(value);
+    }
+}
+
+template <typename T>
+void store_parts(void* element, const double real, const double imaginary) {
+    using Part = to_real_type_t<T>;
+    const Part parts[] = {part_of<Part>(real), part_of<Part>(imaginary)};
+    std::memcpy(element, parts, sizeof(T));
+}
+
+template <typename T, typename Comparison>
+constexpr Side side_of() {
+    using Part = to_real_type_t<T>;
+    return {sizeof(T),
+            alignof(T),
+            is_complex_v<T>,
+            std::is_signed_v<Part>,
+            std::is_same_v<Part, Comparison>,
+            store_parts<T>};
+}
+
+struct Pair {
+    std::string name;
+    Side side1, side2;
+    int bits;          // of the reals that are compared; 0 for integers
+    std::size_t block; // elements
+    Loop element_loop;
+    std::vector<BlockLoop> block_loops;
+    void (*draw)(oracle::Random& random, double share, void* element1, void* element2);
+};
+
+template <typename T1, typename T2>
+void append_pair(std::vector<Pair>& pairs) {
+    using T = talnumericarray::comparison_t<T1, T2>;
+    // Two arrays of one integer type are compared as bytes.
+    if constexpr (!(std::is_same_v<T1, T2> && std::is_integral_v<T1>)) {
+        pairs.push_back({"element types " + std::to_string(element_type_id<T1>) + " and "
+                             + std::to_string(element_type_id<T2>),
+                         side_of<T1, T>(), side_of<T2, T>(),
+                         std::is_integral_v<T> ? 0 : std::numeric_limits<T>::digits,
+                         talnumericarray::block_length<T1, T2>, element_loop<T1, T2>,
+                         block_loops<T1, T2>(instruction_sets{}), draw_elements<T1, T2>});
+    }
+}
+
+template <typename T1, typename... Types>
+void append_row(std::vector<Pair>& pairs, type_list<Types...> /*types*/) {
+    (append_pair<T1, Types>(pairs), ...);
+}
+
+template <typename... Types>
+std::vector<Pair> make_pairs(type_list<Types...> types) {
+    std::vector<Pair> pairs;
+    (append_row<Types>(pairs, types), ...);
+    return pairs;
+}
+
+// Calls `check(pair)` for all ordered pairs that have a loop.
+template <typename Check>
+void for_each_pair_with_a_loop(const Check& check) {
+    const std::vector<Pair> pairs = make_pairs(element_type_list{});
+    EXPECT_EQ(pairs.size(), 136U);
+    for (const Pair& pair : pairs) {
+        SCOPED_TRACE(pair.name);
+        check(pair);
+    }
+}
+
+std::vector<double> tolerances_of(const Pair& pair) {
+    if (pair.bits == 0) {
+        return {0.0};
+    }
+    const double bits = pair.bits;
+    return {-1, 0, 1e-46, 0.5, 1, 10, 10.5, bits - 1, bits - 0.5, bits, bits + 10, nan};
+}
+
+// ---- Arrays with one pair of elements that is not like the others
+
+struct Element {
+    double real, imaginary;
+};
+
+struct Planted {
+    const char* name;
+    Element element1, element2;
+};
+
+// A greater number than 7, by the share `share` of it or, if that is nothing, the next one.
+double above_seven(const int bits, const double share) {
+    if (bits == std::numeric_limits<float>::digits) {
+        constexpr float seven = 7;
+        return std::max(std::nextafter(seven, 8.0F), static_cast<float>(7 + 7 * share));
+    }
+    return std::max(std::nextafter(7.0, 8.0), 7 + 7 * share);
+}
+
+// 7 and another number, on the side that can hold it.
+Planted seven_and(const char* name, const Pair& pair, const double other) {
+    return pair.side2.has_comparison_type ? Planted{name, {7, 0}, {other, 0}}
+                                          : Planted{name, {other, 0}, {7, 0}};
+}
+
+// Where there are no reals in between, the pair is one of different integers.
+Planted near_pair(const Pair& pair, const double tol) {
+    const double share = tol > 0 ? std::exp2(std::min<double>(tol, pair.bits) - pair.bits) : 0;
+    return seven_and("near", pair, pair.bits == 0 ? 6 : above_seven(pair.bits, share / 2));
+}
+
+Planted beyond_pair(const Pair& pair, const double tol) {
+    const double share = tol > 0 ? std::exp2(std::min<double>(tol, pair.bits) - pair.bits) : 0;
+    return seven_and("beyond", pair,
+                     pair.bits == 0 ? 8 : above_seven(pair.bits, share * 2 / (1 - share / 2)));
+}
+
+std::vector<Planted> planted_pairs(const Pair& pair, const double tol) {
+    const double least = pair.bits == std::numeric_limits<float>::digits
+                             ? std::numeric_limits<float>::denorm_min()
+                             : std::numeric_limits<double>::denorm_min();
+    return {
+        {"nothing", {7, 0}, {7, 0}},
+        near_pair(pair, tol),
+        beyond_pair(pair, tol),
+        {"a zero", {7, 0}, {0, 0}},
+        {"another zero", {0, 0}, {7, 0}},
+        {"NaNs", {nan, 0}, {nan, 0}},
+        {"a NaN", {nan, 0}, {7, 0}},
+        {"infinities", {infinity, 0}, {infinity, 0}},
+        {"an infinity", {infinity, 0}, {7, 0}},
+        {"zeros of both signs", {0.0, 0}, {-0.0, 0}},
+        {"subnormals", {3 * least, 0}, {4 * least, 0}},
+        {"a subnormal and a zero", {least, 0}, {0, 0}},
+        {"all bits of an integer", {-1, 0}, {-1, 0}},
+        {"imaginary zeros of both signs", {7, -0.0}, {7, 0.0}},
+        {"imaginary subnormals", {7, least}, {7, least}},
+        {"an imaginary subnormal and a zero", {7, least}, {7, 0}},
+    };
+}
+
+constexpr std::size_t page = 4096;
+
+// The elements of one side, which can be copied to any place in a page.
+class Elements {
+  public:
+    Elements(const Side& side, const std::size_t longest)
+        : side_(side), elements_(longest * side.size), memory_(2 * page + longest * side.size) {}
+
+    void set(const std::size_t index, const Element& element) {
+        side_.store(elements_.data() + index * side_.size, element.real, element.imaginary);
+    }
+
+    // The first `count` elements in the `place`-th place of a page, `planted` being among them.
+    void* placed(const std::size_t place, const std::size_t count, const std::size_t index,
+                 const Element& planted) {
+        const auto to_page = (page - reinterpret_cast<std::uintptr_t>(memory_.data()) % page);
+        unsigned char* const data = memory_.data() + to_page + place * side_.alignment % page;
+        std::memcpy(data, elements_.data(), count * side_.size);
+        if (index < count) {
+            side_.store(data + index * side_.size, planted.real, planted.imaginary);
+        }
+        return data;
+    }
+
+  private:
+    Side side_;
+    std::vector<unsigned char> elements_;
+    std::vector<unsigned char> memory_;
+};
+
+// Whether all block loops of the pair answer and remember as the element loop does.
+bool as_element_loop(const Pair& pair, const Remembered& before, const double tol,
+                     const void* data1, const void* data2, const std::size_t count) {
+    const auto length = static_cast<talint>(count);
+    remember(before);
+    const bool expected = pair.element_loop(tol, data1, data2, length);
+    const Remembered expected_after = remembered();
+    const auto as_expected = [&](const BlockLoop& block_loop) {
+        remember(before);
+        const bool answer = block_loop.loop(tol, data1, data2, length);
+        const bool same_memory = same_factors(remembered(), expected_after);
+        if (answer != expected || !same_memory) {
+            ADD_FAILURE() << block_loop.set << " answers " << answer << " instead of " << expected
+                          << (same_memory ? "" : " and remembers another factor") << "; tolerance "
+                          << tol << ", " << count << " elements, remembered before: tolerance "
+                          << before.of_singles.lasttol << " of singles, "
+                          << before.of_doubles.lasttol << " of doubles";
+        }
+        return answer == expected && same_memory;
+    };
+    return std::all_of(pair.block_loops.begin(), pair.block_loops.end(), as_expected);
+}
+
+// One pair of types under one tolerance. Any `step` tolerances in a row have the planted pair at
+// every place of two blocks, each of them at another share of the places.
+class PlantedRuns {
+  public:
+    PlantedRuns(const Pair& pair, const double tol, const std::size_t turn, const std::size_t step)
+        : pair_(pair), tol_(tol), first_(turn % step), step_(step), two_blocks_(2 * pair.block + 1),
+          longest_(4 * pair.block + 1), elements1_(pair.side1, longest_),
+          elements2_(pair.side2, longest_),
+          planted_(planted_pairs(pair, tol)), states_{factors_of(0), factors_of(tol),
+                                                      factors_of(pair.bits - 0.75)} {
+        for (std::size_t count = 0; count <= 70; ++count) {
+            lengths_.push_back(count);
+        }
+        // Of complex numbers, half as many make a block.
+        for (std::size_t edge = pair.block; edge < longest_; edge += pair.block / 2) {
+            lengths_.insert(lengths_.end(), {edge - 1, edge, edge + 1});
+        }
+    }
+
+    bool run_all() {
+        fill({"the same", {7, 0}, {7, 0}});
+        bool as_expected = run_among_these();
+        const Planted near = near_pair(pair_, tol_);
+        fill(near);
+        const void* const data1 = elements1_.placed(0, longest_, longest_, {});
+        const void* const data2 = elements2_.placed(0, longest_, longest_, {});
+        remember(states_[1]);
+        if (as_expected && pair_.element_loop(tol_, data1, data2, static_cast<talint>(longest_))) {
+            ++near_fills_;
+            as_expected = run_among_these();
+        }
+        return as_expected;
+    }
+
+    int near_fills() const { return near_fills_; }
+
+  private:
+    // Multiples of the pair by powers of two, which are as near to each other as the pair is.
+    void fill(const Planted& pair) {
+        for (std::size_t i = 0; i < longest_; ++i) {
+            const bool negative = i % 2 == 1 && pair_.side1.is_signed && pair_.side2.is_signed;
+            const double scale = (negative ? -1 : 1) * std::exp2(i % 5);
+            elements1_.set(i, scaled(pair.element1, scale));
+            elements2_.set(i, scaled(pair.element2, scale));
+        }
+    }
+
+    Element scaled(const Element& element, const double scale) const {
+        const double real = scale * element.real;
+        const bool both_complex = pair_.side1.is_complex && pair_.side2.is_complex;
+        return {real, both_complex ? real : scale * 0};
+    }
+
+    bool run_among_these() {
+        for (const Planted& planted : planted_) {
+            for (const std::size_t length : lengths_) {
+                // 7919 has no factor in common with a length here, so that no place is preferred.
+                if (!run(planted, length, length == 0 ? 0 : runs_ * 7919 % length)) {
+                    return false;
+                }
+            }
+            for (std::size_t index = first_; index < two_blocks_; index += step_) {
+                if (!run(planted, two_blocks_, index)) {
+                    return false;
+                }
+            }
+        }
+        return true;
+    }
+
+    bool run(const Planted& planted, const std::size_t length, const std::size_t index) {
+        // In the course of the runs both sides get to every place in a page.
+        ++runs_;
+        const std::size_t place1 = runs_;
+        const std::size_t place2 = runs_ * 5 + runs_ / 64;
+        const bool swap = pair_.side1.is_complex && pair_.side2.is_complex && runs_ % 2 == 1;
+        const void* const data1 =
+            elements1_.placed(place1, length, index, turned(planted.element1, swap));
+        const void* const data2 =
+            elements2_.placed(place2, length, index, turned(planted.element2, swap));
+        if (!as_element_loop(pair_, states_[runs_ % states_.size()], tol_, data1, data2, length)) {
+            ADD_FAILURE() << "planted at " << index << ": " << planted.name << "; places " << place1
+                          << " and " << place2;
+            return false;
+        }
+        return true;
+    }
+
+    static Element turned(const Element& element, const bool swap) {
+        return swap ? Element{element.imaginary, element.real} : element;
+    }
+
+    const Pair& pair_;
+    double tol_;
+    std::size_t first_;
+    std::size_t step_;
+    std::size_t two_blocks_; // behind the first element, which is judged on its own
+    std::size_t longest_;
+    Elements elements1_;
+    Elements elements2_;
+    std::vector<Planted> planted_;
+    std::vector<Remembered> states_;
+    std::vector<std::size_t> lengths_;
+    std::size_t runs_ = 0;
+    int near_fills_ = 0;
+};
+
+TEST(BlockLoops, AnswerAndRememberAsTheElementLoop) {
+    int near_fills = 0;
+    for_each_pair_with_a_loop([&](const Pair& pair) {
+        const std::vector<double> tolerances = tolerances_of(pair);
+        const std::size_t step = std::min<std::size_t>(tolerances.size(), 3);
+        for (std::size_t turn = 0; turn < tolerances.size(); ++turn) {
+            PlantedRuns runs(pair, tolerances[turn], turn, step);
+            if (!runs.run_all()) {
+                return;
+            }
+            near_fills += runs.near_fills();
+        }
+    });
+    // 80 pairs of types are compared as reals. Near each other are 7 and the next real, or more,
+    // under eight of the tolerances.
+    EXPECT_EQ(near_fills, 80 * 8);
+}
+
+// ---- Random pairs among pairs that are the same, in every direction of rounding
+
+struct Rounding {
+    const char* name;
+    int mode;
+};
+
+constexpr Rounding roundings[] = {
+    {"to nearest", FE_TONEAREST},
+    {"upward", FE_UPWARD},
+    {"downward", FE_DOWNWARD},
+    {"toward zero", FE_TOWARDZERO},
+};
+
+// Rounds in one direction for as long as it lives.
+class RoundingScope {
+  public:
+    explicit RoundingScope(const Rounding& rounding) : before_(std::fegetround()) {
+        EXPECT_EQ(std::fesetround(rounding.mode), 0) << rounding.name;
+    }
+    RoundingScope(const RoundingScope&) = delete;
+    RoundingScope& operator=(const RoundingScope&) = delete;
+    ~RoundingScope() { std::fesetround(before_); }
+
+  private:
+    int before_;
+};
+
+double share_of(const int bits, const Remembered& factors) {
+    return bits == std::numeric_limits<float>::digits ? factors.of_singles.tolfactor
+                                                      : factors.of_doubles.tolfactor;
+}
+
+std::uint64_t printed_seed() {
+    const std::uint64_t seed = oracle::requested_seed();
+    std::cout << "TALNUMERICARRAY_SEED=" << seed << std::endl;
+    return seed;
+}
+
+TEST(BlockLoops, AnswerAsTheElementLoopInEveryDirectionOfRounding) {
+    constexpr int draws = 150;
+    oracle::Random random(printed_seed());
+    for_each_pair_with_a_loop([&](const Pair& pair) {
+        const std::size_t count = 2 * pair.block + 1;
+        const auto sevens = [count](const Side& side) {
+            std::vector<unsigned char> bytes(count * side.size);
+            for (std::size_t i = 0; i < count; ++i) {
+                side.store(bytes.data() + i * side.size, 7, 0);
+            }
+            return bytes;
+        };
+        for (const Rounding& rounding : roundings) {
+            SCOPED_TRACE(rounding.name);
+            for (const double tol : tolerances_of(pair)) {
+                const RoundingScope scope(rounding);
+                const Remembered factors = factors_of(tol);
+                std::vector<unsigned char> data1 = sevens(pair.side1);
+                std::vector<unsigned char> data2 = sevens(pair.side2);
+                for (int draw = 0; draw < draws; ++draw) {
+                    const std::size_t index = random.below(static_cast<std::uint32_t>(count));
+                    unsigned char* const element1 = data1.data() + index * pair.side1.size;
+                    unsigned char* const element2 = data2.data() + index * pair.side2.size;
+                    pair.draw(random, share_of(pair.bits, factors), element1, element2);
+                    if (!as_element_loop(pair, factors, tol, data1.data(), data2.data(), count)) {
+                        return;
+                    }
+                    pair.side1.store(element1, 7, 0);
+                    pair.side2.store(element2, 7, 0);
+                }
+            }
+        }
+    });
+}
+
+template <typename T>
+void expect_divisors_only_to_nearest() {
+    constexpr int bits = std::numeric_limits<T>::digits;
+    for (const Rounding& rounding : roundings) {
+        SCOPED_TRACE(rounding.name);
+        for (const T tol : {T{0.5}, T{10}, T{10.5}, T{bits - 1}, T{bits}, T{bits + 10}}) {
+            remember(factors_of(tol));
+            const RoundingScope scope(rounding);
+            const bool has_divisor = talnumericarray::certain_divisor(tol) != 0;
+            EXPECT_EQ(has_divisor, rounding.mode == FE_TONEAREST) << tol;
+        }
+    }
+}
+
+TEST(CertainDivisor, IsOnlyGivenWhereResultsAreRoundedToNearest) {
+    expect_divisors_only_to_nearest<float>();
+    expect_divisors_only_to_nearest<double>();
+}
+
+// The factor of 20 is.
+template <typename T>
+void expect_divisors_only_without_need_of_another_factor() {
+    constexpr int bits = std::numeric_limits<T>::digits;
+    for (const T tol : {T{-1}, T{0}, T{0.5}, T{10}, T{10.5}, T{bits - 1}, static_cast<T>(nan)}) {
+        remember(factors_of(20));
+        EXPECT_EQ(talnumericarray::certain_divisor(tol), 0) << tol;
+    }
+    for (const T tol : {T{bits}, T{bits + 10}}) {
+        remember(factors_of(20));
+        EXPECT_EQ(talnumericarray::certain_divisor(tol), 1) << tol;
+    }
+}
+
+TEST(CertainDivisor, IsOnlyGivenWhereTheFactorIsRememberedOrNotNeeded) {
+    expect_divisors_only_without_need_of_another_factor<float>();
+    expect_divisors_only_without_need_of_another_factor<double>();
+}
+
+// ---- The block test itself
+
+// A block of pairs that are the same, for one drawn pair to be put among them.
+template <typename T1, typename T2>
+class Block {
+  public:
+    static constexpr std::size_t length = talnumericarray::block_length<T1, T2>;
+
+    Block() {
+        for (std::size_t i = 0; i < length; ++i) {
+            reset(i);
+        }
+    }
+
+    void reset(const std::size_t index) {
+        data1_[index] = 7;
+        data2_[index] = 7;
+    }
+
+    void draw(oracle::Random& random, const double share, const std::size_t index) {
+        draw_elements<T1, T2>(random, share, &data1_[index], &data2_[index]);
+    }
+
+    to_real_type_t<T2> real_part2(const std::size_t index) const {
+        return reinterpret_cast<const to_real_type_t<T2>*>(&data2_[index])[0];
+    }
+
+    const T1* data1() const { return data1_; }
+    const T2* data2() const { return data2_; }
+
+  private:
+    // In one page.
+    alignas(4096) T1 data1_[length] = {};
+    alignas(4096) T2 data2_[length] = {};
+};
+
+// What the element rule says of a pair, and whether the block test may not be in doubt of it if it
+// is the same.
+struct Ruling {
+    bool same;
+    bool beyond_doubt;
+};
+
+template <typename Bound, typename T1, typename T2, typename... Sets>
+bool as_ruled(type_list<Sets...> /*sets*/, const Ruling& ruling, const Bound bound,
+              const Block<T1, T2>& block) {
+    [[maybe_unused]] const auto follows = [&](auto tag) {
+        using Set = typename decltype(tag)::type;
+        if (!Set::supported()) {
+            return true;
+        }
+        constexpr std::size_t length = Block<T1, T2>::length;
+        const bool certain =
+            Set::leading_certainly_same(bound, block.data1(), block.data2(), length) == length;
+        const bool follows_rule = certain ? ruling.same : !(ruling.same && ruling.beyond_doubt);
+        if (!follows_rule) {
+            ADD_FAILURE() << Set::name << " is " << (certain ? "certain" : "in doubt")
+                          << " of a pair that is " << (ruling.same ? "" : "not ") << "the same";
+        }
+        return follows_rule;
+    };
+    return (true && ... && follows(type_tag<Sets>{}));
+}
+
+double drawn_tolerance(oracle::Random& random, const int bits) {
+    const double marks[] = {-1, 0, 1e-46, 0.5, 10.5, bits - 0.5, 1.0 * bits, bits + 10.0, nan};
+    switch (random.below(4)) {
+    case 0:
+        return random.pick(marks);
+    case 1:
+        return bits - 1 + random.unit();
+    case 2:
+        return bits * random.unit();
+    default:
+        return random.between(1, bits - 1);
+    }
+}
+
+template <typename T1, typename T2>
+class CertaintyRuns {
+  public:
+    explicit CertaintyRuns(oracle::Random& random) : random_(random) {}
+
+    // The number of pairs that were drawn.
+    std::uint64_t run_all() {
+        constexpr std::uint64_t tolerances = 100;
+        constexpr std::uint64_t draws = 600;
+        for (std::uint64_t i = 0; i < tolerances; ++i) {
+            const double tol = is_real ? drawn_tolerance(random_, bits) : 0;
+            const Remembered factors = factors_of(tol);
+            remember(factors);
+            const double share = share_of(bits, factors);
+            for (std::uint64_t draw = 0; draw < draws; ++draw) {
+                if (!run(tol, share)) {
+                    return 0;
+                }
+            }
+            EXPECT_TRUE(same_factors(remembered(), factors)) << tol;
+        }
+        return tolerances * draws;
+    }
+
+  private:
+    using T = talnumericarray::comparison_t<T1, T2>;
+    static constexpr bool is_real = std::is_floating_point_v<T>;
+    static constexpr int bits = std::numeric_limits<T>::digits;
+
+    bool run(const double tol, const double share) {
+        const std::size_t index = random_.below(Block<T1, T2>::length);
+        block_.draw(random_, share, index);
+        const T1& element1 = block_.data1()[index];
+        const T2& element2 = block_.data2()[index];
+        const bool equal = sameQ_test(-1.0, element1, element2);
+        bool followed =
+            as_ruled(instruction_sets{}, {equal, true}, talnumericarray::equality{}, block_);
+        if constexpr (is_real) {
+            const T divisor = talnumericarray::certain_divisor(static_cast<T>(tol));
+            if (divisor != 0) {
+                const bool exact = std::trunc(tol) == tol && tol < bits;
+                const bool infinite = std::isinf(static_cast<T>(block_.real_part2(index)));
+                followed = followed
+                           && as_ruled(
+                               instruction_sets{},
+                               {sameQ_test(tol, element1, element2), exact && !(equal && infinite)},
+                               talnumericarray::nearness<T>{divisor}, block_);
+            }
+        }
+        if (!followed) {
+            ADD_FAILURE() << testing::PrintToString(element1) << " and "
+                          << testing::PrintToString(element2) << ", tolerance " << tol;
+        }
+        block_.reset(index);
+        return followed;
+    }
+
+    oracle::Random& random_;
+    Block<T1, T2> block_;
+};
+
+struct Drawn {
+    int pairs_of_types = 0;
+    std::uint64_t integers = 0;
+    std::uint64_t singles = 0;
+    std::uint64_t doubles = 0;
+};
+
+// The order of the two does not matter to a block test, nor does it see two complex numbers as
+// anything but reals.
+template <typename T1, typename T2>
+void run_certainty([[maybe_unused]] oracle::Random& random, [[maybe_unused]] Drawn& drawn) {
+    constexpr bool has_block_test =
+        element_type_id<T1> <= element_type_id<
+            T2> && !is_complex_v<T1> && !(std::is_same_v<T1, T2> && std::is_integral_v<T1>);
+    if constexpr (has_block_test) {
+        using T = talnumericarray::comparison_t<T1, T2>;
+        SCOPED_TRACE("element types " + std::to_string(element_type_id<T1>) + " and "
+                     + std::to_string(element_type_id<T2>));
+        auto& drawn_of_type = std::is_integral_v<T>      ? drawn.integers
+                              : std::is_same_v<T, float> ? drawn.singles
+                                                         : drawn.doubles;
+        drawn_of_type += CertaintyRuns<T1, T2>(random).run_all();
+        ++drawn.pairs_of_types;
+    }
+}
+
+template <typename T1, typename... Types>
+void run_certainty_of_row(oracle::Random& random, Drawn& drawn, type_list<Types...> /*types*/) {
+    (run_certainty<T1, Types>(random, drawn), ...);
+}
+
+template <typename... Types>
+Drawn run_certainty_of_all(oracle::Random& random, type_list<Types...> types) {
+    Drawn drawn;
+    (run_certainty_of_row<Types>(random, drawn, types), ...);
+    return drawn;
+}
+
+TEST(BlockTests, AreCertainOnlyOfWhatTheElementTestFindsTheSame) {
+    oracle::Random random(printed_seed());
+    const Drawn drawn = run_certainty_of_all(random, element_type_list{});
+    EXPECT_EQ(drawn.pairs_of_types, 67);
+    EXPECT_GE(drawn.integers, 1000000U);
+    EXPECT_GE(drawn.singles, 1000000U);
+    EXPECT_GE(drawn.doubles, 1000000U);
+}
+
+} // namespace
