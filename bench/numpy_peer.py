@@ -1,0 +1,50 @@
+#!/usr/bin/python3
+"""Times NumPy on the reals of peers.cpp, in nanoseconds: numpy_peer.py [--quick]."""
+
+import json
+import sys
+import time
+import timeit
+
+import numpy as np
+
+BYTES = 256 * 1024  # of both arrays together
+TOLERANCE = 10
+
+
+def arrays(dtype):
+    """An array of reals and one that is near it and nowhere equal."""
+    random = np.random.default_rng(20240229)
+    count = BYTES // 2 // np.dtype(dtype).itemsize
+    signs = random.choice([-1, 1], count)
+    first = (signs * random.uniform(2**-10, 4, count)).astype(dtype)
+    epsilons = random.integers(1, 257, count).astype(dtype)
+    return first, first * (1 + epsilons * np.finfo(dtype).eps)
+
+
+def nanoseconds(function, repetitions):
+    assert function(), "the answer is wrong"
+    # Of a processor, as for the other libraries.
+    return min(timeit.repeat(function, timer=time.process_time, number=1, repeat=repetitions)) * 1e9
+
+
+def main():
+    repetitions = 5 if "--quick" in sys.argv[1:] else 500
+    times = {}
+    for dtype in (np.float64, np.float32):
+        first, near = arrays(dtype)
+        identical = first.copy()
+        relative = 2.0 ** (TOLERANCE - 1 - np.finfo(dtype).nmant)
+        name = np.dtype(dtype).name
+        times[f"{name}/NumPy_allclose"] = nanoseconds(
+            lambda: np.allclose(first, near, rtol=relative, atol=0), repetitions
+        )
+        times[f"{name}/NumPy_array_equal"] = nanoseconds(
+            lambda: np.array_equal(first, identical), repetitions
+        )
+    json.dump({"numpy": np.__version__, "nanoseconds": times}, sys.stdout, indent=1)
+    print()
+
+
+if __name__ == "__main__":
+    main()
