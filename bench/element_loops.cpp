@@ -14,9 +14,9 @@
 #include <cstdlib>
 #include <cstring>
 #include <memory>
-#include <new>
 #include <string>
 #include <utility>
+#include <vector>
 
 namespace {
 
@@ -54,7 +54,6 @@ constexpr Workload workloads[] = {
 // so that it is filled only where others than those wanted are in it.
 class Memory {
   public:
-    static constexpr std::size_t alignment = std::size_t{2} << 20;
     static constexpr std::size_t bytes = std::size_t{256} << 20;
 
     template <typename Fill>
@@ -65,22 +64,19 @@ class Memory {
         }
     }
 
-    unsigned char* begin() { return begin_.get(); }
+    unsigned char* begin() { return begin_; }
 
   private:
-    struct Free {
-        void operator()(unsigned char* memory) const { std::free(memory); }
-    };
+    static constexpr std::size_t alignment = std::size_t{2} << 20; // a large page
 
-    static unsigned char* allocated() {
-        void* const memory = std::aligned_alloc(alignment, bytes);
-        if (memory == nullptr) {
-            throw std::bad_alloc();
-        }
-        return static_cast<unsigned char*>(memory);
+    unsigned char* aligned() {
+        void* place = storage_.data();
+        std::size_t space = storage_.size();
+        return static_cast<unsigned char*>(std::align(alignment, bytes, place, space));
     }
 
-    std::unique_ptr<unsigned char, Free> begin_{allocated()};
+    std::vector<unsigned char> storage_ = std::vector<unsigned char>(bytes + alignment);
+    unsigned char* begin_ = aligned();
     std::string held_;
 };
 

@@ -24,8 +24,8 @@ WORKLOADS = {
     "identical": "identical",
     "near": "near",
     "near_fractional": "near, fractional tolerance",
-    "last_differs": "last element differs",
     "first_differs": "first element differs",
+    "last_differs": "last element differs",
 }
 
 # These answer another question than element by element under a tolerance.
@@ -201,7 +201,7 @@ def slowdown(row):
 
 
 def small_table(small):
-    workloads = list(dict.fromkeys(row["workload"] for row in small))
+    workloads = [name for name in WORKLOADS if any(row["workload"] == name for row in small)]
     by_length = defaultdict(list)
     for row in small:
         by_length[row["len"]].append(row)
