@@ -26,14 +26,6 @@ namespace {
 
 constexpr std::size_t bytes = std::size_t{256} << 10; // of both arrays together
 
-template <typename T>
-struct NearArrays {
-    std::vector<T> first = std::vector<T>(bytes / 2 / sizeof(T));
-    std::vector<T> second = std::vector<T>(bytes / 2 / sizeof(T));
-
-    NearArrays() { fill<T, T>(Contents::near, first.data(), second.data(), first.size()); }
-};
-
 // The difference, relative to the larger, that `whole_tolerance` stands for.
 template <typename T>
 T relative_tolerance() {
@@ -45,10 +37,12 @@ template <typename T, typename Same>
 void add(const std::string& name, const Same& same) {
     const std::string full_name = type_name<T>() + "/" + name;
     benchmark::RegisterBenchmark(full_name.c_str(), [same](benchmark::State& state) {
-        NearArrays<T> arrays;
+        std::vector<T> first(bytes / 2 / sizeof(T));
+        std::vector<T> second(first.size());
+        fill<T, T>(Contents::near, first.data(), second.data(), first.size());
         bool answer = false;
         for (auto _ : state) {
-            answer = same(arrays.first, arrays.second);
+            answer = same(first, second);
             benchmark::DoNotOptimize(answer);
             benchmark::ClobberMemory();
         }

@@ -91,7 +91,7 @@ struct Call {
     const std::chrono::duration<double, std::nano> time = std::chrono::steady_clock::now() - start;
     if (wrong != 0) {
         std::fputs("small_arrays: an answer is wrong\n", stderr);
-        std::exit(EXIT_FAILURE);
+        std::abort();
     }
     return time.count();
 }
@@ -132,10 +132,8 @@ class Rows {
         separator_ = ",\n";
     }
 
-    void end() { std::puts("\n]"); }
-
   private:
-    const char* separator_ = "[\n";
+    const char* separator_ = "";
 };
 
 template <typename T1, typename T2>
@@ -166,9 +164,10 @@ int main(int count, char** arguments) {
     }
     const Effort& effort = option.empty() ? full : quick;
     Rows rows;
+    std::puts("[");
     for_each_pair_with_loop([&](auto tag1, auto tag2) {
         measure_pair<typename decltype(tag1)::type, typename decltype(tag2)::type>(effort, rows);
     });
-    rows.end();
+    std::puts("\n]");
     return EXIT_SUCCESS;
 }
