@@ -59,7 +59,7 @@ struct baseline {
 struct avx2 {
     static constexpr const char* name = "AVX2";
 
-    static bool supported() noexcept { return __builtin_cpu_supports("avx2") != 0; }
+    static bool supported() noexcept { return static_cast<bool>(__builtin_cpu_supports("avx2")); }
 
     // There is no instruction that converts 64-bit integers, and GCC does so one at a time.
     template <typename Bound, typename T1, typename T2>
@@ -85,9 +85,10 @@ struct avx512 {
     static constexpr const char* name = "AVX-512";
 
     static bool supported() noexcept {
-        return __builtin_cpu_supports("avx512f") != 0 && __builtin_cpu_supports("avx512bw") != 0
-               && __builtin_cpu_supports("avx512dq") != 0
-               && __builtin_cpu_supports("avx512vl") != 0;
+        return static_cast<bool>(__builtin_cpu_supports("avx512f"))
+               && static_cast<bool>(__builtin_cpu_supports("avx512bw"))
+               && static_cast<bool>(__builtin_cpu_supports("avx512dq"))
+               && static_cast<bool>(__builtin_cpu_supports("avx512vl"));
     }
 
     template <typename Bound, typename T1, typename T2>

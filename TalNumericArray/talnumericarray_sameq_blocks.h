@@ -34,6 +34,9 @@ struct equality {};
 template <typename T>
 struct nearness {
     T divisor;
+    // The least number above zero. Not a constant in the loops, as GCC compares and selects to find
+    // the larger of a number and a constant.
+    T least = std::numeric_limits<T>::denorm_min();
 };
 
 // Whether results of arithmetic are rounded to the nearest number, as they are unless a program has
@@ -140,9 +143,8 @@ template <typename T1, typename T2, std::enable_if_t<compared_as_reals_v<T1, T2>
     const T magnitude_y = std::fabs(y);
     // The least number above zero in the place of zero: two zeros are near, and nothing else is
     // nearer to a zero than that. It saves a test for equality, which only two infinities miss.
-    constexpr T least = std::numeric_limits<T>::denorm_min();
     const T larger = magnitude_x > magnitude_y ? magnitude_x : magnitude_y;
-    const T max = larger < least ? least : larger;
+    const T max = larger > near.least ? larger : near.least;
     return std::fabs(x - y) * near.divisor < max ? D{0} : static_cast<D>(-1);
 }
 
@@ -160,9 +162,9 @@ template <typename Bound, typename T1, typename T2>
 // ---- Doubt about a block
 
 // Long enough for the vectors of every instruction set, and for what it costs to gather their
-// doubts, to be a small part of the work.
+// doubts, to be a small part of the work. A power of two, so that pages end with a block.
 template <typename T1, typename T2>
-inline constexpr std::size_t block_length = sizeof(comparison_t<T1, T2>) == 8 ? 64 : 128;
+inline constexpr std::size_t block_length = is_complex_v<T1> || is_complex_v<T2> ? 64 : 128;
 
 template <typename Bound, typename T1, typename T2>
 [[gnu::always_inline]] inline bool certainly_sameQ(const Bound bound, const T1* data1,

@@ -49,7 +49,7 @@ template <typename T1, typename T2>
 template <typename Sets, typename T1, typename T2>
 [[gnu::noinline]] int rest_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                                  const talint len) noexcept {
-    constexpr talint block = static_cast<talint>(block_length<T1, T2>);
+    constexpr auto block = static_cast<talint>(block_length<T1, T2>);
     talint stretch = block;
     for (talint i = 1; i < len;) {
         const talint passed = static_cast<talint>(

@@ -24,22 +24,14 @@ namespace {
 
 // ---- The two loops
 
-using Loop = int (*)(const talreal& tol, const void* data1, const void* data2, talint len);
+template <typename T1, typename T2>
+using Loop = int (*)(const talreal& tol, const T1* data1, const T2* data2, talint len);
 
 template <typename T1, typename T2>
-[[gnu::noinline]] int loop_of_library(const talreal& tol, const void* data1, const void* data2,
+[[gnu::noinline]] int loop_of_library(const talreal& tol, const T1* data1, const T2* data2,
                                       const talint len) {
-    return talnumericarray::elements_sameQ<talnumericarray::instruction_sets>(
-        tol, static_cast<const T1*>(data1), static_cast<const T2*>(data2), len);
-}
-
-template <typename T1, typename T2>
-[[gnu::noinline]] int plain_loop(const talreal& tol, const void* data1, const void* data2,
-                                 const talint len) {
-    return talnumericarray::each_sameQ(tol, static_cast<const T1*>(data1),
-                                       static_cast<const T2*>(data2), len)
-               ? 1
-               : 0;
+    return talnumericarray::elements_sameQ<talnumericarray::instruction_sets>(tol, data1, data2,
+                                                                              len);
 }
 
 // ---- What is measured
@@ -74,14 +66,17 @@ constexpr double looks_slower = 1.03;
 
 // ---- Time
 
+template <typename T1, typename T2>
 struct Call {
-    const void* data1;
-    const void* data2;
+    const T1* data1;
+    const T2* data2;
     talint len;
     int right_answer;
 };
 
-[[gnu::noinline]] double nanoseconds(const Loop loop, const Call& call, const int calls) {
+template <typename T1, typename T2>
+[[gnu::noinline]] double nanoseconds(const Loop<T1, T2> loop, const Call<T1, T2>& call,
+                                     const int calls) {
     const talreal tol = whole_tolerance;
     int wrong = 0;
     const auto start = std::chrono::steady_clock::now();
@@ -101,7 +96,9 @@ struct Times {
     double plain = std::numeric_limits<double>::infinity();
 };
 
-Times measure(const Loop library, const Loop plain, const Call& call, const Effort& effort) {
+template <typename T1, typename T2>
+Times measure(const Loop<T1, T2> library, const Loop<T1, T2> plain, const Call<T1, T2>& call,
+              const Effort& effort) {
     int calls = 1;
     while (nanoseconds(plain, call, calls) < effort.batch) {
         calls *= 2;
@@ -147,8 +144,9 @@ void measure_pair(const Effort& effort, Rows& rows) {
         }
         for (const talint len : lengths) {
             fill<T1, T2>(workload.contents, data1, data2, static_cast<std::size_t>(len));
-            const Call call = {data1, data2, len, right_answer(workload.contents)};
-            const Times times = measure(loop_of_library<T1, T2>, plain_loop<T1, T2>, call, effort);
+            const Call<T1, T2> call = {data1, data2, len, right_answer(workload.contents)};
+            const Times times = measure<T1, T2>(loop_of_library<T1, T2>,
+                                                talnumericarray::each_sameQ<T1, T2>, call, effort);
             rows.add(type_name<T1>(), type_name<T2>(), workload, len, times);
         }
     }
