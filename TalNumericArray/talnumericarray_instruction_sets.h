@@ -19,7 +19,7 @@ namespace talnumericarray {
 //
 // Each has one function, which is `leading_certainly_same` compiled for it. What that calls is
 // inlined into it, so that nothing else of the program is compiled for the set. `pays` tells where
-// it is faster than the element test.
+// it is faster than the sets behind it and the element test.
 
 // What the compiler has been told that the processor has.
 struct baseline {
@@ -91,9 +91,18 @@ struct avx512 {
                && static_cast<bool>(__builtin_cpu_supports("avx512vl"));
     }
 
+    // For equality of reals GCC's loops are hardly faster than those for AVX2, but for conversions
+    // that only this set has.
     template <typename Bound, typename T1, typename T2>
     static constexpr bool pays() noexcept {
+#    if defined(__clang__)
         return true;
+#    else
+        constexpr bool converted_by_avx2 =
+            std::is_floating_point_v<T1> || sizeof(T1) < 4 || std::is_same_v<T1, BIT32>;
+        return std::is_integral_v<comparison_t<T1, T2>> || is_complex_v<T2> || !converted_by_avx2
+               || !std::is_same_v<Bound, equality>;
+#    endif
     }
 
     template <typename Bound, typename T1, typename T2>
@@ -141,7 +150,7 @@ constexpr bool blocks_pay(type_list<Sets...> /*sets*/) noexcept {
     }
 }
 
-// `leading_certainly_same` by the best set that the processor has; 0 where it does not pay.
+// `leading_certainly_same` by the best set that the processor has and that pays; 0 if none does.
 template <typename... Sets, typename Bound, typename T1, typename T2>
 inline std::size_t by_best_set(type_list<Sets...> /*sets*/, const Bound bound, const T1* data1,
                                const T2* data2, const std::size_t len) noexcept {
@@ -149,11 +158,14 @@ inline std::size_t by_best_set(type_list<Sets...> /*sets*/, const Bound bound, c
     [[maybe_unused]] const auto ask = [&](auto tag) noexcept {
         using Set = typename decltype(tag)::type;
         if constexpr (Set::template pays<Bound, T1, T2>()) {
-            passed = Set::leading_certainly_same(bound, data1, data2, len);
+            if (Set::supported()) {
+                passed = Set::leading_certainly_same(bound, data1, data2, len);
+                return true;
+            }
         }
-        return true;
+        return false;
     };
-    (void)(... || (Sets::supported() && ask(type_tag<Sets>{})));
+    (void)(... || ask(type_tag<Sets>{}));
     return passed;
 }
 

@@ -31,8 +31,8 @@ inline bool compared_as_bytes(const talreal& tol) noexcept {
 // The elements one by one, in order, up to the first pair that is not the same. A count below 1 is
 // no elements.
 template <typename T1, typename T2>
-[[gnu::noinline]] int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
-                                 const talint len) noexcept {
+inline int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                      const talint len) noexcept {
     for (talint i = 0; i < len; ++i) {
         if (!sameQ_test(tol, data1[i], data2[i])) {
             return 0;
@@ -71,10 +71,9 @@ template <typename Sets, typename T1, typename T2>
 inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                           const talint len) noexcept {
     if constexpr (blocks_pay<T1, T2>(Sets{})) {
-        if (len > static_cast<talint>(block_length<T1, T2>)) {
-            return sameQ_test(tol, data1[0], data2[0]) ? rest_sameQ<Sets>(tol, data1, data2, len)
-                                                       : 0;
-        }
+        const bool in_blocks = len > static_cast<talint>(block_length<T1, T2>);
+        const int same = each_sameQ(tol, data1, data2, in_blocks ? 1 : len);
+        return same != 0 && in_blocks ? rest_sameQ<Sets>(tol, data1, data2, len) : same;
     }
     return each_sameQ(tol, data1, data2, len);
 }
@@ -96,8 +95,8 @@ inline int with_element_type(const type_t id, type_list<Types...> /*types*/,
 // The pair routine: `na1` has elements of type `T1`, `na2` of type `T2`, and their shapes are
 // equal.
 template <typename T1, typename T2>
-inline int TalNumericArray_sameQ_impl(const talreal& tol, TalNumericArray na1,
-                                      TalNumericArray na2) noexcept {
+[[gnu::noinline]] int TalNumericArray_sameQ_impl(const talreal& tol, TalNumericArray na1,
+                                                 TalNumericArray na2) noexcept {
     const T1* data1 = static_cast<const T1*>(na1->data);
     const T2* data2 = static_cast<const T2*>(na2->data);
     const talint len = na1->nelems;
