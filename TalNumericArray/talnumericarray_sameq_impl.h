@@ -50,9 +50,9 @@ template <typename Sets, typename T1, typename T2>
 [[gnu::noinline]] int rest_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                                  const talint len) noexcept {
     constexpr auto block = static_cast<talint>(block_length<T1, T2>);
-    talint stretch = block;
+    talint stretch = block / 2;
     for (talint i = 1; i < len;) {
-        const talint passed = static_cast<talint>(
+        const auto passed = static_cast<talint>(
             passed_over<Sets>(tol, data1 + i, data2 + i, static_cast<std::size_t>(len - i)));
         i += passed;
         stretch = passed > 0 ? block : std::min(2 * stretch, 64 * block);
