@@ -4,20 +4,22 @@
 // the same and would leave the remembered factor as it is, so that they can be passed over. Where
 // it is in doubt it says nothing, and the element test decides. It is written without branches, for
 // compilers to turn into vector instructions.
+//
+// Outside the functions that are compiled without NEON on 32-bit ARM: reals are not looked at in
+// blocks there.
 
 #ifndef TALNUMERICARRAY_SAMEQ_BLOCKS_H
 #define TALNUMERICARRAY_SAMEQ_BLOCKS_H
 
 #include "compare.h"
 #include "promotion_rules.h"
-#include "talnumericarray_sameq_elements.h"
 #include "to_type.h"
 
 #include <algorithm>
 #include <cmath>
-#include <complex>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <limits>
 #include <type_traits>
 
@@ -155,7 +157,7 @@ template <typename Bound, typename T1, typename T2>
                                                     const T2 imaginary) noexcept {
     using Bits = unsigned_of_size_t<T2>;
     Bits imaginary_bits;
-    __builtin_memcpy(&imaginary_bits, &imaginary, sizeof imaginary_bits);
+    std::memcpy(&imaginary_bits, &imaginary, sizeof imaginary_bits);
     return doubt(bound, x, real) | static_cast<Bits>(imaginary_bits << 1);
 }
 
