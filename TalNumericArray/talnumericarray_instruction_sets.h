@@ -136,7 +136,8 @@ using instruction_sets = type_list<>;
 
 // ---- The choice
 
-// Whether a block test of any of the sets is ever faster than the element test.
+// Whether a block test of any of the sets is ever faster than the element test. Between reals, one
+// for nearness is wherever one for equality is.
 template <typename T1, typename T2, typename... Sets>
 constexpr bool blocks_pay(type_list<Sets...> /*sets*/) noexcept {
     if constexpr ((element_type_id<T1>) > element_type_id<T2>) {
@@ -144,9 +145,9 @@ constexpr bool blocks_pay(type_list<Sets...> /*sets*/) noexcept {
     } else if constexpr (is_complex_v<T1>) {
         return blocks_pay<to_real_type_t<T1>, to_real_type_t<T2>>(type_list<Sets...>{});
     } else {
-        return (...
-                || (Sets::template pays<equality, T1, T2>()
-                    || Sets::template pays<nearness<comparison_t<T1, T2>>, T1, T2>()));
+        using T = comparison_t<T1, T2>;
+        using Bound = std::conditional_t<std::is_integral_v<T>, equality, nearness<T>>;
+        return (... || Sets::template pays<Bound, T1, T2>());
     }
 }
 
