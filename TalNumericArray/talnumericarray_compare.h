@@ -4,9 +4,10 @@
 //
 // Both predicates only read the records and what they point to, and take no reference on them; the
 // caller keeps them alive and unchanged for the length of a call. Any number of threads may compare
-// the same records at once. Neither predicate allocates, throws, locks or logs. The comparison of
-// reals may raise floating-point status flags, overflow among them, which a program that traps on
-// them has to mask for the call.
+// the same records at once, and so may a signal handler, even one that has interrupted a
+// comparison. Neither predicate allocates, throws, locks or logs. The comparison of reals may raise
+// floating-point status flags, overflow among them, which a program that traps on them has to mask
+// for the call.
 //
 // Nothing but what is said below is checked: a null handle, a null `dims` with a rank above 0, a
 // null `data` with a count above 0, a `data` that is not aligned for its elements, a negative rank

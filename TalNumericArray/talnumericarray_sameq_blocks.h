@@ -78,8 +78,8 @@ inline T certain_divisor(const T tol) noexcept {
     if (tol >= bits) {
         return 1;
     }
-    const auto& [lasttol, tolfactor] = nesk::detail::factor_cache<T>();
-    if (tol != lasttol) {
+    T tolfactor = 0;
+    if (!nesk::detail::recall_factor(tol, tolfactor)) {
         return 0;
     }
     const T inverse = 1 / tolfactor;

@@ -72,13 +72,19 @@ struct Remembered {
     nesk::detail::remembered_factor<double> of_doubles;
 };
 
+template <typename T>
+nesk::detail::remembered_factor<T> remembered_of() {
+    const nesk::detail::factor_cache<T>& cache = nesk::detail::factor_cache_of_thread<T>();
+    return {cache.lasttol, cache.tolfactor};
+}
+
 Remembered remembered() {
-    return {nesk::detail::factor_cache<float>(), nesk::detail::factor_cache<double>()};
+    return {remembered_of<float>(), remembered_of<double>()};
 }
 
 void remember(const Remembered& factors) {
-    nesk::detail::factor_cache<float>() = factors.of_singles;
-    nesk::detail::factor_cache<double>() = factors.of_doubles;
+    nesk::detail::remember_factor(factors.of_singles);
+    nesk::detail::remember_factor(factors.of_doubles);
 }
 
 template <typename T>

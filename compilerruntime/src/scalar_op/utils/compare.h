@@ -81,16 +81,61 @@ struct remembered_factor {
     T tolfactor;
 };
 
-// The last factor that was needed. All elements of an array are compared under one tolerance, so
-// one remembered factor keeps pow and ldexp out of the element loops. The initial pair is a true
-// one (2^0 is 1) that the comparison never looks up, as it answers for tolerances of `bits` or more
-// before. Each thread remembers its own: nothing is shared, nothing is locked.
+// Where the last factor that was needed is kept. The initial one is a true one (2^0 is 1) that the
+// comparison never looks up, as it answers for tolerances of `bits` or more before.
+//
+// A signal handler that compares may come between any two instructions of a comparison in its
+// thread. `changes` is odd while a factor is being written, and is another number afterwards, so
+// that two halves of different factors are never taken for one; volatile keeps the order of reads
+// and writes.
 template <typename T>
-inline remembered_factor<T>& factor_cache() noexcept {
+struct factor_cache {
+    volatile unsigned changes = 0;
+    volatile T lasttol = std::numeric_limits<T>::digits;
+    volatile T tolfactor = 1;
+};
+
+// Each thread has its own: nothing is shared, nothing is locked.
+template <typename T>
+inline factor_cache<T>& factor_cache_of_thread() noexcept {
     // Initial-exec: in a shared object the general model would allocate on a thread's first use.
-    [[gnu::tls_model("initial-exec")]] static thread_local remembered_factor<T> cache{
-        std::numeric_limits<T>::digits, 1};
+    [[gnu::tls_model("initial-exec")]] static thread_local factor_cache<T> cache;
     return cache;
+}
+
+// All elements of an array are compared under one tolerance, so that one remembered factor keeps
+// pow and ldexp out of the element loops. Returns whether `tol` has it, and then puts it in
+// `factor`.
+template <typename T>
+inline bool recall_factor(const T tol, T& factor) noexcept {
+    const factor_cache<T>& cache = factor_cache_of_thread<T>();
+    const unsigned changes = cache.changes;
+    const T lasttol = cache.lasttol;
+    factor = cache.tolfactor;
+    // No even number is equal to `changes` if it is odd.
+    const unsigned unchanged = changes & ~1U;
+    return tol == lasttol && cache.changes == unchanged;
+}
+
+// In a handler that has interrupted this very function nothing is remembered.
+template <typename T>
+inline void remember_factor(const remembered_factor<T> remembered) noexcept {
+    factor_cache<T>& cache = factor_cache_of_thread<T>();
+    const unsigned changes = cache.changes;
+    if (changes % 2 == 0) {
+        cache.changes = changes + 1;
+        cache.lasttol = remembered.lasttol;
+        cache.tolfactor = remembered.tolfactor;
+        cache.changes = changes + 2;
+    }
+}
+
+// Out of the loops, which need it once.
+template <typename T>
+[[gnu::noinline]] T new_factor(const T tol) noexcept {
+    const T tolfactor = ToleranceShiftFactor(tol);
+    remember_factor<T>({tol, tolfactor});
+    return tolfactor;
 }
 
 // Returns 0 when `x` and `y` are the same under `tol`, else +1 when `x` is the greater and -1 when
@@ -140,8 +185,8 @@ NESK_EXPANDED int compare_impl(const T& tol, const T& x, const T y) noexcept {
         return s;
     }
 
-    auto& [lasttol, tolfactor] = factor_cache<T>();
-    if (tol != lasttol) {
+    T tolfactor = 0;
+    if (!recall_factor(tol, tolfactor)) {
         // A pair that differs in its leading binary digit needs no factor. For tolerances up to
         // `bits` - 1 the factor is at most 1/2 and this changes no answer; above, it is part of the
         // rule that such a pair is the same only when the factor is remembered already.
@@ -149,8 +194,7 @@ NESK_EXPANDED int compare_impl(const T& tol, const T& x, const T y) noexcept {
         if (far_apart) {
             return s;
         }
-        tolfactor = ToleranceShiftFactor(tol);
-        lasttol = tol;
+        tolfactor = new_factor(tol);
     }
 
     // A magnitude of at least 1 times the factor, like a difference below 1 divided by it, neither
