@@ -1,0 +1,5 @@
+; Operations of which nothing is known but what a proof assumes.
+(declare-fun minus (T T) T)
+(declare-fun plus (T T) T)
+(declare-fun times (T T) T)
+(declare-fun over (T T) T)

@@ -1,0 +1,28 @@
+; Proves: two reals in either order are the same, and a factor is made for them in either order; and
+;   where both are numbers, what is above in one order is below in the other.
+; Stands for: compare_impl (compare.h); that a pair of element types and its reverse share a block
+;   test (passed_over in talnumericarray_instruction_sets.h).
+; for: single, double
+; with: real_type any_arithmetic rule two_reals nan_stays_nan
+; fault: (minus y x)) => (minus x y))
+; fault: (ite (fp.lt y zero) (fp.neg x) y) => (ite (fp.lt y zero) (fp.neg x) x)
+; fault: (ite (fp.lt x zero) below above) => above
+
+(declare-const tol T)
+(declare-const factor T)
+(declare-const remembered Bool)
+(assert (and (nan_stays factor (diff x y) (larger x y))
+             (nan_stays factor (diff y x) (larger y x))))
+
+(define-fun same ((a T) (b T)) Bool (= (compare_impl tol factor remembered a b) the_same))
+(define-fun makes_factor ((a T) (b T)) Bool
+  (and (not (fp.eq a b)) (not (fp.isZero a)) (not (fp.isZero b))
+       (= (fp.lt a zero) (fp.lt b zero)) (not (fp.leq tol zero)) (not (fp.geq tol bits))
+       (not (fp.eq (diff a b) (larger a b))) (not remembered)
+       (not (far_apart (diff a b) (larger a b)))))
+(define-fun claim_same () Bool (= (same x y) (same y x)))
+(define-fun claim_factor () Bool (= (makes_factor x y) (makes_factor y x)))
+(define-fun claim_order () Bool
+  (=> (not (or (fp.isNaN x) (fp.isNaN y)))
+      (= (compare_impl tol factor remembered x y)
+         (bvneg (compare_impl tol factor remembered y x)))))
