@@ -5,7 +5,7 @@
 ; for: single, double
 ; with: real_type arithmetic rule block_test two_reals
 ; fault: (fp.lt (times (difference x y) divisor) => (fp.leq (times (difference x y) divisor)
-; fault: (fp.isZero y) (ite => (fp.isNaN y) (ite
+; fault: (ite (fp.eq x y) the_same => (ite (= x y) the_same
 
 (declare-const tol T)
 (assert (fp.geq tol bits))

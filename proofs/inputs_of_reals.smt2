@@ -5,7 +5,6 @@
 ; with: real_type arithmetic rule block_test
 ; fault: (fp.lt d (times m factor)) => (fp.leq d (times m factor))
 ; fault: (fp.lt (over d factor) m) => (fp.leq (over d factor) m)
-; fault: (fp.geq m one) (fp.geq d => (fp.gt m one) (fp.geq d
 ; fault: (fp.leq m (plus d d)) => (fp.lt m (plus d d))
 ; fault: (fp.geq d (times m half)) => (fp.gt d (times m half))
 ; fault: (fp.eq d m) s => (fp.lt d m) s
