@@ -1,0 +1,170 @@
+// Surveys of the pairs of one kind: each draws a tolerance, judges some pairs under it, and draws
+// the next.
+
+#ifndef TALNUMERICARRAY_TESTS_SURVEYS_H
+#define TALNUMERICARRAY_TESTS_SURVEYS_H
+
+#include "exactness.h"
+#include "limit_pairs.h"
+#include "random_arrays.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <limits>
+#include <type_traits>
+#include <utility>
+
+namespace exactness {
+
+// How many pairs, and one of how many the exact rule judges as well as the quick one.
+struct Extent {
+    std::uint64_t pairs;
+    std::uint32_t verify_one_in;
+};
+
+constexpr std::uint64_t pairs_under_one_tolerance = 64;
+
+// The share of the larger number by which pairs differ at the limit, or at some number where there
+// is none.
+template <typename T>
+T share_at_limit(const double tolerance, const double limit) {
+    const bool has_limit = limit > 0;
+    return has_limit       ? static_cast<T>(limit)
+           : tolerance > 0 ? T{0.5}
+                           : std::numeric_limits<T>::epsilon() / 2;
+}
+
+// Calls `judge_next(survey, share)` for each pair.
+template <typename X, typename T, typename NextTolerance, typename JudgeNext>
+void survey(const std::uint64_t pairs, const Factor factor, const NextTolerance& next_tolerance,
+            const JudgeNext& judge_next) {
+    for (std::uint64_t judged = 0; judged < pairs;) {
+        const double tolerance = next_tolerance();
+        const Survey<X, T> under_tolerance(tolerance, factor);
+        const T share = share_at_limit<T>(tolerance, under_tolerance.limit());
+        const std::uint64_t last = std::min(pairs, judged + pairs_under_one_tolerance);
+        for (; judged < last; ++judged) {
+            judge_next(under_tolerance, share);
+        }
+    }
+}
+
+// ---- Reals
+
+// Where the larger magnitude is subnormal, the steps are further from the meaning.
+struct RealTallies {
+    Tally normal;
+    Tally subnormal;
+};
+
+template <typename T>
+bool is_subnormal_pair(const T x, const T y) {
+    return std::max(std::fabs(x), std::fabs(y)) < std::numeric_limits<T>::min();
+}
+
+template <typename T, typename NextTolerance, typename NextPair>
+RealTallies survey_pairs(oracle::Random& random, const Factor factor, const Extent extent,
+                         const NextTolerance& next_tolerance, const NextPair& next_pair) {
+    RealTallies tallies;
+    survey<T, T>(extent.pairs, factor, next_tolerance,
+                 [&](const Survey<T, T>& survey, const T share) {
+                     const auto [x, y] = next_pair(share);
+                     Tally& tally = is_subnormal_pair(x, y) ? tallies.subnormal : tallies.normal;
+                     survey.judge(x, y, tally);
+                     if (random.one_in(extent.verify_one_in)) {
+                         survey.verify(x, y, tally);
+                     }
+                 });
+    return tallies;
+}
+
+template <typename T>
+RealTallies survey_reals(oracle::Random& random, const Kind kind, const Factor factor,
+                         const Place place, const Extent extent) {
+    return survey_pairs<T>(
+        random, factor, extent,
+        [&] { return static_cast<double>(random_tolerance<T>(random, kind, place)); },
+        [&](const T share) { return random_pair(random, place, share); });
+}
+
+// ---- Singles under a tolerance that is no single
+
+// Of a magnitude that no rounding of the quotient disturbs. At the limit, they are as far around it
+// as a rounded tolerance moves it.
+inline std::pair<float, float> pair_under_rounded_tolerance(oracle::Random& random,
+                                                            const Place place, const float share) {
+    constexpr int ulps = 12;
+    const auto significand = static_cast<float>(1 + random.unit());
+    const float magnitude = std::ldexp(significand, random.between(-60, 60));
+    return with_random_order_and_sign(
+        random, place == Place::random
+                    ? std::pair<float, float>{magnitude, random_partner(random, magnitude, share)}
+                    : pair_at_limit(random, magnitude, share, ulps));
+}
+
+inline Tally survey_rounded_tolerances(oracle::Random& random, const double low, const double high,
+                                       const Place place, const Extent extent) {
+    return survey_pairs<float>(
+               random, Factor::remembered, extent,
+               [&] { return random_between(random, low, high); },
+               [&](const float share) {
+                   return pair_under_rounded_tolerance(random, place, share);
+               })
+        .normal;
+}
+
+// ---- Integers
+
+// Of more than `digits` digits: half of them near the middle of two reals of so many digits.
+inline std::uint64_t random_long_integer(oracle::Random& random, const int digits,
+                                         const int most_digits) {
+    const int length = random.between(digits + 1, most_digits);
+    const std::uint64_t integer = (random.bits() | (std::uint64_t{1} << 63)) >> (64 - length);
+    const std::uint64_t half = std::uint64_t{1} << (length - digits - 1);
+    if (random.one_in(2)) {
+        return integer;
+    }
+    const std::uint64_t tie = (integer | half) & ~(half - 1);
+    return tie + static_cast<std::uint64_t>(random.between(0, 2)) - 1;
+}
+
+template <typename X>
+X random_integer_of(oracle::Random& random, const int digits) {
+    const std::uint64_t magnitude =
+        random_long_integer(random, digits, std::numeric_limits<X>::digits);
+    const bool negative = std::is_signed_v<X> && random.one_in(2);
+    return static_cast<X>(negative ? 0 - magnitude : magnitude);
+}
+
+template <typename T>
+T partner_of_integer(oracle::Random& random, const Place place, const T rounded, const T share) {
+    const T magnitude = std::fabs(rounded);
+    const T partner = place == Place::random ? random_partner(random, magnitude, share)
+                      : random.one_in(2)     ? magnitude - magnitude * share
+                                             : magnitude / (1 - share);
+    return std::copysign(place == Place::random ? partner : moved_at_random(random, partner, 1),
+                         rounded);
+}
+
+template <typename X, typename T>
+Tally survey_integers(oracle::Random& random, const Kind kind, const Factor factor,
+                      const Place place, const Extent extent) {
+    Tally tally;
+    survey<X, T>(
+        extent.pairs, factor,
+        [&] { return static_cast<double>(random_tolerance<T>(random, kind, place)); },
+        [&](const Survey<X, T>& survey, const T share) {
+            const X integer = random_integer_of<X>(random, std::numeric_limits<T>::digits);
+            const T real = partner_of_integer(random, place, static_cast<T>(integer), share);
+            survey.judge(integer, real, tally);
+            if (random.one_in(extent.verify_one_in)) {
+                survey.verify(integer, real, tally);
+            }
+        });
+    return tally;
+}
+
+} // namespace exactness
+
+#endif
