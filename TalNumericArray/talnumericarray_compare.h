@@ -29,7 +29,8 @@
 // `tol` is the tolerance for reals, a count of binary digits: two nonzero reals of the same sign
 // are the same when they differ by less than 2^(tol - bits) times the larger magnitude, `bits`
 // being 53 where doubles are compared and 24 where singles are; there `tol` is first rounded to a
-// single, so that 23.99999999 counts as 24 and 1e-46 as 0. A `tol` of 0 or less, or NaN, asks for
+// single, so that 23.99999999 counts as 24 and 1e-46 as 0. A whole `tol` is kept exactly, a
+// fractional one as exactly as rounding allows. A `tol` of 0 or less, or NaN, asks for
 // equality; one of `bits` or more makes any two nonzero reals of the same sign the same. Zero is
 // never the same as another number, nor a number the same as one of the other sign. Integers are
 // compared exactly.

@@ -198,7 +198,7 @@ NESK_EXPANDED int compare_impl(const T& tol, const T& x, const T y) noexcept {
     }
 
     // A magnitude of at least 1 times the factor, like a difference below 1 divided by it, neither
-    // underflows nor overflows.
+    // falls to zero nor overflows.
     if (max >= 1) {
         max = max * tolfactor;
     } else {
