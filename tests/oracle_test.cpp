@@ -1,10 +1,14 @@
 // Worked examples, by which a reader can trust the oracle before the oracle judges anything.
 
+#include "support/floating_point_modes.h"
 #include "support/oracle.h"
 
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstddef>
+#include <cstdint>
+#include <iterator>
 #include <limits>
 
 namespace {
@@ -120,6 +124,22 @@ TEST(Oracle, RoundsAnIntegerToSingleOnce) {
     const std::int64_t above_midway = (std::int64_t{1} << 60) + (std::int64_t{1} << 36) + 1;
     EXPECT_TRUE(same(0, 7, above_midway, 9, 0x1.000002p60F));
     EXPECT_FALSE(same(0, 7, above_midway, 9, 0x1p60F));
+}
+
+// 2^24 + 1 lies midway between two singles.
+TEST(Oracle, RoundsAnIntegerInTheDirectionOfRounding) {
+    const std::int32_t midway = 16777217;
+    const float below = 16777216.0F;
+    const float above = 16777218.0F;
+    const bool goes_up[] = {false, true, false, false};
+    const bool opposite_goes_up[] = {true, true, false, true};
+    for (std::size_t i = 0; i < std::size(roundings); ++i) {
+        SCOPED_TRACE(roundings[i].name);
+        const RoundingScope scope(roundings[i]);
+        EXPECT_TRUE(same(0, 5, midway, 9, goes_up[i] ? above : below));
+        EXPECT_TRUE(same(0, 5, -midway, 9, opposite_goes_up[i] ? -below : -above));
+        EXPECT_TRUE(same(0, 5, midway - 1, 9, below));
+    }
 }
 
 TEST(Oracle, ComparesReals) {

@@ -1,6 +1,7 @@
 #include "oracle.h"
 
 #include <algorithm>
+#include <cfenv>
 #include <cmath>
 #include <cstring>
 #include <limits>
@@ -48,19 +49,20 @@ struct Number {
     bool negative;
     std::uint64_t magnitude;
     double real;
+    std::size_t size; // of an integer, in bytes
 };
 
-Number integer_number(std::int64_t value) {
+Number integer_number(std::int64_t value, std::size_t size) {
     const auto bits = static_cast<std::uint64_t>(value);
-    return value < 0 ? Number{true, true, 0 - bits, 0} : Number{true, false, bits, 0};
+    return value < 0 ? Number{true, true, 0 - bits, 0, size} : Number{true, false, bits, 0, size};
 }
 
-Number natural_number(std::uint64_t value) {
-    return {true, false, value, 0};
+Number natural_number(std::uint64_t value, std::size_t size) {
+    return {true, false, value, 0, size};
 }
 
 Number real_number(double value) {
-    return {false, false, 0, value};
+    return {false, false, 0, value, 0};
 }
 
 struct Element {
@@ -113,9 +115,9 @@ Element decode(ElementType type, const unsigned char* at) {
     const Number zero = real_number(0);
     switch (type.kind) {
     case Kind::signed_integer:
-        return {integer_number(load_signed(at, size)), zero};
+        return {integer_number(load_signed(at, size), size), zero};
     case Kind::unsigned_integer:
-        return {natural_number(load_unsigned(at, size)), zero};
+        return {natural_number(load_unsigned(at, size), size), zero};
     case Kind::real:
         return {real_number(load_real(at, size)), zero};
     default:
@@ -129,9 +131,34 @@ Element element_at(const Array& array, std::int32_t index) {
     return decode(element_type(array.type_id), bytes + offset);
 }
 
-// Rounds to `digits` binary digits, ties to even, in whole numbers: a single thus comes from an
-// integer in one rounding, whatever conversion the compiler would choose.
-double rounded(std::uint64_t magnitude, int digits) {
+// 32-bit ARM has no instruction that converts an integer of 64 bits, and the routine that does it
+// rounds to nearest in every direction of rounding.
+#if defined(__arm__)
+constexpr std::size_t widest_converted_by_instruction = 4;
+#else
+constexpr std::size_t widest_converted_by_instruction = 8;
+#endif
+
+// Whether a magnitude between two reals goes to the greater one, as the direction of rounding says;
+// to nearest, from midway to the even one.
+bool goes_up(const Number& integer, std::uint64_t kept, std::uint64_t rest, std::uint64_t half) {
+    const bool by_instruction = integer.size <= widest_converted_by_instruction;
+    switch (by_instruction ? std::fegetround() : FE_TONEAREST) {
+    case FE_UPWARD:
+        return !integer.negative;
+    case FE_DOWNWARD:
+        return integer.negative;
+    case FE_TOWARDZERO:
+        return false;
+    default:
+        return rest > half || (rest == half && kept % 2 == 1);
+    }
+}
+
+// Rounds to `digits` binary digits in whole numbers: a single thus comes from an integer in one
+// rounding, whatever conversion the compiler would choose.
+double rounded(const Number& integer, int digits) {
+    const std::uint64_t magnitude = integer.magnitude;
     int dropped = 0;
     while (((magnitude >> dropped) >> digits) != 0) {
         ++dropped;
@@ -140,7 +167,7 @@ double rounded(std::uint64_t magnitude, int digits) {
     if (dropped > 0) {
         const std::uint64_t rest = magnitude - (kept << dropped);
         const std::uint64_t half = std::uint64_t{1} << (dropped - 1);
-        kept += rest > half || (rest == half && kept % 2 == 1) ? 1 : 0;
+        kept += rest > 0 && goes_up(integer, kept, rest, half) ? 1 : 0;
     }
     return std::ldexp(static_cast<double>(kept), dropped);
 }
@@ -149,7 +176,7 @@ double value_of(const Number& number, int digits) {
     if (!number.is_integer) {
         return number.real;
     }
-    const double magnitude = rounded(number.magnitude, digits);
+    const double magnitude = rounded(number, digits);
     return number.negative ? -magnitude : magnitude;
 }
 
@@ -182,7 +209,8 @@ int compare_reals(FactorCache& cache, Real (*factor_of)(Real), Real tolerance, R
         return 0;
     }
     const Real larger = std::max(std::fabs(x), std::fabs(y));
-    const Real difference = std::fabs(x - y);
+    // Not the magnitude of any difference, as a negative one may be rounded otherwise.
+    const Real difference = x > y ? x - y : y - x;
     if (difference == larger) {
         return order;
     }
