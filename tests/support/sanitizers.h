@@ -1,0 +1,18 @@
+// Which sanitizer's instrumentation the tests are compiled with.
+
+#ifndef TALNUMERICARRAY_TESTS_SANITIZERS_H
+#define TALNUMERICARRAY_TESTS_SANITIZERS_H
+
+#if defined(__SANITIZE_ADDRESS__)
+inline constexpr bool address_sanitizer = true;
+#else
+inline constexpr bool address_sanitizer = false;
+#endif
+
+#if defined(__SANITIZE_THREAD__)
+inline constexpr bool thread_sanitizer = true;
+#else
+inline constexpr bool thread_sanitizer = false;
+#endif
+
+#endif
