@@ -66,7 +66,7 @@ class WhatIsRemembered {
     }
 
   private:
-    int answer(const Array<double>& array1, const Array<double>& array2) const noexcept {
+    static int answer(const Array<double>& array1, const Array<double>& array2) noexcept {
         return TalNumericArray_sameQ(52.5, 1, array1.handle(), array2.handle());
     }
 
