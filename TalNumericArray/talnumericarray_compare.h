@@ -4,10 +4,18 @@
 //
 // Both predicates only read the records and what they point to, and take no reference on them; the
 // caller keeps them alive and unchanged for the length of a call. Any number of threads may compare
-// the same records at once, and so may a signal handler, even one that has interrupted a
-// comparison. Neither predicate allocates, throws, locks or logs. The comparison of reals may raise
-// floating-point status flags, overflow among them, which a program that traps on them has to mask
-// for the call.
+// the same records at once. Neither predicate allocates, throws, locks, logs or calls the system,
+// and each takes at most 2 KiB of stack, what it calls of the C library included. A signal handler
+// may interrupt a comparison anywhere, compare itself, and leave it for good; a child may compare
+// after a fork.
+//
+// errno, the direction of rounding, traps and other modes of floating point stay as they are, and
+// no status flag is cleared. The comparison of reals may raise flags: invalid where an element is a
+// NaN or an infinity or `tol` is a NaN; overflow by a `tol` too large for a single and, in long
+// arrays, by elements far apart; underflow by a `tol` or elements of about the least normal number;
+// inexact by anything; division by zero never. A program that traps on these has to mask them for
+// the call. The answer is that of the rule in the direction of rounding in force; where the
+// processor takes subnormal numbers for zero, they count as zero unless bits are compared.
 //
 // Nothing but what is said below is checked: a null handle, a null `dims` with a rank above 0, a
 // null `data` with a count above 0, a `data` that is not aligned for its elements, a negative rank
@@ -50,7 +58,8 @@
 // The last factor 2^(tol - bits) that was needed is remembered, for each real type and thread. That
 // shows in an answer only where `tol` lies between `bits` - 1 and `bits`: then two numbers that
 // differ by half the larger or more are the same only if this factor is remembered already, be it
-// from an earlier pair of the same arrays or from an earlier call.
+// from an earlier pair of the same arrays or from an earlier call. A signal handler that compares
+// leaves its own factor.
 //
 // Two arrays of one shape without elements are the same whatever their types. Otherwise an array
 // whose `data_type` is outside 1 to 12 is the same as none.
