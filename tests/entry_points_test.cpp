@@ -252,6 +252,20 @@ TEST(Count, OfZeroInTheFirstArrayIsEnough) {
     EXPECT_EQ(sameQ(0, array1, array2), 1);
 }
 
+// 65536 elements, which are none in 16 bits.
+TEST(Count, HasMoreThan16Bits) {
+    constexpr std::size_t count = 65536;
+    std::vector<BIT32> integers(count, 1);
+    const std::vector<talint> dimensions = {static_cast<talint>(count)};
+    const Array<BIT32> array1(dimensions, integers);
+    integers.back() = 2;
+    const Array<BIT32> array2(dimensions, integers);
+    const Array<double> array3(dimensions, std::vector<double>(integers.begin(), integers.end()));
+    EXPECT_EQ(sameQ(0, array1, array2), 0);
+    EXPECT_EQ(sameQ(0, array1, array3), 0);
+    EXPECT_EQ(sameQ(0, array2, array3), 1);
+}
+
 TEST(Identity, AnArrayIsEquivalentToItselfAndTheSameByItsBytes) {
     for (const ElementType& type : element_types) {
         const AnyArray array(type, {1, 2, 3});
