@@ -85,6 +85,7 @@ const Case double_cases[] = {
     {"NaNAndNaN", 10, nan, nan, -1},
     {"NaNAndMinusOne", 10, nan, -1.0, 1},
     {"MinusOneAndNaN", 10, -1.0, nan, -1},
+    {"NaNAndMinusOneUnderNone", 0, nan, -1.0, 1},
     {"ZeroAndNaN", 10, 0.0, nan, -1},
     {"NaNAndZero", 10, nan, 0.0, 1},
     {"NaNTolerance", nan, 1.0, 1.0 + 0x1p-52, -1},

@@ -28,6 +28,12 @@ class Token:
     end: int
 
 
+def code_of(source):
+    """The text without comments and blanks."""
+    return " ".join(match.group() for match in _TOKEN.finditer(source)
+                    if match.lastgroup != "comment")
+
+
 def tokens_of(source):
     """The tokens that a mutant may touch: without comments, directives and static assertions."""
     tokens = [
@@ -82,6 +88,7 @@ class Change:
     begin: int
     end: int
     text: str
+    swaps: bool = False
 
 
 # An operator has blanks on both sides, as the sources are formatted; what looks like one and has
@@ -288,7 +295,7 @@ class Source:
                     begin, end = self.tokens[one[0]].begin, self.tokens[other[1]].end
                     between = self.text[self.tokens[one[1]].end : self.tokens[other[0]].begin]
                     yield Change(begin, end,
-                                 self._range_text(other) + between + self._range_text(one))
+                                 self._range_text(other) + between + self._range_text(one), True)
 
 
 # ---- Mutants
@@ -349,6 +356,8 @@ def mutants_of(path, text):
         seen.add(mutated)
         line = places.line_of(change.begin)
         what = f"{shown(text[change.begin:change.end])} -> {shown(change.text) or 'nothing'}"
+        if change.swaps:
+            what = f"{shown(change.text)} first"
         name = f"{path.split('/')[-1]}: {places.name(line)} [{what}]"
         taken[name] += 1
         if taken[name] > 1:

@@ -8,7 +8,7 @@
 A mutant is the module with one small change in its text. Each has to make a test fail, or to stand
 in equivalent.txt with the reason why none can tell it from the module; the run fails where one does
 neither, or both. Everything is built below build/mutation. What a step finds is kept there, and is
-looked for again only where the mutant or the sources of the step have changed.
+looked for again only where the code of the module or the sources of the step have changed.
 """
 
 import hashlib
@@ -22,7 +22,8 @@ from dataclasses import dataclass
 
 import mutants
 import steps
-from steps import ARRAYS, BLOCKS, PARTS, READING, SCALARS, ROOT, WORK, Broken, Killed
+from steps import (ARRAYS, BLOCKS, BLOCKS_OF_SETS, PARTS, READING, ROOT, SCALARS, SMALL, WORK,
+                   Broken, Killed)
 
 FILES = ["Includes/taldata_array_element_types.h", "Includes/talnumericarray.h",
          "Includes/taltensor.h", "TalNumericArray/*.cpp", "TalNumericArray/*.h",
@@ -46,11 +47,13 @@ def rank(mutant):
 
 
 def chosen(found):
-    """One mutant of each line."""
+    """One mutant of each line, and all that change the order of two statements."""
     by_line = defaultdict(list)
     for mutant in found:
         by_line[mutant.line].append(mutant)
-    return [min(line, key=rank) for _, line in sorted(by_line.items())]
+    for _, line in sorted(by_line.items()):
+        best = min((mutant for mutant in line if not mutant.change.swaps), key=rank, default=None)
+        yield from (mutant for mutant in line if mutant is best or mutant.change.swaps)
 
 
 def all_mutants():
@@ -127,8 +130,8 @@ class Run:
             self.trees.append(tree)
 
     def _outcome(self, mutant, tree):
-        module = steps.digest(*({**tree.texts, mutant.path: mutant.applied(
-            tree.texts[mutant.path])}[path] for path in sorted(tree.texts)))
+        texts = {**tree.texts, mutant.path: mutant.applied(tree.texts[mutant.path])}
+        module = steps.digest(*(mutants.code_of(texts[path]) for path in sorted(texts)))
         for name, sources, find in self._steps(mutant, tree):
             key = steps.digest(module, name, sources)
             kind, by = self.memory.ask(key, lambda find=find: self._found(find))
@@ -154,11 +157,18 @@ class Run:
             return (step(part) for part in parts if mutant.path in self.needs[part])
         yield from steps_of(SCALARS)
         yield step(ARRAYS)
-        yield from steps_of((BLOCKS, *PARTS) if "TalNumericArray" in mutant.path else PARTS)
+        of_sets = "instruction_sets" in mutant.path
+        if "TalNumericArray" in mutant.path and not of_sets:
+            yield from steps_of([BLOCKS])
+        yield from steps_of(PARTS)
+        if "TalNumericArray" in mutant.path:
+            yield step(SMALL)
         yield "same code", "", lambda: self._same_code(tree)
         yield step(READING)
-        yield step(BLOCKS)
-        yield "release build", steps.checked_sources(), lambda: self._release(mutant, tree)
+        if of_sets:
+            yield step(BLOCKS_OF_SETS)
+        if mutant.change.text == "":
+            yield "release build", steps.checked_sources(), lambda: self._release(mutant, tree)
 
     def _same_code(self, tree):
         """No test of what is compiled can tell them apart."""
@@ -203,7 +213,8 @@ def complaints(outcomes, reasons):
 
 
 GROUPS = {**{part.name: "parts" for part in SCALARS + PARTS}, ARRAYS.name: "arrays",
-          READING.name: "reading", BLOCKS.name: "blocks", "release build": "release"}
+          SMALL.name: "arrays", READING.name: "reading", BLOCKS.name: "blocks",
+          "release build": "release"}
 COLUMNS = {"arrays": "whole arrays", "parts": "tests of parts", "reading": "`reading_test`",
            "blocks": "`blocks_test`", "release": "release build", TIME_OUT: "time-out",
            SURVIVES: "equivalent"}

@@ -7,7 +7,7 @@ import resource
 import shutil
 import subprocess
 import threading
-from dataclasses import dataclass
+from dataclasses import dataclass, field, replace
 from pathlib import Path
 
 ROOT = Path(__file__).resolve().parents[2]
@@ -33,6 +33,7 @@ class Program:
     fixed: tuple = ()
     level: str = "-O0"         # of the sources that see the mutant
     link: tuple = ()
+    run: tuple = field(default=(), repr=False)
     module_level: str = "-O0"
 
 
@@ -45,6 +46,8 @@ ARRAYS = Program("whole arrays", (),
                  (*(f"tests/{name}.cpp" for name in
                     ("complex_pairs_test", "golden_calls_test", "random_calls_test",
                      "threads_test")), *SUPPORT))
+# Without blocks, as with the option to optimise for size.
+SMALL = replace(ARRAYS, name="whole arrays, built for size", module_level="-Os")
 SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
                           "tolerance_shift_factor_test")))
 PARTS = (
@@ -57,6 +60,9 @@ PARTS = (
 )
 READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O2")
 BLOCKS = own("blocks_test", *SUPPORT)
+# Of all sets, and so without the longest of the tests, which says no more of them than of one.
+BLOCKS_OF_SETS = own("blocks_test", *SUPPORT,
+                     run=("--gtest_filter=-BlockLoops.AnswerAndRememberAsTheElementLoop",))
 
 # All sets have the same loops, so that one will do but where sets are chosen.
 ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
@@ -243,7 +249,7 @@ class Bench:
             raise Broken("does not link: " + first_error(text))
         environment = {**os.environ, "TALNUMERICARRAY_SEED": "1",
                        "GTEST_BREAK_ON_FAILURE": "1", "GTEST_FAIL_FAST": "1"}
-        status, text = command([str(target)], seconds, env=environment,
+        status, text = command([str(target), *program.run], seconds, env=environment,
                                   cwd=tree.folder)
         if status in (-24, -9):
             raise Killed("time-out")
