@@ -22,8 +22,8 @@ from dataclasses import dataclass
 
 import mutants
 import steps
-from steps import (ARRAYS, BLOCKS, BLOCKS_OF_SETS, PARTS, READING, ROOT, SCALARS, SMALL, WORK,
-                   Broken, Killed)
+from steps import (ARRAYS, BLOCKS, BLOCKS_OF_SETS, PARTS, READING, ROOT, SCALARS, SIGNALS, SMALL,
+                   WORK, Broken, Killed)
 
 FILES = ["Includes/taldata_array_element_types.h", "Includes/talnumericarray.h",
          "Includes/taltensor.h", "TalNumericArray/*.cpp", "TalNumericArray/*.h",
@@ -154,20 +154,24 @@ class Run:
             return (program.name, self.bench.sources(program),
                     lambda: self.bench.run(program, tree, self.bench.limit(program)))
         def steps_of(parts):
-            return (step(part) for part in parts if mutant.path in self.needs[part])
+            return (step(part) for part in parts
+                    if mutant.path in self.needs[part] or mutant.path == steps.MODULE)
         yield from steps_of(SCALARS)
         yield step(ARRAYS)
         of_sets = "instruction_sets" in mutant.path
         if "TalNumericArray" in mutant.path and not of_sets:
             yield from steps_of([BLOCKS])
+        yield "same code", "", lambda: self._same_code(tree)
         yield from steps_of(PARTS)
+        if "/compare.h" in mutant.path:
+            yield step(SIGNALS)
         if "TalNumericArray" in mutant.path:
             yield step(SMALL)
-        yield "same code", "", lambda: self._same_code(tree)
         yield step(READING)
         if of_sets:
             yield step(BLOCKS_OF_SETS)
         if mutant.change.text == "":
+            # An attribute, say, of which nothing but the built files tells.
             yield "release build", steps.checked_sources(), lambda: self._release(mutant, tree)
 
     def _same_code(self, tree):
@@ -212,7 +216,7 @@ def complaints(outcomes, reasons):
             yield f"{outcome.kind}, but is listed as equivalent: {mutant.name}"
 
 
-GROUPS = {**{part.name: "parts" for part in SCALARS + PARTS}, ARRAYS.name: "arrays",
+GROUPS = {**{part.name: "parts" for part in (*SCALARS, *PARTS, SIGNALS)}, ARRAYS.name: "arrays",
           SMALL.name: "arrays", READING.name: "reading", BLOCKS.name: "blocks",
           "release build": "release"}
 COLUMNS = {"arrays": "whole arrays", "parts": "tests of parts", "reading": "`reading_test`",
@@ -277,9 +281,10 @@ def main():
         wrong += [f"of quick.txt, but no mutant: {name}" for name in read_list("quick.txt")
                   if name not in names]
     usage = resource.getrusage(resource.RUSAGE_CHILDREN)
-    print(f"{len(found)} mutants in {(usage.ru_utime + usage.ru_stime) / 60:.0f} minutes of a core:",
-          ", ".join(f"{count} {kind}" for kind, count in
-                    Counter(outcome.kind for outcome in outcomes.values()).items()))
+    minutes = (usage.ru_utime + usage.ru_stime) / 60
+    kinds = Counter(outcome.kind for outcome in outcomes.values())
+    print(f"{len(found)} mutants, {minutes:.0f} minutes of a core:",
+          ", ".join(f"{count} {kind}" for kind, count in kinds.items()))
     if not found:
         wrong.append(f"no mutant has '{argument}' in its name")
     print(*wrong, sep="\n")

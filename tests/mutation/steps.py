@@ -1,5 +1,6 @@
 """Builds the tests against one copy of the module after the other, and tells which of them fail."""
 
+import functools
 import hashlib
 import os
 import re
@@ -31,7 +32,7 @@ class Program:
     name: str
     mutated: tuple = ()
     fixed: tuple = ()
-    level: str = "-O0"         # of the sources that see the mutant
+    level: str = "-O0"  # of the sources that see the mutant
     link: tuple = ()
     run: tuple = field(default=(), repr=False)
     module_level: str = "-O0"
@@ -58,7 +59,8 @@ PARTS = (
     own("power_calls_test", link=("-Wl,--wrap=pow,--wrap=powf",)),
     own("subnormal_singles_test"),
 )
-READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O2")
+SIGNALS = Program("signals_test", (), ("tests/signals_test.cpp", *SUPPORT), link=("-Wl,-z,now",))
+READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O1")
 BLOCKS = own("blocks_test", *SUPPORT)
 # Of all sets, and so without the longest of the tests, which says no more of them than of one.
 BLOCKS_OF_SETS = own("blocks_test", *SUPPORT,
@@ -158,17 +160,20 @@ class UnharmedTree(Tree):
 
     def _compile(self, source, flags, target):
         stamp = Path(f"{target}.stamp")
-        texts = digest(source, *flags, *self.texts.values(), *test_texts())
+        texts = digest(*flags, *self.texts.values(), test_texts((source,)))
         if not (target.exists() and stamp.exists() and stamp.read_text() == texts):
             stamp.unlink(missing_ok=True)
             super()._compile(source, flags, target)
             stamp.write_text(texts)
 
 
-def test_texts():
-    paths = [path for folder in ("tests", "tests/support") for path in (ROOT / folder).iterdir()]
-    return [path.read_text(encoding="utf-8") for path in sorted(paths)
-            if path.suffix in (".h", ".cpp")]
+@functools.lru_cache(maxsize=None)
+def test_texts(sources):
+    """The sources and what they include of the tests, as one number."""
+    _, text = command(["g++", *FLAGS, *(f"-I{name}" for name in (*FOLDERS, "tests")), "-MM",
+                       *sources], cwd=ROOT)
+    names = {name for name in text.split() if name.startswith("tests/")}
+    return digest(*((ROOT / name).read_text(encoding="utf-8") for name in sorted(names)))
 
 
 def compile_source(folder, source, flags, target):
@@ -178,8 +183,8 @@ def compile_source(folder, source, flags, target):
                   f"-DDEFAULT_RANDOM_CALLS={RANDOM_CALLS}",
                   f'-DGOLDEN_CALLS="{ROOT}/tests/golden_calls.txt"', "-c", str(ROOT / source)]
     else:
-        words += ["-fno-exceptions", *(["-include", str(WORK / "standard.h")] if "-O0" in flags
-                                       else []), "-c", source]
+        words += ["-include", str(WORK / "standard.h")] if "-O0" in flags else []
+        words += ["-fno-exceptions", "-c", source]
     status, text = command([*words, "-o", str(target)], cwd=folder)
     if status != 0:
         raise Broken(first_error(text))
@@ -226,16 +231,13 @@ class Bench:
             except (Broken, Killed) as failure:
                 raise RuntimeError(f"{program.name} fails without a mutant: {failure}") from None
             return resource.getrusage(resource.RUSAGE_CHILDREN).ru_utime - before
-        key = digest("unharmed", repr(program), *self.tree.texts.values(), *test_texts())
+        key = digest("unharmed", *self.tree.texts.values(), self.sources(program))
         with self.lock:
             return int(10 + 3 * self.memory.ask(key, seconds))
 
-    @staticmethod
-    def sources(program):
+    def sources(self, program):
         """What the finding depends on besides the module."""
-        paths = [ROOT / path for path in (*program.mutated, *program.fixed)]
-        paths += sorted((ROOT / "tests" / "support").iterdir())
-        return digest(repr(program), *(path.read_text(encoding="utf-8") for path in paths))
+        return digest(repr(program), test_texts((*program.mutated, *program.fixed)))
 
     def run(self, program, tree, seconds):
         """Builds and runs the program with the tree's module; raises Killed where a test fails."""
@@ -243,22 +245,22 @@ class Bench:
         objects += [tree.object(MODULE, program.module_level), tree.object(TABLE, "-O0")]
         objects += [self.tree.object(source, "-O1") for source in program.fixed]
         target = tree.folder / "program"
-        status, text = command(["g++", "-fuse-ld=gold", *map(str, objects), *program.link, "-lgtest",
-                                   "-lgtest_main", "-pthread", "-o", str(target)])
+        status, text = command(["g++", "-fuse-ld=gold", *map(str, objects), *program.link,
+                                "-lgtest", "-lgtest_main", "-pthread", "-o", str(target)])
         if status != 0:
             raise Broken("does not link: " + first_error(text))
         environment = {**os.environ, "TALNUMERICARRAY_SEED": "1",
                        "GTEST_BREAK_ON_FAILURE": "1", "GTEST_FAIL_FAST": "1"}
         status, text = command([str(target), *program.run], seconds, env=environment,
-                                  cwd=tree.folder)
+                               cwd=tree.folder)
         if status in (-24, -9):
             raise Killed("time-out")
         if status != 0:
             raise Killed(last_test(text))
 
     def same_code(self, tree):
-        return (tree.object(MODULE, "-O2").read_bytes()
-                == self.tree.object(MODULE, "-O2", tree.sets).read_bytes())
+        return (tree.object(MODULE, "-O1").read_bytes()
+                == self.tree.object(MODULE, "-O1", tree.sets).read_bytes())
 
     def dependencies(self, sources):
         """The files of the module that the sources include, or are."""
@@ -335,11 +337,11 @@ class Suite:
 
     def run(self):
         status, text = command(["cmake", "--build", "--preset", "release", "--target",
-                                   *CHECKED_TARGETS, "--", "-j1"], cwd=self.folder)
+                                *CHECKED_TARGETS, "--", "-j1"], cwd=self.folder)
         if status != 0:
             raise Killed("warning: " + first_error(text))
         status, text = command(["ctest", "--preset", "release", "-j1", "--stop-on-failure",
-                                   "--tests-regex", CHECKED_TESTS], cwd=self.folder)
+                                "--tests-regex", CHECKED_TESTS], cwd=self.folder)
         if status != 0:
             failed = re.search(r"^\s*\d+ - (\S+)", text, flags=re.MULTILINE)
             raise Killed(failed.group(1) if failed else "ctest")
