@@ -51,7 +51,12 @@ struct Filling {
     std::vector<double> same_under;
 };
 
-// Threes, and threes beside numbers that are near three.
+bool is_complex(const ElementType& type) {
+    return type.size != type.part_size;
+}
+
+// Threes, and threes beside numbers that are near three. Beside complex numbers zeros too, as many
+// of which as there are parts would be the same as these.
 std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2) {
     if (type1.is_integer && type2.is_integer) {
         return {{3, 3, {0.0, 10.0}}};
@@ -62,15 +67,20 @@ std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2
     const bool doubles = is_double(type1) || is_double(type2);
     const double near_three = doubles ? 3 + 0x1p-44 : 3 + 0x1p-15;
     const bool second_holds_it = doubles ? is_double(type2) : !type2.is_integer;
-    return {{3, 3, {std::begin(tolerances), std::end(tolerances)}},
-            {second_holds_it ? 3 : near_three, second_holds_it ? near_three : 3, {10, 10.5, 53}}};
+    std::vector<Filling> chosen = {
+        {3, 3, {std::begin(tolerances), std::end(tolerances)}},
+        {second_holds_it ? 3 : near_three, second_holds_it ? near_three : 3, {10, 10.5, 53}}};
+    if (is_complex(type1) != is_complex(type2)) {
+        chosen.push_back({0, 0, {0.0, 10.0}});
+    }
+    return chosen;
 }
 
 // How far behind its last element an array's page may end: one of complex numbers need only be
 // aligned as its parts are, so that an element may lie in two pages.
 std::vector<std::size_t> phases(const ElementType& type) {
-    return type.size == type.part_size ? std::vector<std::size_t>{0}
-                                       : std::vector<std::size_t>{0, type.part_size};
+    return is_complex(type) ? std::vector<std::size_t>{0, type.part_size}
+                            : std::vector<std::size_t>{0};
 }
 
 // All up to behind two blocks, those around the ends of two pages, and some between.
@@ -173,7 +183,7 @@ void expect_to_stop_at(const std::size_t position, const ElementType& type1,
     auto count = static_cast<talint>(position + 4 * page);
     auto record1 = record_of(type1, last1 - position * type1.size, &count);
     auto record2 = record_of(type2, last2 - position * type2.size, &count);
-    type1.store(last1, 0);
+    type1.store(last1, filling.value1 == 0 ? 3 : 0);
     for (const double tol : filling.same_under) {
         if (type1.id == type2.id && tol == 0.0) {
             continue; // compared as bytes, of which memcmp may read all
