@@ -153,20 +153,21 @@ class Run:
         def step(program):
             return (program.name, self.bench.sources(program),
                     lambda: self.bench.run(program, tree, self.bench.limit(program)))
+
         def steps_of(parts):
             return (step(part) for part in parts
                     if mutant.path in self.needs[part] or mutant.path == steps.MODULE)
+
         yield from steps_of(SCALARS)
         yield step(ARRAYS)
         of_sets = "instruction_sets" in mutant.path
         if "TalNumericArray" in mutant.path and not of_sets:
             yield from steps_of([BLOCKS])
+            yield step(SMALL)
         yield "same code", "", lambda: self._same_code(tree)
         yield from steps_of(PARTS)
         if "/compare.h" in mutant.path:
             yield step(SIGNALS)
-        if "TalNumericArray" in mutant.path:
-            yield step(SMALL)
         yield step(READING)
         if of_sets:
             yield step(BLOCKS_OF_SETS)
@@ -242,8 +243,9 @@ def table(outcomes):
     for name, counts in by_file.items():
         cells = [counts[key] for key in COLUMNS]
         text += row([name, sum(cells), *cells]) if sum(cells) else ""
-    return (f"{text}\nAnother {total[BROKEN]} do not compile, and {total[ELSEWHERE]} lie in lines "
-            "for other platforms or compilers.\n")
+    elsewhere = (f", and {total[ELSEWHERE]} lie in lines for other platforms or compilers"
+                 if total[ELSEWHERE] else "")
+    return f"{text}\nAnother {total[BROKEN]} do not compile{elsewhere}.\n"
 
 
 def renew_document(outcomes):

@@ -256,7 +256,7 @@ class Bench:
         if status in (-24, -9):
             raise Killed("time-out")
         if status != 0:
-            raise Killed(last_test(text))
+            raise Killed(failing_test(text))
 
     def same_code(self, tree):
         return (tree.object(MODULE, "-O1").read_bytes()
@@ -292,9 +292,11 @@ class Bench:
         return compiled
 
 
-def last_test(text):
-    tests = re.findall(r"^\[ RUN      \] (\S+)", text, flags=re.MULTILINE)
-    return tests[-1] if tests else "before the first test"
+def failing_test(text):
+    """The first that says so, else the one in which the program ended."""
+    failed = re.search(r"^\[  FAILED  \] (\S+)", text, flags=re.MULTILINE)
+    begun = re.findall(r"^\[ RUN      \] (\S+)", text, flags=re.MULTILINE)
+    return failed.group(1) if failed else begun[-1] if begun else "before the first test"
 
 
 # ---- The release build's own checks
