@@ -73,7 +73,7 @@ INTEGERS = {
     for signed in (True, False)
 }
 
-# The instances of each family, and whether a fault has to show in all of them or in one.
+# The instances of each family. A fault has to show in one of them.
 FAMILIES = {
     "single": {"single": real_family(8, 24)},
     "double": {"double": real_family(11, 53)},
