@@ -71,7 +71,7 @@ int make_calls(const PreparedCalls& prepared) {
     return prepared.wrong_answers();
 }
 
-int touch_the_limit(const PreparedCalls&) {
+int touch_the_limit(const PreparedCalls& /*unused*/) {
     volatile unsigned char touched[limit];
     for (volatile unsigned char& byte : touched) {
         byte = 0;
