@@ -1,11 +1,13 @@
 #!/usr/bin/python3
 """Writes the named inputs of corpus/npy_files: make_npy_seeds.py [FOLDER].
 
-An input is an .npy file or two of them, one behind the other.
+An input is an .npy file, two of them, one behind the other, or an .npz archive.
 """
 
+import io
 import struct
 import sys
+import zipfile
 from pathlib import Path
 
 # By the letters of .npy files and those of the module struct.
@@ -25,6 +27,15 @@ def row(code, values, byte_order="<"):
     elements = b"".join(struct.pack(byte_order + letters, *[value] * len(letters))
                         for value in values)
     return npy(f"'{byte_order}{code}'", f"({len(values)},)", elements)
+
+
+def archive(compression, members):
+    contents = io.BytesIO()
+    with zipfile.ZipFile(contents, "w", compression) as file:
+        for name, member in members.items():
+            # With a fixed date, so that the bytes are the same each time.
+            file.writestr(zipfile.ZipInfo(name, (2000, 1, 1, 0, 0, 0)), member, compression)
+    return contents.getvalue()
 
 
 def seeds():
@@ -49,6 +60,17 @@ def seeds():
     yield "more_data", npy("'<f8'", "(1,)", two)
     yield "part_of_an_element", npy("'<f8'", "(2,)", two + b"1")
     yield "fortran_order", npy("'<f8'", "(2,)", two, order=True)
+    yield "two_orders", (npy("'|i1'", "(2, 3)", b"123456")
+                         + npy("'|i1'", "(2, 3)", b"142536", order=True))
+    yield "both_in_fortran_order", (npy("'|i1'", "(2, 3)", b"123456", order=True)
+                                    + npy("'|u1'", "(2, 3)", b"123467", order=True))
+    yield "order_of_rank_3", (npy("'<i2'", "(2, 2, 3)", bytes(range(24)))
+                              + npy("'<i2'", "(2, 2, 3)", bytes(range(24)), order=True))
+    for name, compression in ("stored", zipfile.ZIP_STORED), ("compressed", zipfile.ZIP_DEFLATED):
+        yield f"archive_{name}", archive(compression, {"x.npy": row("f8", [1, 2]),
+                                                       "y.npy": row("i1", [1] * 50)})
+    yield "archive_of_text", archive(zipfile.ZIP_STORED, {"notes.txt": b"no array"})
+    yield "archive_without_members", archive(zipfile.ZIP_STORED, {})
     yield "structured", npy("[('a', '<f8')]", "(2,)", two)
     yield "text", npy("'<U4'", "(1,)", two)
     yield "nan", row("f8", [float("nan"), 1]) + row("f8", [float("nan"), 2])

@@ -1,14 +1,15 @@
 // An input is an .npy file as it is, or, where a second one seems to begin in it, two files: what
 // is refused is refused with a message of one line, and what is read is compared as the oracle
-// would.
+// would. An input that begins as a zip archive does is read as one.
 
 #include "checked_call.h"
 
-#include "difference.h"
+#include "array_file.h"
+#include "comparison.h"
 #include "difference_text.h"
 #include "element_type.h"
-#include "npy_file.h"
 #include "npy_header.h"
+#include "support/memory_bytes.h"
 #include "trouble.h"
 
 #include <algorithm>
@@ -93,6 +94,8 @@ void check_against_text(const NpyHeader& header, const std::string_view dictiona
     require(code != std::string_view::npos && code > 0, "the type is the one that is written");
     require(header.bytes_swapped == (dictionary[code - 1] == '>' && type.size > 1),
             "the byte order is the one that is written");
+    require(header.fortran_order == (dictionary.find("True") != std::string_view::npos),
+            "the order is the one that is written");
 }
 
 void check_header(const NpyHeader& header, const std::size_t file_size) {
@@ -116,7 +119,8 @@ HeaderOrRefusal read_header(const std::string_view bytes) {
     const std::unique_ptr<unsigned char[]> block(new unsigned char[bytes.size()]);
     std::copy(bytes.begin(), bytes.end(), block.get());
     try {
-        const NpyHeader header = talcmp::read_npy_header(block.get(), bytes.size());
+        MemoryBytes file({reinterpret_cast<const char*>(block.get()), bytes.size()});
+        const NpyHeader header = talcmp::read_npy_header(file);
         check_header(header, bytes.size());
         const std::size_t begin = bytes[6] == 1 ? 10 : 12;
         check_against_text(header, bytes.substr(begin, header.data_offset - begin));
@@ -151,70 +155,138 @@ class MemoryFile {
     int descriptor_;
 };
 
+// An array, and its elements as they were read from it.
+struct OpenedArray {
+    std::unique_ptr<ArraySource> source;
+    std::vector<std::max_align_t> elements;
+};
+
+const unsigned char* element(const OpenedArray& array, const std::uint64_t position) {
+    const std::size_t size = talcmp::element_type(array.source->element_type()).size;
+    return reinterpret_cast<const unsigned char*>(array.elements.data()) + position * size;
+}
+
+// One element, as an array.
+oracle::Array at(const OpenedArray& array, const std::uint64_t position) {
+    return {array.source->element_type(), {}, 1, element(array, position)};
+}
+
+// Where the element lies that comes at `order` in row-major order.
+std::uint64_t position_of(const OpenedArray& array, const std::uint64_t order) {
+    if (!array.source->fortran_order()) {
+        return order;
+    }
+    const talcmp::Shape& shape = array.source->shape();
+    std::uint64_t rest = order;
+    std::uint64_t position = 0;
+    std::uint64_t stride = talcmp::element_count(*array.source);
+    for (std::size_t axis = shape.size(); axis-- > 0;) {
+        stride /= shape[axis];
+        position += rest % shape[axis] * stride;
+        rest /= shape[axis];
+    }
+    return position;
+}
+
 // The elements are those in the file, each part in the byte order of this machine.
-void check_elements(ArraySource& source, const NpyHeader& header, const std::string_view bytes) {
+void check_elements(const OpenedArray& array, const NpyHeader& header,
+                    const std::string_view bytes) {
     const talcmp::ElementType& type = talcmp::element_type(header.element_type);
-    std::string expected(bytes.substr(header.data_offset));
+    std::string expected(bytes.substr(static_cast<std::size_t>(header.data_offset)));
     if (header.bytes_swapped) {
         for (std::size_t i = 0; i < expected.size(); i += type.part_size) {
             const auto part = expected.begin() + static_cast<std::ptrdiff_t>(i);
             std::reverse(part, part + static_cast<std::ptrdiff_t>(type.part_size));
         }
     }
-    const void* const elements = source.elements(0, header.element_count);
-    require(std::memcmp(elements, expected.data(), expected.size()) == 0,
+    require(std::memcmp(array.elements.data(), expected.data(), expected.size()) == 0,
             "the elements are those in the file");
-    require(reinterpret_cast<std::uintptr_t>(elements) % type.alignment == 0,
-            "the elements are aligned");
+}
+
+OpenedArray read_all(const MemoryFile& file) {
+    OpenedArray array;
+    array.source = talcmp::open_array_file(file.path())->open("");
+    const std::uint64_t count = talcmp::element_count(*array.source);
+    const std::size_t size = talcmp::element_type(array.source->element_type()).size;
+    array.elements.resize(static_cast<std::size_t>(count) * size / sizeof(std::max_align_t) + 1);
+    array.source->read(0, count, array.elements.data());
+    return array;
+}
+
+// An archive is read to its end, or refused.
+void read_archive(const MemoryFile& file) {
+    try {
+        const auto archive = talcmp::open_array_file(file.path());
+        for (const std::string& member : archive->members()) {
+            const auto source = archive->open(member);
+            const std::size_t size = talcmp::element_type(source->element_type()).size;
+            std::vector<unsigned char> element(size);
+            const std::uint64_t count = talcmp::element_count(*source);
+            for (std::uint64_t i = 0; i < std::min<std::uint64_t>(count, 1000); ++i) {
+                source->read(i, 1, element.data());
+            }
+        }
+    } catch (const talcmp::Trouble& trouble) {
+        require(*trouble.what() != '\0', "a refusal says something");
+    }
 }
 
 // Nothing where the file is refused.
-std::unique_ptr<ArraySource> opened(const MemoryFile& file, const std::string_view bytes) {
-    const HeaderOrRefusal read = read_header(bytes);
+std::optional<OpenedArray> opened(const MemoryFile& file, const std::string_view bytes) {
     file.write(bytes);
+    if (bytes.substr(0, 2) == "PK") {
+        read_archive(file);
+        return std::nullopt;
+    }
+    const HeaderOrRefusal read = read_header(bytes);
     try {
-        auto source = std::make_unique<talcmp::NpyFile>(file.path());
+        OpenedArray array = read_all(file);
         require(read.header.has_value(), "the file is refused as its bytes are");
-        require(source->element_type() == read.header->element_type
-                    && source->shape() == read.header->shape
-                    && source->element_count() == read.header->element_count,
+        require(array.source->element_type() == read.header->element_type
+                    && array.source->shape() == read.header->shape
+                    && array.source->fortran_order() == read.header->fortran_order,
                 "the file has the header of its bytes");
-        check_elements(*source, *read.header, bytes);
-        return source;
+        check_elements(array, *read.header, bytes);
+        return array;
     } catch (const talcmp::Trouble& trouble) {
         require(trouble.what() == file.path() + ": " + read.refusal,
                 "the file is refused with the words for its bytes");
-        return nullptr;
+        return std::nullopt;
     }
 }
 
 // ---- The comparison
 
-// One element, as an array.
-oracle::Array at(ArraySource& source, const std::uint64_t position) {
-    return {source.element_type(), {}, 1, source.elements(position, 1)};
+oracle::State remembering(const double tolerance) {
+    oracle::State state;
+    oracle::compare_doubles(state, tolerance, 1, 1 + 0x1p-52);
+    oracle::compare_singles(state, static_cast<float>(tolerance), 1, 1 + 0x1p-23F);
+    return state;
 }
 
-std::optional<Difference> expected_difference(ArraySource& first, ArraySource& second,
-                                              const talcmp::Question& question) {
-    oracle::State state = fuzz::known_state();
-    if (first.shape() != second.shape()) {
-        return Difference{Difference::Kind::shape, 0};
+struct Expected {
+    Difference difference = Difference::none;
+    std::uint64_t order = 0; // of the first pair that differs
+    std::uint64_t differing = 0;
+};
+
+Expected expected_answer(const OpenedArray& first, const OpenedArray& second,
+                         const talcmp::Question& question) {
+    if (first.source->shape() != second.source->shape()) {
+        return {Difference::shape, 0, 0};
     }
-    if (question.strict_type && first.element_type() != second.element_type()) {
-        return Difference{Difference::Kind::type, 0};
-    }
-    for (std::uint64_t i = 0; i < first.element_count(); ++i) {
-        if (!oracle::same(state, question.tolerance, true, at(first, i), at(second, i))) {
-            return Difference{Difference::Kind::element, i};
+    Expected expected;
+    for (std::uint64_t i = talcmp::element_count(*first.source); i-- > 0;) {
+        oracle::State state = remembering(question.tolerance);
+        if (!oracle::same(state, question.tolerance, true, at(first, position_of(first, i)),
+                          at(second, position_of(second, i)))) {
+            expected = {Difference::elements, i, expected.differing + 1};
         }
     }
-    return std::nullopt;
-}
-
-bool agree(const std::optional<Difference>& one, const std::optional<Difference>& other) {
-    return one.has_value() == other.has_value()
-           && (!one || (one->kind == other->kind && one->position == other->position));
+    if (question.strict_type && first.source->element_type() != second.source->element_type()) {
+        expected.difference = Difference::type;
+    }
+    return expected;
 }
 
 // Moves behind `expected`.
@@ -273,47 +345,73 @@ void pass_part(const char*& text, const talcmp::ElementType& type, const unsigne
     }
 }
 
-void pass_element(const char*& text, ArraySource& source, const std::uint64_t position) {
-    const talcmp::ElementType& type = talcmp::element_type(source.element_type());
-    const auto* const element = static_cast<const unsigned char*>(source.elements(position, 1));
-    pass_part(text, type, element);
+void pass_element(const char*& text, const OpenedArray& array, const std::uint64_t order) {
+    const talcmp::ElementType& type = talcmp::element_type(array.source->element_type());
+    const unsigned char* const bytes = element(array, position_of(array, order));
+    pass_part(text, type, bytes);
     if (type.kind == 'c') {
         pass(text, *text == '-' ? "" : "+");
-        pass_part(text, type, element + type.part_size);
+        pass_part(text, type, bytes + type.part_size);
         pass(text, "j");
     }
 }
 
-void check_text(const std::string& line, const Difference& difference, ArraySource& first,
-                ArraySource& second) {
+void check_text(const std::string& line, const Expected& expected, const OpenedArray& first,
+                const OpenedArray& second) {
     require_line(line);
     const char* text = line.c_str();
-    if (difference.kind != Difference::Kind::element) {
-        pass(text, difference.kind == Difference::Kind::shape ? "shape (" : "type ");
+    if (expected.difference != Difference::elements) {
+        pass(text, expected.difference == Difference::shape ? "shape (" : "type ");
         return;
     }
-    pass_index(text, difference.position, first.shape());
-    pass_element(text, first, difference.position);
+    pass_index(text, expected.order, first.source->shape());
+    pass_element(text, first, expected.order);
     pass(text, " and ");
-    pass_element(text, second, difference.position);
-    require(*text == '\0', "nothing follows the difference");
+    pass_element(text, second, expected.order);
+    pass(text, " (");
 }
 
-void check_question(ArraySource& first, ArraySource& second, const talcmp::Question& question) {
-    const auto expected = expected_difference(first, second, question);
-    fuzz::known_state();
-    const auto difference = talcmp::first_difference(first, second, question);
-    require(agree(difference, expected), "the first difference is the one that is expected");
-    if (difference) {
-        check_text(talcmp::difference_text(*difference, first, second), *difference, first, second);
+class NoProgress : public talcmp::ProgressListener {
+  public:
+    void begin(std::uint64_t /*total_bytes*/) override {}
+    void advance(std::uint64_t /*bytes*/) override {}
+};
+
+talcmp::NamedArray named(const MemoryFile& file) {
+    return {file.path(), talcmp::open_array_file(file.path())->open("")};
+}
+
+struct Operand {
+    const MemoryFile& file;
+    const OpenedArray& array;
+};
+
+void check_question(const Operand& first, const Operand& second, const talcmp::Question& question) {
+    const Expected expected = expected_answer(first.array, second.array, question);
+    NoProgress progress;
+    const auto comparison =
+        talcmp::compare(named(first.file), named(second.file), question, progress);
+    require(comparison.difference == expected.difference, "the arrays differ as is expected");
+    if (comparison.difference != Difference::none) {
+        check_text(talcmp::difference_text(comparison), expected, first.array, second.array);
+    }
+    if (comparison.report) {
+        require(comparison.report->differing == expected.differing,
+                "as many pairs differ as is expected");
     }
 }
 
-void compare(ArraySource& first, ArraySource& second) {
+void compare(const Operand& first, const Operand& second) {
+    talcmp::Question question;
+    question.threads = 1;
     for (const double tolerance : {0.0, 3.0, 23.5, 52.5}) {
-        check_question(first, second, {tolerance, false});
+        question.tolerance = tolerance;
+        question.report = !question.report;
+        check_question(first, second, question);
     }
-    check_question(first, second, {30, true});
+    question.tolerance = 30;
+    question.strict_type = true;
+    check_question(first, second, question);
 }
 
 } // namespace
@@ -330,12 +428,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* bytes, const std::size
     if (!first) {
         return 0;
     }
-    compare(*first, *first);
+    compare({first_file, *first}, {first_file, *first});
     if (second_begins != std::string_view::npos) {
         const auto second = opened(second_file, input.substr(second_begins));
         if (second) {
-            compare(*first, *second);
-            compare(*second, *first);
+            compare({first_file, *first}, {second_file, *second});
+            compare({second_file, *second}, {first_file, *first});
         }
     }
     return 0;

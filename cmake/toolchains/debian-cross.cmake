@@ -4,6 +4,7 @@
 #   TALNUMERICARRAY_TRIPLE   how Debian calls the platform's tools: arm-linux-gnueabihf
 #   TALNUMERICARRAY_QEMU     its emulator: qemu-arm
 #   CMAKE_SYSTEM_PROCESSOR   as uname -m says it there
+#   CMAKE_LIBRARY_ARCHITECTURE   how Debian calls the folder of its libraries; usually the triple
 #
 # and includes this one. GCC is used unless CMAKE_CXX_COMPILER is Clang, which has all its targets in
 # one program.
@@ -37,13 +38,25 @@ foreach(tool AR RANLIB NM READELF OBJDUMP STRIP)
 endforeach()
 
 # Only the architecture's own libraries are taken; headers and packages without machine code, like
-# those of CLI11, are the host's.
-set(CMAKE_FIND_ROOT_PATH /usr/${TALNUMERICARRAY_TRIPLE})
+# those of CLI11, are the host's. What Debian has no cross package of, scripts/foreign-libraries
+# fetches.
+get_filename_component(foreign ${CMAKE_CURRENT_LIST_DIR}/../../build/foreign ABSOLUTE)
+set(foreign ${foreign}/${TALNUMERICARRAY_TRIPLE})
+set(CMAKE_FIND_ROOT_PATH /usr/${TALNUMERICARRAY_TRIPLE} ${foreign})
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
+if(NOT CMAKE_LIBRARY_ARCHITECTURE)
+  set(CMAKE_LIBRARY_ARCHITECTURE ${TALNUMERICARRAY_TRIPLE})
+endif()
+set(foreign_folders ${foreign}/usr/lib/${CMAKE_LIBRARY_ARCHITECTURE}
+                    ${foreign}/lib/${CMAKE_LIBRARY_ARCHITECTURE})
+list(JOIN foreign_folders : foreign_path)
+# Where the linker finds what those libraries need.
+set(CMAKE_EXE_LINKER_FLAGS_INIT -Wl,-rpath-link,${foreign_path})
 
 # The library path keeps the emulated loader from libraries of the host for the same architecture,
 # which 64-bit x86 may have for 32-bit programs, of another build of libc than the loader.
 set(CMAKE_CROSSCOMPILING_EMULATOR
-    ${TALNUMERICARRAY_EMULATOR} -E LD_LIBRARY_PATH=/usr/${TALNUMERICARRAY_TRIPLE}/lib -L
+    ${TALNUMERICARRAY_EMULATOR} -E
+    LD_LIBRARY_PATH=/usr/${TALNUMERICARRAY_TRIPLE}/lib:${foreign_path} -L
     /usr/${TALNUMERICARRAY_TRIPLE})

@@ -79,25 +79,34 @@ const std::string nan2 = real_of_bits(0xFFF8000000000456);
 constexpr double infinity = std::numeric_limits<double>::infinity();
 
 const Answer values[] = {
-    {"SeveralDifferences", f64({1, 2, 3, 4}), f64({1, 9, 8, 4}), "[1]: 2 and 9"},
-    {"TenthAsSingle", f32({0.1F}), f32({0.3F}), "[0]: 0.1 and 0.3"},
-    {"TenthAsDouble", f64({0.1}), f64({0.1F}), "[0]: 0.1 and 0.10000000149011612"},
-    {"LeastSingle", f32({1e-45F}), f32({std::nextafter(1.0F, 2.0F)}), "[0]: 1e-45 and 1.0000001"},
-    {"NextDouble", f64({1}), f64({std::nextafter(1.0, 2.0)}), "[0]: 1 and 1.0000000000000002"},
+    {"SeveralDifferences", f64({1, 2, 3, 4}), f64({1, 9, 8, 4}),
+     "[1]: 2 and 9 (the same from --tol 53 on)"},
+    {"TenthAsSingle", f32({0.1F}), f32({0.3F}), "[0]: 0.1 and 0.3 (the same from --tol 24 on)"},
+    {"TenthAsDouble", f64({0.1}), f64({0.1F}),
+     "[0]: 0.1 and 0.10000000149011612 (the same from --tol 27 on)"},
+    {"LeastSingle", f32({1e-45F}), f32({std::nextafter(1.0F, 2.0F)}),
+     "[0]: 1e-45 and 1.0000001 (the same from --tol 24 on)"},
+    {"NextDouble", f64({1}), f64({std::nextafter(1.0, 2.0)}),
+     "[0]: 1 and 1.0000000000000002 (the same from --tol 1 on)"},
     {"LimitsOfDouble", f64({5e-324}), f64({-1.7976931348623157e308}),
-     "[0]: 5e-324 and -1.7976931348623157e+308"},
-    {"Infinities", f64({infinity}), f64({-infinity}), "[0]: inf and -inf"},
-    {"Bytes", i8({-128}), i8({127}), "[0]: -128 and 127"},
-    {"UnsignedBytes", u8({65}), u8({255}), "[0]: 65 and 255"},
+     "[0]: 5e-324 and -1.7976931348623157e+308 (opposite signs)"},
+    {"Infinities", f64({infinity}), f64({-infinity}), "[0]: inf and -inf (opposite signs)"},
+    {"Bytes", i8({-128}), i8({127}), "[0]: -128 and 127 (different integers)"},
+    {"UnsignedBytes", u8({65}), u8({255}), "[0]: 65 and 255 (different integers)"},
     {"LimitsOfInt64", i64({INT64_MIN}), i64({INT64_MAX}),
-     "[0]: -9223372036854775808 and 9223372036854775807"},
-    {"LimitOfUint64", u64({UINT64_MAX}), u64({0}), "[0]: 18446744073709551615 and 0"},
-    {"ComplexSingles", c64({{0.1F, -2}}), c64({{0.1F, 2}}), "[0]: 0.1-2j and 0.1+2j"},
-    {"ComplexMinusZero", c128({{1, -0.0}}), c128({{1, 0.0}}), "[0]: 1-0j and 1+0j"},
-    {"Zeros", f64({-0.0}), f64({0.0}), "[0]: -0 and 0"},
+     "[0]: -9223372036854775808 and 9223372036854775807 (different integers)"},
+    {"LimitOfUint64", u64({UINT64_MAX}), u64({0}),
+     "[0]: 18446744073709551615 and 0 (different integers)"},
+    {"ComplexSingles", c64({{0.1F, -2}}), c64({{0.1F, 2}}),
+     "[0]: 0.1-2j and 0.1+2j (imaginary parts: opposite signs)"},
+    {"ComplexMinusZero", c128({{1, -0.0}}), c128({{1, 0.0}}),
+     "[0]: 1-0j and 1+0j (the same from --tol 1 on)"},
+    {"Zeros", f64({-0.0}), f64({0.0}), "[0]: -0 and 0 (the same from --tol 1 on)"},
     {"EqualNaNs", nan1, nan1},
-    {"UnequalNaNs", nan1, nan2, "[0]: nan(0x7ff8000000000123) and nan(0xfff8000000000456)"},
-    {"SingleNaN", single_of_bits(0x7FC00ABC), f32({1}), "[0]: nan(0x7fc00abc) and 1"},
+    {"UnequalNaNs", nan1, nan2,
+     "[0]: nan(0x7ff8000000000123) and nan(0xfff8000000000456) (the same from --tol 53 on)"},
+    {"SingleNaN", single_of_bits(0x7FC00ABC), f32({1}),
+     "[0]: nan(0x7fc00abc) and 1 (the same from --tol 24 on)"},
 };
 
 const std::string near_far = f64({1.1, 2.5});
@@ -105,35 +114,55 @@ const std::string far_near = f64({2.5, 1.1});
 
 const Answer tolerances[] = {
     {"Within", f64({1}), f64({1 + 0x1p-52}), "", {"--tol", "2"}},
-    {"Outside", f64({1}), f64({1 + 0x1p-51}), "[0]: 1 and 1.0000000000000004", {"--tol", "1"}},
+    {"Outside",
+     f64({1}),
+     f64({1 + 0x1p-51}),
+     "[0]: 1 and 1.0000000000000004 (the same from --tol 2 on)",
+     {"--tol", "1"}},
     {"WithinAsSingles", f32({1}), f32({1 + 0x1p-23F}), "", {"--tol", "2"}},
-    {"OutsideAsSingles", f32({1}), f32({1 + 0x1p-22F}), "[0]: 1 and 1.0000002", {"--tol", "1"}},
-    {"Half", f64({1, 1}), f64({1, 2}), "[1]: 1 and 2", {"--tol", "0.5"}},
+    {"OutsideAsSingles",
+     f32({1}),
+     f32({1 + 0x1p-22F}),
+     "[0]: 1 and 1.0000002 (the same from --tol 2 on)",
+     {"--tol", "1"}},
+    {"Half",
+     f64({1, 1}),
+     f64({1, 2}),
+     "[1]: 1 and 2 (the same from --tol 53 on)",
+     {"--tol", "0.5"}},
     {"WithEqualsSign", f64({1}), f64({2}), "", {"--tol=53"}},
     {"Negative", f64({-0.0}), f64({0.0}), "", {"--tol", "-1"}},
     {"NegativeWithEqualsSign",
      f64({1}),
      f64({1 + 0x1p-52}),
-     "[0]: 1 and 1.0000000000000002",
+     "[0]: 1 and 1.0000000000000002 (the same from --tol 1 on)",
      {"--tol=-1"}},
     {"Huge", f64({1}), f64({1e300}), "", {"--tol", "1e300"}},
     {"Infinite", f64({1}), f64({1e300}), "", {"--tol", "inf"}},
-    {"InfiniteForZero", f64({1}), f64({0}), "[0]: 1 and 0", {"--tol", "inf"}},
-    {"ZerosUnderZero", f64({-0.0}), f64({0.0}), "[0]: -0 and 0", {"--tol", "0"}},
+    {"InfiniteForZero",
+     f64({1}),
+     f64({0}),
+     "[0]: 1 and 0 (zero is the same only as zero)",
+     {"--tol", "inf"}},
+    {"ZerosUnderZero",
+     f64({-0.0}),
+     f64({0.0}),
+     "[0]: -0 and 0 (the same from --tol 1 on)",
+     {"--tol", "0"}},
     {"ZerosUnderTiny", f64({-0.0}), f64({0.0}), "", {"--tol", "1e-10"}},
     {"NaNsUnderZero", nan1, nan1, "", {"--tol", "0.0"}},
     {"NaNsUnderOne",
      nan1,
      nan1,
-     "[0]: nan(0x7ff8000000000123) and nan(0x7ff8000000000123)",
+     "[0]: nan(0x7ff8000000000123) and nan(0x7ff8000000000123) (the same from --tol 53 on)",
      {"--tol", "1"}},
-    {"Integers", i32({7}), i32({8}), "[0]: 7 and 8", {"--tol", "100"}},
+    {"Integers", i32({7}), i32({8}), "[0]: 7 and 8 (different integers)", {"--tol", "100"}},
     {"NearThenFar", f64({1, 1}), near_far, "", {"--tol", "52.5"}},
-    {"FarThenNear", f64({1, 1}), far_near, "[0]: 1 and 2.5", {"--tol", "52.5"}},
+    {"FarThenNear", f64({1, 1}), far_near, "", {"--tol", "52.5"}},
     {"NearFarThenNegative",
      f64({1, 1, 1, 1, 1}),
      f64({1, 1.1, 2.5, 2.5, -1}),
-     "[4]: 1 and -1",
+     "[4]: 1 and -1 (opposite signs)",
      {"--tol", "52.5"}},
 };
 
@@ -142,13 +171,16 @@ const std::string no_doubles = f64({});
 
 const Answer types_and_shapes[] = {
     {"IntegersAndReals", i16({-3, 0}), f32({-3, -0.0F})},
-    {"IntegerAndReal", u8({3}), f64({3.5}), "[0]: 3 and 3.5"},
-    {"IntegersOfOnePattern", i64({-1}), u64({UINT64_MAX}), "[0]: -1 and 18446744073709551615"},
+    {"IntegerAndReal", u8({3}), f64({3.5}), "[0]: 3 and 3.5 (the same from --tol 51 on)"},
+    {"IntegersOfOnePattern", i64({-1}), u64({UINT64_MAX}),
+     "[0]: -1 and 18446744073709551615 (different integers)"},
     {"RealsAndComplex", f32({2}), c128({{2, -0.0}})},
-    {"RealAndComplex", f64({2}), c64({{2, 1}}), "[0]: 2 and 2+1j"},
-    {"OneTextInTwoTypes", f32({0.1F}), f64({0.1}), "[0]: 0.10000000149011612 and 0.1"},
+    {"RealAndComplex", f64({2}), c64({{2, 1}}),
+     "[0]: 2 and 2+1j (imaginary parts: zero is the same only as zero)"},
+    {"OneTextInTwoTypes", f32({0.1F}), f64({0.1}),
+     "[0]: 0.10000000149011612 and 0.1 (the same from --tol 27 on)"},
     {"OneTextInTwoComplexTypes", c64({{1, 0.1F}}), c128({{1, 0.1}}),
-     "[0]: 1+0.10000000149011612j and 1+0.1j"},
+     "[0]: 1+0.10000000149011612j and 1+0.1j (the same from --tol 27 on)"},
     {"TwoTypesWithinTolerance", f64({0.1}), f32({0.1F}), "", {"--tol", "30"}},
     {"StrictType", f32({1}), f64({1}), "type float32 and float64", {"--strict-type"}},
     {"StrictTypeOfOneType", f32({1}), f32({1}), "", {"--strict-type"}},
@@ -168,7 +200,8 @@ const Answer types_and_shapes[] = {
     {"HugeShapesWithoutElements", array("(0, 18446744073709551615, 2)", Reals()),
      array("(0, 18446744073709551615, 2)", Reals())},
     {"Scalars", array("()", Reals{1}), array("()", Reals{1})},
-    {"DifferentScalars", array("()", Reals{1}), array("()", Reals{2}), "[]: 1 and 2"},
+    {"DifferentScalars", array("()", Reals{1}), array("()", Reals{2}),
+     "[]: 1 and 2 (the same from --tol 53 on)"},
 };
 
 // The array [1. 2.] with a dictionary of its element type and what is around that.
@@ -210,6 +243,69 @@ INSTANTIATE_TEST_SUITE_P(Value, Answers, testing::ValuesIn(values), name_of<Answ
 INSTANTIATE_TEST_SUITE_P(Tolerance, Answers, testing::ValuesIn(tolerances), name_of<Answer>);
 INSTANTIATE_TEST_SUITE_P(Record, Answers, testing::ValuesIn(types_and_shapes), name_of<Answer>);
 INSTANTIATE_TEST_SUITE_P(Spelling, Answers, testing::ValuesIn(spellings), name_of<Answer>);
+
+// ---- Parts of arrays
+
+struct Part {
+    const char* name;
+    std::string slice;
+    std::string difference = {}; // empty where the parts are the same
+};
+
+void PrintTo(const Part& part, std::ostream* out) {
+    *out << part.name;
+}
+
+// Of arrays of the shape (3, 4) that differ in [1, 2] and [2, 0].
+const Part parts[] = {
+    {"Whole", ":", "[1, 2]: 0 and 5 (different integers)"},
+    {"FirstRow", "0"},
+    {"LastRow", "-1", "[2, 0]: 0 and 7 (different integers)"},
+    {"Column", ":,2", "[1, 2]: 0 and 5 (different integers)"},
+    {"OneElement", "1,2", "[1, 2]: 0 and 5 (different integers)"},
+    {"EverySecondRow", "::2", "[2, 0]: 0 and 7 (different integers)"},
+    {"EverySecondColumn", ":,1::2"},
+    {"Spaces", " 1 : 2 , : 2 "},
+    {"BehindTheEnd", "1:100,3:9223372036854775807"},
+    {"BeforeTheBeginning", "-9223372036854775808:1"},
+    {"Nothing", "2:1"},
+    {"LongStep", "1::9223372036854775807", "[1, 2]: 0 and 5 (different integers)"},
+};
+
+class Parts : public testing::TestWithParam<Part> {
+  protected:
+    static constexpr const char* shape = "(3, 4)";
+};
+
+TEST_P(Parts, AreComparedAlone) {
+    const std::vector<std::int32_t> zeros(12);
+    std::vector<std::int32_t> others(12);
+    others[6] = 5;
+    others[8] = 7;
+    expect_answer(TemporaryFolder(), {"--slice=" + GetParam().slice}, array(shape, zeros),
+                  array(shape, others), GetParam().difference);
+}
+
+INSTANTIATE_TEST_SUITE_P(Slice, Parts, testing::ValuesIn(parts), name_of<Part>);
+
+TEST(Parts, MayBeOfArraysOfDifferentShapes) {
+    const TemporaryFolder folder;
+    expect_answer(folder, {"--slice=:2"}, f64({1, 2, 3}), f64({1, 2}), "");
+    expect_answer(folder, {"--slice=1:"}, f64({1, 2, 3}), f64({1, 2}), "shape (2,) and (1,)");
+    expect_answer(folder, {"--slice=0"}, array("(1, 2)", Reals(2)), f64({0, 0}),
+                  "shape (2,) and ()");
+}
+
+TEST(Parts, ThatAnArrayHasNotAreTrouble) {
+    const TemporaryFolder folder;
+    const std::string path = folder.write("a.npy", f64({1, 2, 3}));
+    expect_trouble(run_talcmp({"--slice=3", path, path}), path + ": ",
+                   "has no index 3 in a dimension of 3");
+    expect_trouble(run_talcmp({"--slice=-4", path, path}), path + ": ",
+                   "has no index -4 in a dimension of 3");
+    expect_trouble(run_talcmp({"--slice=0,0", path, path}), path + ": ",
+                   "has fewer dimensions (1) than --slice (2)");
+}
 
 // ---- All types, versions, places and alignments
 
@@ -267,7 +363,8 @@ TEST(OtherByteOrder, ValuesAreToldAsWhatTheyAre) {
         npy::dictionary(npy::descr<Complex>(npy::swapped), "False", "(200000,)");
     const std::string first = npy::header(dictionary) + npy::elements(row, npy::swapped);
     row[199998] = Complex(1, 3);
-    expect_answer(folder, {}, first, npy::row(row), "[199998]: 1+2j and 1+3j");
+    expect_answer(folder, {}, first, npy::row(row),
+                  "[199998]: 1+2j and 1+3j (the same from --tol 23 on)");
 }
 
 TEST(EveryType, IsComparedByValueWithEveryOther) {
@@ -301,6 +398,16 @@ TEST(Files, MayHaveNamesThatLookLikeOptions) {
     std::filesystem::current_path(old_folder);
 }
 
+TEST(Files, HaveNamesThatAreToldInOneLine) {
+    const TemporaryFolder folder;
+    const std::string path1 = folder.write("a\nb\x1B[31m.npy", f64({1}));
+    const std::string path2 = folder.write("c.npy", f64({2}));
+    const std::string shown1 = folder.path_of("a?b?[31m.npy");
+    EXPECT_EQ(run_talcmp({path1, path2}).output,
+              shown1 + " " + path2 + " differ: [0]: 1 and 2 (the same from --tol 53 on)\n");
+    expect_trouble(run_talcmp({path1 + "x", path2}), shown1 + "x: ", "there is no such file");
+}
+
 TEST(Index, IsThatOfTheFirstDifferenceInRowMajorOrder) {
     const TemporaryFolder folder;
     const auto zeros = array("(2, 3, 4)", std::vector<std::int16_t>(24));
@@ -311,7 +418,8 @@ TEST(Index, IsThatOfTheFirstDifferenceInRowMajorOrder) {
         const std::string index = std::to_string(position / 12) + ", "
                                   + std::to_string(position / 4 % 3) + ", "
                                   + std::to_string(position % 4);
-        expect_answer(folder, {}, zeros, array("(2, 3, 4)", elements), "[" + index + "]: 0 and 5");
+        expect_answer(folder, {}, zeros, array("(2, 3, 4)", elements),
+                      "[" + index + "]: 0 and 5 (different integers)");
     }
 }
 
@@ -338,21 +446,25 @@ TEST_P(Slices, DifferWhereTheArraysDo) {
         Reals elements = ones;
         elements[position] = elements[last] = 2.5;
         const std::string index = "[" + std::to_string(position) + "]";
-        expect_answer(folder, {}, file(ones), file(elements), index + ": 1 and 2.5");
+        expect_answer(folder, {}, file(ones), file(elements),
+                      index + ": 1 and 2.5 (the same from --tol 53 on)");
     }
 }
 
-// With this tolerance, arrays that begin with a near pair may have far pairs behind it.
-TEST_P(Slices, AreComparedInOneCourse) {
+// What is compared before a pair has no influence on it, even under such a tolerance.
+TEST_P(Slices, DoNotDependOnEachOther) {
     const TemporaryFolder folder;
     const Reals ones(131072, 1.0);
-    Reals elements = ones;
-    elements[70000] = 2.5;
-    expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "[70000]: 1 and 2.5");
-    elements[10] = 1.1;
-    expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "");
-    elements[5] = 2.5;
-    expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "[5]: 1 and 2.5");
+    for (const std::size_t position : {std::size_t{5}, std::size_t{70000}}) {
+        Reals elements = ones;
+        elements[position] = 2.5;
+        expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "");
+        elements[10] = 1.1;
+        expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "");
+        elements[position] = 4;
+        expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements),
+                      "[" + std::to_string(position) + "]: 1 and 4 (the same from --tol 53 on)");
+    }
 }
 
 INSTANTIATE_TEST_SUITE_P(Offset, Slices, testing::Values(0U, 1U, 4U));
@@ -370,8 +482,8 @@ void PrintTo(const BadUsage& usage, std::ostream* out) {
 }
 
 const BadUsage bad_usages[] = {
-    {"NoFiles", {}, "A is required"},
-    {"OneFile", {"a"}, "B is required"},
+    {"NoFiles", {}, "two arrays are needed"},
+    {"OneFile", {"a"}, "two arrays are needed"},
     {"ThreeFiles", {"a", "b", "c"}, "not expected: c"},
     {"UnknownOption", {"--fast", "a", "b"}, "--fast"},
     {"UnknownShortOption", {"-t", "a", "b"}, "-t"},
@@ -386,6 +498,23 @@ const BadUsage bad_usages[] = {
     {"TolWithSpace", {"--tol", "10 ", "a", "b"}, "not '10 '"},
     {"TolWithUnit", {"--tol=10bits", "a", "b"}, "not '10bits'"},
     {"TolWithDecimalComma", {"--tol=2,5", "a", "b"}, "not '2,5'"},
+    {"TwoStandardInputs", {"-", "-"}, "standard input can be only one of the two"},
+    {"NoDifferences", {"-n", "0", "a", "b"}, "--max-differences takes a number from 1 to"},
+    {"NegativeDifferences", {"--max-differences=-1", "a", "b"}, "not '-1'"},
+    {"DifferencesOfText", {"-n", "all", "a", "b"}, "not 'all'"},
+    {"TooManyDifferences", {"-n", "10000001", "a", "b"}, "from 1 to 10000000"},
+    {"NoThreads", {"--threads", "0", "a", "b"}, "--threads takes a number from 1 to 64"},
+    {"TooManyThreads", {"--threads", "65", "a", "b"}, "not '65'"},
+    {"QuietAndVerbose", {"-q", "-v", "a", "b"}, "--quiet prints nothing"},
+    {"QuietReport", {"-q", "--report", "a", "b"}, "--quiet prints nothing"},
+    {"QuietJson", {"--quiet", "--json", "a", "b"}, "--quiet prints nothing"},
+    {"SliceOfText", {"--slice", "x", "a", "b"}, "in 'x': 'x' is no index"},
+    {"SliceWithoutIndex", {"--slice", "1,,2", "a", "b"}, "neither an index nor a colon"},
+    {"SliceOfThreeColons", {"--slice", "::,1:2:3:4", "a", "b"}, "more than two colons"},
+    {"SliceWithStepZero", {"--slice", "::0", "a", "b"}, "the step 0 is not positive"},
+    {"SliceBackwards", {"--slice", "::-1", "a", "b"}, "the step -1 is not positive"},
+    {"SliceOutOfRange", {"--slice", "9223372036854775808", "a", "b"}, "is no index"},
+    {"SliceWithBrackets", {"--slice", "[1]", "a", "b"}, "'[1]' is no index"},
 };
 
 class BadUsages : public testing::TestWithParam<BadUsage> {};
@@ -407,6 +536,36 @@ TEST(CommandLine, AsksForHelpOrTheVersion) {
         EXPECT_NE(outcome.output.find(answer), std::string::npos) << outcome.output;
         EXPECT_EQ(outcome.errors, "");
     }
+}
+
+TEST(CommandLine, MayTellOfEqualArraysToo) {
+    const TemporaryFolder folder;
+    const std::string path = folder.write("a.npy", f64({1, 2}));
+    EXPECT_EQ(run_talcmp({"-v", path, path}).output, path + " " + path + " are the same\n");
+}
+
+TEST(CommandLine, MayAskForTheExitStatusAlone) {
+    const TemporaryFolder folder;
+    const std::string path1 = folder.write("a.npy", f64({1, 2}));
+    const std::string path2 = folder.write("b.npy", f64({1, 3}));
+    const Outcome outcome = run_talcmp({"--quiet", path1, path2});
+    EXPECT_EQ(outcome.status, 1);
+    EXPECT_EQ(outcome.output + outcome.errors, "");
+    expect_trouble(run_talcmp({"-q", path1, path2 + "x"}), path2 + "x: ", "No such file");
+}
+
+TEST(CommandLine, MayAskForSeveralDifferences) {
+    const TemporaryFolder folder;
+    const std::string path1 = folder.write("a.npy", i8({0, 1, 2, 3}));
+    const std::string path2 = folder.write("b.npy", i8({9, 1, 8, 7}));
+    const std::string begin = path1 + " " + path2 + " differ: ";
+    const std::string lines[] = {begin + "[0]: 0 and 9 (different integers)\n",
+                                 begin + "[2]: 2 and 8 (different integers)\n",
+                                 begin + "[3]: 3 and 7 (different integers)\n"};
+    EXPECT_EQ(run_talcmp({"-n", "2", path1, path2}).output, lines[0] + lines[1]);
+    EXPECT_EQ(run_talcmp({"-n3", path1, path2}).output, lines[0] + lines[1] + lines[2]);
+    EXPECT_EQ(run_talcmp({"--max-differences=10000000", path1, path2}).output,
+              lines[0] + lines[1] + lines[2]);
 }
 
 // ---- A standard output that takes nothing

@@ -3,7 +3,8 @@
 #ifndef TALCMP_COMMAND_LINE_H
 #define TALCMP_COMMAND_LINE_H
 
-#include "difference.h"
+#include "comparison.h"
+#include "operands.h"
 
 #include <optional>
 #include <stdexcept>
@@ -13,8 +14,13 @@ namespace talcmp {
 
 struct CommandLine {
     Question question;
-    std::string first;  // path of the first file
-    std::string second; // path of the second file
+    NameFilter member_filter;
+    bool json = false;
+    bool quiet = false;
+    bool verbose = false;
+    std::string slice; // as it was given
+    std::string first; // the operands
+    std::string second;
 };
 
 // Returns what is asked; nothing where that was help or the version, which are printed already.

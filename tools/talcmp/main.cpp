@@ -1,45 +1,40 @@
-// talcmp: are the arrays in two files the same?
-//
-// Prints nothing when they are; else one line that says how they first differ.
+// talcmp: are the arrays in two files the same, where are they not, and by how much?
 
 #include "command_line.h"
-#include "difference.h"
-#include "difference_text.h"
-#include "open_array.h"
+#include "compare_operands.h"
+#include "json_answers.h"
+#include "text_answers.h"
 #include "trouble.h"
 
 #include <cstdio>
 #include <exception>
 #include <memory>
-#include <string>
 
 namespace {
 
-// The exit statuses of cmp and diff.
-enum ExitStatus { same = 0, different = 1, trouble = 2 };
+using talcmp::Summary;
 
-ExitStatus compare(const talcmp::CommandLine& command_line) {
-    const auto first = talcmp::open_array(command_line.first);
-    const auto second = talcmp::open_array(command_line.second);
-    const auto difference = talcmp::first_difference(*first, *second, command_line.question);
-    if (!difference) {
-        return same;
+std::unique_ptr<talcmp::Answers> answers_for(const talcmp::CommandLine& command_line) {
+    if (command_line.json) {
+        return std::make_unique<talcmp::JsonAnswers>(command_line);
     }
-    const std::string text = talcmp::difference_text(*difference, *first, *second);
-    std::printf("%s %s differ: %s\n", command_line.first.c_str(), command_line.second.c_str(),
-                text.c_str());
-    return different;
+    return std::make_unique<talcmp::TextAnswers>(command_line,
+                                                 talcmp::Terminal::of_standard_output());
 }
 
-ExitStatus run(const int argc, const char* const* argv) {
+int run(const int argc, const char* const* argv) {
+    constexpr int trouble = 2;
     try {
-        const auto command_line = talcmp::read_command_line(argc, argv);
-        const ExitStatus status = command_line ? compare(*command_line) : same;
+        Summary summary;
+        if (const auto command_line = talcmp::read_command_line(argc, argv)) {
+            talcmp::ProgressBar progress(!command_line->quiet);
+            summary = compare_operands(*command_line, *answers_for(*command_line), progress);
+        }
         // A line too long for the buffer may have failed before the flush.
         if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
             throw talcmp::Trouble("standard output", "cannot be written");
         }
-        return status;
+        return exit_status(summary);
     } catch (const talcmp::UsageError& error) {
         std::fprintf(stderr, "talcmp: %s; see 'talcmp --help'\n", error.what());
     } catch (const std::exception& error) {

@@ -8,6 +8,7 @@
 #include <stdexcept>
 
 #include <fcntl.h>
+#include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -53,7 +54,8 @@ class Capture {
     ::_exit(not_started);
 }
 
-int start_and_wait(const std::vector<std::string>& arguments, const int output, const int errors) {
+int start_and_wait(const std::vector<std::string>& arguments, const int output, const int errors,
+                   struct rusage& usage) {
     std::vector<std::string> command = {TALCMP_COMMAND};
     command.insert(command.end(), arguments.begin(), arguments.end());
     std::vector<char*> pointers;
@@ -67,7 +69,7 @@ int start_and_wait(const std::vector<std::string>& arguments, const int output, 
         become_talcmp(pointers.data(), output, errors);
     }
     int status = 0;
-    if (child < 0 || ::waitpid(child, &status, 0) != child) {
+    if (child < 0 || ::wait4(child, &status, 0, &usage) != child) {
         throw std::runtime_error("no child process for talcmp");
     }
     return status;
@@ -86,12 +88,14 @@ Outcome run_talcmp(const std::vector<std::string>& arguments, const Output outpu
     const Capture errors;
     const int full = output == Output::full ? ::open("/dev/full", O_WRONLY | O_CLOEXEC) : -1;
     const int descriptor = output == Output::captured ? captured.descriptor() : full;
-    const int status = start_and_wait(arguments, descriptor, errors.descriptor());
+    struct rusage usage = {};
+    const int status = start_and_wait(arguments, descriptor, errors.descriptor(), usage);
     if (full >= 0) {
         ::close(full);
     }
     EXPECT_TRUE(WIFEXITED(status)) << "ended by signal " << WTERMSIG(status);
-    return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, captured.contents(), errors.contents()};
+    return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, captured.contents(), errors.contents(),
+            usage.ru_maxrss}; // NOLINT(cppcoreguidelines-pro-type-union-access)
 }
 
 void expect_trouble(const Outcome& outcome, const std::string& beginning,

@@ -10,6 +10,7 @@ struct Outcome {
     int status = -1;    // the exit status
     std::string output; // on standard output
     std::string errors; // on standard error
+    long memory = 0; // the greatest resident memory in KiB, that of the test at the start included
 };
 
 // Where the child's standard output goes.

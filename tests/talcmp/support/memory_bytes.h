@@ -1,0 +1,34 @@
+// A file in memory.
+
+#ifndef TALNUMERICARRAY_TESTS_MEMORY_BYTES_H
+#define TALNUMERICARRAY_TESTS_MEMORY_BYTES_H
+
+#include "byte_source.h"
+
+#include <algorithm>
+#include <cstring>
+#include <string_view>
+
+class MemoryBytes : public talcmp::ByteSource {
+  public:
+    explicit MemoryBytes(const std::string_view bytes) : bytes_(bytes) {}
+
+    bool random_access() const override { return true; }
+    std::optional<std::uint64_t> size() const override { return bytes_.size(); }
+
+    std::size_t read(const std::uint64_t offset, void* const bytes,
+                     const std::size_t count) override {
+        const std::size_t begin =
+            static_cast<std::size_t>(std::min<std::uint64_t>(offset, bytes_.size()));
+        const std::size_t there = std::min(count, bytes_.size() - begin);
+        if (there != 0) {
+            std::memcpy(bytes, bytes_.data() + begin, there);
+        }
+        return there;
+    }
+
+  private:
+    std::string_view bytes_;
+};
+
+#endif

@@ -1,0 +1,53 @@
+#include "array_file.h"
+
+#include "npy_file.h"
+#include "npz_file.h"
+#include "regular_file.h"
+#include "standard_input.h"
+
+#include <array>
+#include <string_view>
+
+namespace talcmp {
+namespace {
+
+struct Format {
+    std::string_view beginning; // of its files
+    std::unique_ptr<ArrayFile> (*open)(const std::string& path);
+};
+
+template <typename File>
+std::unique_ptr<ArrayFile> open_as(const std::string& path) {
+    return std::make_unique<File>(path);
+}
+
+// What begins like none of them is read as an .npy file, which says what is wrong with it.
+constexpr Format formats[] = {
+    {"PK\x03\x04", open_as<NpzFile>},
+    {"PK\x05\x06", open_as<NpzFile>}, // without members
+    {"", open_as<NpyFile>},
+};
+
+std::string beginning_of(const std::string& path) {
+    constexpr std::size_t longest = 8;
+    std::string bytes(longest, '\0');
+    RegularFile file(path);
+    bytes.resize(file.read(0, bytes.data(), bytes.size()));
+    return bytes;
+}
+
+} // namespace
+
+std::unique_ptr<ArrayFile> open_array_file(const std::string& path) {
+    if (path == standard_input_path) {
+        return std::make_unique<NpyFile>("standard input", std::make_unique<StandardInput>());
+    }
+    const std::string bytes = beginning_of(path);
+    const Format* format = formats;
+    while (bytes.compare(0, format->beginning.size(), format->beginning) != 0) {
+        ++format;
+    }
+    return format->open(path);
+}
+
+} // namespace talcmp

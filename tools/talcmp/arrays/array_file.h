@@ -1,0 +1,41 @@
+// The formats of files that talcmp reads.
+
+#ifndef TALCMP_ARRAY_FILE_H
+#define TALCMP_ARRAY_FILE_H
+
+#include "array_source.h"
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace talcmp {
+
+// A file with one array or several. A format is a class that implements this, and a line in
+// `formats` in array_file.cpp.
+class ArrayFile {
+  public:
+    ArrayFile() = default;
+    ArrayFile(const ArrayFile&) = delete;
+    ArrayFile& operator=(const ArrayFile&) = delete;
+    virtual ~ArrayFile() = default;
+
+    // Whether the arrays have names.
+    virtual bool is_archive() const = 0;
+
+    // The names of the arrays, each once; one empty name where they have none.
+    virtual std::vector<std::string> members() const = 0;
+
+    // Opens an array, once each. Throws Trouble.
+    virtual std::unique_ptr<ArraySource> open(const std::string& member) = 0;
+};
+
+// The path that stands for standard input.
+inline constexpr const char* standard_input_path = "-";
+
+// Throws Trouble when the file cannot be opened or is of no known format.
+std::unique_ptr<ArrayFile> open_array_file(const std::string& path);
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,57 @@
+// Where talcmp gets the elements of an array from.
+
+#ifndef TALCMP_ARRAY_SOURCE_H
+#define TALCMP_ARRAY_SOURCE_H
+
+#include "type_properties.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <functional>
+#include <numeric>
+#include <vector>
+
+namespace talcmp {
+
+// The dimensions of an array, outermost first; a file may have larger ones than a record holds.
+using Shape = std::vector<std::uint64_t>;
+
+// An array that is read piece by piece. Its elements have positions, 0 to the product of its shape
+// - 1, in the order in which they are stored.
+class ArraySource {
+  public:
+    ArraySource() = default;
+    ArraySource(const ArraySource&) = delete;
+    ArraySource& operator=(const ArraySource&) = delete;
+    virtual ~ArraySource() = default;
+
+    // The element type, an id of `TalNumericArrayTypeId` from 1 to 12.
+    virtual type_t element_type() const = 0;
+
+    virtual const Shape& shape() const = 0;
+
+    // Whether the first index varies fastest from position to position, as in Fortran; otherwise
+    // the last one does, as in C.
+    virtual bool fortran_order() const = 0;
+
+    // Whether elements may be read in any order, by several threads at once. Otherwise `first` may
+    // never be below what has been read, and only one thread reads.
+    virtual bool random_access() const = 0;
+
+    // Reads the elements at the positions `first` to `first + count - 1`, which the array has, to
+    // `elements`. Throws Trouble.
+    virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
+};
+
+// The number of elements, which has been seen to be below 2^64: the product of the shape.
+inline std::uint64_t element_count(const ArraySource& source) {
+    const Shape& shape = source.shape();
+    if (std::find(shape.begin(), shape.end(), 0U) != shape.end()) {
+        return 0; // the product of the others may be larger
+    }
+    return std::accumulate(shape.begin(), shape.end(), std::uint64_t{1}, std::multiplies<>());
+}
+
+} // namespace talcmp
+
+#endif

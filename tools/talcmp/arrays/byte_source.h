@@ -1,0 +1,33 @@
+// Where the bytes of a file come from.
+
+#ifndef TALCMP_BYTE_SOURCE_H
+#define TALCMP_BYTE_SOURCE_H
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+
+namespace talcmp {
+
+class ByteSource {
+  public:
+    ByteSource() = default;
+    ByteSource(const ByteSource&) = delete;
+    ByteSource& operator=(const ByteSource&) = delete;
+    virtual ~ByteSource() = default;
+
+    // Whether bytes may be read in any order, by several threads at once. Otherwise `offset` may
+    // never be below what has been read, and only one thread reads.
+    virtual bool random_access() const = 0;
+
+    // In bytes; nothing where only the end will tell.
+    virtual std::optional<std::uint64_t> size() const = 0;
+
+    // Reads up to `count` bytes from `offset` on to `bytes` and returns how many, fewer only at the
+    // end. Throws Trouble.
+    virtual std::size_t read(std::uint64_t offset, void* bytes, std::size_t count) = 0;
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,28 @@
+// Bytes that come but once.
+
+#ifndef TALCMP_BYTE_STREAM_H
+#define TALCMP_BYTE_STREAM_H
+
+#include "byte_source.h"
+
+namespace talcmp {
+
+// A class that derives from it only says how the next bytes are got.
+class ByteStream : public ByteSource {
+  public:
+    bool random_access() const final { return false; }
+    std::size_t read(std::uint64_t offset, void* bytes, std::size_t count) final;
+
+  private:
+    // Reads up to `count` bytes to `bytes` and returns how many; 0 at the end. Throws Trouble.
+    virtual std::size_t read_next(void* bytes, std::size_t count) = 0;
+
+    // Reads until `count` bytes or the end.
+    std::size_t read_all(void* bytes, std::size_t count);
+
+    std::uint64_t position_ = 0;
+};
+
+} // namespace talcmp
+
+#endif

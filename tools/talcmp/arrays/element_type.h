@@ -1,0 +1,39 @@
+// What talcmp knows about an element type: its size, its name and how a value of it is written.
+
+#ifndef TALCMP_ELEMENT_TYPE_H
+#define TALCMP_ELEMENT_TYPE_H
+
+#include "taldata_array_element_types.h"
+
+#include <array>
+#include <cstddef>
+#include <string>
+
+namespace talcmp {
+
+struct ElementType {
+    type_t id;             // of `TalNumericArrayTypeId`
+    char kind;             // 'i' signed, 'u' unsigned, 'f' real, 'c' complex: the letters of .npy
+    std::size_t size;      // bytes
+    std::size_t part_size; // bytes of a real or imaginary part; those of an element without parts
+    std::size_t alignment; // bytes
+    std::string name;      // as NumPy says it: int8, float64, complex128
+
+    // Writes the element at `element` in the fewest digits that read back as the same value; a NaN
+    // with its bits. `as_doubles` does so for the double of the same value, if it is of singles.
+    std::string (*text)(const void* element, bool as_doubles);
+
+    // The real and the imaginary part, rounded to doubles: signs, zeros and NaNs stay what they
+    // are.
+    std::array<double, 2> (*parts)(const void* element);
+};
+
+// All element types, in the order of their ids.
+const std::array<ElementType, element_type_list::size>& element_types();
+
+// The element type of an id from 1 to 12.
+const ElementType& element_type(type_t id);
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,37 @@
+// An .npy file as a source of elements.
+
+#ifndef TALCMP_NPY_ARRAY_H
+#define TALCMP_NPY_ARRAY_H
+
+#include "array_source.h"
+#include "byte_source.h"
+#include "npy_header.h"
+
+#include <memory>
+#include <string>
+
+namespace talcmp {
+
+class NpyArray : public ArraySource {
+  public:
+    // `name` is what messages call the file. Throws Trouble when it is broken or not supported.
+    NpyArray(std::string name, std::unique_ptr<ByteSource> file);
+
+    type_t element_type() const override { return header_.element_type; }
+    const Shape& shape() const override { return header_.shape; }
+    bool fortran_order() const override { return header_.fortran_order; }
+    bool random_access() const override { return file_->random_access(); }
+    void read(std::uint64_t first, std::uint64_t count, void* elements) override;
+
+  private:
+    // That nothing follows the elements; an archive checks its sum only when it is asked.
+    void check_end();
+
+    std::string name_;
+    std::unique_ptr<ByteSource> file_;
+    NpyHeader header_;
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,38 @@
+// The header of an .npy file: what its elements are and where they begin.
+//
+// The format: 6 bytes "\x93NUMPY", a byte each for the major and minor version, the length of a
+// dictionary (2 bytes in version 1, 4 in versions 2 and 3, little-endian), the dictionary as a
+// Python literal with the keys 'descr', 'fortran_order' and 'shape', and behind it the elements.
+
+#ifndef TALCMP_NPY_HEADER_H
+#define TALCMP_NPY_HEADER_H
+
+#include "array_source.h"
+#include "byte_source.h"
+
+#include <cstdint>
+#include <stdexcept>
+
+namespace talcmp {
+
+struct NpyHeader {
+    type_t element_type = 0;         // an id of `TalNumericArrayTypeId` from 1 to 12
+    Shape shape;                     // outermost dimension first
+    std::uint64_t element_count = 0; // the product of `shape`
+    std::uint64_t data_offset = 0;   // bytes from the beginning of the file to the first element
+    bool fortran_order = false;      // whether the first index varies fastest
+    bool bytes_swapped = false;      // whether the elements are in the other byte order than ours
+};
+
+// What is wrong with a header, or not supported, as a sentence without its subject, the file.
+struct NpyError : std::runtime_error {
+    using std::runtime_error::runtime_error;
+};
+
+// Reads the header of an .npy file and checks, where the size of the file is known, that the
+// elements fill the rest of it. Throws NpyError, or what reading throws.
+NpyHeader read_npy_header(ByteSource& file);
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,18 @@
+#include "standard_input.h"
+
+#include "descriptor.h"
+
+namespace talcmp {
+
+std::size_t StandardInput::read_next(void* const bytes, const std::size_t count) {
+    ssize_t got = 0;
+    do {
+        got = ::read(STDIN_FILENO, bytes, count);
+    } while (got < 0 && errno == EINTR);
+    if (got < 0) {
+        throw_system_trouble("standard input", "cannot be read");
+    }
+    return static_cast<std::size_t>(got);
+}
+
+} // namespace talcmp

@@ -1,0 +1,71 @@
+#include "temporary_copy.h"
+
+#include "element_type.h"
+
+#include <algorithm>
+#include <cstdlib>
+#include <filesystem>
+#include <vector>
+
+#include <fcntl.h>
+
+namespace talcmp {
+namespace {
+
+int open_without_name(const std::string& folder) {
+    std::string path = folder + "/talcmp-XXXXXX";
+    const int file = ::mkostemp(path.data(), O_CLOEXEC);
+    if (file >= 0) {
+        ::unlink(path.c_str());
+    }
+    return file;
+}
+
+std::string temporary_folder() {
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing changes the environment.
+    const char* const folder = std::getenv("TMPDIR");
+    return folder != nullptr && *folder != '\0' ? folder : "/tmp";
+}
+
+constexpr const char* cannot_be_written =
+    "cannot take a temporary copy of the array; set TMPDIR to a folder with room for it";
+
+} // namespace
+
+TemporaryCopy::TemporaryCopy(std::unique_ptr<ArraySource> source)
+    : source_(std::move(source)), folder_(temporary_folder()), file_(open_without_name(folder_)) {
+    if (file_.number() < 0) {
+        throw_system_trouble(folder_, cannot_be_written);
+    }
+    copy_all(*source_, file_.number(), folder_);
+}
+
+void TemporaryCopy::copy_all(ArraySource& source, const int file, const std::string& folder) {
+    constexpr std::uint64_t elements_at_once = std::uint64_t{1} << 14U;
+    const std::size_t size = talcmp::element_type(source.element_type()).size;
+    const std::uint64_t total = element_count(source);
+    std::vector<char> buffer(static_cast<std::size_t>(std::min(elements_at_once, total)) * size);
+    for (std::uint64_t first = 0; first < total; first += elements_at_once) {
+        const std::uint64_t count = std::min(elements_at_once, total - first);
+        source.read(first, count, buffer.data());
+        const char* rest = buffer.data();
+        for (std::size_t left = static_cast<std::size_t>(count) * size; left > 0;) {
+            const ssize_t written = ::write(file, rest, left);
+            if (written < 0 && errno != EINTR) {
+                throw_system_trouble(folder, cannot_be_written);
+            }
+            const auto advance = static_cast<std::size_t>(std::max<ssize_t>(written, 0));
+            rest += advance;
+            left -= advance;
+        }
+    }
+}
+
+void TemporaryCopy::read(const std::uint64_t first, const std::uint64_t count,
+                         void* const elements) {
+    const std::size_t size = talcmp::element_type(element_type()).size;
+    const std::size_t bytes = static_cast<std::size_t>(count) * size;
+    read_at(file_.number(), folder_, first * size, elements, bytes);
+}
+
+} // namespace talcmp

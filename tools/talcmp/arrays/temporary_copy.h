@@ -1,0 +1,35 @@
+// An array that comes but once, copied to where it can be read in any order.
+
+#ifndef TALCMP_TEMPORARY_COPY_H
+#define TALCMP_TEMPORARY_COPY_H
+
+#include "array_source.h"
+#include "descriptor.h"
+
+#include <memory>
+
+namespace talcmp {
+
+// In a file without a name, in the folder that the environment variable TMPDIR tells.
+class TemporaryCopy : public ArraySource {
+  public:
+    // Reads all of `source`. Throws Trouble.
+    explicit TemporaryCopy(std::unique_ptr<ArraySource> source);
+
+    type_t element_type() const override { return source_->element_type(); }
+    const Shape& shape() const override { return source_->shape(); }
+    bool fortran_order() const override { return source_->fortran_order(); }
+    bool random_access() const override { return true; }
+    void read(std::uint64_t first, std::uint64_t count, void* elements) override;
+
+  private:
+    static void copy_all(ArraySource& source, int file, const std::string& folder);
+
+    std::unique_ptr<ArraySource> source_; // has been read
+    std::string folder_;
+    Descriptor file_;
+};
+
+} // namespace talcmp
+
+#endif

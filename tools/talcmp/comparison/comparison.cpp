@@ -1,0 +1,280 @@
+#include "comparison.h"
+
+#include "temporary_copy.h"
+#include "traversal.h"
+#include "trouble.h"
+
+#include <algorithm>
+#include <atomic>
+#include <exception>
+#include <future>
+#include <limits>
+#include <mutex>
+#include <stdexcept>
+#include <system_error>
+#include <thread>
+
+namespace talcmp {
+namespace {
+
+View selected(const NamedArray& array, const Selection& selection) {
+    try {
+        return select(*array.source, selection);
+    } catch (const std::invalid_argument& error) {
+        throw Trouble(array.name, error.what());
+    }
+}
+
+ArrayFacts facts_of(const NamedArray& array, const View& view) {
+    return {array.name, array.source->element_type(), array.source->shape(), view.shape,
+            array.source->fortran_order()};
+}
+
+// ---- What the threads of one comparison share
+
+// What is to be done.
+struct Task {
+    const Traversal& way;
+    ArraySource& first;
+    ArraySource& second;
+    const Question& question;
+    ProgressListener& progress;
+};
+
+// Otherwise places are met in row-major order.
+bool column_major(const ArraySource& first, const ArraySource& second) {
+    return first.fortran_order() && second.fortran_order();
+}
+
+// How far it is.
+class Work {
+  public:
+    explicit Work(const std::uint64_t box_count) : box_count_(box_count) {}
+
+    // The number of the next box to look at; nothing when all is done or something failed.
+    std::optional<std::uint64_t> next_box() {
+        const std::uint64_t box = next_box_++;
+        return box < box_count_ && !stopped_ ? std::optional(box) : std::nullopt;
+    }
+
+    void fail(const std::exception_ptr& failure) {
+        const std::lock_guard<std::mutex> lock(mutex_);
+        if (!failure_) {
+            failure_ = failure;
+        }
+        stopped_ = true;
+    }
+
+    void rethrow_failure() const {
+        if (failure_) {
+            std::rethrow_exception(failure_);
+        }
+    }
+
+    // Places from `bound` on are no longer of interest.
+    void lower_bound(const std::uint64_t bound) {
+        std::uint64_t known = bound_;
+        while (bound < known && !bound_.compare_exchange_weak(known, bound)) {
+        }
+    }
+    std::uint64_t bound() const { return bound_; }
+
+  private:
+    std::uint64_t box_count_;
+    std::atomic<std::uint64_t> next_box_ = 0;
+    std::atomic<std::uint64_t> bound_ = std::numeric_limits<std::uint64_t>::max();
+    std::atomic<bool> stopped_ = false;
+    std::mutex mutex_;
+    std::exception_ptr failure_;
+};
+
+// ---- What one thread does
+
+class Worker {
+  public:
+    Worker(const Task& task, Work& work)
+        : task_(task), work_(work), size1_(element_type(task.first.element_type()).size),
+          size2_(element_type(task.second.element_type()).size),
+          buffer1_(new unsigned char[task.way.largest_box() * size1_]),
+          buffer2_(new unsigned char[task.way.largest_box() * size2_]),
+          column_major_(column_major(task.first, task.second)), order_(task.first),
+          places_(task.question.differences), reporter_(task.question.tolerance) {}
+
+    void run() {
+        try {
+            remember_factor_of(task_.question.tolerance);
+            while (const auto box = work_.next_box()) {
+                look_at(task_.way.box(*box));
+            }
+        } catch (...) {
+            work_.fail(std::current_exception());
+        }
+    }
+
+    const FirstPlaces& places() const { return places_; }
+    const Report& report() const { return reporter_.report(); }
+
+  private:
+    Place place(const Pairs& pairs, const Box& box, const std::size_t i) const {
+        const std::uint64_t position = task_.way.first_position(box, i);
+        return place_of(pairs, i, order_.of(position), position);
+    }
+
+    // Whether all places in the box are behind those that are told.
+    bool is_beyond(const Box& box) const {
+        const std::uint64_t earliest =
+            column_major_ ? 0 : order_.of(task_.way.first_position(box, 0));
+        return earliest >= work_.bound();
+    }
+
+    void read(const Box& box) {
+        const auto read_second = [&] {
+            task_.way.read(Side::second, task_.second, box, buffer2_.get());
+        };
+        // What is read but once may have to be decompressed, of which one thread can do one side.
+        const bool side_by_side = !task_.first.random_access() && !task_.second.random_access();
+        auto second = std::async(side_by_side ? std::launch::async | std::launch::deferred
+                                              : std::launch::deferred,
+                                 read_second);
+        task_.way.read(Side::first, task_.first, box, buffer1_.get());
+        second.get();
+    }
+
+    void look_at(const Box& box) {
+        if (!task_.question.report && is_beyond(box)) {
+            return;
+        }
+        read(box);
+        const Pairs pairs(task_.first.element_type(), buffer1_.get(), task_.second.element_type(),
+                          buffer2_.get(), box.count);
+        if (task_.question.report) {
+            const auto make_place = [&](const std::size_t i) { return place(pairs, box, i); };
+            reporter_.add(pairs, make_place, !column_major_, places_);
+        } else {
+            add_places(pairs, box);
+        }
+        task_.progress.advance(box.count * (size1_ + size2_));
+    }
+
+    void add_places(const Pairs& pairs, const Box& box) {
+        const talreal tolerance = task_.question.tolerance;
+        for (std::size_t i = pairs.find_different(tolerance, 0); i < pairs.count();
+             i = pairs.find_different(tolerance, i + 1)) {
+            const Place next = place(pairs, box, i);
+            if (next.order < places_.bound()) {
+                places_.add(next);
+                work_.lower_bound(places_.bound());
+            } else if (!column_major_) {
+                return; // those behind it come later still
+            }
+        }
+    }
+
+    const Task& task_;
+    Work& work_;
+    std::size_t size1_;
+    std::size_t size2_;
+    std::unique_ptr<unsigned char[]> buffer1_;
+    std::unique_ptr<unsigned char[]> buffer2_;
+    bool column_major_;
+    RowMajorOrder order_;
+    FirstPlaces places_;
+    Reporter reporter_;
+};
+
+unsigned thread_count(const Task& task) {
+    if (!task.first.random_access() || !task.second.random_access()) {
+        return 1;
+    }
+    constexpr unsigned most = 8; // a few MiB each; more hardly read faster
+    const unsigned wanted = task.question.threads != 0
+                                ? task.question.threads
+                                : std::clamp(std::thread::hardware_concurrency(), 1U, most);
+    return static_cast<unsigned>(std::min<std::uint64_t>(wanted, task.way.box_count()));
+}
+
+void run_all(std::vector<std::unique_ptr<Worker>>& workers) {
+    std::vector<std::thread> threads;
+    try {
+        for (std::size_t i = 1; i < workers.size(); ++i) {
+            threads.emplace_back([&workers, i] { workers[i]->run(); });
+        }
+    } catch (const std::system_error&) {
+        // The system has no more threads; those that there are do all of the work.
+    }
+    workers.front()->run();
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+}
+
+// ---- The whole comparison
+
+void make_readable_in_any_order(NamedArray& array) {
+    if (!array.source->random_access()) {
+        array.source = std::make_unique<TemporaryCopy>(std::move(array.source));
+    }
+}
+
+void compare_elements(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
+                      const Question& question, ProgressListener& progress, Comparison& result) {
+    const std::size_t element_size = std::max(element_type(first.source->element_type()).size,
+                                              element_type(second.source->element_type()).size);
+    const Traversal way(view1, view2, column_major(*first.source, *second.source), element_size);
+    if (!way.is_linear()) {
+        make_readable_in_any_order(first);
+        make_readable_in_any_order(second);
+    }
+    progress.begin(way.pair_count()
+                   * (element_type(first.source->element_type()).size
+                      + element_type(second.source->element_type()).size));
+    const Task task{way, *first.source, *second.source, question, progress};
+    Work work(way.box_count());
+    std::vector<std::unique_ptr<Worker>> workers;
+    for (unsigned i = 0; i < thread_count(task); ++i) {
+        workers.push_back(std::make_unique<Worker>(task, work));
+    }
+    run_all(workers);
+    work.rethrow_failure();
+    FirstPlaces places(question.differences);
+    for (const auto& worker : workers) {
+        places.add(worker->places());
+        if (question.report) {
+            add(*result.report, worker->report());
+        }
+    }
+    result.places = places.in_order();
+}
+
+} // namespace
+
+Comparison compare(NamedArray first, NamedArray second, const Question& question,
+                   ProgressListener& progress) {
+    const View view1 = selected(first, question.selection);
+    const View view2 = selected(second, question.selection);
+    Comparison result;
+    result.array1 = facts_of(first, view1);
+    result.array2 = facts_of(second, view2);
+    // Not by the records' dimensions, which are 32-bit: those of a file may be larger.
+    if (view1.shape != view2.shape) {
+        result.difference = Difference::shape;
+        return result;
+    }
+    if (question.report) {
+        result.report.emplace();
+    }
+    const bool empty = std::find(view1.shape.begin(), view1.shape.end(), 0U) != view1.shape.end();
+    if (!empty
+        && !(question.strict_type && result.array1.type != result.array2.type
+             && !question.report)) {
+        compare_elements(first, second, view1, view2, question, progress, result);
+    }
+    if (question.strict_type && result.array1.type != result.array2.type) {
+        result.difference = Difference::type;
+    } else if (question.report ? result.report->differing != 0 : !result.places.empty()) {
+        result.difference = Difference::elements;
+    }
+    return result;
+}
+
+} // namespace talcmp

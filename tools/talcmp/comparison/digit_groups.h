@@ -1,0 +1,52 @@
+// Pairs of elements in groups of which the module has to be asked about one pair only.
+
+#ifndef TALCMP_DIGIT_GROUPS_H
+#define TALCMP_DIGIT_GROUPS_H
+
+#include "pairs.h"
+
+#include <cstdint>
+#include <vector>
+
+namespace talcmp {
+
+// Sorts pairs by |x - y| / max(|x|, |y|), as computed, between which two powers of two it lies.
+//
+// A whole tolerance compares that quotient with a power of two. The quotient as computed lies
+// strictly between two neighbouring powers of two only if the exact one does, as rounding takes no
+// number past a power of two. So all pairs of such a group are the same under the same whole
+// tolerances from 1 on. A quotient that is a power of two may be a rounded one: such pairs, NaNs
+// and infinities are left to be asked about one by one. The groups tell nothing but what is alike;
+// the answers are the module's.
+class DigitGroups {
+  public:
+    using Group = std::uint8_t;
+
+    // Pairs of equal values, with the same signs.
+    static constexpr Group equal = 0;
+    // Pairs of equal values of which some are zeros of two signs.
+    static constexpr Group equal_but_signs_of_zeros = 1;
+    // Between, in ascending order, the pairs whose quotients lie between two powers of two.
+    static constexpr Group smallest_quotient = 2;
+    static constexpr Group largest_quotient = smallest_quotient + 54;
+    static constexpr Group doubtful = largest_quotient + 1;
+    // Pairs of zero and another number, or of a negative number and another one.
+    static constexpr Group unlike = doubtful + 1;
+    static constexpr int count = unlike + 1;
+
+    // Writes the group of each pair to `groups`; of a pair of complex numbers, the last of those of
+    // its parts. Returns false, and writes nothing, where both types are integers.
+    bool sort(const Pairs& pairs, Group* groups);
+
+  private:
+    template <typename Real>
+    void sort_as(const Pairs& pairs, Group* groups);
+
+    std::vector<Group> groups_of_part_;
+    std::vector<double> parts1_; // also as singles
+    std::vector<double> parts2_;
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,91 @@
+// In how many binary digits the elements of pairs differ.
+
+#ifndef TALCMP_DIGITS_H
+#define TALCMP_DIGITS_H
+
+#include "digit_groups.h"
+#include "pairs.h"
+
+#include <array>
+#include <cstdint>
+#include <vector>
+
+namespace talcmp {
+
+// The whole tolerances that tell anything: from 53 on all answer alike.
+inline constexpr int most_digits = 53;
+
+// Stands for the digits of a pair that is the same under no tolerance.
+inline constexpr int more_than_all_digits = most_digits + 1;
+
+// How many pairs differ in 0, 1, ... 53 digits, and in more than all.
+using DigitCounts = std::array<std::uint64_t, more_than_all_digits + 1>;
+
+// Under which whole tolerances from 0 on a pair is the same: perhaps under 0, and from some
+// tolerance on. NaNs of the same bits are the same under 0, and yet not under 1.
+class Sameness {
+  public:
+    Sameness() = default;
+    constexpr Sameness(const bool at_zero, const int from_one)
+        : at_zero_(at_zero), from_one_(from_one) {}
+
+    bool at_zero() const { return at_zero_; }
+
+    // The smallest whole tolerance from 1 on; `more_than_all_digits` where there is none.
+    int from_one() const { return from_one_; }
+
+    int digits() const { return at_zero_ ? 0 : from_one_; }
+
+    bool operator==(const Sameness other) const {
+        return at_zero_ == other.at_zero_ && from_one_ == other.from_one_;
+    }
+
+  private:
+    bool at_zero_ = false;
+    int from_one_ = 0;
+};
+
+// Of a pair that is the same under every tolerance.
+inline constexpr Sameness same_under_all(true, 1);
+
+// Asks the module about one pair.
+Sameness sameness_of(const Pairs& pairs, std::size_t i);
+
+// Asks the module about many pairs in few questions.
+class DigitSearch {
+  public:
+    // Stands for pairs of one sameness.
+    using Kind = std::uint8_t;
+    static constexpr std::size_t kind_count = 256;
+
+    struct Result {
+        std::vector<Kind> kind_of;                        // each pair
+        std::array<Sameness, kind_count> sameness_of;     // the pairs of each kind
+        std::array<std::uint64_t, kind_count> count = {}; // of the pairs of each kind
+    };
+
+    DigitSearch();
+
+    // Valid until the next call.
+    const Result& search(const Pairs& pairs);
+
+  private:
+    using Indices = std::vector<std::uint32_t>;
+
+    void answer_groups(const Pairs& pairs);
+    void set_aside_same(const Pairs& pairs, std::size_t begin, std::size_t count);
+    void ask_about_open(const Pairs& pairs);
+    void settle(const Pairs& pairs, std::uint32_t* begin, std::uint32_t* end, int lowest,
+                int highest);
+    int best_question(int lowest, int highest) const;
+
+    Result result_;
+    DigitGroups groups_;
+    Indices open_; // pairs that are to be asked about one by one
+    Indices rest_;
+    DigitCounts seen_ = {}; // the smallest tolerances from 1 on of all pairs that were in `open_`
+};
+
+} // namespace talcmp
+
+#endif

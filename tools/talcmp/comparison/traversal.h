@@ -1,0 +1,72 @@
+// The way through two arrays of one shape, piece by piece.
+
+#ifndef TALCMP_TRAVERSAL_H
+#define TALCMP_TRAVERSAL_H
+
+#include "array_source.h"
+#include "selection.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <vector>
+
+namespace talcmp {
+
+enum class Side { first, second };
+
+// A box of index space, along the axes of a traversal.
+struct Box {
+    std::vector<std::uint64_t> begin;
+    std::vector<std::uint64_t> extent;
+    std::size_t count = 0; // of the pairs in it
+};
+
+// All pairs of elements of two views, in boxes that take a few MiB at most. Where both arrays lie
+// in one order and without gaps, a box is a stretch of both; otherwise it is such that both are
+// read in stretches of some length.
+class Traversal {
+  public:
+    // `first` and `second` have one shape, which has elements. Boxes and the pairs in them are in
+    // column-major order where both arrays are stored so, else in row-major order.
+    Traversal(const View& first, const View& second, bool column_major, std::size_t element_size);
+
+    // Whether each array is read once from its lower positions to its higher ones.
+    bool is_linear() const;
+
+    std::uint64_t pair_count() const { return pair_count_; }
+    std::uint64_t box_count() const { return box_count_; }
+
+    // Of the number `index`, from 0 on.
+    Box box(std::uint64_t index) const;
+
+    // The position in the first array of the pair `local` of the box.
+    std::uint64_t first_position(const Box& box, std::size_t local) const;
+
+    // Reads the elements of one side, in the order of the box, to `elements`, which has room for
+    // `largest_box()` of them.
+    void read(Side side, ArraySource& source, const Box& box, void* elements) const;
+
+    std::size_t largest_box() const { return largest_box_; }
+
+  private:
+    struct Axis {
+        std::uint64_t extent;
+        std::uint64_t stride[2]; // of each side, in positions
+        std::uint64_t tile;      // extent of a box
+    };
+
+    void choose_axes(const View& first, const View& second, bool column_major);
+    void choose_boxes(std::size_t element_size);
+    std::size_t fastest_axis(Side side) const;
+    std::uint64_t position(Side side, const Box& box) const;
+
+    std::vector<Axis> axes_; // outermost first
+    std::uint64_t offset_[2];
+    std::uint64_t pair_count_ = 1;
+    std::uint64_t box_count_ = 1;
+    std::size_t largest_box_ = 1;
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,31 @@
+// How many values of an array are special.
+
+#ifndef TALCMP_VALUE_COUNTS_H
+#define TALCMP_VALUE_COUNTS_H
+
+#include "type_properties.h"
+
+#include <cstddef>
+#include <cstdint>
+
+namespace talcmp {
+
+// Numbers of elements; a complex one counts where either part is such.
+struct ValueCounts {
+    std::uint64_t nans = 0;
+    std::uint64_t infinities = 0;
+    std::uint64_t negative_zeros = 0;
+};
+
+inline void add(ValueCounts& sum, const ValueCounts& counts) {
+    sum.nans += counts.nans;
+    sum.infinities += counts.infinities;
+    sum.negative_zeros += counts.negative_zeros;
+}
+
+// Of `count` elements of the type of the id `type`.
+ValueCounts count_values(type_t type, const void* elements, std::size_t count);
+
+} // namespace talcmp
+
+#endif

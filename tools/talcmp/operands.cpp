@@ -1,0 +1,152 @@
+#include "operands.h"
+
+#include "array_file.h"
+#include "trouble.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <map>
+#include <system_error>
+
+#include <fnmatch.h>
+#include <glob.h>
+
+namespace talcmp {
+namespace {
+
+namespace fs = std::filesystem;
+
+using PathsByName = std::map<std::string, std::string>;
+
+std::vector<NamedPair> matched(const PathsByName& first, const PathsByName& second) {
+    std::map<std::string, NamedPair> pairs;
+    for (const auto& [name, path] : first) {
+        pairs[name] = {name, path, std::nullopt};
+    }
+    for (const auto& [name, path] : second) {
+        NamedPair& pair = pairs[name];
+        pair.name = name;
+        pair.second = path;
+    }
+    std::vector<NamedPair> list;
+    list.reserve(pairs.size());
+    for (auto& [name, pair] : pairs) {
+        list.push_back(std::move(pair));
+    }
+    return list;
+}
+
+bool is_folder(const std::string& path) {
+    std::error_code error;
+    return path != standard_input_path && fs::is_directory(path, error);
+}
+
+bool exists(const std::string& path) {
+    std::error_code error;
+    return fs::exists(fs::symlink_status(path, error));
+}
+
+bool is_pattern(const std::string& operand) {
+    return operand.find_first_of("*?[") != std::string::npos && !exists(operand);
+}
+
+PathsByName files_in(const std::string& folder) {
+    PathsByName files;
+    try {
+        for (const auto& entry : fs::recursive_directory_iterator(folder)) {
+            const auto extension = entry.path().extension();
+            if (!entry.is_directory() && (extension == ".npy" || extension == ".npz")) {
+                files[entry.path().lexically_relative(folder).string()] = entry.path().string();
+            }
+        }
+    } catch (const fs::filesystem_error& error) {
+        throw Trouble(folder, "cannot be read: " + error.code().message());
+    }
+    return files;
+}
+
+PathsByName files_that_match(const std::string& pattern) {
+    glob_t found = {};
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): no other thread is there yet.
+    const int status = ::glob(pattern.c_str(), 0, nullptr, &found);
+    std::vector<std::string> paths;
+    if (status == 0) {
+        paths.assign(found.gl_pathv, found.gl_pathv + found.gl_pathc);
+    }
+    ::globfree(&found);
+    if (paths.empty()) {
+        throw Trouble(pattern, "there is no such file, and no file matches it as a pattern");
+    }
+    PathsByName files;
+    for (const std::string& path : paths) {
+        const std::string name = fs::path(path).filename().string();
+        const auto [place, is_new] = files.emplace(name, path);
+        if (!is_new) {
+            throw Trouble(pattern, "matches two files of one name, " + place->second + " and "
+                                       + path + "; files are matched by name");
+        }
+    }
+    return files;
+}
+
+PathsByName files_of(const std::string& operand) {
+    return is_folder(operand) ? files_in(operand) : files_that_match(operand);
+}
+
+bool stands_for_many(const std::string& operand) {
+    return is_folder(operand) || is_pattern(operand);
+}
+
+// The file of the same name in the folder.
+std::string in_folder(const std::string& folder, const std::string& file) {
+    return (fs::path(folder) / fs::path(file).filename()).string();
+}
+
+bool accepts(const NameFilter& filter, const std::string& name) {
+    const auto matches = [&name](const std::string& pattern) {
+        return ::fnmatch(pattern.c_str(), name.c_str(), 0) == 0;
+    };
+    return (filter.include.empty()
+            || std::any_of(filter.include.begin(), filter.include.end(), matches))
+           && std::none_of(filter.exclude.begin(), filter.exclude.end(), matches);
+}
+
+} // namespace
+
+FilePairs match_files(const std::string& first, const std::string& second) {
+    if (stands_for_many(first) && stands_for_many(second)) {
+        FilePairs files{true, matched(files_of(first), files_of(second))};
+        if (files.pairs.empty()) {
+            throw Trouble(first, "holds no .npy or .npz file, nor does " + second);
+        }
+        return files;
+    }
+    if (first == standard_input_path || second == standard_input_path) {
+        return {false, {{"", first, second}}};
+    }
+    if (is_pattern(first) || is_pattern(second)) {
+        throw Trouble(is_pattern(first) ? first : second,
+                      "there is no such file; a pattern can be compared with another one or with a "
+                      "folder");
+    }
+    const std::string path1 = is_folder(first) ? in_folder(first, second) : first;
+    const std::string path2 = is_folder(second) ? in_folder(second, first) : second;
+    return {false, {{"", path1, path2}}};
+}
+
+std::vector<NamedPair> match_names(const std::vector<std::string>& first,
+                                   const std::vector<std::string>& second,
+                                   const NameFilter& filter) {
+    const auto accepted = [&filter](const std::vector<std::string>& names) {
+        PathsByName result;
+        for (const std::string& name : names) {
+            if (accepts(filter, name)) {
+                result[name] = name;
+            }
+        }
+        return result;
+    };
+    return matched(accepted(first), accepted(second));
+}
+
+} // namespace talcmp

@@ -1,0 +1,41 @@
+// What the two operands of the command line stand for.
+
+#ifndef TALCMP_OPERANDS_H
+#define TALCMP_OPERANDS_H
+
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace talcmp {
+
+// Two things of one name, or one that has no counterpart.
+struct NamedPair {
+    std::string name;
+    std::optional<std::string> first;
+    std::optional<std::string> second;
+};
+
+struct FilePairs {
+    bool many = false;            // whether folders or patterns were matched by name
+    std::vector<NamedPair> pairs; // of paths
+};
+
+// Two files; or all .npy and .npz files in two folders, by their paths in the folders; or what
+// matches two patterns, by the names of the files. Throws Trouble.
+FilePairs match_files(const std::string& first, const std::string& second);
+
+// Patterns for names, as of a shell; `include` without patterns stands for all names.
+struct NameFilter {
+    std::vector<std::string> include;
+    std::vector<std::string> exclude;
+};
+
+// All names of both lists that the filter accepts, in order.
+std::vector<NamedPair> match_names(const std::vector<std::string>& first,
+                                   const std::vector<std::string>& second,
+                                   const NameFilter& filter);
+
+} // namespace talcmp
+
+#endif

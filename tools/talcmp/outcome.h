@@ -1,0 +1,56 @@
+// What comes of the operands: of each two arrays that belong together, and in all.
+
+#ifndef TALCMP_OUTCOME_H
+#define TALCMP_OUTCOME_H
+
+#include "comparison.h"
+
+#include <cstdint>
+#include <string>
+
+namespace talcmp {
+
+struct Outcome {
+    enum class Kind { same, different, only_in_first, only_in_second, trouble };
+    Kind kind = Kind::same;
+    std::string first;     // what the arrays are called; of one that has no counterpart, where that
+    std::string second;    // would be
+    std::string name;      // of an array that has no counterpart, in a folder or an archive
+    Comparison comparison; // where the kind is same or different
+    std::string message;   // where there was trouble
+};
+
+// How many outcomes there were of each kind.
+struct Summary {
+    std::uint64_t same = 0;
+    std::uint64_t different = 0;
+    std::uint64_t only_in_first = 0;
+    std::uint64_t only_in_second = 0;
+    std::uint64_t trouble = 0;
+};
+
+void count(Summary& summary, Outcome::Kind kind);
+
+// The exit statuses of cmp and diff: 0 the same, 1 different, 2 trouble; the worst there was.
+int exit_status(const Summary& summary);
+
+// A way to tell the outcomes.
+class Answers {
+  public:
+    Answers() = default;
+    Answers(const Answers&) = delete;
+    Answers& operator=(const Answers&) = delete;
+    virtual ~Answers() = default;
+
+    // Before the first outcome. `many` says whether folders or patterns are compared.
+    virtual void begin(bool many) = 0;
+
+    virtual void tell(const Outcome& outcome) = 0;
+
+    // After the last outcome.
+    virtual void finish(const Summary& summary) = 0;
+};
+
+} // namespace talcmp
+
+#endif

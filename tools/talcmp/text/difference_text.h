@@ -1,0 +1,34 @@
+// Places and differences in words.
+
+#ifndef TALCMP_DIFFERENCE_TEXT_H
+#define TALCMP_DIFFERENCE_TEXT_H
+
+#include "comparison.h"
+
+#include <string>
+
+namespace talcmp {
+
+// As NumPy writes a shape: "()", "(3,)", "(2, 3)".
+std::string shape_text(const Shape& shape);
+
+// The index of a place in the first array, "[1, 2]".
+std::string index_text(const Comparison& comparison, const Place& place);
+
+// A value in digits that read back as the same value, a NaN as its bits.
+std::string first_value_text(const Comparison& comparison, const Place& place);
+std::string second_value_text(const Comparison& comparison, const Place& place);
+
+// Why the two are not the same: "the same from --tol 15 on", "opposite signs", ...
+std::string reason_text(const Comparison& comparison, const Place& place);
+
+// "[1, 2]: 0.5 and 0.25 (the same from --tol 53 on)"
+std::string place_text(const Comparison& comparison, const Place& place);
+
+// How two arrays that differ do: "shape (2, 3) and (3, 2)", "type int32 and float64", or the first
+// place that differs.
+std::string difference_text(const Comparison& comparison);
+
+} // namespace talcmp
+
+#endif

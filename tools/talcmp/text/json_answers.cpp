@@ -1,0 +1,172 @@
+#include "json_answers.h"
+
+#include "difference_text.h"
+#include "number_text.h"
+#include "report_text.h"
+#include "text_answers.h"
+
+#include <nlohmann/json.hpp>
+
+#include <cmath>
+#include <cstdio>
+
+namespace talcmp {
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+const char* kind_text(const Outcome::Kind kind) {
+    switch (kind) {
+    case Outcome::Kind::same:
+        return "same";
+    case Outcome::Kind::different:
+        return "different";
+    case Outcome::Kind::only_in_first:
+        return "only in first";
+    case Outcome::Kind::only_in_second:
+        return "only in second";
+    default:
+        return "trouble";
+    }
+}
+
+Json difference_kind(const Difference difference) {
+    switch (difference) {
+    case Difference::shape:
+        return "shape";
+    case Difference::type:
+        return "type";
+    case Difference::elements:
+        return "elements";
+    default:
+        return nullptr;
+    }
+}
+
+// JSON has no infinity.
+Json number(const talreal value) {
+    return std::isfinite(value) ? Json(value) : Json(number_text(value));
+}
+
+Json digits(const int count) {
+    return count > most_digits ? Json() : Json(count);
+}
+
+Json array_json(const ArrayFacts& array) {
+    return {{"name", array.name},
+            {"type", element_type(array.type).name},
+            {"shape", array.shape},
+            {"selected_shape", array.selected_shape},
+            {"order", array.fortran_order ? "Fortran" : "C"}};
+}
+
+Json place_json(const Comparison& comparison, const Place& place) {
+    const Pairs pair(comparison.array1.type, place.element1.data(), comparison.array2.type,
+                     place.element2.data(), 1);
+    return {{"index",
+             index_of(comparison.array1.shape, comparison.array1.fortran_order, place.position)},
+            {"first", first_value_text(comparison, place)},
+            {"second", second_value_text(comparison, place)},
+            {"digits", digits(sameness_of(pair, 0).digits())},
+            {"reason", reason_text(comparison, place)}};
+}
+
+Json values_json(const ValueCounts& counts) {
+    return {{"nans", counts.nans},
+            {"infinities", counts.infinities},
+            {"negative_zeros", counts.negative_zeros}};
+}
+
+Json histogram_json(const Report& report) {
+    Json bars = Json::array();
+    for (std::size_t i = 0; i < report.digits.size(); ++i) {
+        if (report.digits[i] != 0) {
+            bars.push_back({{"digits", digits(static_cast<int>(i))}, {"pairs", report.digits[i]}});
+        }
+    }
+    return bars;
+}
+
+Json report_json(const Comparison& comparison) {
+    if (!comparison.report) {
+        return nullptr;
+    }
+    const Report& report = *comparison.report;
+    const auto smallest = talcmp::smallest_tolerance(report);
+    const std::string why_none = reason_of_no_tolerance(comparison);
+    return {{"pairs", report.pairs},
+            {"differing", report.differing},
+            {"worst", report.worst_place ? place_json(comparison, *report.worst_place) : Json()},
+            {"smallest_tolerance", smallest ? Json(*smallest) : Json()},
+            {"why_no_tolerance", why_none.empty() ? Json() : Json(why_none)},
+            {"first_values", values_json(report.values1)},
+            {"second_values", values_json(report.values2)},
+            {"histogram", histogram_json(report)}};
+}
+
+Json comparison_json(const Comparison& comparison) {
+    Json places = Json::array();
+    for (const Place& place : comparison.places) {
+        places.push_back(place_json(comparison, place));
+    }
+    const bool has_report = comparison.difference != Difference::shape;
+    return {{"first", array_json(comparison.array1)},
+            {"second", array_json(comparison.array2)},
+            {"difference", difference_kind(comparison.difference)},
+            {"differences", places},
+            {"report", has_report ? report_json(comparison) : Json()}};
+}
+
+} // namespace
+
+struct JsonAnswers::Document { // NOLINT(bugprone-exception-escape): of moves that are not made
+    Json json;
+};
+
+JsonAnswers::JsonAnswers(const CommandLine& command_line)
+    : command_line_(command_line), document_(std::make_unique<Document>()) {}
+
+JsonAnswers::~JsonAnswers() = default;
+
+void JsonAnswers::begin(const bool /*many*/) {
+    document_->json = {{"talcmp", TALCMP_VERSION},
+                       {"format", 1},
+                       {"tolerance", number(command_line_.question.tolerance)},
+                       {"strict_type", command_line_.question.strict_type},
+                       {"slice", command_line_.slice.empty() ? Json() : Json(command_line_.slice)},
+                       {"comparisons", Json::array()}};
+}
+
+void JsonAnswers::tell(const Outcome& outcome) {
+    Json entry = {{"result", kind_text(outcome.kind)}};
+    switch (outcome.kind) {
+    case Outcome::Kind::same:
+    case Outcome::Kind::different:
+        entry.update(comparison_json(outcome.comparison));
+        break;
+    case Outcome::Kind::only_in_first:
+    case Outcome::Kind::only_in_second:
+        entry["name"] = outcome.name;
+        break;
+    case Outcome::Kind::trouble:
+        entry["message"] = outcome.message;
+        complain(outcome.message);
+        break;
+    }
+    document_->json["comparisons"].push_back(entry);
+}
+
+void JsonAnswers::finish(const Summary& summary) {
+    document_->json["summary"] = {{"same", summary.same},
+                                  {"different", summary.different},
+                                  {"only_in_first", summary.only_in_first},
+                                  {"only_in_second", summary.only_in_second},
+                                  {"trouble", summary.trouble}};
+    document_->json["exit_status"] = talcmp::exit_status(summary);
+    // Names of files need not be UTF-8, which JSON is.
+    const std::string text =
+        document_->json.dump(2, ' ', false, Json::error_handler_t::replace) + "\n";
+    std::fputs(text.c_str(), stdout);
+}
+
+} // namespace talcmp

@@ -1,0 +1,32 @@
+// Outcomes as one JSON document on standard output, which talcmp.schema.json describes.
+
+#ifndef TALCMP_JSON_ANSWERS_H
+#define TALCMP_JSON_ANSWERS_H
+
+#include "command_line.h"
+#include "outcome.h"
+
+#include <memory>
+
+namespace talcmp {
+
+class JsonAnswers : public Answers {
+  public:
+    explicit JsonAnswers(const CommandLine& command_line);
+    JsonAnswers(const JsonAnswers&) = delete;
+    JsonAnswers& operator=(const JsonAnswers&) = delete;
+    ~JsonAnswers() override;
+
+    void begin(bool many) override;
+    void tell(const Outcome& outcome) override;
+    void finish(const Summary& summary) override;
+
+  private:
+    struct Document;
+    const CommandLine& command_line_;
+    std::unique_ptr<Document> document_;
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,48 @@
+#include "terminal.h"
+
+#include <cstdlib>
+
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+namespace talcmp {
+namespace {
+
+// Empty where the variable is not set.
+std::string environment(const char* const variable) {
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing changes the environment.
+    const char* const value = std::getenv(variable);
+    return value == nullptr ? "" : value;
+}
+
+bool shows_colours() {
+    const std::string terminal = environment("TERM");
+    return !terminal.empty() && terminal != "dumb" && environment("NO_COLOR").empty();
+}
+
+} // namespace
+
+Terminal Terminal::of_standard_output() {
+    const bool colours = ::isatty(STDOUT_FILENO) == 1 && shows_colours();
+    return {colours, columns_of(STDOUT_FILENO)};
+}
+
+std::string Terminal::coloured(const std::string& text, const Colour colour) const {
+    if (!colours_) {
+        return text;
+    }
+    const char* const code = colour == Colour::red ? "31" : colour == Colour::green ? "32" : "34";
+    return "\x1B[" + std::string(code) + "m" + text + "\x1B[0m";
+}
+
+int columns_of(const int descriptor) {
+    constexpr int usual = 80;
+    constexpr int fewest = 20;
+    struct winsize size = {};
+    if (::ioctl(descriptor, TIOCGWINSZ, &size) != 0 || size.ws_col == 0) {
+        return usual;
+    }
+    return size.ws_col < fewest ? fewest : size.ws_col;
+}
+
+} // namespace talcmp

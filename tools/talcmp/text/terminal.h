@@ -1,0 +1,36 @@
+// What a terminal needs that a file or a pipe does not.
+
+#ifndef TALCMP_TERMINAL_H
+#define TALCMP_TERMINAL_H
+
+#include <string>
+
+namespace talcmp {
+
+enum class Colour { red, green, blue };
+
+// What standard output is.
+class Terminal {
+  public:
+    // Colours are shown on a terminal, unless the environment variable NO_COLOR is set or TERM is
+    // "dumb".
+    static Terminal of_standard_output();
+
+    Terminal(const bool colours, const int columns) : colours_(colours), columns_(columns) {}
+
+    std::string coloured(const std::string& text, Colour colour) const;
+
+    // Characters in a line.
+    int columns() const { return columns_; }
+
+  private:
+    bool colours_;
+    int columns_;
+};
+
+// Characters in a line of the terminal `descriptor`; 80 where it is none.
+int columns_of(int descriptor);
+
+} // namespace talcmp
+
+#endif

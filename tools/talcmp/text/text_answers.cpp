@@ -1,0 +1,71 @@
+#include "text_answers.h"
+
+#include "difference_text.h"
+#include "report_text.h"
+#include "trouble.h"
+
+#include <cstdio>
+
+namespace talcmp {
+namespace {
+
+void print(const std::string& line) {
+    std::printf("%s\n", line.c_str());
+}
+
+std::string summary_text(const Summary& summary) {
+    return std::to_string(summary.same) + " the same, " + std::to_string(summary.different)
+           + " different, " + std::to_string(summary.only_in_first) + " only in the first, "
+           + std::to_string(summary.only_in_second) + " only in the second, "
+           + std::to_string(summary.trouble) + " in trouble";
+}
+
+} // namespace
+
+void TextAnswers::tell(const Outcome& outcome) {
+    if (outcome.kind == Outcome::Kind::trouble) {
+        complain(outcome.message);
+    } else if (command_line_.quiet) {
+        return;
+    } else if (outcome.kind != Outcome::Kind::same) {
+        tell_difference(outcome);
+    } else if (many_ || command_line_.verbose || command_line_.question.report) {
+        print(shown(outcome.first) + " " + shown(outcome.second) + " "
+              + terminal_.coloured("are the same", Colour::green));
+    }
+    const auto& report = outcome.comparison.report;
+    if (report && report->pairs != 0) {
+        const auto text = report_text(outcome.comparison, command_line_.question, terminal_);
+        std::fputs(text.c_str(), stdout);
+    }
+}
+
+void TextAnswers::tell_difference(const Outcome& outcome) const {
+    const std::string begin = shown(outcome.first) + " " + shown(outcome.second) + " "
+                              + terminal_.coloured("differ", Colour::red) + ": ";
+    const Comparison& comparison = outcome.comparison;
+    if (outcome.kind != Outcome::Kind::different) {
+        const bool first = outcome.kind == Outcome::Kind::only_in_first;
+        print(begin + "only in " + shown(first ? outcome.first : outcome.second) + ": "
+              + shown(outcome.name));
+    } else if (comparison.difference != Difference::elements) {
+        print(begin + difference_text(comparison));
+    } else {
+        for (const Place& place : comparison.places) {
+            print(begin + place_text(comparison, place));
+        }
+    }
+}
+
+void TextAnswers::finish(const Summary& summary) {
+    if (many_ && !command_line_.quiet) {
+        print(summary_text(summary));
+    }
+}
+
+void complain(const std::string& message) {
+    std::fflush(stdout); // so that lines on one terminal stay in their order
+    std::fprintf(stderr, "talcmp: %s\n", message.c_str());
+}
+
+} // namespace talcmp
