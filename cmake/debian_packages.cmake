@@ -44,12 +44,14 @@ set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION math)
 if(CMAKE_CROSSCOMPILING)
   # dpkg-shlibdeps would name the packages of the cross compiler, which the architecture itself has
   # not. These are Debian 12's, to which the cross compiler links.
-  set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS "libc6 (>= 2.36), libgcc-s1 (>= 12), libstdc++6 (>= 12)")
+  set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS 
+      "libc6 (>= 2.36), libgcc-s1 (>= 12), libstdc++6 (>= 12), libzip4 (>= 1.7)")
 else()
   set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)
 endif()
 set(CPACK_COMPONENT_RUNTIME_DESCRIPTION
-    "Compare the arrays in two .npy files
- talcmp says how two arrays of numbers first differ, under a tolerance in binary digits.")
+    "Compare the arrays in .npy and .npz files
+ talcmp says whether two arrays of numbers are the same, where they differ and by how much, under a
+ tolerance in binary digits.")
 
 include(CPack)

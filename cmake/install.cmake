@@ -4,7 +4,9 @@
 
 option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
        OFF)
+set(zsh_folder site-functions)
 if(TALNUMERICARRAY_DEBIAN_PACKAGES)
+  set(zsh_folder vendor-completions)
   include(${CMAKE_CURRENT_LIST_DIR}/debian_packages.cmake)
 endif()
 include(CMakePackageConfigHelpers)
@@ -68,5 +70,40 @@ install(
 # ---- The command
 
 if(TARGET talcmp)
+  set(talcmp_folder ${PROJECT_SOURCE_DIR}/tools/talcmp)
   install(TARGETS talcmp RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT Runtime)
+  set(manual ${talcmp_folder}/talcmp.1)
+  if(TALNUMERICARRAY_DEBIAN_PACKAGES)
+    # Debian compresses its manual pages.
+    file(MAKE_DIRECTORY ${generated})
+    execute_process(COMMAND gzip -9nc ${manual} OUTPUT_FILE ${generated}/talcmp.1.gz
+                            COMMAND_ERROR_IS_FATAL ANY)
+    set(manual ${generated}/talcmp.1.gz)
+  endif()
+  install(
+    FILES ${manual}
+    DESTINATION ${CMAKE_INSTALL_MANDIR}/man1
+    COMPONENT Runtime)
+  install(
+    FILES ${talcmp_folder}/talcmp.schema.json ${PROJECT_SOURCE_DIR}/docs/talcmp.md
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/talcmp
+    COMPONENT Runtime)
+  install(
+    DIRECTORY ${PROJECT_SOURCE_DIR}/examples/recipes
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/talcmp
+    COMPONENT Runtime
+    USE_SOURCE_PERMISSIONS)
+  install(
+    FILES ${talcmp_folder}/completions/talcmp.bash
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
+    RENAME talcmp
+    COMPONENT Runtime)
+  install(
+    FILES ${talcmp_folder}/completions/_talcmp
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/${zsh_folder}
+    COMPONENT Runtime)
+  install(
+    FILES ${talcmp_folder}/completions/talcmp.fish
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d
+    COMPONENT Runtime)
 endif()

@@ -5,8 +5,8 @@
 
 Each ```console block is a session: its lines behind "$ " are run one after the other by bash in
 ROOT, with the programs of BIN first in the path, behind their emulator if one is given, and must
-print the lines that follow them. Each ```cpp block must stand, line by line, in one of the files of
-ROOT/examples, and each ```cmake block in one of the projects of ROOT/tests/outside.
+print the lines that follow them. Each block in another language must stand, line by line, in one of
+the files of ROOT that are listed for it below, which other tests run.
 """
 
 import os
@@ -14,14 +14,20 @@ import re
 import subprocess
 import sys
 import tempfile
-import textwrap
 from pathlib import Path
+
+SOURCES = {
+    "cpp": ["examples/*.cpp"],
+    "cmake": ["tests/outside/*/CMakeLists.txt", "examples/recipes/CMakeLists.txt"],
+    "sh": ["examples/recipes/*.sh"],
+    "yaml": ["examples/recipes/*.yml"],
+}
 
 
 def blocks(document, language):
     pattern = rf"^( *)```{language}\n(.*?)^ *```$"
     found = re.findall(pattern, document, flags=re.MULTILINE | re.DOTALL)
-    return [textwrap.dedent(body) for _, body in found]
+    return [re.sub(f"^{indent}", "", body, flags=re.MULTILINE) for indent, body in found]
 
 
 def run_session(commands, root, folder):
@@ -60,13 +66,14 @@ def main():
                 failures += 1
                 print(f"-- documented:\n{session}-- found:\n{shown}")
     snippets = 0
-    for language, pattern in (("cpp", "examples/*.cpp"), ("cmake", "tests/outside/*/CMakeLists.txt")):
-        sources = [path.read_text(encoding="utf-8") for path in root.glob(pattern)]
+    for language, patterns in SOURCES.items():
+        sources = [path.read_text(encoding="utf-8") for pattern in patterns
+                   for path in root.glob(pattern)]
         for snippet in blocks(document, language):
             snippets += 1
             if not any(snippet in source for source in sources):
                 failures += 1
-                print(f"-- not in any file of {pattern}:\n{snippet}")
+                print(f"-- not in any file of {patterns}:\n{snippet}")
     print(f"{len(sessions)} sessions and {snippets} snippets, {failures} wrong")
     sys.exit(1 if failures or not sessions else 0)
 

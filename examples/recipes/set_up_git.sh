@@ -1,0 +1,12 @@
+#!/bin/sh
+# shellcheck disable=SC2016 # git expands what is in single quotes
+# Has git tell of a changed array, in this repository, how it differs.
+echo '*.npy diff=npy' >>.gitattributes
+
+# git diff, git show, git log --patch: what a report says of each array alone, line by line.
+git config diff.npy.textconv 'f() { talcmp --report "$1" "$1" | tail -n +2; }; f'
+
+# git difftool: how the old array and the new one differ.
+git config difftool.talcmp.cmd 'talcmp --report "$LOCAL" "$REMOTE" || true'
+git config diff.tool talcmp
+git config difftool.prompt false

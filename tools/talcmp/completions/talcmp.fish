@@ -1,0 +1,16 @@
+# Completion of talcmp for fish.
+
+complete -c talcmp -f -a '(__fish_complete_suffix .npy; __fish_complete_suffix .npz)'
+complete -c talcmp -l tol -x -d 'Tolerate so many binary digits in reals'
+complete -c talcmp -l strict-type -d 'Arrays of different element types differ'
+complete -c talcmp -l slice -x -d 'Compare a part, such as 0:10,:,3'
+complete -c talcmp -l include -x -d 'Only such members of an archive'
+complete -c talcmp -l exclude -x -d 'All members of an archive but such'
+complete -c talcmp -s n -l max-differences -x -d 'List the first differences'
+complete -c talcmp -l report -d 'Count and measure all differences'
+complete -c talcmp -l json -d 'Print a report in JSON'
+complete -c talcmp -s q -l quiet -d 'Print nothing, only exit'
+complete -c talcmp -s v -l verbose -d 'Tell of arrays that are the same, too'
+complete -c talcmp -l threads -x -d 'Use at most so many threads'
+complete -c talcmp -s h -l help -d 'Print the options'
+complete -c talcmp -l version -d 'Print the version'
