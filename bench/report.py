@@ -19,6 +19,9 @@ FRACTIONAL_BAR = 1.5
 SMALL_BAR = 1.05
 SMALL_LENGTHS = 64
 PEER_BAR = 3.0  # the least
+FILE_BAR = 1.3
+REPORT_BAR = 3.0
+ALLCLOSE_BAR = 10.0  # the least
 
 WORKLOADS = {
     "identical": "identical",
@@ -248,6 +251,20 @@ def peers_table(peers):
     return table(("elements", "function", "elementwise", "time, µs", "of ours"), rows)
 
 
+def files_table(files):
+    cmp_seconds = files["rows"][0]["seconds"]
+    rows = [
+        (
+            row["name"],
+            f"{row['seconds']:.2f}",
+            f"{row['seconds'] / cmp_seconds:.2f}",
+            f"{row['memory'] / 2**20:.0f}",
+        )
+        for row in files["rows"]
+    ]
+    return table(("command and files", "time, s", "of cmp", "memory, MiB"), rows)
+
+
 # ---- Pictures
 
 
@@ -288,7 +305,7 @@ def heat_map(loops, size):
 # ---- Bars
 
 
-def bars(loops, small, peers):
+def bars(loops, small, peers, files):
     """What is measured, its value, the bar, and whether the value may not be below it."""
     for (size, workload), ratios in loops.ratios.items():
         all_mean = mean(loops.all_pairs(size, workload).values())
@@ -307,6 +324,14 @@ def bars(loops, small, peers):
     for element_type in peers.times:
         ratio, peer = peers.least_ratio(element_type)
         yield f"{element_type}, {peer.replace('_', ' ')} to ours", ratio, PEER_BAR, True
+    seconds = {row["name"]: row["seconds"] for row in files["rows"]}
+    cmp_seconds, near = seconds["cmp, identical"], seconds["talcmp --tol 20, near"]
+    yield "identical files, talcmp to cmp", seconds["talcmp, identical"] / cmp_seconds, FILE_BAR, False
+    yield "near files, talcmp to cmp of identical ones", near / cmp_seconds, FILE_BAR, False
+    report = seconds["talcmp --tol 20 --report, near"]
+    yield "near files, talcmp with a report to without", report / near, REPORT_BAR, False
+    allclose = seconds["NumPy allclose of loaded arrays, near"]
+    yield "near files, NumPy allclose of loaded arrays to talcmp", allclose / near, ALLCLOSE_BAR, True
 
 
 def print_bars(measured):
@@ -342,6 +367,7 @@ def main():
     loops = Loops(read("element_loops"))
     small = read("small_arrays")
     peers = Peers(read("peers"), read("numpy_peer"))
+    files = read("talcmp_files")
 
     for size in loops.sizes:
         picture = documents / f"performance_{size}.svg"
@@ -353,8 +379,9 @@ def main():
     text = renew(text, "worst pairs", worst_pairs_table(loops))
     text = renew(text, "short arrays", small_table(small))
     text = renew(text, "peers", peers_table(peers))
+    text = renew(text, "files", files_table(files))
     document.write_text(text, encoding="utf-8")
-    print_bars(bars(loops, small, peers))
+    print_bars(bars(loops, small, peers, files))
 
 
 if __name__ == "__main__":
