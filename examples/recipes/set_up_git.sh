@@ -3,8 +3,9 @@
 # Has git tell of a changed array, in this repository, how it differs.
 echo '*.npy diff=npy' >>.gitattributes
 
-# git diff, git show, git log --patch: what a report says of each array alone, line by line.
-git config diff.npy.textconv 'f() { talcmp --report "$1" "$1" | tail -n +2; }; f'
+# git diff, git show, git log --patch: what a report says of each array alone, line by line, and a sum
+# that differs whenever the array does.
+git config diff.npy.textconv 'f() { talcmp --report "$1" "$1" | tail -n +2; cksum <"$1"; }; f'
 
 # git difftool: how the old array and the new one differ.
 git config difftool.talcmp.cmd 'talcmp --report "$LOCAL" "$REMOTE" || true'

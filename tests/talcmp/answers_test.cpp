@@ -154,7 +154,8 @@ const Answer tolerances[] = {
     {"NaNsUnderOne",
      nan1,
      nan1,
-     "[0]: nan(0x7ff8000000000123) and nan(0x7ff8000000000123) (the same from --tol 53 on)",
+     "[0]: nan(0x7ff8000000000123) and nan(0x7ff8000000000123) "
+     "(NaNs of the same bits are the same under --tol 0)",
      {"--tol", "1"}},
     {"Integers", i32({7}), i32({8}), "[0]: 7 and 8 (different integers)", {"--tol", "100"}},
     {"NearThenFar", f64({1, 1}), near_far, "", {"--tol", "52.5"}},
@@ -300,9 +301,9 @@ TEST(Parts, ThatAnArrayHasNotAreTrouble) {
     const TemporaryFolder folder;
     const std::string path = folder.write("a.npy", f64({1, 2, 3}));
     expect_trouble(run_talcmp({"--slice=3", path, path}), path + ": ",
-                   "has no index 3 in a dimension of 3");
+                   "has no index 3 in axis 0, whose length is 3");
     expect_trouble(run_talcmp({"--slice=-4", path, path}), path + ": ",
-                   "has no index -4 in a dimension of 3");
+                   "has no index -4 in axis 0, whose length is 3");
     expect_trouble(run_talcmp({"--slice=0,0", path, path}), path + ": ",
                    "has fewer dimensions (1) than --slice (2)");
 }
@@ -484,10 +485,12 @@ void PrintTo(const BadUsage& usage, std::ostream* out) {
 const BadUsage bad_usages[] = {
     {"NoFiles", {}, "two arrays are needed"},
     {"OneFile", {"a"}, "two arrays are needed"},
-    {"ThreeFiles", {"a", "b", "c"}, "not expected: c"},
-    {"UnknownOption", {"--fast", "a", "b"}, "--fast"},
-    {"UnknownShortOption", {"-t", "a", "b"}, "-t"},
+    {"ThreeFiles", {"a", "b", "c"}, "more than two arrays; a pattern"},
+    {"PatternsThatTakeNoOperands", {"a", "b", "--exclude", "x", "c"}, "more than two arrays"},
+    {"UnknownOption", {"--fast", "a", "b"}, "no option '--fast'"},
+    {"UnknownShortOption", {"-t", "a", "b"}, "no option '-t'"},
     {"AbbreviatedOption", {"--strict", "a", "b"}, "--strict"},
+    {"TolOfFile", {"--tol", "a", "b"}, "not 'a'"},
     {"TolWithoutNumber", {"a", "b", "--tol"}, "--tol"},
     {"StrictTypeWithValue", {"--strict-type=no", "a", "b"}, "strict-type"},
     {"TolTwice", {"--tol", "1", "--tol", "2", "a", "b"}, "--tol"},
@@ -542,6 +545,26 @@ TEST(CommandLine, MayTellOfEqualArraysToo) {
     const TemporaryFolder folder;
     const std::string path = folder.write("a.npy", f64({1, 2}));
     EXPECT_EQ(run_talcmp({"-v", path, path}).output, path + " " + path + " are the same\n");
+    EXPECT_EQ(run_talcmp({"-v", "--slice=5:", path, path}).output,
+              path + " " + path + " are the same (no elements)\n");
+}
+
+TEST(CommandLine, MayAskForAReportWhereThereIsNothingToCount) {
+    const TemporaryFolder folder;
+    const std::string path1 = folder.write("a.npy", no_singles);
+    const std::string path2 = folder.write("b.npy", no_doubles);
+    const std::string path3 = folder.write("c.npy", f64({1}));
+    const std::string tolerance = "  tolerance             0 binary digits\n";
+    EXPECT_EQ(run_talcmp({"--report", path1, path2}).output,
+              path1 + " " + path2
+                  + " are the same (no elements)\n"
+                    "  first array           float32 (0,)\n  second array          float64 (0,)\n"
+                  + tolerance + "  pairs                 0\n");
+    EXPECT_EQ(run_talcmp({"--report", path1, path3}).output,
+              path1 + " " + path3
+                  + " differ: shape (0,) and (1,)\n"
+                    "  first array           float32 (0,)\n  second array          float64 (1,)\n"
+                  + tolerance);
 }
 
 TEST(CommandLine, MayAskForTheExitStatusAlone) {

@@ -460,6 +460,9 @@ class Archives(Folder):
             f"{a}[y] {b}[y] differ: shape (2,) and (2, 1)"])
         self.assertEqual(run(a, b, "--include", "x*", "--exclude=x")[0], 2)
         self.assertEqual(run(a, b, "--include", "x")[0], 1)
+        self.assertEqual(run("--include", "z", "--include", "x", a, b)[0], 1)
+        self.assertEqual(run(a, "--exclude", "only*", "--exclude", "[xy]", a), (2, "", f"talcmp: "
+                         f"{a}: has no array that --include and --exclude leave, nor has {a}\n"))
         self.assertEqual(len(run(a, b, "--exclude", "only*")[1].splitlines()), 2)
         self.assertEqual(len(run(a, b, "--include=only*", "--include=y")[1].splitlines()), 3)
 
@@ -507,6 +510,8 @@ class Archives(Folder):
     def test_no_members(self):
         a = self.save_archive("a.npz")
         self.assertEqual(run(a, a), (0, "", ""))
+        self.assertEqual(run("-v", a, a), (0, "0 the same, 0 different, 0 only in the first, "
+                                           "0 only in the second, 0 in trouble\n", ""))
 
 
 class FoldersAndPatterns(Folder):
@@ -557,6 +562,14 @@ class FoldersAndPatterns(Folder):
         self.assertEqual(document["summary"], {"same": 0, "different": 1, "only_in_first": 1,
                                                "only_in_second": 1, "trouble": 1})
 
+    def test_files_that_are_left_out(self):
+        one, two = self.make_folders()
+        status, _, errors = run(one, two, "--exclude=*")
+        self.assertEqual(status, 2)
+        self.assertIn("holds no .npy or .npz file to compare", errors)
+        self.assertEqual(run("-q", one, two, "--exclude=sub/*", "--exclude=mine*",
+                             "--exclude=yours*"), (0, "", ""))
+
     def test_patterns(self):
         one, two = self.make_folders()
         status, output, _ = run(one + "/s*.npy", two + "/[s]*.npy")
@@ -582,7 +595,8 @@ class KindsThatAreNotCompared(Folder):
     def test_each_is_told(self):
         good = self.save("good.npy", np.zeros(2))
         for values, message in [
-                (np.zeros(2, dtype="f2"), "'<f2', which is not supported"),
+                (np.zeros(2, dtype="f2"), "half precision"),
+                (np.zeros(2, dtype=np.longdouble), "extended precision"),
                 (np.zeros(2, dtype="?"), "boolean"),
                 (np.zeros(2, dtype="U3"), "text"),
                 (np.zeros(2, dtype="S3"), "text"),

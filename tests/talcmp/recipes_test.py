@@ -75,7 +75,7 @@ class ShellScript(Recipe):
     def test_as_expected(self):
         status, output, errors = self.compare(np.arange(5.0))
         self.assertEqual((status, errors), (0, ""))
-        self.assertTrue(output.endswith("all results are as expected\n"))
+        self.assertEqual(output, "all results are as expected\n")
 
     def test_not_as_expected(self):
         status, output, _ = self.compare(np.arange(5.0) * (1 + 2.0**-35))
@@ -128,6 +128,10 @@ class Git(Recipe):
 
     def test_difftool(self):
         self.assertIn("smallest tolerance    --tol 18", self.git("difftool"))
+
+    def test_diff_of_values_alone(self):
+        self.save("a.npy", np.arange(5.0) + 1)
+        self.assertTrue(self.git("diff"))
 
     def test_diff(self):
         self.save("a.npy", np.array([0, np.nan, 2]))

@@ -4,6 +4,7 @@
 
 #include <CLI/CLI.hpp>
 
+#include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <cstdio>
@@ -22,11 +23,11 @@ two folders, or two patterns in quotes ('run1/*.npy'), matched by name.
       --strict-type       arrays of different element types differ
       --slice RANGES      compare a part, such as 0:10,:,3
       --include PATTERN   only such members of an archive; may be repeated
-      --exclude PATTERN   all members of an archive but such; may be repeated
+      --exclude PATTERN   no such members, or files of folders; may be repeated
   -n, --max-differences N list the first N differences (default 1)
       --report            count and measure all differences
       --json              print a report in JSON
-  -q, --quiet             print nothing, only exit
+  -q, --quiet             print nothing but trouble, only exit
   -v, --verbose           tell of arrays that are the same, too
       --threads N         use at most N threads; answers are the same
   -h, --help; --version   print this; print the version
@@ -81,9 +82,15 @@ struct Texts {
     bool version = false;
 };
 
-// Says the same of what CLI11 refuses, whatever its version.
-std::string complaint(const CLI::ParseError& error) {
-    return error.what();
+// What the words are that belong to no option, and are no operands.
+std::string complaint(const std::vector<std::string>& words) {
+    const auto option = std::find_if(words.begin(), words.end(), [](const std::string& word) {
+        return word.size() > 1 && word.front() == '-';
+    });
+    if (option != words.end()) {
+        return "there is no option '" + *option + "'";
+    }
+    return "there are more than two arrays; a pattern for several goes in quotes";
 }
 
 void add_options(CLI::App& app, CommandLine& line, Texts& texts) {
@@ -93,12 +100,9 @@ void add_options(CLI::App& app, CommandLine& line, Texts& texts) {
     app.add_option("--tol", texts.tolerance);
     app.add_flag("--strict-type", line.question.strict_type)->disable_flag_override();
     app.add_option("--slice", line.slice);
-    app.add_option("--include", line.member_filter.include)
-        ->expected(1)
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
-    app.add_option("--exclude", line.member_filter.exclude)
-        ->expected(1)
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll);
+    // One pattern behind each; the next word is an operand.
+    app.add_option("--include", line.filter.include)->allow_extra_args(false);
+    app.add_option("--exclude", line.filter.exclude)->allow_extra_args(false);
     app.add_option("-n,--max-differences", texts.differences);
     app.add_flag("--report", line.question.report)->disable_flag_override();
     app.add_flag("--json", line.json)->disable_flag_override();
@@ -131,14 +135,15 @@ std::optional<CommandLine> read_command_line(const int argc, const char* const* 
     add_options(app, line, texts);
     try {
         app.parse(argc, argv);
+    } catch (const CLI::ExtrasError&) {
+        throw UsageError(complaint(app.remaining()));
     } catch (const CLI::ParseError& error) {
-        throw UsageError(complaint(error));
+        throw UsageError(error.what());
     }
     if (texts.help || texts.version) {
         std::fputs(texts.help ? help : "talcmp " TALCMP_VERSION "\n", stdout);
         return std::nullopt;
     }
-    check_together(line);
     constexpr std::size_t most_differences = 10000000; // that memory holds
     constexpr unsigned most_threads = 64;
     line.question.tolerance = tolerance_from(texts.tolerance);
@@ -150,6 +155,7 @@ std::optional<CommandLine> read_command_line(const int argc, const char* const* 
     if (!line.slice.empty()) {
         line.question.selection = selection_from(line.slice);
     }
+    check_together(line);
     line.question.report = line.question.report || line.json;
     return line;
 }

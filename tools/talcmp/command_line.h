@@ -14,7 +14,7 @@ namespace talcmp {
 
 struct CommandLine {
     Question question;
-    NameFilter member_filter;
+    NameFilter filter; // of members of archives; what is excluded also of files of folders
     bool json = false;
     bool quiet = false;
     bool verbose = false;

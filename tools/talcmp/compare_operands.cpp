@@ -13,7 +13,8 @@ class Run {
         : command_line_(command_line), answers_(answers), progress_(progress) {}
 
     Summary compare_all() {
-        const FilePairs files = match_files(command_line_.first, command_line_.second);
+        const FilePairs files =
+            match_files(command_line_.first, command_line_.second, command_line_.filter.exclude);
         answers_.begin(files.many);
         for (const NamedPair& pair : files.pairs) {
             if (pair.first && pair.second) {
@@ -56,8 +57,7 @@ class Run {
 
     void compare_members(const std::string& path1, ArrayFile& file1, const std::string& path2,
                          ArrayFile& file2) {
-        const auto pairs =
-            match_names(file1.members(), file2.members(), command_line_.member_filter);
+        const auto pairs = match_names(file1.members(), file2.members(), command_line_.filter);
         if (pairs.empty() && !(file1.members().empty() && file2.members().empty())) {
             throw Trouble(path1,
                           "has no array that --include and --exclude leave, nor has " + path2);
@@ -77,7 +77,7 @@ class Run {
         if (!file.is_archive()) {
             return "";
         }
-        const auto members = match_names(file.members(), {}, command_line_.member_filter);
+        const auto members = match_names(file.members(), {}, command_line_.filter);
         if (members.size() != 1) {
             throw Trouble(path, "has " + std::to_string(members.size())
                                     + " arrays, the other file one; choose one with --include");

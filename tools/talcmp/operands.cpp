@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <iterator>
 #include <map>
 #include <system_error>
 
@@ -102,22 +103,33 @@ std::string in_folder(const std::string& folder, const std::string& file) {
     return (fs::path(folder) / fs::path(file).filename()).string();
 }
 
-bool accepts(const NameFilter& filter, const std::string& name) {
-    const auto matches = [&name](const std::string& pattern) {
+bool matches_any(const std::vector<std::string>& patterns, const std::string& name) {
+    return std::any_of(patterns.begin(), patterns.end(), [&name](const std::string& pattern) {
         return ::fnmatch(pattern.c_str(), name.c_str(), 0) == 0;
-    };
-    return (filter.include.empty()
-            || std::any_of(filter.include.begin(), filter.include.end(), matches))
-           && std::none_of(filter.exclude.begin(), filter.exclude.end(), matches);
+    });
+}
+
+bool accepts(const NameFilter& filter, const std::string& name) {
+    return (filter.include.empty() || matches_any(filter.include, name))
+           && !matches_any(filter.exclude, name);
+}
+
+PathsByName without(PathsByName files, const std::vector<std::string>& exclude) {
+    for (auto file = files.begin(); file != files.end();) {
+        file = matches_any(exclude, file->first) ? files.erase(file) : std::next(file);
+    }
+    return files;
 }
 
 } // namespace
 
-FilePairs match_files(const std::string& first, const std::string& second) {
+FilePairs match_files(const std::string& first, const std::string& second,
+                      const std::vector<std::string>& exclude) {
     if (stands_for_many(first) && stands_for_many(second)) {
-        FilePairs files{true, matched(files_of(first), files_of(second))};
+        FilePairs files{
+            true, matched(without(files_of(first), exclude), without(files_of(second), exclude))};
         if (files.pairs.empty()) {
-            throw Trouble(first, "holds no .npy or .npz file, nor does " + second);
+            throw Trouble(first, "holds no .npy or .npz file to compare, nor does " + second);
         }
         return files;
     }

@@ -23,7 +23,9 @@ struct FilePairs {
 
 // Two files; or all .npy and .npz files in two folders, by their paths in the folders; or what
 // matches two patterns, by the names of the files. Throws Trouble.
-FilePairs match_files(const std::string& first, const std::string& second);
+// Names that match a pattern of `exclude` are left out.
+FilePairs match_files(const std::string& first, const std::string& second,
+                      const std::vector<std::string>& exclude);
 
 // Patterns for names, as of a shell; `include` without patterns stands for all names.
 struct NameFilter {

@@ -22,6 +22,11 @@ void count(Summary& summary, const Outcome::Kind kind) {
     }
 }
 
+std::uint64_t total(const Summary& summary) {
+    return summary.same + summary.different + summary.only_in_first + summary.only_in_second
+           + summary.trouble;
+}
+
 int exit_status(const Summary& summary) {
     if (summary.trouble != 0) {
         return 2;

@@ -31,6 +31,8 @@ struct Summary {
 
 void count(Summary& summary, Outcome::Kind kind);
 
+std::uint64_t total(const Summary& summary);
+
 // The exit statuses of cmp and diff: 0 the same, 1 different, 2 trouble; the worst there was.
 int exit_status(const Summary& summary);
 

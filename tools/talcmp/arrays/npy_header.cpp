@@ -203,6 +203,12 @@ class DictionaryReader {
 
 // What the kinds of elements are that NumPy has and talcmp has not.
 std::string kind_name(const std::string& code) {
+    if (code == "f2") {
+        return " (half precision)";
+    }
+    if (code == "f12" || code == "f16" || code == "c24" || code == "c32") {
+        return " (extended precision)";
+    }
     switch (code.empty() ? '\0' : code[0]) {
     case 'b':
     case '?':

@@ -263,8 +263,9 @@ Comparison compare(NamedArray first, NamedArray second, const Question& question
     if (question.report) {
         result.report.emplace();
     }
-    const bool empty = std::find(view1.shape.begin(), view1.shape.end(), 0U) != view1.shape.end();
-    if (!empty
+    result.has_elements =
+        std::find(view1.shape.begin(), view1.shape.end(), 0U) == view1.shape.end();
+    if (result.has_elements
         && !(question.strict_type && result.array1.type != result.array2.type
              && !question.report)) {
         compare_elements(first, second, view1, view2, question, progress, result);

@@ -38,6 +38,7 @@ struct ArrayFacts {
 
 struct Comparison {
     ArrayFacts array1, array2;
+    bool has_elements = true; // whether there was any pair to compare
     Difference difference = Difference::none;
     std::vector<Place> places;    // the first that differ, in row-major order
     std::optional<Report> report; // where asked for and the shapes are the same

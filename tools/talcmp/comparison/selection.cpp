@@ -86,19 +86,21 @@ std::uint64_t clipped(const std::int64_t number, const std::uint64_t dimension) 
     return dimension - std::min(back, dimension);
 }
 
-std::uint64_t checked_index(const std::int64_t number, const std::uint64_t dimension) {
+std::uint64_t checked_index(const std::int64_t number, const std::uint64_t dimension,
+                            const std::size_t axis) {
     const std::uint64_t back = std::uint64_t{0} - static_cast<std::uint64_t>(number);
     if (number >= 0 ? static_cast<std::uint64_t>(number) >= dimension : back > dimension) {
-        throw std::invalid_argument("has no index " + std::to_string(number) + " in a dimension of "
+        throw std::invalid_argument("has no index " + std::to_string(number) + " in axis "
+                                    + std::to_string(axis) + ", whose length is "
                                     + std::to_string(dimension));
     }
     return clipped(number, dimension);
 }
 
-void append(View& view, const AxisRange& range, const std::uint64_t dimension,
-            const std::uint64_t stride) {
+void append(View& view, const AxisRange& range, const std::size_t axis,
+            const std::uint64_t dimension, const std::uint64_t stride) {
     if (range.one_index) {
-        view.offset += checked_index(*range.start, dimension) * stride;
+        view.offset += checked_index(*range.start, dimension, axis) * stride;
         return;
     }
     const std::uint64_t start = clipped(range.start.value_or(0), dimension);
@@ -131,7 +133,7 @@ View select(const ArraySource& source, const Selection& selection) {
     View view;
     for (std::size_t axis = 0; axis < shape.size(); ++axis) {
         const AxisRange range = axis < selection.size() ? selection[axis] : AxisRange{};
-        append(view, range, shape[axis], strides[axis]);
+        append(view, range, axis, shape[axis], strides[axis]);
     }
     return view;
 }

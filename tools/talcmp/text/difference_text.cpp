@@ -80,9 +80,12 @@ std::string second_value_text(const Comparison& comparison, const Place& place) 
 std::string reason_text(const Comparison& comparison, const Place& place) {
     const Pairs pair(comparison.array1.type, place.element1.data(), comparison.array2.type,
                      place.element2.data(), 1);
-    const int digits = sameness_of(pair, 0).from_one();
-    if (digits <= most_digits) {
-        return "the same from --tol " + std::to_string(digits) + " on";
+    const Sameness sameness = sameness_of(pair, 0);
+    if (sameness.at_zero() && sameness.from_one() > 1) {
+        return "NaNs of the same bits are the same under --tol 0";
+    }
+    if (sameness.from_one() <= most_digits) {
+        return "the same from --tol " + std::to_string(sameness.from_one()) + " on";
     }
     return reason_under_all(pair.type1(), pair.type2(), place);
 }

@@ -80,12 +80,18 @@ std::string reason_of_no_tolerance(const Comparison& comparison) {
 
 std::string report_text(const Comparison& comparison, const Question& question,
                         const Terminal& terminal) {
-    const Report& report = *comparison.report;
     std::string text;
     text += line("first array", array_text(comparison.array1));
     text += line("second array", array_text(comparison.array2));
     text += line("tolerance", number_text(question.tolerance) + " binary digits");
+    if (!comparison.report) {
+        return text;
+    }
+    const Report& report = *comparison.report;
     text += line("pairs", std::to_string(report.pairs));
+    if (report.pairs == 0) {
+        return text;
+    }
     text += line("differing", share_text(report.differing, report.pairs));
     if (!comparison.places.empty()) {
         text += line("first place", place_text(comparison, comparison.places.front()));

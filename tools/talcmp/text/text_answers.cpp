@@ -31,10 +31,12 @@ void TextAnswers::tell(const Outcome& outcome) {
         tell_difference(outcome);
     } else if (many_ || command_line_.verbose || command_line_.question.report) {
         print(shown(outcome.first) + " " + shown(outcome.second) + " "
-              + terminal_.coloured("are the same", Colour::green));
+              + terminal_.coloured("are the same", Colour::green)
+              + (outcome.comparison.has_elements ? "" : " (no elements)"));
     }
-    const auto& report = outcome.comparison.report;
-    if (report && report->pairs != 0) {
+    const bool compared =
+        outcome.kind == Outcome::Kind::same || outcome.kind == Outcome::Kind::different;
+    if (compared && command_line_.question.report) {
         const auto text = report_text(outcome.comparison, command_line_.question, terminal_);
         std::fputs(text.c_str(), stdout);
     }
@@ -58,7 +60,9 @@ void TextAnswers::tell_difference(const Outcome& outcome) const {
 }
 
 void TextAnswers::finish(const Summary& summary) {
-    if (many_ && !command_line_.quiet) {
+    // Of the members of two archives, of which there may be none, on demand.
+    const bool one = total(summary) == 1;
+    if ((many_ || (command_line_.verbose && !one)) && !command_line_.quiet) {
         print(summary_text(summary));
     }
 }
