@@ -561,6 +561,10 @@ class FoldersAndPatterns(Folder):
         document = self.report(one, two)
         self.assertEqual(document["summary"], {"same": 0, "different": 1, "only_in_first": 1,
                                                "only_in_second": 1, "trouble": 1})
+        mine, trouble, _, yours = document["comparisons"]
+        self.assertEqual((mine["in"], mine["name"]), (one, "mine.npy"))
+        self.assertEqual(trouble["names"], [one + "/same.npy", two + "/same.npy"])
+        self.assertEqual((yours["in"], yours["name"]), (two, "yours.npy"))
 
     def test_files_that_are_left_out(self):
         one, two = self.make_folders()

@@ -114,11 +114,11 @@ class Width(Folder):
 class Progress(Folder):
     """The other array comes from standard input, as slowly as is wanted."""
 
-    def run_slowly(self, seconds, errors=True, options=()):
-        values = np.arange(200000.0)
-        path = self.save("values.npy", values)
-        with open(path, "rb") as file:
+    def run_slowly(self, seconds, errors=True, options=(), order="C"):
+        values = np.arange(200000.0).reshape(400, 500)
+        with open(self.save("values.npy", values), "rb") as file:
             contents = file.read()
+        path = self.save("other.npy", np.asarray(values, order=order))
         read_end, write_end = os.pipe()
         writer = os.fork()
         if writer == 0:
@@ -138,7 +138,12 @@ class Progress(Folder):
         return result
 
     def test_bar_after_half_a_second(self):
-        status, text = self.run_slowly(2)
+        self.check_bar(*self.run_slowly(2))
+
+    def test_bar_while_a_copy_is_taken(self):
+        self.check_bar(*self.run_slowly(2, order="F"))
+
+    def check_bar(self, status, text):
         self.assertEqual(status, 0)
         bars = re.findall(r"\r\[=* *\] +(\d+) %  \d+\.\d\d [GM]B/s  \d+:\d\d left\x1b\[K", text)
         self.assertGreaterEqual(len(bars), 2)

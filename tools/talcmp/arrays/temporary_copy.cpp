@@ -32,32 +32,38 @@ constexpr const char* cannot_be_written =
 
 } // namespace
 
-TemporaryCopy::TemporaryCopy(std::unique_ptr<ArraySource> source)
+TemporaryCopy::TemporaryCopy(std::unique_ptr<ArraySource> source,
+                             const std::function<void(std::uint64_t)>& copied)
     : source_(std::move(source)), folder_(temporary_folder()), file_(open_without_name(folder_)) {
     if (file_.number() < 0) {
         throw_system_trouble(folder_, cannot_be_written);
     }
-    copy_all(*source_, file_.number(), folder_);
+    copy_all(copied);
 }
 
-void TemporaryCopy::copy_all(ArraySource& source, const int file, const std::string& folder) {
+void TemporaryCopy::copy_all(const std::function<void(std::uint64_t)>& copied) {
     constexpr std::uint64_t elements_at_once = std::uint64_t{1} << 14U;
-    const std::size_t size = talcmp::element_type(source.element_type()).size;
-    const std::uint64_t total = element_count(source);
+    const std::size_t size = talcmp::element_type(element_type()).size;
+    const std::uint64_t total = element_count(*source_);
     std::vector<char> buffer(static_cast<std::size_t>(std::min(elements_at_once, total)) * size);
     for (std::uint64_t first = 0; first < total; first += elements_at_once) {
         const std::uint64_t count = std::min(elements_at_once, total - first);
-        source.read(first, count, buffer.data());
-        const char* rest = buffer.data();
-        for (std::size_t left = static_cast<std::size_t>(count) * size; left > 0;) {
-            const ssize_t written = ::write(file, rest, left);
-            if (written < 0 && errno != EINTR) {
-                throw_system_trouble(folder, cannot_be_written);
-            }
-            const auto advance = static_cast<std::size_t>(std::max<ssize_t>(written, 0));
-            rest += advance;
-            left -= advance;
+        const auto bytes = static_cast<std::size_t>(count) * size;
+        source_->read(first, count, buffer.data());
+        append(buffer.data(), bytes);
+        copied(bytes);
+    }
+}
+
+void TemporaryCopy::append(const char* bytes, std::size_t count) {
+    while (count > 0) {
+        const ssize_t written = ::write(file_.number(), bytes, count);
+        if (written < 0 && errno != EINTR) {
+            throw_system_trouble(folder_, cannot_be_written);
         }
+        const auto advance = static_cast<std::size_t>(std::max<ssize_t>(written, 0));
+        bytes += advance;
+        count -= advance;
     }
 }
 

@@ -6,6 +6,7 @@
 #include "array_source.h"
 #include "descriptor.h"
 
+#include <functional>
 #include <memory>
 
 namespace talcmp {
@@ -13,8 +14,10 @@ namespace talcmp {
 // In a file without a name, in the folder that the environment variable TMPDIR tells.
 class TemporaryCopy : public ArraySource {
   public:
-    // Reads all of `source`. Throws Trouble.
-    explicit TemporaryCopy(std::unique_ptr<ArraySource> source);
+    // Reads all of `source`; `copied` is told of the bytes that have been since the last call.
+    // Throws Trouble.
+    TemporaryCopy(std::unique_ptr<ArraySource> source,
+                  const std::function<void(std::uint64_t)>& copied);
 
     type_t element_type() const override { return source_->element_type(); }
     const Shape& shape() const override { return source_->shape(); }
@@ -23,7 +26,8 @@ class TemporaryCopy : public ArraySource {
     void read(std::uint64_t first, std::uint64_t count, void* elements) override;
 
   private:
-    static void copy_all(ArraySource& source, int file, const std::string& folder);
+    void copy_all(const std::function<void(std::uint64_t)>& copied);
+    void append(const char* bytes, std::size_t count);
 
     std::unique_ptr<ArraySource> source_; // has been read
     std::string folder_;

@@ -30,6 +30,10 @@ ArrayFacts facts_of(const NamedArray& array, const View& view) {
             array.source->fortran_order()};
 }
 
+std::size_t element_size(const ArraySource& source) {
+    return element_type(source.element_type()).size;
+}
+
 // ---- What the threads of one comparison share
 
 // What is to be done.
@@ -57,19 +61,21 @@ class Work {
         return box < box_count_ && !stopped_ ? std::optional(box) : std::nullopt;
     }
 
-    void fail(const std::exception_ptr& failure) {
+    // All boxes before it have been given out, so that of several failures the first is known.
+    void fail(const std::uint64_t box, const std::exception_ptr& failure) {
         const std::lock_guard<std::mutex> lock(mutex_);
-        if (!failure_) {
+        if (!failure_ || box < failed_box_) {
+            failed_box_ = box;
             failure_ = failure;
         }
         stopped_ = true;
     }
 
-    void rethrow_failure() const {
-        if (failure_) {
-            std::rethrow_exception(failure_);
-        }
+    // The first box that failed; nothing where none did. When all threads have ended.
+    std::optional<std::uint64_t> failed_box() const {
+        return failure_ ? std::optional(failed_box_) : std::nullopt;
     }
+    [[noreturn]] void rethrow_failure() const { std::rethrow_exception(failure_); }
 
     // Places from `bound` on are no longer of interest.
     void lower_bound(const std::uint64_t bound) {
@@ -86,28 +92,41 @@ class Work {
     std::atomic<bool> stopped_ = false;
     std::mutex mutex_;
     std::exception_ptr failure_;
+    std::uint64_t failed_box_ = 0;
 };
+
+// Whether the answer does without the box, as all its places come later than those that are told,
+// which are below `bound`.
+bool is_beyond(const Task& task, const RowMajorOrder& order, const Box& box,
+               const std::uint64_t bound) {
+    if (task.question.report) {
+        return false;
+    }
+    const std::uint64_t earliest =
+        column_major(task.first, task.second) ? 0 : order.of(task.way.first_position(box, 0));
+    return earliest >= bound;
+}
 
 // ---- What one thread does
 
 class Worker {
   public:
     Worker(const Task& task, Work& work)
-        : task_(task), work_(work), size1_(element_type(task.first.element_type()).size),
-          size2_(element_type(task.second.element_type()).size),
+        : task_(task), work_(work), size1_(element_size(task.first)),
+          size2_(element_size(task.second)),
           buffer1_(new unsigned char[task.way.largest_box() * size1_]),
           buffer2_(new unsigned char[task.way.largest_box() * size2_]),
           column_major_(column_major(task.first, task.second)), order_(task.first),
           places_(task.question.differences), reporter_(task.question.tolerance) {}
 
     void run() {
-        try {
-            remember_factor_of(task_.question.tolerance);
-            while (const auto box = work_.next_box()) {
+        remember_factor_of(task_.question.tolerance);
+        while (const auto box = work_.next_box()) {
+            try {
                 look_at(task_.way.box(*box));
+            } catch (...) {
+                work_.fail(*box, std::current_exception());
             }
-        } catch (...) {
-            work_.fail(std::current_exception());
         }
     }
 
@@ -118,13 +137,6 @@ class Worker {
     Place place(const Pairs& pairs, const Box& box, const std::size_t i) const {
         const std::uint64_t position = task_.way.first_position(box, i);
         return place_of(pairs, i, order_.of(position), position);
-    }
-
-    // Whether all places in the box are behind those that are told.
-    bool is_beyond(const Box& box) const {
-        const std::uint64_t earliest =
-            column_major_ ? 0 : order_.of(task_.way.first_position(box, 0));
-        return earliest >= work_.bound();
     }
 
     void read(const Box& box) {
@@ -141,7 +153,7 @@ class Worker {
     }
 
     void look_at(const Box& box) {
-        if (!task_.question.report && is_beyond(box)) {
+        if (is_beyond(task_, order_, box, work_.bound())) {
             return;
         }
         read(box);
@@ -208,26 +220,41 @@ void run_all(std::vector<std::unique_ptr<Worker>>& workers) {
     }
 }
 
+// One thread alone would not have come to a box behind the places that are told.
+void rethrow_failure_before(const std::uint64_t bound, const Task& task, const Work& work) {
+    const auto box = work.failed_box();
+    if (box && !is_beyond(task, RowMajorOrder(task.first), task.way.box(*box), bound)) {
+        work.rethrow_failure();
+    }
+}
+
 // ---- The whole comparison
 
-void make_readable_in_any_order(NamedArray& array) {
+void make_readable_in_any_order(NamedArray& array, ProgressListener& progress) {
     if (!array.source->random_access()) {
-        array.source = std::make_unique<TemporaryCopy>(std::move(array.source));
+        array.source = std::make_unique<TemporaryCopy>(
+            std::move(array.source), [&](const std::uint64_t bytes) { progress.advance(bytes); });
     }
+}
+
+// Of the copy that is taken where elements come but once and in another order than wanted.
+std::uint64_t bytes_to_copy(const Traversal& way, const ArraySource& source) {
+    return way.is_linear() || source.random_access() ? 0
+                                                     : element_count(source) * element_size(source);
 }
 
 void compare_elements(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
                       const Question& question, ProgressListener& progress, Comparison& result) {
-    const std::size_t element_size = std::max(element_type(first.source->element_type()).size,
-                                              element_type(second.source->element_type()).size);
-    const Traversal way(view1, view2, column_major(*first.source, *second.source), element_size);
+    const std::size_t size1 = element_size(*first.source);
+    const std::size_t size2 = element_size(*second.source);
+    const Traversal way(view1, view2, column_major(*first.source, *second.source),
+                        std::max(size1, size2));
+    progress.begin(way.pair_count() * (size1 + size2) + bytes_to_copy(way, *first.source)
+                   + bytes_to_copy(way, *second.source));
     if (!way.is_linear()) {
-        make_readable_in_any_order(first);
-        make_readable_in_any_order(second);
+        make_readable_in_any_order(first, progress);
+        make_readable_in_any_order(second, progress);
     }
-    progress.begin(way.pair_count()
-                   * (element_type(first.source->element_type()).size
-                      + element_type(second.source->element_type()).size));
     const Task task{way, *first.source, *second.source, question, progress};
     Work work(way.box_count());
     std::vector<std::unique_ptr<Worker>> workers;
@@ -235,7 +262,6 @@ void compare_elements(NamedArray& first, NamedArray& second, const View& view1, 
         workers.push_back(std::make_unique<Worker>(task, work));
     }
     run_all(workers);
-    work.rethrow_failure();
     FirstPlaces places(question.differences);
     for (const auto& worker : workers) {
         places.add(worker->places());
@@ -243,6 +269,7 @@ void compare_elements(NamedArray& first, NamedArray& second, const View& view1, 
             add(*result.report, worker->report());
         }
     }
+    rethrow_failure_before(places.bound(), task, work);
     result.places = places.in_order();
 }
 

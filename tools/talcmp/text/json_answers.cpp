@@ -146,9 +146,11 @@ void JsonAnswers::tell(const Outcome& outcome) {
         break;
     case Outcome::Kind::only_in_first:
     case Outcome::Kind::only_in_second:
+        entry["in"] = outcome.kind == Outcome::Kind::only_in_first ? outcome.first : outcome.second;
         entry["name"] = outcome.name;
         break;
     case Outcome::Kind::trouble:
+        entry["names"] = {outcome.first, outcome.second};
         entry["message"] = outcome.message;
         complain(outcome.message);
         break;
