@@ -229,8 +229,8 @@ void PrintTo(const NoFile& no_file, std::ostream* out) {
 
 void make_nothing(const TemporaryFolder& /*folder*/, const std::string& /*path*/) {}
 
-void make_pipe(const TemporaryFolder& /*folder*/, const std::string& path) {
-    ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+void make_link_to_device(const TemporaryFolder& /*folder*/, const std::string& path) {
+    ASSERT_EQ(::symlink("/dev/null", path.c_str()), 0);
 }
 
 void make_link_to_itself(const TemporaryFolder& /*folder*/, const std::string& path) {
@@ -247,7 +247,7 @@ void make_unreadable(const TemporaryFolder& folder, const std::string& path) {
 
 const NoFile no_files[] = {
     {"Missing", make_nothing, "No such file"},
-    {"Pipe", make_pipe, "not a regular file"},
+    {"Device", make_link_to_device, "neither a file nor a pipe"},
     {"LinkToItself", make_link_to_itself, "cannot be opened"},
     {"Unreadable", make_unreadable, "Permission denied"},
 };

@@ -419,6 +419,20 @@ class StandardInput(Folder):
         self.assertEqual((status, output), (2, ""))
         self.assertIn("standard input: has more data than its shape says", errors)
 
+    def test_named_pipes(self):
+        path = self.save("a.npy", np.arange(300000.0))
+        other = self.save("b.npy", np.where(np.arange(300000) == 3, 5, np.arange(300000.0)))
+        pipe = self.path("pipe")
+        os.mkfifo(pipe)
+        for operands, answer in (((pipe, path), ""), ((other, pipe), "differ: [3]: 5 and 3 ")):
+            writer = subprocess.Popen(["sh", "-c", 'exec cat "$1" >"$2"', "sh", path, pipe],
+                                      stderr=subprocess.DEVNULL)
+            self.addCleanup(writer.wait)
+            self.addCleanup(writer.kill)
+            status, output, errors = run(*operands)
+            self.assertEqual((status, errors), (1 if answer else 0, ""))
+            self.assertIn(answer, output)
+
     def test_no_room_for_a_copy(self):
         path = self.save("a.npy", np.zeros((20, 30), order="F"))
         contents = read_bytes(self.save("b.npy", np.zeros((20, 30))))

@@ -2,11 +2,15 @@
 
 #include "npy_file.h"
 #include "npz_file.h"
+#include "pipe.h"
 #include "regular_file.h"
-#include "standard_input.h"
 
 #include <array>
+#include <filesystem>
 #include <string_view>
+#include <system_error>
+
+#include <unistd.h>
 
 namespace talcmp {
 namespace {
@@ -40,7 +44,12 @@ std::string beginning_of(const std::string& path) {
 
 std::unique_ptr<ArrayFile> open_array_file(const std::string& path) {
     if (path == standard_input_path) {
-        return std::make_unique<NpyFile>("standard input", std::make_unique<StandardInput>());
+        const std::string name = "standard input";
+        return std::make_unique<NpyFile>(name, std::make_unique<Pipe>(name, STDIN_FILENO));
+    }
+    std::error_code ignored; // opening it tells what is wrong
+    if (std::filesystem::is_fifo(path, ignored)) {
+        return std::make_unique<NpyFile>(path, std::make_unique<Pipe>(path));
     }
     const std::string bytes = beginning_of(path);
     const Format* format = formats;

@@ -6,9 +6,7 @@
 namespace talcmp {
 
 RegularFile::RegularFile(const std::string& path)
-    : path_(path),
-      // Without O_NONBLOCK the open of a pipe would wait for its writer.
-      file_(::open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK)) {
+    : path_(path), file_(::open(path.c_str(), O_RDONLY | O_CLOEXEC)) {
     struct stat status = {};
     if (file_.number() < 0 || ::fstat(file_.number(), &status) != 0) {
         throw_system_trouble(path, "cannot be opened");
@@ -17,8 +15,7 @@ RegularFile::RegularFile(const std::string& path)
         throw Trouble(path, "is a folder; name a file in it, or two folders");
     }
     if (!S_ISREG(status.st_mode)) {
-        throw Trouble(path, "is not a regular file; save the array to a file first, or write '-' "
-                            "for standard input");
+        throw Trouble(path, "is neither a file nor a pipe; save the array to a file first");
     }
     size_ = static_cast<std::uint64_t>(status.st_size);
 }
