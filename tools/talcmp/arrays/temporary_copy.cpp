@@ -43,7 +43,7 @@ TemporaryCopy::TemporaryCopy(std::unique_ptr<ArraySource> source,
 
 void TemporaryCopy::copy_all(const std::function<void(std::uint64_t)>& copied) {
     constexpr std::uint64_t elements_at_once = std::uint64_t{1} << 14U;
-    const std::size_t size = talcmp::element_type(element_type()).size;
+    const std::size_t size = talcmp::element_type(source_->element_type()).size;
     const std::uint64_t total = element_count(*source_);
     std::vector<char> buffer(static_cast<std::size_t>(std::min(elements_at_once, total)) * size);
     for (std::uint64_t first = 0; first < total; first += elements_at_once) {
