@@ -106,7 +106,7 @@ T partner(oracle::Random& random, const Anchor anchor, [[maybe_unused]] const do
     if constexpr (std::is_integral_v<T>) {
         const std::uint32_t choice = random.below(4);
         return choice == 0   ? random_number<T>(random)
-               : choice == 1 ? static_cast<T>(same + 1)
+               : choice == 1 ? static_cast<T>(static_cast<std::uint64_t>(same) + 1)
                              : same;
     } else {
         const T limit = nudged(random, same * static_cast<T>(share));
