@@ -44,7 +44,7 @@ set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION math)
 if(CMAKE_CROSSCOMPILING)
   # dpkg-shlibdeps would name the packages of the cross compiler, which the architecture itself has
   # not. These are Debian 12's, to which the cross compiler links.
-  set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS 
+  set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS
       "libc6 (>= 2.36), libgcc-s1 (>= 12), libstdc++6 (>= 12), libzip4 (>= 1.7)")
 else()
   set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)

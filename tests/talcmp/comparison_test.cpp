@@ -21,16 +21,22 @@ using namespace std::chrono_literals;
 
 constexpr std::uint64_t length = 1000000;
 
-// Zeros, of which those from `broken` on cannot be read. The first are handed out only after the
-// others have failed, if anybody asks for those meanwhile.
-class BrokenArray : public talcmp::ArraySource {
+class Bytes : public talcmp::ArraySource {
   public:
-    explicit BrokenArray(const std::uint64_t broken) : broken_(broken) {}
-
     type_t element_type() const override { return 1; }
     const talcmp::Shape& shape() const override { return shape_; }
     bool fortran_order() const override { return false; }
     bool random_access() const override { return true; }
+
+  private:
+    talcmp::Shape shape_ = {length};
+};
+
+// Zeros, of which those from `broken` on cannot be read. The first are handed out only after the
+// others have failed, if anybody asks for those meanwhile.
+class BrokenArray : public Bytes {
+  public:
+    explicit BrokenArray(const std::uint64_t broken) : broken_(broken) {}
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         for (int patience = 200; first == 0 && failures_ == 0 && patience > 0; --patience) {
@@ -45,20 +51,14 @@ class BrokenArray : public talcmp::ArraySource {
     }
 
   private:
-    talcmp::Shape shape_ = {length};
     std::uint64_t broken_;
     std::atomic<int> failures_ = 0;
 };
 
-// Ones at the position `one`, zeros elsewhere.
-class ZerosAndOne : public talcmp::ArraySource {
+// A one at the position `one`, zeros elsewhere.
+class ZerosAndOne : public Bytes {
   public:
     explicit ZerosAndOne(const std::uint64_t one) : one_(one) {}
-
-    type_t element_type() const override { return 1; }
-    const talcmp::Shape& shape() const override { return shape_; }
-    bool fortran_order() const override { return false; }
-    bool random_access() const override { return true; }
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         auto* const values = static_cast<std::int8_t*>(elements);
@@ -69,7 +69,6 @@ class ZerosAndOne : public talcmp::ArraySource {
     }
 
   private:
-    talcmp::Shape shape_ = {length};
     std::uint64_t one_;
 };
 

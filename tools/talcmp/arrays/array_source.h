@@ -3,9 +3,11 @@
 #ifndef TALCMP_ARRAY_SOURCE_H
 #define TALCMP_ARRAY_SOURCE_H
 
+#include "element_type.h"
 #include "type_properties.h"
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <numeric>
@@ -50,6 +52,11 @@ inline std::uint64_t element_count(const ArraySource& source) {
         return 0; // the product of the others may be larger
     }
     return std::accumulate(shape.begin(), shape.end(), std::uint64_t{1}, std::multiplies<>());
+}
+
+// In bytes.
+inline std::size_t element_size(const ArraySource& source) {
+    return element_type(source.element_type()).size;
 }
 
 } // namespace talcmp

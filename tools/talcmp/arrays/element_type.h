@@ -28,6 +28,14 @@ struct ElementType {
     std::array<double, 2> (*parts)(const void* element);
 };
 
+inline bool is_integer(const ElementType& type) {
+    return type.kind == 'i' || type.kind == 'u';
+}
+
+inline bool is_complex(const ElementType& type) {
+    return type.kind == 'c';
+}
+
 // All element types, in the order of their ids.
 const std::array<ElementType, element_type_list::size>& element_types();
 

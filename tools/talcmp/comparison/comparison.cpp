@@ -30,10 +30,6 @@ ArrayFacts facts_of(const NamedArray& array, const View& view) {
             array.source->fortran_order()};
 }
 
-std::size_t element_size(const ArraySource& source) {
-    return element_type(source.element_type()).size;
-}
-
 // ---- What the threads of one comparison share
 
 // What is to be done.

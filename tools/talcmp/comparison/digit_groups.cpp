@@ -126,10 +126,6 @@ const Real* parts(type_list<Types...> /*types*/, const type_t type, const void* 
                                                           reinterpret_cast<Real*>(room.data()));
 }
 
-bool is_integer(const ElementType& type) {
-    return type.kind == 'i' || type.kind == 'u';
-}
-
 bool is_double(const ElementType& type) {
     return !is_integer(type) && type.part_size == sizeof(double);
 }
@@ -138,7 +134,7 @@ bool is_double(const ElementType& type) {
 
 template <typename Real>
 void DigitGroups::sort_as(const Pairs& pairs, Group* const groups) {
-    const bool complex = pairs.type1().kind == 'c' || pairs.type2().kind == 'c';
+    const bool complex = is_complex(pairs.type1()) || is_complex(pairs.type2());
     const auto sort_part = [&](const int part, Group* const groups_of_part) {
         constexpr element_type_list types;
         const Real* const x =

@@ -1,7 +1,5 @@
 #include "traversal.h"
 
-#include "element_type.h"
-
 #include <algorithm>
 #include <cmath>
 #include <cstring>
@@ -265,8 +263,7 @@ void Traversal::read(const Side side, ArraySource& source, const Box& box,
         ways[i] = {extent, axes_[i].stride[s], place_stride};
         place_stride *= extent;
     }
-    BoxReader(source, element_type(source.element_type()).size, ways,
-              static_cast<unsigned char*>(elements))
+    BoxReader(source, element_size(source), ways, static_cast<unsigned char*>(elements))
         .read(origin);
 }
 

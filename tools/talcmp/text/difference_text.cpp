@@ -26,10 +26,6 @@ std::string value_text(const Comparison& comparison, const type_t type, const vo
 
 // ---- Why two values are not the same under any tolerance
 
-bool is_integer(const ElementType& type) {
-    return type.kind == 'i' || type.kind == 'u';
-}
-
 // Empty where the parts are the same under some tolerance.
 std::string reason_of_parts(const double part1, const double part2) {
     if ((part1 == 0) != (part2 == 0)) {
@@ -49,7 +45,7 @@ std::string reason_under_all(const ElementType& type1, const ElementType& type2,
     const auto parts1 = type1.parts(place.element1.data());
     const auto parts2 = type2.parts(place.element2.data());
     std::string real = reason_of_parts(parts1[0], parts2[0]);
-    if (type1.kind != 'c' && type2.kind != 'c') {
+    if (!is_complex(type1) && !is_complex(type2)) {
         return real;
     }
     return real.empty() ? "imaginary parts: " + reason_of_parts(parts1[1], parts2[1])
