@@ -4,6 +4,8 @@
 #include "operands.h"
 #include "trouble.h"
 
+#include <new>
+
 namespace talcmp {
 namespace {
 
@@ -17,7 +19,10 @@ class Run {
             match_files(command_line_.first, command_line_.second, command_line_.filter.exclude);
         answers_.begin(files.many);
         for (const NamedPair& pair : files.pairs) {
-            if (pair.first && pair.second) {
+            if (pair.trouble) {
+                tell_trouble(pair.first.value_or(command_line_.first),
+                             pair.second.value_or(command_line_.second), *pair.trouble);
+            } else if (pair.first && pair.second) {
                 guarded(*pair.first, *pair.second,
                         [&] { compare_files(*pair.first, *pair.second); });
             } else {
@@ -35,13 +40,22 @@ class Run {
         try {
             action();
         } catch (const Trouble& trouble) {
-            Outcome outcome;
-            outcome.kind = Outcome::Kind::trouble;
-            outcome.first = first;
-            outcome.second = second;
-            outcome.message = trouble.what();
-            tell(outcome);
+            tell_trouble(first, second, trouble.what());
+        } catch (const std::bad_alloc&) {
+            tell_trouble(
+                first, second,
+                Trouble(first, "there is not enough memory to compare it with " + second).what());
         }
+    }
+
+    void tell_trouble(const std::string& first, const std::string& second,
+                      const std::string& message) {
+        Outcome outcome;
+        outcome.kind = Outcome::Kind::trouble;
+        outcome.first = first;
+        outcome.second = second;
+        outcome.message = message;
+        tell(outcome);
     }
 
     void compare_files(const std::string& path1, const std::string& path2) {

@@ -3,6 +3,7 @@
 #include "command_line.h"
 #include "compare_operands.h"
 #include "json_answers.h"
+#include "process_setup.h"
 #include "text_answers.h"
 #include "trouble.h"
 
@@ -25,6 +26,7 @@ std::unique_ptr<talcmp::Answers> answers_for(const talcmp::CommandLine& command_
 int run(const int argc, const char* const* argv) {
     constexpr int trouble = 2;
     try {
+        talcmp::set_up_process();
         Summary summary;
         if (const auto command_line = talcmp::read_command_line(argc, argv)) {
             talcmp::ProgressBar progress(!command_line->quiet);

@@ -1,6 +1,7 @@
 #include "operands.h"
 
 #include "array_file.h"
+#include "folder_files.h"
 #include "trouble.h"
 
 #include <algorithm>
@@ -17,18 +18,33 @@ namespace {
 
 namespace fs = std::filesystem;
 
-using PathsByName = std::map<std::string, std::string>;
+// Takes out of `pairs` what lies below a name with trouble: of that nothing can be said.
+void leave_to_trouble(std::map<std::string, NamedPair>& pairs) {
+    for (auto pair = pairs.begin(); pair != pairs.end(); ++pair) {
+        if (pair->second.trouble) {
+            const std::string below = pair->first + '/';
+            const std::string behind = pair->first + char('/' + 1);
+            pairs.erase(pairs.lower_bound(below), pairs.lower_bound(behind));
+        }
+    }
+}
 
-std::vector<NamedPair> matched(const PathsByName& first, const PathsByName& second) {
+std::vector<NamedPair> matched(const FilesByName& first, const FilesByName& second) {
     std::map<std::string, NamedPair> pairs;
-    for (const auto& [name, path] : first) {
-        pairs[name] = {name, path, std::nullopt};
-    }
-    for (const auto& [name, path] : second) {
-        NamedPair& pair = pairs[name];
-        pair.name = name;
-        pair.second = path;
-    }
+    const auto add = [&pairs](const FilesByName& files,
+                              std::optional<std::string> NamedPair::*side) {
+        for (const auto& [name, file] : files) {
+            NamedPair& pair = pairs[name];
+            pair.name = name;
+            pair.*side = file.path;
+            if (file.trouble && !pair.trouble) {
+                pair.trouble = Trouble(file.path, *file.trouble).what();
+            }
+        }
+    };
+    add(first, &NamedPair::first);
+    add(second, &NamedPair::second);
+    leave_to_trouble(pairs);
     std::vector<NamedPair> list;
     list.reserve(pairs.size());
     for (auto& [name, pair] : pairs) {
@@ -51,22 +67,7 @@ bool is_pattern(const std::string& operand) {
     return operand.find_first_of("*?[") != std::string::npos && !exists(operand);
 }
 
-PathsByName files_in(const std::string& folder) {
-    PathsByName files;
-    try {
-        for (const auto& entry : fs::recursive_directory_iterator(folder)) {
-            const auto extension = entry.path().extension();
-            if (!entry.is_directory() && (extension == ".npy" || extension == ".npz")) {
-                files[entry.path().lexically_relative(folder).string()] = entry.path().string();
-            }
-        }
-    } catch (const fs::filesystem_error& error) {
-        throw Trouble(folder, "cannot be read: " + error.code().message());
-    }
-    return files;
-}
-
-PathsByName files_that_match(const std::string& pattern) {
+FilesByName files_that_match(const std::string& pattern) {
     glob_t found = {};
     // NOLINTNEXTLINE(concurrency-mt-unsafe): no other thread is there yet.
     const int status = ::glob(pattern.c_str(), 0, nullptr, &found);
@@ -78,19 +79,20 @@ PathsByName files_that_match(const std::string& pattern) {
     if (paths.empty()) {
         throw Trouble(pattern, "there is no such file, and no file matches it as a pattern");
     }
-    PathsByName files;
+    FilesByName files;
     for (const std::string& path : paths) {
         const std::string name = fs::path(path).filename().string();
-        const auto [place, is_new] = files.emplace(name, path);
+        const auto [place, is_new] =
+            files.emplace(name, FolderFile{path, reason_not_to_open(path)});
         if (!is_new) {
-            throw Trouble(pattern, "matches two files of one name, " + place->second + " and "
+            throw Trouble(pattern, "matches two files of one name, " + place->second.path + " and "
                                        + path + "; files are matched by name");
         }
     }
     return files;
 }
 
-PathsByName files_of(const std::string& operand) {
+FilesByName files_of(const std::string& operand) {
     return is_folder(operand) ? files_in(operand) : files_that_match(operand);
 }
 
@@ -98,9 +100,13 @@ bool stands_for_many(const std::string& operand) {
     return is_folder(operand) || is_pattern(operand);
 }
 
-// The file of the same name in the folder.
+// The file of the same name in the folder. Throws Trouble.
 std::string in_folder(const std::string& folder, const std::string& file) {
-    return (fs::path(folder) / fs::path(file).filename()).string();
+    std::string path = (fs::path(folder) / fs::path(file).filename()).string();
+    if (const auto trouble = reason_not_to_open(path)) {
+        throw Trouble(path, *trouble);
+    }
+    return path;
 }
 
 bool matches_any(const std::vector<std::string>& patterns, const std::string& name) {
@@ -114,7 +120,7 @@ bool accepts(const NameFilter& filter, const std::string& name) {
            && !matches_any(filter.exclude, name);
 }
 
-PathsByName without(PathsByName files, const std::vector<std::string>& exclude) {
+FilesByName without(FilesByName files, const std::vector<std::string>& exclude) {
     for (auto file = files.begin(); file != files.end();) {
         file = matches_any(exclude, file->first) ? files.erase(file) : std::next(file);
     }
@@ -150,10 +156,10 @@ std::vector<NamedPair> match_names(const std::vector<std::string>& first,
                                    const std::vector<std::string>& second,
                                    const NameFilter& filter) {
     const auto accepted = [&filter](const std::vector<std::string>& names) {
-        PathsByName result;
+        FilesByName result;
         for (const std::string& name : names) {
             if (accepts(filter, name)) {
-                result[name] = name;
+                result[name] = {name};
             }
         }
         return result;

@@ -14,6 +14,7 @@ struct NamedPair {
     std::string name;
     std::optional<std::string> first;
     std::optional<std::string> second;
+    std::optional<std::string> trouble = {}; // why they cannot be compared, with the name of which
 };
 
 struct FilePairs {
@@ -24,6 +25,10 @@ struct FilePairs {
 // Two files; or all .npy and .npz files in two folders, by their paths in the folders; or what
 // matches two patterns, by the names of the files. Throws Trouble.
 // Names that match a pattern of `exclude` are left out.
+//
+// Links to folders are followed. What may hide arrays and cannot be read is a pair with trouble: a
+// folder without permission, a link that leads nowhere or back to a folder that it is in, and a
+// pipe, a socket or a device with the name of a file.
 FilePairs match_files(const std::string& first, const std::string& second,
                       const std::vector<std::string>& exclude);
 

@@ -1,0 +1,120 @@
+#include "folder_files.h"
+
+#include "trouble.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <system_error>
+#include <utility>
+#include <vector>
+
+#include <sys/stat.h>
+
+namespace talcmp {
+namespace {
+
+namespace fs = std::filesystem;
+
+// What every name of a folder, its own and those of links, has in common.
+using Identity = std::pair<dev_t, ino_t>;
+
+std::optional<Identity> identity_of(const fs::path& folder) {
+    struct stat status = {};
+    return ::stat(folder.c_str(), &status) == 0
+               ? std::optional(Identity(status.st_dev, status.st_ino))
+               : std::nullopt;
+}
+
+bool is_called_like_an_array(const fs::path& path) {
+    const fs::path extension = path.extension();
+    return extension == ".npy" || extension == ".npz";
+}
+
+// Otherwise something is there, if only a link that leads nowhere.
+bool is_gone(const fs::path& path) {
+    std::error_code ignored;
+    return fs::symlink_status(path, ignored).type() == fs::file_type::not_found;
+}
+
+class Walk {
+  public:
+    explicit Walk(const fs::path& folder) : top_(folder) { enter(folder); }
+
+    FilesByName files() && { return std::move(files_); }
+
+  private:
+    void enter(const fs::path& folder) {
+        const auto identity = identity_of(folder);
+        if (identity && std::find(open_.begin(), open_.end(), *identity) != open_.end()) {
+            add(folder, "is a link to a folder that it is in; leave it out by --exclude");
+            return;
+        }
+        open_.push_back(identity.value_or(Identity()));
+        std::error_code error;
+        // Read to its end before the next is opened: there may be more levels than files that a
+        // program may have open.
+        for (const fs::path& path : entries_of(folder, error)) {
+            visit(path);
+        }
+        if (error) {
+            cannot_be_read(folder, error);
+        }
+        open_.pop_back();
+    }
+
+    static std::vector<fs::path> entries_of(const fs::path& folder, std::error_code& error) {
+        std::vector<fs::path> paths;
+        for (fs::directory_iterator entry(folder, error);
+             !error && entry != fs::directory_iterator(); entry.increment(error)) {
+            paths.push_back(entry->path());
+        }
+        return paths;
+    }
+
+    void visit(const fs::path& path) {
+        std::error_code error;
+        const fs::file_status status = fs::status(path, error);
+        if (fs::is_directory(status)) {
+            enter(path);
+        } else if (fs::exists(status)) {
+            if (is_called_like_an_array(path)) {
+                add(path, reason_not_to_open(path.string()));
+            }
+        } else if (!is_gone(path)) {
+            add(path, "cannot be followed: " + error.message());
+        }
+    }
+
+    void cannot_be_read(const fs::path& folder, const std::error_code& error) {
+        const std::string trouble = "cannot be read: " + error.message();
+        if (folder == top_) {
+            throw Trouble(folder.string(), trouble);
+        }
+        add(folder, trouble);
+    }
+
+    void add(const fs::path& path, std::optional<std::string> trouble) {
+        files_[path.lexically_relative(top_).string()] = {path.string(), std::move(trouble)};
+    }
+
+    fs::path top_;
+    FilesByName files_;
+    std::vector<Identity> open_; // the folders that the walk is in
+};
+
+} // namespace
+
+FilesByName files_in(const std::string& folder) {
+    return Walk(folder).files();
+}
+
+std::optional<std::string> reason_not_to_open(const std::string& path) {
+    std::error_code error;
+    const fs::file_status status = fs::status(path, error);
+    if (!fs::exists(status) || fs::is_regular_file(status) || fs::is_directory(status)) {
+        return std::nullopt; // or opening it says what is wrong
+    }
+    return "is no regular file; leave it out by --exclude, or compare it by itself";
+}
+
+} // namespace talcmp

@@ -1,0 +1,32 @@
+// The files of arrays in a folder.
+
+#ifndef TALCMP_FOLDER_FILES_H
+#define TALCMP_FOLDER_FILES_H
+
+#include <map>
+#include <optional>
+#include <string>
+
+namespace talcmp {
+
+struct FolderFile {
+    std::string path;
+    std::optional<std::string> trouble = {}; // why it is not to be opened
+};
+
+using FilesByName = std::map<std::string, FolderFile>;
+
+// All .npy and .npz files in a folder and in those below it, by their paths in the folder. Links to
+// folders are followed. Throws Trouble when the folder itself cannot be read.
+//
+// What cannot be read is listed with its trouble, whatever its name, as it may hide arrays: a
+// folder without permission, a link that leads nowhere or back to a folder that it is in.
+FilesByName files_in(const std::string& folder);
+
+// Why a file that was not named by itself is not to be opened; nothing where it may be. Whoever
+// opens a pipe waits for its writer, who may never come.
+std::optional<std::string> reason_not_to_open(const std::string& path);
+
+} // namespace talcmp
+
+#endif
