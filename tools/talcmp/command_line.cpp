@@ -157,6 +157,7 @@ std::optional<CommandLine> read_command_line(const int argc, const char* const* 
     }
     check_together(line);
     line.question.report = line.question.report || line.json;
+    line.question.only_whether = line.quiet;
     return line;
 }
 

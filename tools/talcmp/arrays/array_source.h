@@ -43,6 +43,10 @@ class ArraySource {
     // Reads the elements at the positions `first` to `first + count - 1`, which the array has, to
     // `elements`. Throws Trouble.
     virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
+
+    // Reads what is left, where only the end says whether what has been read was right. Before it
+    // has returned no answer is to be believed. Throws Trouble.
+    virtual void check_to_end() {}
 };
 
 // The number of elements, which has been seen to be below 2^64: the product of the shape.

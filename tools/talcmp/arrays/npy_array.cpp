@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <vector>
 
 namespace talcmp {
 namespace {
@@ -67,9 +68,23 @@ void NpyArray::read(const std::uint64_t first, const std::uint64_t count, void* 
     if (header_.bytes_swapped) {
         reverse_each(static_cast<unsigned char*>(elements), bytes, type.part_size);
     }
-    if (!file_->random_access() && first + count == header_.element_count) {
-        check_end();
+    if (!file_->random_access()) {
+        next_ = first + count;
     }
+}
+
+void NpyArray::check_to_end() {
+    if (file_->random_access()) {
+        return; // its size was compared with its header
+    }
+    const std::size_t size = talcmp::element_type(header_.element_type).size;
+    std::vector<unsigned char> passed_over(std::size_t{64} * 1024);
+    while (next_ < header_.element_count) {
+        read(next_,
+             std::min<std::uint64_t>(passed_over.size() / size, header_.element_count - next_),
+             passed_over.data());
+    }
+    check_end();
 }
 
 void NpyArray::check_end() {

@@ -22,6 +22,7 @@ class NpyArray : public ArraySource {
     bool fortran_order() const override { return header_.fortran_order; }
     bool random_access() const override { return file_->random_access(); }
     void read(std::uint64_t first, std::uint64_t count, void* elements) override;
+    void check_to_end() override;
 
   private:
     // That nothing follows the elements; an archive checks its sum only when it is asked.
@@ -30,6 +31,7 @@ class NpyArray : public ArraySource {
     std::string name_;
     std::unique_ptr<ByteSource> file_;
     NpyHeader header_;
+    std::uint64_t next_ = 0; // the position after those that have been read, where they come once
 };
 
 } // namespace talcmp

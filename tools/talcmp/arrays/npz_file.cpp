@@ -72,6 +72,9 @@ NpzFile::NpzFile(const std::string& path) : path_(path), archive_(open_archive(p
             throw Trouble(path, "has a member without a readable name");
         }
         std::string member = name;
+        if (ends_with(member, "/")) {
+            continue; // a folder, as zip writes one in front of what is in it
+        }
         if (ends_with(member, suffix)) {
             member.resize(member.size() - suffix.size());
         }

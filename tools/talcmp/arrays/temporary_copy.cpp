@@ -1,8 +1,8 @@
 #include "temporary_copy.h"
 
 #include <algorithm>
+#include <csignal>
 #include <cstdlib>
-#include <filesystem>
 #include <vector>
 
 #include <fcntl.h>
@@ -10,8 +10,25 @@
 namespace talcmp {
 namespace {
 
+// So that no signal ends the process between two steps.
+class NoSignals {
+  public:
+    NoSignals() {
+        sigset_t all;
+        ::sigfillset(&all);
+        ::pthread_sigmask(SIG_SETMASK, &all, &before_);
+    }
+    NoSignals(const NoSignals&) = delete;
+    NoSignals& operator=(const NoSignals&) = delete;
+    ~NoSignals() { ::pthread_sigmask(SIG_SETMASK, &before_, nullptr); }
+
+  private:
+    sigset_t before_ = {};
+};
+
 int open_without_name(const std::string& folder) {
     std::string path = folder + "/talcmp-XXXXXX";
+    const NoSignals none;
     const int file = ::mkostemp(path.data(), O_CLOEXEC);
     if (file >= 0) {
         ::unlink(path.c_str());
@@ -51,17 +68,20 @@ void TemporaryCopy::copy_all(const std::function<void(std::uint64_t)>& copied) {
         append(buffer.data(), bytes);
         copied(bytes);
     }
+    source_->check_to_end();
 }
 
 void TemporaryCopy::append(const char* bytes, std::size_t count) {
     while (count > 0) {
         const ssize_t written = ::write(file_.number(), bytes, count);
-        if (written < 0 && errno != EINTR) {
+        if (written < 0 && errno == EINTR) {
+            continue;
+        }
+        if (written <= 0) {
             throw_system_trouble(folder_, cannot_be_written);
         }
-        const auto advance = static_cast<std::size_t>(std::max<ssize_t>(written, 0));
-        bytes += advance;
-        count -= advance;
+        bytes += written;
+        count -= static_cast<std::size_t>(written);
     }
 }
 
@@ -69,7 +89,9 @@ void TemporaryCopy::read(const std::uint64_t first, const std::uint64_t count,
                          void* const elements) {
     const std::size_t size = element_size(*source_);
     const std::size_t bytes = static_cast<std::size_t>(count) * size;
-    read_at(file_.number(), folder_, first * size, elements, bytes);
+    if (read_at(file_.number(), folder_, first * size, elements, bytes) < bytes) {
+        throw Trouble(folder_, "the temporary copy of the array there was cut short");
+    }
 }
 
 } // namespace talcmp

@@ -14,8 +14,8 @@ namespace talcmp {
 // In a file without a name, in the folder that the environment variable TMPDIR tells.
 class TemporaryCopy : public ArraySource {
   public:
-    // Reads all of `source`; `copied` is told of the bytes that have been since the last call.
-    // Throws Trouble.
+    // Reads all of `source`, to its end; `copied` is told of the bytes that have been since the
+    // last call. Throws Trouble.
     TemporaryCopy(std::unique_ptr<ArraySource> source,
                   const std::function<void(std::uint64_t)>& copied);
 

@@ -10,6 +10,7 @@
 #include <future>
 #include <limits>
 #include <mutex>
+#include <new>
 #include <stdexcept>
 #include <system_error>
 #include <thread>
@@ -32,19 +33,28 @@ ArrayFacts facts_of(const NamedArray& array, const View& view) {
 
 // ---- What the threads of one comparison share
 
+// Otherwise boxes are gone through in row-major order.
+bool column_major(const ArraySource& first, const ArraySource& second) {
+    return first.fortran_order() && second.fortran_order();
+}
+
 // What is to be done.
 struct Task {
+    Task(const Traversal& traversal, ArraySource& array1, ArraySource& array2,
+         const Question& asked, ProgressListener& listener)
+        : way(traversal), first(array1), second(array2), question(asked), progress(listener),
+          in_order(asked.only_whether || !column_major(array1, array2)),
+          order(asked.only_whether && column_major(array1, array2) ? RowMajorOrder()
+                                                                   : RowMajorOrder(array1)) {}
+
     const Traversal& way;
     ArraySource& first;
     ArraySource& second;
     const Question& question;
     ProgressListener& progress;
+    bool in_order;       // whether places are met in their order
+    RowMajorOrder order; // of places; as they are met, where any of them will do
 };
-
-// Otherwise places are met in row-major order.
-bool column_major(const ArraySource& first, const ArraySource& second) {
-    return first.fortran_order() && second.fortran_order();
-}
 
 // How far it is.
 class Work {
@@ -93,13 +103,12 @@ class Work {
 
 // Whether the answer does without the box, as all its places come later than those that are told,
 // which are below `bound`.
-bool is_beyond(const Task& task, const RowMajorOrder& order, const Box& box,
-               const std::uint64_t bound) {
+bool is_beyond(const Task& task, const Box& box, const std::uint64_t bound) {
     if (task.question.report) {
         return false;
     }
     const std::uint64_t earliest =
-        column_major(task.first, task.second) ? 0 : order.of(task.way.first_position(box, 0));
+        task.in_order ? task.order.of(task.way.first_position(box, 0)) : 0;
     return earliest >= bound;
 }
 
@@ -112,7 +121,6 @@ class Worker {
           size2_(element_size(task.second)),
           buffer1_(new unsigned char[task.way.largest_box() * size1_]),
           buffer2_(new unsigned char[task.way.largest_box() * size2_]),
-          column_major_(column_major(task.first, task.second)), order_(task.first),
           places_(task.question.differences), reporter_(task.question.tolerance) {}
 
     void run() {
@@ -132,7 +140,7 @@ class Worker {
   private:
     Place place(const Pairs& pairs, const Box& box, const std::size_t i) const {
         const std::uint64_t position = task_.way.first_position(box, i);
-        return place_of(pairs, i, order_.of(position), position);
+        return place_of(pairs, i, task_.order.of(position), position);
     }
 
     void read(const Box& box) {
@@ -149,7 +157,7 @@ class Worker {
     }
 
     void look_at(const Box& box) {
-        if (is_beyond(task_, order_, box, work_.bound())) {
+        if (is_beyond(task_, box, work_.bound())) {
             return;
         }
         read(box);
@@ -157,7 +165,7 @@ class Worker {
                           buffer2_.get(), box.count);
         if (task_.question.report) {
             const auto make_place = [&](const std::size_t i) { return place(pairs, box, i); };
-            reporter_.add(pairs, make_place, !column_major_, places_);
+            reporter_.add(pairs, make_place, task_.in_order, places_);
         } else {
             add_places(pairs, box);
         }
@@ -172,7 +180,7 @@ class Worker {
             if (next.order < places_.bound()) {
                 places_.add(next);
                 work_.lower_bound(places_.bound());
-            } else if (!column_major_) {
+            } else if (task_.in_order) {
                 return; // those behind it come later still
             }
         }
@@ -184,8 +192,6 @@ class Worker {
     std::size_t size2_;
     std::unique_ptr<unsigned char[]> buffer1_;
     std::unique_ptr<unsigned char[]> buffer2_;
-    bool column_major_;
-    RowMajorOrder order_;
     FirstPlaces places_;
     Reporter reporter_;
 };
@@ -219,7 +225,7 @@ void run_all(std::vector<std::unique_ptr<Worker>>& workers) {
 // One thread alone would not have come to a box behind the places that are told.
 void rethrow_failure_before(const std::uint64_t bound, const Task& task, const Work& work) {
     const auto box = work.failed_box();
-    if (box && !is_beyond(task, RowMajorOrder(task.first), task.way.box(*box), bound)) {
+    if (box && !is_beyond(task, task.way.box(*box), bound)) {
         work.rethrow_failure();
     }
 }
@@ -239,6 +245,36 @@ std::uint64_t bytes_to_copy(const Traversal& way, const ArraySource& source) {
                                                      : element_count(source) * element_size(source);
 }
 
+// What the comparison may take, to be said where it is not to be had.
+std::string memory_text(const Task& task, const std::string& other_name, const unsigned threads) {
+    const std::uint64_t piece =
+        task.way.largest_box() * (element_size(task.first) + element_size(task.second));
+    const std::uint64_t places =
+        std::min<std::uint64_t>(task.question.differences, task.way.pair_count()) * sizeof(Place);
+    return "there is not enough memory to compare it with " + other_name + ": "
+           + std::to_string(threads * piece) + " bytes for pieces of both, up to "
+           + std::to_string(threads * places)
+           + " for differences; fewer --threads and --max-differences take less";
+}
+
+void compare_all_boxes(const Task& task, const unsigned threads, Comparison& result) {
+    Work work(task.way.box_count());
+    std::vector<std::unique_ptr<Worker>> workers;
+    for (unsigned i = 0; i < threads; ++i) {
+        workers.push_back(std::make_unique<Worker>(task, work));
+    }
+    run_all(workers);
+    FirstPlaces places(task.question.differences);
+    for (const auto& worker : workers) {
+        places.add(worker->places());
+        if (task.question.report) {
+            add(*result.report, worker->report());
+        }
+    }
+    rethrow_failure_before(places.bound(), task, work);
+    result.places = places.in_order();
+}
+
 void compare_elements(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
                       const Question& question, ProgressListener& progress, Comparison& result) {
     const std::size_t size1 = element_size(*first.source);
@@ -251,22 +287,32 @@ void compare_elements(NamedArray& first, NamedArray& second, const View& view1, 
         make_readable_in_any_order(first, progress);
         make_readable_in_any_order(second, progress);
     }
-    const Task task{way, *first.source, *second.source, question, progress};
-    Work work(way.box_count());
-    std::vector<std::unique_ptr<Worker>> workers;
-    for (unsigned i = 0; i < thread_count(task); ++i) {
-        workers.push_back(std::make_unique<Worker>(task, work));
+    const Task task(way, *first.source, *second.source, question, progress);
+    const unsigned threads = thread_count(task);
+    try {
+        compare_all_boxes(task, threads, result);
+    } catch (const std::bad_alloc&) {
+        throw Trouble(first.name, memory_text(task, second.name, threads));
     }
-    run_all(workers);
-    FirstPlaces places(question.differences);
-    for (const auto& worker : workers) {
-        places.add(worker->places());
-        if (question.report) {
-            add(*result.report, worker->report());
-        }
+}
+
+// Of arrays of one shape.
+void compare_contents(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
+                      const Question& question, ProgressListener& progress, Comparison& result) {
+    if (question.report) {
+        result.report.emplace();
     }
-    rethrow_failure_before(places.bound(), task, work);
-    result.places = places.in_order();
+    result.has_elements =
+        std::find(view1.shape.begin(), view1.shape.end(), 0U) == view1.shape.end();
+    const bool types_differ = question.strict_type && result.array1.type != result.array2.type;
+    if (result.has_elements && (!types_differ || question.report)) {
+        compare_elements(first, second, view1, view2, question, progress, result);
+    }
+    if (types_differ) {
+        result.difference = Difference::type;
+    } else if (question.report ? result.report->differing != 0 : !result.places.empty()) {
+        result.difference = Difference::elements;
+    }
 }
 
 } // namespace
@@ -281,23 +327,11 @@ Comparison compare(NamedArray first, NamedArray second, const Question& question
     // Not by the records' dimensions, which are 32-bit: those of a file may be larger.
     if (view1.shape != view2.shape) {
         result.difference = Difference::shape;
-        return result;
+    } else {
+        compare_contents(first, second, view1, view2, question, progress, result);
     }
-    if (question.report) {
-        result.report.emplace();
-    }
-    result.has_elements =
-        std::find(view1.shape.begin(), view1.shape.end(), 0U) == view1.shape.end();
-    if (result.has_elements
-        && !(question.strict_type && result.array1.type != result.array2.type
-             && !question.report)) {
-        compare_elements(first, second, view1, view2, question, progress, result);
-    }
-    if (question.strict_type && result.array1.type != result.array2.type) {
-        result.difference = Difference::type;
-    } else if (question.report ? result.report->differing != 0 : !result.places.empty()) {
-        result.difference = Difference::elements;
-    }
+    first.source->check_to_end();
+    second.source->check_to_end();
     return result;
 }
 

@@ -22,6 +22,7 @@ struct Question {
     Selection selection;         // what is compared of each array
     std::size_t differences = 1; // how many places are told at most
     bool report = false;         // whether all pairs are looked at and counted
+    bool only_whether = false;   // whether any place will do, in whatever order they are met
     unsigned threads = 0;        // at most; 0 for as many as are worth while
 };
 
@@ -68,7 +69,8 @@ struct NamedArray {
 // Compares what `question` selects of both arrays. The answer is what `TalNumericArray_sameQ` says
 // of them in a thread that remembers the factor of the tolerance; but under `strict_type` arrays of
 // different types differ even where they have no elements. The answer does not depend on how the
-// arrays are stored nor on the number of threads. Throws Trouble.
+// arrays are stored nor on the number of threads. What comes once is read to its end, whatever has
+// been found before, as only there a damaged archive shows. Throws Trouble.
 Comparison compare(NamedArray first, NamedArray second, const Question& question,
                    ProgressListener& progress);
 

@@ -43,6 +43,8 @@ Shape index_of(const Shape& shape, bool fortran_order, std::uint64_t position);
 // Places in an array are ordered by the positions that their elements would have in C order.
 class RowMajorOrder {
   public:
+    // Of an array that is stored in C order.
+    RowMajorOrder() = default;
     explicit RowMajorOrder(const ArraySource& source);
 
     // Of the element that is stored at `position`.

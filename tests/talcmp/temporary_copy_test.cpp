@@ -1,0 +1,148 @@
+// Copies of arrays that come but once, where there is no room for them or they are tampered with.
+
+#include "temporary_copy.h"
+
+#include "support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <csignal>
+#include <cstdint>
+#include <cstdlib>
+#include <filesystem>
+#include <memory>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <sys/resource.h>
+#include <unistd.h>
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::uint64_t length = 100000;
+
+// The numbers 0, 1, 2, ... as bytes, which come but once.
+class Bytes : public talcmp::ArraySource {
+  public:
+    explicit Bytes(std::uint64_t& checked) : checked_(checked) {}
+
+    type_t element_type() const override { return UBIT8_TYPE; }
+    const talcmp::Shape& shape() const override { return shape_; }
+    bool fortran_order() const override { return false; }
+    bool random_access() const override { return false; }
+
+    void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
+        EXPECT_EQ(first, next_);
+        next_ += count;
+        std::generate_n(static_cast<std::uint8_t*>(elements), count,
+                        [number = first]() mutable { return static_cast<std::uint8_t>(number++); });
+    }
+
+    void check_to_end() override { checked_ = next_; }
+
+  private:
+    talcmp::Shape shape_ = {length};
+    std::uint64_t next_ = 0;
+    std::uint64_t& checked_;
+};
+
+class TemporaryCopies : public testing::Test {
+  protected:
+    TemporaryCopies() { ::setenv("TMPDIR", folder_.path_of("").c_str(), 1); }
+    ~TemporaryCopies() override { ::unsetenv("TMPDIR"); }
+
+    talcmp::TemporaryCopy take() {
+        return {std::make_unique<Bytes>(checked_),
+                [this](const std::uint64_t bytes) { copied_ += bytes; }};
+    }
+
+    std::string trouble_in_taking() {
+        try {
+            take();
+        } catch (const talcmp::Trouble& trouble) {
+            return trouble.what();
+        }
+        return "none";
+    }
+
+    // The only file that is open in the folder.
+    std::string open_file() const {
+        for (const auto& entry : fs::directory_iterator("/proc/self/fd")) {
+            std::error_code ignored;
+            if (fs::read_symlink(entry.path(), ignored).string().rfind(folder_.path_of(""), 0)
+                == 0) {
+                return entry.path().string();
+            }
+        }
+        return "none";
+    }
+
+    std::string folder_name() const { return folder_.path_of(""); }
+    std::uint64_t copied() const { return copied_; }
+    std::uint64_t checked() const { return checked_; }
+
+  private:
+    TemporaryFolder folder_;
+    std::uint64_t copied_ = 0;
+    std::uint64_t checked_ = 0;
+};
+
+TEST_F(TemporaryCopies, AreReadInAnyOrderAndLeaveNoFile) {
+    auto copy = take();
+    EXPECT_EQ(copied(), length);
+    EXPECT_EQ(checked(), length);
+    EXPECT_TRUE(fs::is_empty(folder_name()));
+    for (const std::uint64_t first :
+         {std::uint64_t{99990}, std::uint64_t{0}, std::uint64_t{16380}}) {
+        std::vector<std::uint8_t> elements(10);
+        copy.read(first, elements.size(), elements.data());
+        for (const std::uint8_t& element : elements) {
+            const auto place = first + static_cast<std::uint64_t>(&element - elements.data());
+            EXPECT_EQ(element, static_cast<std::uint8_t>(place));
+        }
+    }
+}
+
+TEST_F(TemporaryCopies, AreTroubleWhereTheyDoNotFit) {
+    const auto old_action = std::signal(SIGXFSZ, SIG_IGN);
+    struct rlimit old_limit = {};
+    ::getrlimit(RLIMIT_FSIZE, &old_limit);
+    // The first piece fits, of the second a part.
+    const struct rlimit limit = {20000, old_limit.rlim_max};
+    ::setrlimit(RLIMIT_FSIZE, &limit);
+    const std::string trouble = trouble_in_taking();
+    ::setrlimit(RLIMIT_FSIZE, &old_limit);
+    std::signal(SIGXFSZ, old_action);
+    EXPECT_EQ(trouble, folder_name()
+                           + ": cannot take a temporary copy of the array; set TMPDIR to a folder "
+                             "with room for it: File too large");
+    EXPECT_TRUE(fs::is_empty(folder_name()));
+}
+
+TEST_F(TemporaryCopies, AreTroubleWhereThereIsNoFolder) {
+    ::setenv("TMPDIR", (folder_name() + "no").c_str(), 1);
+    EXPECT_EQ(trouble_in_taking(),
+              folder_name()
+                  + "no: cannot take a temporary copy of the array; set TMPDIR "
+                    "to a folder with room for it: No such file or directory");
+}
+
+TEST_F(TemporaryCopies, AreTroubleWhereTheyWereCutShort) {
+    auto copy = take();
+    ASSERT_EQ(::truncate(open_file().c_str(), 50000), 0);
+    std::vector<std::uint8_t> elements(10);
+    copy.read(49990, elements.size(), elements.data());
+    try {
+        copy.read(49991, elements.size(), elements.data());
+        FAIL() << "nothing was noticed";
+    } catch (const talcmp::Trouble& trouble) {
+        EXPECT_EQ(trouble.what(),
+                  folder_name() + ": the temporary copy of the array there was cut short");
+    }
+}
+
+} // namespace
