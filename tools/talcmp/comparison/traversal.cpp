@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <numeric>
 
 namespace talcmp {
 namespace {
@@ -173,33 +174,35 @@ void Traversal::choose_axes(const View& first, const View& second, const bool co
 }
 
 void Traversal::choose_boxes(const std::size_t element_size) {
-    const std::size_t first_axes[] = {fastest_axis(Side::first), fastest_axis(Side::second)};
     const std::uint64_t room = (is_linear() ? bytes_of_stretch : bytes_of_tile) / element_size;
-    if (first_axes[0] != first_axes[1]) {
-        const auto side = static_cast<std::uint64_t>(std::sqrt(static_cast<double>(room)));
-        for (const std::size_t axis : first_axes) {
-            axes_[axis].tile = std::min(side, axes_[axis].extent);
+    const auto side_room = static_cast<std::uint64_t>(std::sqrt(static_cast<double>(room)));
+    // First both sides get runs of a like length; what room is left goes to longer ones.
+    for (const std::uint64_t length : {side_room, room}) {
+        for (const Side side : {Side::first, Side::second}) {
+            lengthen_runs(side, length, room);
         }
     }
-    // What room is left goes to the fast axes, then to the others from the last one on.
-    std::vector<std::size_t> order(std::begin(first_axes), std::end(first_axes));
-    for (std::size_t axis = axes_.size(); axis-- > 0;) {
-        order.push_back(axis);
-    }
-    std::uint64_t count = 1;
-    for (const Axis& axis : axes_) {
-        count *= axis.tile;
-    }
-    for (const std::size_t i : order) {
-        Axis& axis = axes_[i];
-        count /= axis.tile;
-        axis.tile = std::min(axis.extent, std::max(axis.tile, room / count));
-        count *= axis.tile;
-    }
-    largest_box_ = static_cast<std::size_t>(count);
     for (const Axis& axis : axes_) {
         pair_count_ *= axis.extent;
         box_count_ *= (axis.extent - 1) / axis.tile + 1;
+    }
+}
+
+// Lets boxes reach farther along the axes by which one side is stored, the fastest first, until it
+// is read in runs of `length` positions or boxes have `room` pairs.
+void Traversal::lengthen_runs(const Side side, const std::uint64_t length,
+                              const std::uint64_t room) {
+    std::uint64_t run = 1;
+    for (const std::size_t i : axes_by_stride(side)) {
+        Axis& axis = axes_[i];
+        const std::uint64_t others = largest_box_ / axis.tile;
+        const std::uint64_t wanted = std::min(length / run, room / others);
+        axis.tile = std::min(axis.extent, std::max(axis.tile, wanted));
+        largest_box_ = static_cast<std::size_t>(others * axis.tile);
+        run *= axis.tile;
+        if (axis.tile < axis.extent) {
+            return; // the next positions belong to other boxes
+        }
     }
 }
 
@@ -207,13 +210,15 @@ bool Traversal::is_linear() const {
     return axes_.size() == 1 && axes_[0].stride[0] == 1 && axes_[0].stride[1] == 1;
 }
 
-std::size_t Traversal::fastest_axis(const Side side) const {
+std::vector<std::size_t> Traversal::axes_by_stride(const Side side) const {
     const auto s = static_cast<std::size_t>(side);
-    const auto fastest =
-        std::min_element(axes_.begin(), axes_.end(), [s](const Axis& one, const Axis& other) {
-            return one.stride[s] < other.stride[s];
-        });
-    return static_cast<std::size_t>(fastest - axes_.begin());
+    std::vector<std::size_t> order(axes_.size());
+    std::iota(order.begin(), order.end(), std::size_t{0});
+    std::sort(order.begin(), order.end(),
+              [this, s](const std::size_t one, const std::size_t other) {
+                  return axes_[one].stride[s] < axes_[other].stride[s];
+              });
+    return order;
 }
 
 Box Traversal::box(std::uint64_t index) const {

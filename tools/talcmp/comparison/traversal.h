@@ -52,12 +52,13 @@ class Traversal {
     struct Axis {
         std::uint64_t extent;
         std::uint64_t stride[2]; // of each side, in positions
-        std::uint64_t tile;      // extent of a box
+        std::uint64_t tile;      // extent of a box that is not at an edge
     };
 
     void choose_axes(const View& first, const View& second, bool column_major);
     void choose_boxes(std::size_t element_size);
-    std::size_t fastest_axis(Side side) const;
+    void lengthen_runs(Side side, std::uint64_t length, std::uint64_t room);
+    std::vector<std::size_t> axes_by_stride(Side side) const;
     std::uint64_t position(Side side, const Box& box) const;
 
     std::vector<Axis> axes_; // outermost first
