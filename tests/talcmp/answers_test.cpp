@@ -401,12 +401,23 @@ TEST(Files, MayHaveNamesThatLookLikeOptions) {
 
 TEST(Files, HaveNamesThatAreToldInOneLine) {
     const TemporaryFolder folder;
-    const std::string path1 = folder.write("a\nb\x1B[31m.npy", f64({1}));
-    const std::string path2 = folder.write("c.npy", f64({2}));
-    const std::string shown1 = folder.path_of("a?b?[31m.npy");
-    EXPECT_EQ(run_talcmp({path1, path2}).output,
-              shown1 + " " + path2 + " differ: [0]: 1 and 2 (the same from --tol 53 on)\n");
-    expect_trouble(run_talcmp({path1 + "x", path2}), shown1 + "x: ", "there is no such file");
+    // Controls of either kind, an override of the direction, a separator of lines, half a
+    // character.
+    const std::string path1 =
+        folder.write("a\nb\x1B[31m\xC2\x9B\x9B\xE2\x80\xAE\xE2\x80\xA8\xC3.npy", f64({1}));
+    const std::string path2 = folder.write("gr\xC3\xBCn.npy", f64({1.5}));
+    const std::string shown1 = folder.path_of("a?b?[31m?????.npy");
+    const Outcome outcome = run_talcmp({path1, path2});
+    EXPECT_EQ(outcome.status, 1);
+    EXPECT_EQ(outcome.output,
+              shown1 + " " + path2 + " differ: [0]: 1 and 1.5 (the same from --tol 52 on)\n");
+    EXPECT_EQ(outcome.errors, "");
+    const Outcome trouble = run_talcmp({path1 + "x", path2});
+    EXPECT_EQ(trouble.status, 2);
+    EXPECT_EQ(trouble.output, "");
+    EXPECT_EQ(trouble.errors, "talcmp: " + shown1
+                                  + "x: there is no such file; a pattern can be compared with "
+                                    "another one or with a folder\n");
 }
 
 TEST(Index, IsThatOfTheFirstDifferenceInRowMajorOrder) {

@@ -40,7 +40,7 @@ int run(const int argc, const char* const* argv) {
     } catch (const talcmp::UsageError& error) {
         std::fprintf(stderr, "talcmp: %s; see 'talcmp --help'\n", error.what());
     } catch (const std::exception& error) {
-        std::fprintf(stderr, "talcmp: %s\n", error.what());
+        std::fprintf(stderr, "talcmp: %s\n", talcmp::shown(error.what()).c_str());
     }
     return trouble;
 }

@@ -3,19 +3,12 @@
 #ifndef TALCMP_TROUBLE_H
 #define TALCMP_TROUBLE_H
 
-#include <algorithm>
+#include "shown.h"
+
 #include <stdexcept>
 #include <string>
 
 namespace talcmp {
-
-// The name of a file or of a member of an archive, in one line and without what a terminal might
-// take for a command. Names are others' work, those in archives anybody's.
-inline std::string shown(std::string name) {
-    std::replace_if(
-        name.begin(), name.end(), [](const unsigned char c) { return c < ' ' || c == 0x7F; }, '?');
-    return name.empty() ? "''" : name;
-}
 
 // A file that cannot be compared. The text names the file, what is wrong and, where there is
 // something to do, what to do.

@@ -2,7 +2,7 @@
 
 #include "difference_text.h"
 #include "report_text.h"
-#include "trouble.h"
+#include "shown.h"
 
 #include <cstdio>
 

@@ -1,0 +1,26 @@
+// Others' words in messages: in one line, and without what a terminal might take for a command.
+
+#ifndef TALCMP_SHOWN_H
+#define TALCMP_SHOWN_H
+
+#include <functional>
+#include <string>
+#include <string_view>
+
+namespace talcmp {
+
+// What a message says instead of a character that is not shown.
+using StandIn = std::function<std::string(char32_t)>;
+
+// The text with a stand-in for each control character, each character that begins a line or changes
+// the direction of writing, and, as U+FFFD, each byte that belongs to no UTF-8 character. Such may
+// be in names of files, and anybody may have written those of the members of an archive.
+std::string without_controls(std::string_view text, const StandIn& stand_in);
+
+// A name or another text in a message, with a question mark for each such character; two quotation
+// marks for an empty one.
+std::string shown(std::string_view text);
+
+} // namespace talcmp
+
+#endif
