@@ -38,7 +38,7 @@ foreach(tool AR RANLIB NM READELF OBJDUMP STRIP)
 endforeach()
 
 # Only the architecture's own libraries are taken; headers and packages without machine code, like
-# those of CLI11, are the host's. What Debian has no cross package of, scripts/foreign-libraries
+# those of nlohmann-json, are the host's. What Debian has no cross package of, scripts/foreign-libraries
 # fetches.
 get_filename_component(foreign ${CMAKE_CURRENT_LIST_DIR}/../../build/foreign ABSOLUTE)
 set(foreign ${foreign}/${TALNUMERICARRAY_TRIPLE})

@@ -2,12 +2,10 @@
 
 #include "array_file.h"
 
-#include <CLI/CLI.hpp>
-
-#include <algorithm>
 #include <charconv>
 #include <cmath>
 #include <cstdio>
+#include <vector>
 
 namespace talcmp {
 namespace {
@@ -73,50 +71,67 @@ Selection selection_from(const std::string& text) {
     }
 }
 
-// As it stands on the command line.
-struct Texts {
-    std::string tolerance = "0";
-    std::string differences = "1";
-    std::string threads;
-    bool help = false;
-    bool version = false;
-};
-
-// What the words are that belong to no option, and are no operands.
-std::string complaint(const std::vector<std::string>& words) {
-    const auto option = std::find_if(words.begin(), words.end(), [](const std::string& word) {
-        return word.size() > 1 && word.front() == '-';
-    });
-    if (option != words.end()) {
-        return "there is no option '" + *option + "'";
-    }
-    return "there are more than two arrays; a pattern for several goes in quotes";
+const std::vector<Option>& options() {
+    using Kind = Option::Kind;
+    static const std::vector<Option> all = {
+        {"--tol",
+         Kind::value,
+         '\0',
+         {"--rtol", "--atol", "--rel-tol", "--abs-tol", "--tolerance", "--eps", "--epsilon"},
+         "reals are tolerated by --tol DIGITS, in binary digits"},
+        {"--strict-type"},
+        {"--slice", Kind::value},
+        {"--include", Kind::values},
+        {"--exclude", Kind::values},
+        {"--max-differences", Kind::value, 'n'},
+        {"--report"},
+        {"--json"},
+        {"--quiet", Kind::flag, 'q'},
+        {"--verbose", Kind::flag, 'v'},
+        {"--threads", Kind::value},
+        {"--help", Kind::flag, 'h'},
+        {"--version"},
+    };
+    return all;
 }
 
-void add_options(CLI::App& app, CommandLine& line, Texts& texts) {
-    app.set_help_flag();
-    app.add_flag("-h,--help", texts.help)->disable_flag_override();
-    app.add_flag("--version", texts.version)->disable_flag_override();
-    app.add_option("--tol", texts.tolerance);
-    app.add_flag("--strict-type", line.question.strict_type)->disable_flag_override();
-    app.add_option("--slice", line.slice);
-    // One pattern behind each; the next word is an operand.
-    app.add_option("--include", line.filter.include)->allow_extra_args(false);
-    app.add_option("--exclude", line.filter.exclude)->allow_extra_args(false);
-    app.add_option("-n,--max-differences", texts.differences);
-    app.add_flag("--report", line.question.report)->disable_flag_override();
-    app.add_flag("--json", line.json)->disable_flag_override();
-    app.add_flag("-q,--quiet", line.quiet)->disable_flag_override();
-    app.add_flag("-v,--verbose", line.verbose)->disable_flag_override();
-    app.add_option("--threads", texts.threads);
-    app.add_option("A", line.first);
-    app.add_option("B", line.second);
+// What the words mean.
+CommandLine command_line_of(const Words& words) {
+    constexpr std::size_t most_differences = 1000000; // that memory holds in every thread
+    constexpr unsigned most_threads = 64;
+    CommandLine line;
+    line.json = words.has("--json");
+    line.quiet = words.has("--quiet");
+    line.verbose = words.has("--verbose");
+    line.filter = {words.all("--include"), words.all("--exclude")};
+    line.slice = words.value("--slice", "");
+    line.question.tolerance = tolerance_from(words.value("--tol", "0"));
+    line.question.strict_type = words.has("--strict-type");
+    line.question.differences =
+        number_from("--max-differences", words.value("--max-differences", "1"), most_differences);
+    line.question.report = words.has("--report");
+    if (words.has("--threads")) {
+        line.question.threads =
+            number_from("--threads", words.value("--threads", ""), most_threads);
+    }
+    if (words.has("--slice")) {
+        line.question.selection = selection_from(line.slice);
+    }
+    return line;
+}
+
+void take_operands(const std::vector<std::string>& operands, CommandLine& line) {
+    if (operands.size() > 2) {
+        throw UsageError("there are more than two arrays; a pattern for several goes in quotes");
+    }
+    if (operands.size() < 2 || operands[0].empty() || operands[1].empty()) {
+        throw UsageError("two arrays are needed, A and B");
+    }
+    line.first = operands[0];
+    line.second = operands[1];
 }
 
 void check_together(const CommandLine& line) {
-    if (line.first.empty() || line.second.empty()) {
-        throw UsageError("two arrays are needed, A and B");
-    }
     if (line.first == standard_input_path && line.second == standard_input_path) {
         throw UsageError("standard input can be only one of the two arrays");
     }
@@ -129,32 +144,13 @@ void check_together(const CommandLine& line) {
 } // namespace
 
 std::optional<CommandLine> read_command_line(const int argc, const char* const* argv) {
-    CommandLine line;
-    Texts texts;
-    CLI::App app;
-    add_options(app, line, texts);
-    try {
-        app.parse(argc, argv);
-    } catch (const CLI::ExtrasError&) {
-        throw UsageError(complaint(app.remaining()));
-    } catch (const CLI::ParseError& error) {
-        throw UsageError(error.what());
-    }
-    if (texts.help || texts.version) {
-        std::fputs(texts.help ? help : "talcmp " TALCMP_VERSION "\n", stdout);
+    const Words words = sort_words(options(), {argv + 1, argv + argc});
+    if (words.has("--help") || words.has("--version")) {
+        std::fputs(words.has("--help") ? help : "talcmp " TALCMP_VERSION "\n", stdout);
         return std::nullopt;
     }
-    constexpr std::size_t most_differences = 10000000; // that memory holds
-    constexpr unsigned most_threads = 64;
-    line.question.tolerance = tolerance_from(texts.tolerance);
-    line.question.differences =
-        number_from("--max-differences", texts.differences, most_differences);
-    if (!texts.threads.empty()) {
-        line.question.threads = number_from("--threads", texts.threads, most_threads);
-    }
-    if (!line.slice.empty()) {
-        line.question.selection = selection_from(line.slice);
-    }
+    CommandLine line = command_line_of(words);
+    take_operands(words.operands, line);
     check_together(line);
     line.question.report = line.question.report || line.json;
     line.question.only_whether = line.quiet;

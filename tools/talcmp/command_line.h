@@ -5,9 +5,9 @@
 
 #include "comparison.h"
 #include "operands.h"
+#include "options.h"
 
 #include <optional>
-#include <stdexcept>
 #include <string>
 
 namespace talcmp {
@@ -26,11 +26,6 @@ struct CommandLine {
 // Returns what is asked; nothing where that was help or the version, which are printed already.
 // Throws UsageError.
 std::optional<CommandLine> read_command_line(int argc, const char* const* argv);
-
-// A command line that talcmp does not understand. The text says what is wrong.
-struct UsageError : std::runtime_error {
-    using std::runtime_error::runtime_error;
-};
 
 } // namespace talcmp
 

@@ -1,0 +1,51 @@
+// The words of a command line, as options and operands: what they are, not what they mean.
+
+#ifndef TALCMP_OPTIONS_H
+#define TALCMP_OPTIONS_H
+
+#include "shown.h"
+
+#include <map>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace talcmp {
+
+// A command line that talcmp does not understand. The text says what is wrong, in one line whatever
+// it quotes.
+struct UsageError : std::runtime_error {
+    explicit UsageError(const std::string& text) : std::runtime_error(shown(text)) {}
+};
+
+struct Option {
+    enum class Kind { flag, value, values }; // those of `values` may be repeated
+    std::string name;                        // "--tol"
+    Kind kind = Kind::flag;
+    char letter = '\0'; // of its short form, where there is one
+
+    // What a user may take for the name of this option, and what to say of it then.
+    std::vector<std::string> other_names = {};
+    std::string hint = {};
+};
+
+struct Words {
+    std::map<std::string, std::vector<std::string>> values; // by the name of the option
+    std::vector<std::string> operands;
+
+    bool has(const std::string& option) const { return values.count(option) != 0; }
+
+    // All values that the option was given.
+    std::vector<std::string> all(const std::string& option) const;
+
+    // Its only value; `otherwise` where it was not given.
+    std::string value(const std::string& option, const std::string& otherwise) const;
+};
+
+// `--name value`, `--name=value`, `-nvalue`, `-n value`; several flags in one word, `-qv`. Behind
+// `--` all words are operands. Throws UsageError.
+Words sort_words(const std::vector<Option>& options, const std::vector<std::string>& words);
+
+} // namespace talcmp
+
+#endif
