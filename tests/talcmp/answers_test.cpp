@@ -80,14 +80,31 @@ constexpr double infinity = std::numeric_limits<double>::infinity();
 
 const Answer values[] = {
     {"SeveralDifferences", f64({1, 2, 3, 4}), f64({1, 9, 8, 4}),
-     "[1]: 2 and 9 (the same from --tol 53 on)"},
-    {"TenthAsSingle", f32({0.1F}), f32({0.3F}), "[0]: 0.1 and 0.3 (the same from --tol 24 on)"},
+     "[1]: 2 and 9 (no digit in common)"},
+    {"TenthAsSingle", f32({0.1F}), f32({0.3F}), "[0]: 0.1 and 0.3 (no digit in common)"},
     {"TenthAsDouble", f64({0.1}), f64({0.1F}),
      "[0]: 0.1 and 0.10000000149011612 (the same from --tol 27 on)"},
     {"LeastSingle", f32({1e-45F}), f32({std::nextafter(1.0F, 2.0F)}),
-     "[0]: 1e-45 and 1.0000001 (the same from --tol 24 on)"},
+     "[0]: 1e-45 and 1.0000001 (no digit in common)"},
     {"NextDouble", f64({1}), f64({std::nextafter(1.0, 2.0)}),
      "[0]: 1 and 1.0000000000000002 (the same from --tol 1 on)"},
+    {"OneDigitInCommon", f64({1, 3}), f64({std::nextafter(2.0, 1.0), 2}),
+     "[0]: 1 and 1.9999999999999998 (the same from --tol 52 on)"},
+    {"OneDigitInCommonOfSingles", f32({1}), f32({std::nextafter(2.0F, 1.0F)}),
+     "[0]: 1 and 1.9999999 (the same from --tol 23 on)"},
+    {"NoDigitInCommon", f64({0.709}), f64({1.709}), "[0]: 0.709 and 1.709 (no digit in common)"},
+    {"NoDigitInCommonOfNegatives", f64({-1}), f64({-2}), "[0]: -1 and -2 (no digit in common)"},
+    {"NoDigitInCommonWithAnInfinity", f64({5}), f64({infinity}),
+     "[0]: 5 and inf (no digit in common)"},
+    {"NoDigitInCommonOfRealParts", c128({{1, 1}}), c128({{2, 3}}),
+     "[0]: 1+1j and 2+3j (real parts: no digit in common)"},
+    {"NoDigitInCommonOfImaginaryParts", c64({{1, 1}}), c64({{1.5F, 2}}),
+     "[0]: 1+1j and 1.5+2j (imaginary parts: no digit in common)"},
+    {"RealPartsBeforeImaginaryOnes", c64({{1, 1}}), c64({{2, -1}}),
+     "[0]: 1+1j and 2-1j (real parts: no digit in common)"},
+    {"NumberAndNaN", f64({-1}), nan1, "[0]: -1 and nan(0x7ff8000000000123) (a NaN)"},
+    {"ZeroAndNaN", f64({0}), nan1, "[0]: 0 and nan(0x7ff8000000000123) (a NaN)"},
+    {"IntegerAndNaN", i32({1}), nan1, "[0]: 1 and nan(0x7ff8000000000123) (a NaN)"},
     {"LimitsOfDouble", f64({5e-324}), f64({-1.7976931348623157e308}),
      "[0]: 5e-324 and -1.7976931348623157e+308 (opposite signs)"},
     {"Infinities", f64({infinity}), f64({-infinity}), "[0]: inf and -inf (opposite signs)"},
@@ -104,9 +121,8 @@ const Answer values[] = {
     {"Zeros", f64({-0.0}), f64({0.0}), "[0]: -0 and 0 (the same from --tol 1 on)"},
     {"EqualNaNs", nan1, nan1},
     {"UnequalNaNs", nan1, nan2,
-     "[0]: nan(0x7ff8000000000123) and nan(0xfff8000000000456) (the same from --tol 53 on)"},
-    {"SingleNaN", single_of_bits(0x7FC00ABC), f32({1}),
-     "[0]: nan(0x7fc00abc) and 1 (the same from --tol 24 on)"},
+     "[0]: nan(0x7ff8000000000123) and nan(0xfff8000000000456) (two NaNs)"},
+    {"SingleNaN", single_of_bits(0x7FC00ABC), f32({1}), "[0]: nan(0x7fc00abc) and 1 (a NaN)"},
 };
 
 const std::string near_far = f64({1.1, 2.5});
@@ -125,11 +141,7 @@ const Answer tolerances[] = {
      f32({1 + 0x1p-22F}),
      "[0]: 1 and 1.0000002 (the same from --tol 2 on)",
      {"--tol", "1"}},
-    {"Half",
-     f64({1, 1}),
-     f64({1, 2}),
-     "[1]: 1 and 2 (the same from --tol 53 on)",
-     {"--tol", "0.5"}},
+    {"Half", f64({1, 1}), f64({1, 2}), "[1]: 1 and 2 (no digit in common)", {"--tol", "0.5"}},
     {"WithEqualsSign", f64({1}), f64({2}), "", {"--tol=53"}},
     {"Negative", f64({-0.0}), f64({0.0}), "", {"--tol", "-1"}},
     {"NegativeWithEqualsSign",
@@ -173,6 +185,14 @@ const std::string no_doubles = f64({});
 const Answer types_and_shapes[] = {
     {"IntegersAndReals", i16({-3, 0}), f32({-3, -0.0F})},
     {"IntegerAndReal", u8({3}), f64({3.5}), "[0]: 3 and 3.5 (the same from --tol 51 on)"},
+    {"IntegerAndSingle", i64({1}), f32({2}), "[0]: 1 and 2 (no digit in common)"},
+    {"SingleAndInteger", f32({2}), i8({3}), "[0]: 2 and 3 (the same from --tol 23 on)"},
+    {"IntegerAndDouble", i8({1}), f64({2}), "[0]: 1 and 2 (no digit in common)"},
+    {"SingleAndDouble", f32({1}), f64({1.25}), "[0]: 1 and 1.25 (the same from --tol 51 on)"},
+    {"SinglesAndComplexSingles", f32({1}), c64({{2, 0}}),
+     "[0]: 1 and 2+0j (real parts: no digit in common)"},
+    {"ComplexNaN", c128({{1, std::numeric_limits<double>::quiet_NaN()}}), f64({1}),
+     "[0]: 1+nan(0x7ff8000000000000)j and 1 (imaginary parts: a NaN)"},
     {"IntegersOfOnePattern", i64({-1}), u64({UINT64_MAX}),
      "[0]: -1 and 18446744073709551615 (different integers)"},
     {"RealsAndComplex", f32({2}), c128({{2, -0.0}})},
@@ -202,7 +222,7 @@ const Answer types_and_shapes[] = {
      array("(0, 18446744073709551615, 2)", Reals())},
     {"Scalars", array("()", Reals{1}), array("()", Reals{1})},
     {"DifferentScalars", array("()", Reals{1}), array("()", Reals{2}),
-     "[]: 1 and 2 (the same from --tol 53 on)"},
+     "[]: 1 and 2 (no digit in common)"},
 };
 
 // The array [1. 2.] with a dictionary of its element type and what is around that.
@@ -450,7 +470,7 @@ TEST_P(Slices, DifferWhereTheArraysDo) {
         elements[position] = elements[last] = 2.5;
         const std::string index = "[" + std::to_string(position) + "]";
         expect_answer(folder, {}, file(ones), file(elements),
-                      index + ": 1 and 2.5 (the same from --tol 53 on)");
+                      index + ": 1 and 2.5 (no digit in common)");
     }
 }
 
@@ -466,7 +486,7 @@ TEST_P(Slices, DoNotDependOnEachOther) {
         expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements), "");
         elements[position] = 4;
         expect_answer(folder, {"--tol=52.5"}, file(ones), file(elements),
-                      "[" + std::to_string(position) + "]: 1 and 4 (the same from --tol 53 on)");
+                      "[" + std::to_string(position) + "]: 1 and 4 (no digit in common)");
     }
 }
 

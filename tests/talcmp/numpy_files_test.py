@@ -234,7 +234,9 @@ class EveryTypeAndShape(Folder):
                      for bar in report["histogram"]}
         self.assertEqual(histogram, {digit: digits.count(digit) for digit in digits})
         smallest = 0 if not expected else max(from_one)
-        self.assertEqual(report["smallest_tolerance"], None if smallest == NEVER else smallest)
+        none = smallest >= (bits_of(ours.dtype, theirs.dtype) or NEVER)
+        self.assertEqual(report["smallest_tolerance"], None if none else smallest)
+        self.assertEqual(report["why_no_tolerance"] is None, not none)
         for place in found["differences"]:
             self.assertEqual(place["digits"],
                              None if digits[chosen.index(place["index"])] == NEVER
@@ -365,7 +367,9 @@ class LargeArrays(Folder):
         ours[299999] += 2.0**-52
         b = self.save("b.npy", ours)
         report = self.only_comparison(a, b)["report"]
-        self.assertEqual((report["differing"], report["smallest_tolerance"]), (1, 53))
+        self.assertEqual((report["differing"], report["smallest_tolerance"]), (1, None))
+        self.assertEqual(report["why_no_tolerance"],
+                         "pairs of NaNs are the same under the tolerance 0 only")
         report = self.only_comparison("--tol=1", a, b)["report"]
         self.assertEqual(report["differing"], 1)
 

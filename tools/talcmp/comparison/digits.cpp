@@ -22,12 +22,22 @@ constexpr Kind kind_of(const bool at_zero, const int from_one) {
 constexpr Kind kind_of_same_under_all = kind_of(true, 1);
 static_assert(kind_of(true, more_than_all_digits) < DigitSearch::kind_count);
 
+bool has_singles(const ElementType& type) {
+    return !is_integer(type) && type.part_size == sizeof(float);
+}
+
 // Whether the elements are equal and no NaNs, and so the same under every tolerance.
 bool all_same(const Pairs& pairs, const std::size_t begin, const std::size_t count) {
     return pairs.same(0, begin, count) && pairs.same(1, begin, count);
 }
 
 } // namespace
+
+int all_digits(const ElementType& type1, const ElementType& type2) {
+    const bool as_singles = (has_singles(type1) && (has_singles(type2) || is_integer(type2)))
+                            || (is_integer(type1) && has_singles(type2));
+    return as_singles ? std::numeric_limits<float>::digits : most_digits;
+}
 
 Sameness sameness_of(const Pairs& pairs, const std::size_t i) {
     int lowest = 1;

@@ -21,6 +21,10 @@ inline constexpr int more_than_all_digits = most_digits + 1;
 // How many pairs differ in 0, 1, ... 53 digits, and in more than all.
 using DigitCounts = std::array<std::uint64_t, more_than_all_digits + 1>;
 
+// The binary digits of the reals as which two elements are compared. A tolerance of all digits
+// takes any two numbers of one sign for the same, and NaNs too: it says nothing of the pair.
+int all_digits(const ElementType& type1, const ElementType& type2);
+
 // Under which whole tolerances from 0 on a pair is the same: perhaps under 0, and from some
 // tolerance on. NaNs of the same bits are the same under 0, and yet not under 1.
 class Sameness {

@@ -5,11 +5,11 @@
 
 namespace talcmp {
 
-std::optional<int> smallest_tolerance(const Report& report) {
+std::optional<int> smallest_tolerance(const Report& report, const int all_digits) {
     if (report.digits[0] == report.pairs) {
         return 0;
     }
-    if (report.needed_from_one > most_digits) {
+    if (report.needed_from_one >= all_digits) {
         return std::nullopt;
     }
     return report.needed_from_one;

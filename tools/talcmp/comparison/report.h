@@ -25,8 +25,8 @@ struct Report {
 };
 
 // The smallest whole tolerance, from 0 on, under which the arrays are the same; nothing where they
-// are under none.
-std::optional<int> smallest_tolerance(const Report& report);
+// are under none below `all_digits`.
+std::optional<int> smallest_tolerance(const Report& report, int all_digits);
 
 void add(Report& sum, const Report& report);
 

@@ -5,6 +5,7 @@
 
 #include <cmath>
 #include <cstddef>
+#include <limits>
 
 namespace talcmp {
 namespace {
@@ -24,17 +25,28 @@ std::string value_text(const Comparison& comparison, const type_t type, const vo
     return element_type(type).text(element, as_doubles);
 }
 
-// ---- Why two values are not the same under any tolerance
+// ---- Why two values are not the same under any tolerance that says anything of them
 
-// Empty where the parts are the same under some tolerance.
 std::string reason_of_parts(const double part1, const double part2) {
+    if (std::isnan(part1) || std::isnan(part2)) {
+        return std::isnan(part1) && std::isnan(part2) ? "two NaNs" : "a NaN";
+    }
     if ((part1 == 0) != (part2 == 0)) {
         return "zero is the same only as zero";
     }
     if ((part1 < 0) != (part2 < 0)) {
         return "opposite signs";
     }
-    return "";
+    return "no digit in common";
+}
+
+template <typename Real>
+bool are_apart(const double part1, const double part2) {
+    const auto real1 = static_cast<Real>(part1);
+    const auto real2 = static_cast<Real>(part2);
+    const type_t type = element_type_id<Real>;
+    return sameness_of(Pairs(type, &real1, type, &real2, 1), 0).from_one()
+           >= std::numeric_limits<Real>::digits;
 }
 
 std::string reason_under_all(const ElementType& type1, const ElementType& type2,
@@ -44,12 +56,15 @@ std::string reason_under_all(const ElementType& type1, const ElementType& type2,
     }
     const auto parts1 = type1.parts(place.element1.data());
     const auto parts2 = type2.parts(place.element2.data());
-    std::string real = reason_of_parts(parts1[0], parts2[0]);
     if (!is_complex(type1) && !is_complex(type2)) {
-        return real;
+        return reason_of_parts(parts1[0], parts2[0]);
     }
-    return real.empty() ? "imaginary parts: " + reason_of_parts(parts1[1], parts2[1])
-                        : "real parts: " + real;
+    const bool as_singles = all_digits(type1, type2) < most_digits;
+    const bool real = as_singles ? are_apart<float>(parts1[0], parts2[0])
+                                 : are_apart<double>(parts1[0], parts2[0]);
+    const std::size_t part = real ? 0 : 1;
+    return (real ? "real parts: " : "imaginary parts: ")
+           + reason_of_parts(parts1[part], parts2[part]);
 }
 
 } // namespace
@@ -80,7 +95,7 @@ std::string reason_text(const Comparison& comparison, const Place& place) {
     if (sameness.at_zero() && sameness.from_one() > 1) {
         return "NaNs of the same bits are the same under --tol 0";
     }
-    if (sameness.from_one() <= most_digits) {
+    if (sameness.from_one() < all_digits(pair.type1(), pair.type2())) {
         return "the same from --tol " + std::to_string(sameness.from_one()) + " on";
     }
     return reason_under_all(pair.type1(), pair.type2(), place);

@@ -19,10 +19,10 @@ std::string index_text(const Comparison& comparison, const Place& place);
 std::string first_value_text(const Comparison& comparison, const Place& place);
 std::string second_value_text(const Comparison& comparison, const Place& place);
 
-// Why the two are not the same: "the same from --tol 15 on", "opposite signs", ...
+// Why the two are not the same: "the same from --tol 15 on", "no digit in common", "a NaN", ...
 std::string reason_text(const Comparison& comparison, const Place& place);
 
-// "[1, 2]: 0.5 and 0.25 (the same from --tol 53 on)"
+// "[1, 2]: 0.5 and 0.75 (the same from --tol 52 on)"
 std::string place_text(const Comparison& comparison, const Place& place);
 
 // How two arrays that differ do: "shape (2, 3) and (3, 2)", "type int32 and float64", or the first

@@ -92,13 +92,12 @@ Json report_json(const Comparison& comparison) {
         return nullptr;
     }
     const Report& report = *comparison.report;
-    const auto smallest = talcmp::smallest_tolerance(report);
-    const std::string why_none = reason_of_no_tolerance(comparison);
+    const auto smallest = smallest_tolerance(comparison);
     return {{"pairs", report.pairs},
             {"differing", report.differing},
             {"worst", report.worst_place ? place_json(comparison, *report.worst_place) : Json()},
             {"smallest_tolerance", smallest ? Json(*smallest) : Json()},
-            {"why_no_tolerance", why_none.empty() ? Json() : Json(why_none)},
+            {"why_no_tolerance", smallest ? Json() : Json(reason_of_no_tolerance(comparison))},
             {"first_values", values_json(report.values1)},
             {"second_values", values_json(report.values2)},
             {"histogram", histogram_json(report)}};

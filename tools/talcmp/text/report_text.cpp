@@ -37,10 +37,18 @@ std::string digits_text(const int digits) {
     return digits > most_digits ? "more than all" : std::to_string(digits);
 }
 
+int all_digits_of(const Comparison& comparison) {
+    return all_digits(element_type(comparison.array1.type), element_type(comparison.array2.type));
+}
+
 std::string smallest_tolerance_text(const Comparison& comparison) {
-    const auto smallest = smallest_tolerance(*comparison.report);
-    return smallest ? "--tol " + std::to_string(*smallest)
-                    : "none; " + reason_of_no_tolerance(comparison);
+    if (const auto smallest = smallest_tolerance(comparison)) {
+        return "--tol " + std::to_string(*smallest);
+    }
+    const bool none_at_all = comparison.report->needed_from_one > most_digits;
+    const std::string below =
+        none_at_all ? "" : " below all " + std::to_string(all_digits_of(comparison)) + " digits";
+    return "none" + below + "; " + reason_of_no_tolerance(comparison);
 }
 
 // One bar for each number of digits up to the worst.
@@ -68,12 +76,13 @@ std::string histogram(const Report& report, const Terminal& terminal) {
 
 } // namespace
 
+std::optional<int> smallest_tolerance(const Comparison& comparison) {
+    return smallest_tolerance(*comparison.report, all_digits_of(comparison));
+}
+
 std::string reason_of_no_tolerance(const Comparison& comparison) {
     const Report& report = *comparison.report;
-    if (smallest_tolerance(report)) {
-        return "";
-    }
-    return report.worst_digits > most_digits
+    return report.worst_digits >= all_digits_of(comparison)
                ? place_text(comparison, *report.worst_place)
                : "pairs of NaNs are the same under the tolerance 0 only";
 }

@@ -6,6 +6,7 @@
 #include "comparison.h"
 #include "terminal.h"
 
+#include <optional>
 #include <string>
 
 namespace talcmp {
@@ -14,7 +15,11 @@ namespace talcmp {
 std::string report_text(const Comparison& comparison, const Question& question,
                         const Terminal& terminal);
 
-// Why the arrays are the same under no whole tolerance; empty where they are under one.
+// The smallest whole tolerance, from 0 on, under which the arrays are the same; nothing where that
+// is none or one of all digits, which says nothing of them. Of a comparison with a report.
+std::optional<int> smallest_tolerance(const Comparison& comparison);
+
+// Why there is none.
 std::string reason_of_no_tolerance(const Comparison& comparison);
 
 } // namespace talcmp
