@@ -7,17 +7,31 @@
 
 #include <gtest/gtest.h>
 
+#include <cstddef>
 #include <cstdint>
 #include <filesystem>
 #include <fstream>
+#include <sstream>
 #include <string>
+#include <vector>
 
 namespace {
+
+using Options = std::vector<std::string>;
 
 constexpr std::uint64_t GiB = std::uint64_t{1} << 30U;
 
 // Of talcmp and the libraries that it uses, in KiB.
 constexpr long most_memory = 64L * 1024;
+
+std::size_t lines_with(const std::string& text, const std::string& words) {
+    std::istringstream lines(text);
+    std::size_t count = 0;
+    for (std::string line; std::getline(lines, line);) {
+        count += line.find(words) != std::string::npos ? 1 : 0;
+    }
+    return count;
+}
 
 class ExhaustiveLargeArrays : public testing::Test {
   protected:
@@ -82,6 +96,31 @@ TEST_F(ExhaustiveLargeArrays, TakeLittleMemoryInDifferentOrders) {
     expect_same(run_talcmp({first, second}));
     expect_same(run_talcmp({"--slice=::3,::7", first, second}));
     expect_same(run_talcmp({"--slice=:,5", first, second}));
+}
+
+// Each place is held by every thread, and by what puts them together; its text is not held at all.
+TEST(ExhaustiveManyPlaces, TakeTheMemoryThatIsDocumented) {
+    constexpr std::size_t count = 300000;
+    constexpr long bytes_of_place = 48;
+    constexpr long threads = 2;
+    const TemporaryFolder folder;
+    const std::vector<std::int64_t> zeros(count);
+    const std::string first = folder.write("a.npy", npy::row(zeros));
+    const std::string second = folder.write("b.npy", npy::row(std::vector<std::int64_t>(count, 1)));
+    const Options arguments = {"--threads", std::to_string(threads), "-n", "1000000", first,
+                               second};
+    for (const bool json : {false, true}) {
+        Options all = arguments;
+        if (json) {
+            all.emplace_back("--json");
+        }
+        const Outcome outcome = run_talcmp(all);
+        EXPECT_EQ(outcome.status, 1);
+        EXPECT_EQ(outcome.errors, "");
+        EXPECT_EQ(lines_with(outcome.output, "different integers"), json ? count + 2 : count);
+        EXPECT_LT(outcome.memory, most_memory + bytes_of_place * (threads + 2) * long{count} / 1024)
+            << json;
+    }
 }
 
 } // namespace

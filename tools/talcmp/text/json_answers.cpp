@@ -1,6 +1,7 @@
 #include "json_answers.h"
 
 #include "difference_text.h"
+#include "json_writer.h"
 #include "number_text.h"
 #include "report_text.h"
 #include "text_answers.h"
@@ -103,71 +104,70 @@ Json report_json(const Comparison& comparison) {
             {"histogram", histogram_json(report)}};
 }
 
-Json comparison_json(const Comparison& comparison) {
-    Json places = Json::array();
+void write_comparison(JsonWriter& writer, const Comparison& comparison) {
+    writer.add("first", array_json(comparison.array1));
+    writer.add("second", array_json(comparison.array2));
+    writer.add("difference", difference_kind(comparison.difference));
+    writer.begin_array("differences");
     for (const Place& place : comparison.places) {
-        places.push_back(place_json(comparison, place));
+        writer.add(place_json(comparison, place));
     }
+    writer.end();
     const bool has_report = comparison.difference != Difference::shape;
-    return {{"first", array_json(comparison.array1)},
-            {"second", array_json(comparison.array2)},
-            {"difference", difference_kind(comparison.difference)},
-            {"differences", places},
-            {"report", has_report ? report_json(comparison) : Json()}};
+    writer.add("report", has_report ? report_json(comparison) : Json());
 }
 
 } // namespace
 
-struct JsonAnswers::Document { // NOLINT(bugprone-exception-escape): of moves that are not made
-    Json json;
-};
-
 JsonAnswers::JsonAnswers(const CommandLine& command_line)
-    : command_line_(command_line), document_(std::make_unique<Document>()) {}
+    : command_line_(command_line), writer_(std::make_unique<JsonWriter>(stdout)) {}
 
 JsonAnswers::~JsonAnswers() = default;
 
 void JsonAnswers::begin(const bool /*many*/) {
-    document_->json = {{"talcmp", TALCMP_VERSION},
-                       {"format", 1},
-                       {"tolerance", number(command_line_.question.tolerance)},
-                       {"strict_type", command_line_.question.strict_type},
-                       {"slice", command_line_.slice.empty() ? Json() : Json(command_line_.slice)},
-                       {"comparisons", Json::array()}};
+    writer_->begin_object();
+    writer_->add("talcmp", TALCMP_VERSION);
+    writer_->add("format", 1);
+    writer_->add("tolerance", number(command_line_.question.tolerance));
+    writer_->add("strict_type", command_line_.question.strict_type);
+    writer_->add("slice", command_line_.slice.empty() ? Json() : Json(command_line_.slice));
+    writer_->begin_array("comparisons");
 }
 
 void JsonAnswers::tell(const Outcome& outcome) {
-    Json entry = {{"result", kind_text(outcome.kind)}};
+    writer_->begin_object();
+    writer_->add("result", kind_text(outcome.kind));
     switch (outcome.kind) {
     case Outcome::Kind::same:
     case Outcome::Kind::different:
-        entry.update(comparison_json(outcome.comparison));
+        write_comparison(*writer_, outcome.comparison);
         break;
     case Outcome::Kind::only_in_first:
+        writer_->add("in", outcome.first);
+        writer_->add("name", outcome.name);
+        break;
     case Outcome::Kind::only_in_second:
-        entry["in"] = outcome.kind == Outcome::Kind::only_in_first ? outcome.first : outcome.second;
-        entry["name"] = outcome.name;
+        writer_->add("in", outcome.second);
+        writer_->add("name", outcome.name);
         break;
     case Outcome::Kind::trouble:
-        entry["names"] = {outcome.first, outcome.second};
-        entry["message"] = outcome.message;
+        writer_->add("names", {outcome.first, outcome.second});
+        writer_->add("message", outcome.message);
         complain(outcome.message);
         break;
     }
-    document_->json["comparisons"].push_back(entry);
+    writer_->end();
 }
 
 void JsonAnswers::finish(const Summary& summary) {
-    document_->json["summary"] = {{"same", summary.same},
-                                  {"different", summary.different},
-                                  {"only_in_first", summary.only_in_first},
-                                  {"only_in_second", summary.only_in_second},
-                                  {"trouble", summary.trouble}};
-    document_->json["exit_status"] = talcmp::exit_status(summary);
-    // Names of files need not be UTF-8, which JSON is.
-    const std::string text =
-        document_->json.dump(2, ' ', false, Json::error_handler_t::replace) + "\n";
-    std::fputs(text.c_str(), stdout);
+    writer_->end();
+    writer_->add("summary", {{"same", summary.same},
+                             {"different", summary.different},
+                             {"only_in_first", summary.only_in_first},
+                             {"only_in_second", summary.only_in_second},
+                             {"trouble", summary.trouble}});
+    writer_->add("exit_status", talcmp::exit_status(summary));
+    writer_->end();
 }
 
 } // namespace talcmp

@@ -10,6 +10,9 @@
 
 namespace talcmp {
 
+class JsonWriter;
+
+// Prints each outcome when it is told.
 class JsonAnswers : public Answers {
   public:
     explicit JsonAnswers(const CommandLine& command_line);
@@ -22,9 +25,8 @@ class JsonAnswers : public Answers {
     void finish(const Summary& summary) override;
 
   private:
-    struct Document;
     const CommandLine& command_line_;
-    std::unique_ptr<Document> document_;
+    std::unique_ptr<JsonWriter> writer_;
 };
 
 } // namespace talcmp

@@ -24,6 +24,7 @@ std::string summary_text(const Summary& summary) {
 
 void TextAnswers::tell(const Outcome& outcome) {
     if (outcome.kind == Outcome::Kind::trouble) {
+        std::fflush(stdout); // so that lines on one terminal stay in their order
         complain(outcome.message);
     } else if (command_line_.quiet) {
         return;
@@ -68,7 +69,6 @@ void TextAnswers::finish(const Summary& summary) {
 }
 
 void complain(const std::string& message) {
-    std::fflush(stdout); // so that lines on one terminal stay in their order
     std::fprintf(stderr, "talcmp: %s\n", message.c_str());
 }
 
