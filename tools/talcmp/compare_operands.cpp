@@ -15,10 +15,7 @@ class Run {
         : command_line_(command_line), answers_(answers), progress_(progress) {}
 
     Summary compare_all() {
-        const FilePairs files =
-            match_files(command_line_.first, command_line_.second, command_line_.filter.exclude);
-        answers_.begin(files.many);
-        for (const NamedPair& pair : files.pairs) {
+        for (const NamedPair& pair : file_pairs()) {
             if (pair.trouble) {
                 tell_trouble(pair.first.value_or(command_line_.first),
                              pair.second.value_or(command_line_.second), *pair.trouble);
@@ -34,6 +31,21 @@ class Run {
     }
 
   private:
+    // None where there was trouble, which is told.
+    std::vector<NamedPair> file_pairs() {
+        const std::string& first = command_line_.first;
+        const std::string& second = command_line_.second;
+        try {
+            FilePairs files = match_files(first, second, command_line_.filter.exclude);
+            answers_.begin(files.many);
+            return std::move(files.pairs);
+        } catch (const Trouble& trouble) {
+            answers_.begin(false);
+            tell_trouble(first, second, trouble.what());
+            return {};
+        }
+    }
+
     // Trouble with these two does not keep the others from being compared.
     template <typename Action>
     void guarded(const std::string& first, const std::string& second, const Action& action) {

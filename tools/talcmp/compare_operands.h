@@ -10,7 +10,7 @@
 namespace talcmp {
 
 // Compares what the operands stand for, array by array, and tells each outcome when it is known.
-// Throws Trouble where the operands stand for nothing; trouble with one file is an outcome.
+// Trouble with the operands, or with two files of theirs, is an outcome too.
 Summary compare_operands(const CommandLine& command_line, Answers& answers, ProgressBar& progress);
 
 } // namespace talcmp
