@@ -3,6 +3,9 @@
 #include <algorithm>
 #include <cstddef>
 #include <numeric>
+#include <utility>
+
+#include <getopt.h>
 
 namespace talcmp {
 namespace {
@@ -61,89 +64,97 @@ std::string hint_for(const std::vector<Option>& options, const std::string& word
 
 // ---- The words, one by one
 
+// What getopt_long returns.
+constexpr int is_operand = 1;
+constexpr int is_unknown = '?';
+constexpr int lacks_value = ':';
+constexpr int first_long_option = 256; // behind all letters
+
 class Sorter {
   public:
-    Sorter(const std::vector<Option>& options, const std::vector<std::string>& words)
-        : options_(options), next_(words.begin()), end_(words.end()) {}
+    Sorter(const std::vector<Option>& options, std::vector<std::string> words)
+        : options_(options), words_(std::move(words)) {
+        words_.insert(words_.begin(), "talcmp");
+        for (std::string& word : words_) {
+            arguments_.push_back(word.data());
+        }
+        arguments_.push_back(nullptr);
+        describe_options();
+    }
 
     Words sort() {
-        while (next_ != end_) {
-            const std::string& word = *next_++;
-            if (word == "--") {
-                sorted_.operands.insert(sorted_.operands.end(), next_, end_);
-                next_ = end_;
-            } else if (begins_with(word, "--")) {
-                take_long(word);
-            } else if (word.size() > 1 && word[0] == '-') {
-                take_short(word);
-            } else {
-                sorted_.operands.push_back(word);
-            }
+        ::optind = 0; // as at the start of the program
+        ::opterr = 0; // it prints nothing
+        while (take_next()) {
         }
+        sorted_.operands.insert(sorted_.operands.end(), words_.begin() + ::optind, words_.end());
         return sorted_;
     }
 
   private:
-    template <typename Condition>
-    const Option* find(const Condition& condition) const {
-        const auto found = std::find_if(options_.begin(), options_.end(), condition);
-        return found == options_.end() ? nullptr : &*found;
+    static bool takes_value(const Option& option) { return option.kind != Option::Kind::flag; }
+
+    void describe_options() {
+        for (std::size_t i = 0; i < options_.size(); ++i) {
+            const Option& option = options_[i];
+            long_options_.push_back({option.name.c_str() + 2,
+                                     takes_value(option) ? required_argument : no_argument, nullptr,
+                                     first_long_option + static_cast<int>(i)});
+            if (option.letter != '\0') {
+                letters_ += option.letter;
+                letters_ += takes_value(option) ? ":" : "";
+            }
+        }
+        long_options_.push_back({});
     }
 
-    const Option* named(const std::string& name) const {
-        return find([&name](const Option& option) { return option.name == name; });
+    // Returns whether there was another option or operand in front of "--" or the end.
+    bool take_next() {
+        const std::string& word =
+            words_[static_cast<std::size_t>(std::max(::optind, 1)) % words_.size()];
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): no other thread is there yet.
+        const int found = ::getopt_long(static_cast<int>(words_.size()), arguments_.data(),
+                                        letters_.c_str(), long_options_.data(), nullptr);
+        if (found == is_operand) {
+            sorted_.operands.emplace_back(::optarg);
+        } else if (found >= 0) {
+            take_option(word, found);
+        }
+        return found >= 0;
     }
 
-    const Option* lettered(const char letter) const {
-        return find([letter](const Option& option) { return option.letter == letter; });
+    void take_option(const std::string& word, const int found) {
+        const int code = found == is_unknown || found == lacks_value ? ::optopt : found;
+        const Option* const option = option_of(code);
+        const bool is_long = begins_with(word, "--");
+        const std::string name =
+            is_long ? word.substr(0, word.find('=')) : std::string{'-', static_cast<char>(code)};
+        // Names may not be abbreviated, so that no new option changes what a command means.
+        if (option == nullptr || (is_long && option->name != name)) {
+            refuse(options_, is_long ? name : word);
+        }
+        if (found == is_unknown) {
+            throw UsageError(name + " takes no value");
+        }
+        if (found == lacks_value) {
+            throw UsageError(name + " needs a value");
+        }
+        add(*option, name, takes_value(*option) ? ::optarg : "");
+    }
+
+    // Null where there is none.
+    const Option* option_of(const int code) const {
+        const auto found =
+            std::find_if(options_.begin(), options_.end(), [&](const Option& option) {
+                return code == option.letter
+                       || code == first_long_option + (&option - options_.data());
+            });
+        return code == '\0' || found == options_.end() ? nullptr : &*found;
     }
 
     bool is_option(const std::string& word) const {
         return begins_with(word, "--")
-               || (word.size() == 2 && word[0] == '-' && lettered(word[1]) != nullptr);
-    }
-
-    void take_long(const std::string& word) {
-        const std::size_t equals = word.find('=');
-        const std::string name = word.substr(0, equals);
-        const Option* const option = named(name);
-        if (option == nullptr) {
-            refuse(options_, name);
-        }
-        const bool takes_value = option->kind != Option::Kind::flag;
-        if (equals == std::string::npos) {
-            add(*option, name, takes_value ? next_value(name) : "");
-        } else if (takes_value) {
-            add(*option, name, word.substr(equals + 1));
-        } else {
-            throw UsageError(name + " takes no value");
-        }
-    }
-
-    void take_short(const std::string& word) {
-        for (std::size_t i = 1; i < word.size(); ++i) {
-            const Option* const option = lettered(word[i]);
-            if (option == nullptr) {
-                refuse(options_, word);
-            }
-            const std::string name = {'-', word[i]};
-            if (option->kind != Option::Kind::flag) {
-                const std::string rest = word.substr(i + 1);
-                add(*option, name, rest.empty() ? next_value(name) : rest);
-                return;
-            }
-            add(*option, name, "");
-        }
-    }
-
-    std::string next_value(const std::string& name) {
-        if (next_ == end_) {
-            throw UsageError(name + " needs a value");
-        }
-        if (is_option(*next_)) {
-            throw UsageError(name + " needs a value, and '" + *next_ + "' is an option");
-        }
-        return *next_++;
+               || (word.size() == 2 && word[0] == '-' && option_of(word[1]) != nullptr);
     }
 
     void add(const Option& option, const std::string& name, const std::string& value) {
@@ -151,15 +162,24 @@ class Sorter {
         if (option.kind == Option::Kind::value && !values.empty()) {
             throw UsageError(option.name + " is given twice");
         }
-        if (option.kind != Option::Kind::flag && value.empty()) {
+        if (takes_value(option) && value.empty()) {
             throw UsageError(name + ": empty value");
+        }
+        // In a word of its own, which is likely to have been meant as what it looks like.
+        const bool own_word =
+            takes_value(option) && ::optarg == arguments_[static_cast<std::size_t>(::optind - 1)];
+        if (own_word && is_option(value)) {
+            throw UsageError(name + " needs a value, and '" + value + "' is an option");
         }
         values.push_back(value);
     }
 
     const std::vector<Option>& options_;
-    std::vector<std::string>::const_iterator next_;
-    std::vector<std::string>::const_iterator end_;
+    std::vector<std::string> words_;
+    std::vector<char*> arguments_;
+    std::vector<::option> long_options_;
+    // Operands are returned in their places, and missing values apart from unknown options.
+    std::string letters_ = "-:";
     Words sorted_;
 };
 
