@@ -262,6 +262,21 @@ class DamagedArchives(Folder):
                        "as zero)\n", "", self.good, self.bad)
 
 
+class LongNames(Folder):
+    def test_of_members_are_shortened_in_messages(self):
+        one, two = self.path("one.npz"), self.path("two.npz")
+        name = "x" * 65000
+        np.savez(one, **{name: np.arange(3)})
+        np.savez(two, **{name: np.arange(3) + 1})
+        names = [(path + "[" + name)[:700] + " [...] " + "x" * 249 + "]" for path in (one, two)]
+        self.expect(1, f"{names[0]} {names[1]} differ: [0]: 0 and 1 (different integers)\n", "",
+                    one, two)
+        self.assertIn(f'"name": "{one}[{name}]"', run("--json", one, two)[1])
+        np.savez(two, y=np.arange(3))
+        self.expect(1, f"{one} {two} differ: only in {one}: " + "x" * 700 + " [...] " + "x" * 250
+                    + f"\n{one} {two} differ: only in {two}: y\n", "", one, two)
+
+
 class EntriesOfFolders(Folder):
     def test_are_no_arrays(self):
         path = self.save("g/x.npy", np.arange(3.0))

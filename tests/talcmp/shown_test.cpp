@@ -20,6 +20,14 @@ void PrintTo(const Text& text, std::ostream* out) {
     *out << text.name;
 }
 
+std::string repeated(const std::string& text, const int times) {
+    std::string result;
+    for (int i = 0; i < times; ++i) {
+        result += text;
+    }
+    return result;
+}
+
 const Text texts[] = {
     {"Nothing", "", "''"},
     {"Ascii", "a b~[1]", "a b~[1]"},
@@ -57,6 +65,12 @@ const Text texts[] = {
     {"CutInThree", "\xE6\xBC", "??"},
     {"CutInFour", "\xF0\x9F\x98", "???"},
     {"LeadBeforeAscii", "\xC3.\xE6\xBC.\xF0\x9F\x98.", "?.??.???."},
+    {"AsLongAsIsShown", std::string(1000, 'x'), std::string(1000, 'x')},
+    {"LongerThanIsShown",
+     std::string(699, 'x') + "a" + std::string(51, 'y') + "b" + std::string(249, 'z'),
+     std::string(699, 'x') + "a [...] b" + std::string(249, 'z')},
+    {"LongAndNotAscii", repeated("\xE6\xBC\xA2", 400),
+     repeated("\xE6\xBC\xA2", 233) + " [...] " + repeated("\xE6\xBC\xA2", 84)},
     {"NoLeads", "\xBF\xF5\xFF", "???"},
 };
 

@@ -67,6 +67,14 @@ bool is_shown(const char32_t code) {
     });
 }
 
+// Of the one that the byte `position` of a text of UTF-8 belongs to.
+std::size_t beginning_of_character(const std::string_view text, std::size_t position) {
+    while ((static_cast<unsigned char>(text[position]) & 0xC0U) == 0x80) {
+        --position;
+    }
+    return position;
+}
+
 } // namespace
 
 std::string without_controls(std::string_view text, const StandIn& stand_in) {
@@ -81,7 +89,16 @@ std::string without_controls(std::string_view text, const StandIn& stand_in) {
 }
 
 std::string shown(const std::string_view text) {
-    return text.empty() ? "''" : without_controls(text, [](char32_t) { return "?"; });
+    constexpr std::size_t most = 1000; // bytes; members of archives may have names of 65535
+    constexpr std::size_t head = 700;
+    constexpr std::size_t tail = 250;
+    std::string result = text.empty() ? "''" : without_controls(text, [](char32_t) { return "?"; });
+    if (result.size() > most) {
+        const std::size_t begin = beginning_of_character(result, head);
+        const std::size_t end = beginning_of_character(result, result.size() - tail);
+        result.replace(begin, end - begin, " [...] ");
+    }
+    return result;
 }
 
 } // namespace talcmp

@@ -18,7 +18,7 @@ using StandIn = std::function<std::string(char32_t)>;
 std::string without_controls(std::string_view text, const StandIn& stand_in);
 
 // A name or another text in a message, with a question mark for each such character; two quotation
-// marks for an empty one.
+// marks for an empty one. Of more than 1000 bytes the middle is left out.
 std::string shown(std::string_view text);
 
 } // namespace talcmp
