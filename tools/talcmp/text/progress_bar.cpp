@@ -1,12 +1,12 @@
 #include "progress_bar.h"
 
+#include "status_line.h"
 #include "terminal.h"
 
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstdio>
-#include <string>
 
 #include <unistd.h>
 
@@ -17,7 +17,8 @@ constexpr auto patience = std::chrono::milliseconds(500);
 constexpr auto period = std::chrono::milliseconds(100);
 
 std::string left_text(const double seconds) {
-    const long long whole = std::llround(seconds);
+    constexpr double most = 100.0 * 3600 - 1;
+    const long long whole = std::llround(std::min(seconds, most));
     std::array<char, 48> text = {};
     if (whole < 3600) {
         std::snprintf(text.data(), text.size(), "%lld:%02lld left", whole / 60, whole % 60);
@@ -30,7 +31,31 @@ std::string left_text(const double seconds) {
 
 } // namespace
 
-ProgressBar::ProgressBar(const bool wanted) : wanted_(wanted && ::isatty(STDERR_FILENO) == 1) {}
+std::string progress_text(const std::uint64_t done, const std::uint64_t total, const double seconds,
+                          const int columns) {
+    const double part = std::min(static_cast<double>(done) / static_cast<double>(total), 1.0);
+    const double rate = static_cast<double>(done) / seconds;
+    const bool fast = rate >= 1e9;
+    std::array<char, 64> numbers = {};
+    std::snprintf(numbers.data(), numbers.size(), " %3.0f %%  %.2f %s  ", 100 * part,
+                  rate / (fast ? 1e9 : 1e6), fast ? "GB/s" : "MB/s");
+    const std::string text = numbers.data() + left_text(seconds * (1 / part - 1));
+    // One column stays free, as some terminals begin a new line behind the last.
+    const auto most = static_cast<std::size_t>(std::max(columns - 1, 0));
+    if (most < text.size() + 3) {
+        return text.substr(0, most);
+    }
+    const std::size_t width = most - text.size() - 2;
+    const auto full = static_cast<std::size_t>(part * static_cast<double>(width));
+    return "[" + std::string(full, '=') + std::string(width - full, ' ') + "]" + text;
+}
+
+ProgressBar::ProgressBar(const bool wanted)
+    : wanted_(wanted && ::isatty(STDERR_FILENO) == 1 && takes_escapes()) {
+    if (wanted_) {
+        clear_status_at_signals();
+    }
+}
 
 void ProgressBar::begin(const std::uint64_t total_bytes) {
     total_ = std::max<std::uint64_t>(total_bytes, 1);
@@ -47,37 +72,14 @@ void ProgressBar::advance(const std::uint64_t bytes) {
     }
     const auto now = Clock::now();
     if (now >= next_) {
-        draw(now);
+        const double seconds = std::chrono::duration<double>(now - begin_).count();
+        show_status(progress_text(done_, total_, seconds, columns_of(STDERR_FILENO)));
         next_ = now + period;
     }
 }
 
-void ProgressBar::draw(const Clock::time_point now) {
-    const double seconds = std::chrono::duration<double>(now - begin_).count();
-    const double part = static_cast<double>(done_) / static_cast<double>(total_);
-    const double rate = static_cast<double>(done_) / seconds;
-    const bool fast = rate >= 1e9;
-    std::array<char, 64> numbers = {};
-    std::snprintf(numbers.data(), numbers.size(), " %3.0f %%  %.2f %s  ", 100 * part,
-                  rate / (fast ? 1e9 : 1e6), fast ? "GB/s" : "MB/s");
-    const std::string behind = numbers.data() + left_text(seconds * (1 / part - 1));
-    // One column stays free, as some terminals begin a new line behind the last.
-    const int room = columns_of(STDERR_FILENO) - 3 - static_cast<int>(behind.size());
-    std::string bar;
-    if (room > 0) {
-        const auto width = static_cast<std::size_t>(room);
-        const auto full = static_cast<std::size_t>(part * room);
-        bar = "[" + std::string(full, '=') + std::string(width - full, ' ') + "]";
-    }
-    std::fprintf(stderr, "\r%s%s\x1B[K", bar.c_str(), behind.c_str());
-    shown_ = true;
-}
-
 void ProgressBar::clear() {
-    if (shown_) {
-        std::fputs("\r\x1B[K", stderr);
-        shown_ = false;
-    }
+    clear_status();
 }
 
 } // namespace talcmp

@@ -9,12 +9,17 @@
 #include <chrono>
 #include <cstdint>
 #include <mutex>
+#include <string>
 
 namespace talcmp {
 
-// Shows itself half a second after a comparison began, where standard error is a terminal, and is
-// gone at the end. Shows what part of the bytes has been read, how fast, and how long the rest will
-// take.
+// A bar and, behind it, what part of the bytes has been read, how fast, and how long the rest will
+// take; in fewer than `columns` characters, and without a bar where there is no room for it.
+std::string progress_text(std::uint64_t done, std::uint64_t total, double seconds, int columns);
+
+// Shows itself half a second after a comparison began, where standard error is a terminal that
+// takes escape sequences, and is gone at the end, even one by a signal. Shows what part of the
+// bytes has been read, how fast, and how long the rest will take.
 class ProgressBar : public ProgressListener {
   public:
     explicit ProgressBar(bool wanted);
@@ -31,15 +36,12 @@ class ProgressBar : public ProgressListener {
   private:
     using Clock = std::chrono::steady_clock;
 
-    void draw(Clock::time_point now);
-
     bool wanted_;
     std::uint64_t total_ = 0;
     std::atomic<std::uint64_t> done_ = 0;
     std::mutex drawing_;
     Clock::time_point begin_;
     Clock::time_point next_;
-    bool shown_ = false;
 };
 
 } // namespace talcmp

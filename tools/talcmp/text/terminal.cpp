@@ -15,15 +15,11 @@ std::string environment(const char* const variable) {
     return value == nullptr ? "" : value;
 }
 
-bool shows_colours() {
-    const std::string terminal = environment("TERM");
-    return !terminal.empty() && terminal != "dumb" && environment("NO_COLOR").empty();
-}
-
 } // namespace
 
 Terminal Terminal::of_standard_output() {
-    const bool colours = ::isatty(STDOUT_FILENO) == 1 && shows_colours();
+    const bool colours =
+        ::isatty(STDOUT_FILENO) == 1 && takes_escapes() && environment("NO_COLOR").empty();
     return {colours, columns_of(STDOUT_FILENO)};
 }
 
@@ -35,14 +31,18 @@ std::string Terminal::coloured(const std::string& text, const Colour colour) con
     return "\x1B[" + std::string(code) + "m" + text + "\x1B[0m";
 }
 
+bool takes_escapes() {
+    const std::string terminal = environment("TERM");
+    return !terminal.empty() && terminal != "dumb";
+}
+
 int columns_of(const int descriptor) {
     constexpr int usual = 80;
-    constexpr int fewest = 20;
     struct winsize size = {};
     if (::ioctl(descriptor, TIOCGWINSZ, &size) != 0 || size.ws_col == 0) {
         return usual;
     }
-    return size.ws_col < fewest ? fewest : size.ws_col;
+    return size.ws_col;
 }
 
 } // namespace talcmp

@@ -12,8 +12,8 @@ enum class Colour { red, green, blue };
 // What standard output is.
 class Terminal {
   public:
-    // Colours are shown on a terminal, unless the environment variable NO_COLOR is set or TERM is
-    // "dumb".
+    // Colours are shown on a terminal that takes escape sequences, unless the environment variable
+    // NO_COLOR is set.
     static Terminal of_standard_output();
 
     Terminal(const bool colours, const int columns) : colours_(colours), columns_(columns) {}
@@ -27,6 +27,10 @@ class Terminal {
     bool colours_;
     int columns_;
 };
+
+// Whether a terminal takes escape sequences: the environment variable TERM names it, and not as
+// "dumb".
+bool takes_escapes();
 
 // Characters in a line of the terminal `descriptor`; 80 where it is none.
 int columns_of(int descriptor);
