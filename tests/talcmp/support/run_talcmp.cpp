@@ -87,7 +87,9 @@ Outcome run_talcmp(const std::vector<std::string>& arguments, const Output outpu
     const Capture captured;
     const Capture errors;
     const int full = output == Output::full ? ::open("/dev/full", O_WRONLY | O_CLOEXEC) : -1;
-    const int descriptor = output == Output::captured ? captured.descriptor() : full;
+    const int descriptor = output == Output::captured      ? captured.descriptor()
+                           : output == Output::with_errors ? errors.descriptor()
+                                                           : full;
     struct rusage usage = {};
     const int status = start_and_wait(arguments, descriptor, errors.descriptor(), usage);
     if (full >= 0) {

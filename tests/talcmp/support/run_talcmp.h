@@ -13,8 +13,8 @@ struct Outcome {
     long memory = 0; // the greatest resident memory in KiB, that of the test at the start included
 };
 
-// Where the child's standard output goes.
-enum class Output { captured, closed, full };
+// Where the child's standard output goes; `with_errors` is to the same file as standard error.
+enum class Output { captured, closed, full, with_errors };
 
 // Fails the test when the child is ended by a signal, which it is too when it takes too long.
 Outcome run_talcmp(const std::vector<std::string>& arguments, Output output = Output::captured);
