@@ -11,7 +11,8 @@ _TOKEN = re.compile(
     (?P<comment>//[^\n]*|/\*.*?\*/)
   | (?P<directive>^[ ]*\#(?:[^\n\\]|\\.|\\\n)*)
   | (?P<attribute>\[\[.*?\]\])
-  | (?P<string>"(?:[^"\\\n]|\\.)*")
+  | (?P<string>R"\(.*?\)"|"(?:[^"\\\n]|\\.)*")
+  | (?P<character>'(?:[^'\\\n]|\\.)+')
   | (?P<number>\d[\w.']*(?:(?<=[eEpP])[+-][\w.]*)?)
   | (?P<word>[A-Za-z_]\w*)
   | (?P<mark>\.\.\.|<<=|>>=|[-+*/%&|^<>=!]=|<<|>>|&&|\|\||\+\+|--|->|::|[^\w\s])
@@ -104,7 +105,8 @@ class Change:
     begin: int
     end: int
     text: str
-    swaps: bool = False
+    swaps: bool = False  # the order of two statements
+    whole: bool = False  # statements, conditions or texts
 
 
 # An operator has blanks on both sides, as the sources are formatted; what looks like one and has
@@ -361,11 +363,11 @@ class Places:
         return " ".join((run[0], "..", run[-1])) if count > 2 else " ".join(run)
 
 
-def mutants_of(path, text):
+def mutants_of(path, text, source=Source):
     """All mutants of the file, each with a name of its own that no edit elsewhere changes."""
     places = Places(text)
     found, seen, taken = [], set(), Counter()
-    for change in Source(text).changes():
+    for change in source(text).changes():
         mutated = text[: change.begin] + change.text + text[change.end :]
         if mutated in seen or mutated == text:
             continue

@@ -1,0 +1,347 @@
+"""The module as a target: its mutants, and the tests that are built with one after the other."""
+
+import functools
+import hashlib
+import re
+import shutil
+import subprocess
+import threading
+from collections import defaultdict
+from dataclasses import dataclass, field, replace
+from pathlib import Path
+
+import mutants
+import steps
+from steps import (FLAGS, ROOT, SURVIVES, TIME_OUT, WORK, Broken, Killed, command, digest,
+                   first_error, precompile, run_test)
+
+FILES = ["Includes/taldata_array_element_types.h", "Includes/talnumericarray.h",
+         "Includes/taltensor.h", "TalNumericArray/*.cpp", "TalNumericArray/*.h",
+         "compilerruntime/src/scalar_op/utils/*.h", "compilerruntime/src/types/*.h"]
+FOLDERS = ["TalNumericArray", "Includes", "SystemConfiguration/Exports",
+           "compilerruntime/src/scalar_op/utils", "compilerruntime/src/types"]
+MODULE = "TalNumericArray/talnumericarray_compare.cpp"
+TABLE = "TalNumericArray/talnumericarray.cpp"
+
+SUPPORT = [f"tests/support/{name}.cpp"
+           for name in ("checked_calls", "golden_calls", "oracle", "random_arrays")]
+RANDOM_CALLS = 100000
+
+
+@dataclass(frozen=True)
+class Program:
+    """A test program: its sources that see the mutant, and those that see only the contract."""
+
+    name: str
+    mutated: tuple = ()
+    fixed: tuple = ()
+    level: str = "-O0"  # of the sources that see the mutant
+    link: tuple = ()
+    run: tuple = field(default=(), repr=False)
+    module_level: str = "-O0"
+
+
+def own(name, *fixed, **settings):
+    """The program of a test that instantiates the module's templates itself."""
+    return Program(name, (f"tests/{name}.cpp",), fixed, **settings)
+
+
+ARRAYS = Program("whole arrays", (),
+                 (*(f"tests/{name}.cpp" for name in
+                    ("complex_pairs_test", "golden_calls_test", "random_calls_test",
+                     "threads_test")), *SUPPORT))
+# Without blocks, as with the option to optimise for size.
+SMALL = replace(ARRAYS, name="whole arrays, built for size", module_level="-Os")
+SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
+                          "tolerance_shift_factor_test")))
+PARTS = (
+    own("array_record_test", level="-O0 -fsanitize=undefined -fno-sanitize-recover=undefined",
+        link=("-fsanitize=undefined",)),
+    own("entry_points_test"),
+    own("element_pairs_test"),
+    own("power_calls_test", link=("-Wl,--wrap=pow,--wrap=powf",)),
+    own("subnormal_singles_test"),
+)
+SIGNALS = Program("signals_test", (), ("tests/signals_test.cpp", *SUPPORT), link=("-Wl,-z,now",))
+READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O1")
+BLOCKS = own("blocks_test", *SUPPORT)
+# Of all sets, and so without the longest of the tests, which says no more of them than of one.
+BLOCKS_OF_SETS = own("blocks_test", *SUPPORT,
+                     run=("--gtest_filter=-BlockLoops.AnswerAndRememberAsTheElementLoop",))
+
+# All sets have the same loops, so that one will do but where sets are chosen.
+ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
+ALL_SETS = "ALL_SETS"
+
+# What the release build makes of the module beside the test programs, and the tests of that.
+CHECKED_TARGETS = ["talnumericarray_compare", "small_runtime", "runtime_by_linking",
+                   "runtime_by_dlopen", "talcmp", "compare_arrays"]
+CHECKED_TESTS = r"^built\.(archive|shared_object)$|^examples\."
+
+
+# ---- The mutants to try
+
+BOUNDS = {"<": "<=", "<=": "<", ">": ">=", ">=": ">"}
+
+
+def rank(mutant):
+    """Bounds before other operators and numbers, names last; among equals, a choice that stays."""
+    before, _, behind = mutant.name[mutant.name.rindex("[") + 1 : -1].partition(" -> ")
+    by_name = before[0].isalpha() and before not in ("true", "false")
+    chance = hashlib.sha256(mutant.name.encode()).hexdigest()
+    return by_name, BOUNDS.get(before, "") != behind.split(" (")[0], chance
+
+
+def chosen(found):
+    """One mutant of each line, and all that change the order of two statements."""
+    by_line = defaultdict(list)
+    for mutant in found:
+        by_line[mutant.line].append(mutant)
+    for _, line in sorted(by_line.items()):
+        best = min((mutant for mutant in line if not mutant.change.swaps), key=rank, default=None)
+        yield from (mutant for mutant in line if mutant is best or mutant.change.swaps)
+
+
+# ---- A copy of the module, and what is built from it
+
+class Tree(steps.Tree):
+    """The module with one file at a time another."""
+
+    def __init__(self, folder):
+        super().__init__(folder, FOLDERS)
+        self.sets = ALL_SETS
+
+    def put(self, path, text):
+        super().put(path, text)
+        self.sets = ALL_SETS if "instruction_sets" in path else ONE_SET
+
+    def object(self, source, level):
+        """The file that `source` is compiled to, once."""
+        key = source, level, self.sets
+        if key not in self.objects:
+            target = self.folder / f"{digest(*key)[:16]}.o"
+            self._compile(source, [*level.split(), f"-D{self.sets}"], target)
+            self.objects[key] = target
+        return self.objects[key]
+
+    def _compile(self, source, flags, target):
+        compile_source(self.folder, source, flags, target)
+
+
+class UnharmedTree(Tree):
+    """The module as it is. What was built from the same texts by an earlier run is taken again."""
+
+    def __init__(self, folder):
+        super().__init__(folder)
+        self.lock = threading.RLock()
+
+    def object(self, source, level, sets=ALL_SETS):
+        with self.lock:
+            self.sets = sets
+            return super().object(source, level)
+
+    def _compile(self, source, flags, target):
+        stamp = Path(f"{target}.stamp")
+        texts = digest(*flags, *self.texts.values(), test_texts((source,)))
+        if not (target.exists() and stamp.exists() and stamp.read_text() == texts):
+            stamp.unlink(missing_ok=True)
+            super()._compile(source, flags, target)
+            stamp.write_text(texts)
+
+
+@functools.lru_cache(maxsize=None)
+def test_texts(sources):
+    """The sources and what they include of the tests, as one number."""
+    _, text = command(["g++", *FLAGS, *(f"-I{name}" for name in (*FOLDERS, "tests")), "-MM",
+                       *sources], cwd=ROOT)
+    names = {name for name in text.split() if name.startswith("tests/")}
+    return digest(*((ROOT / name).read_text(encoding="utf-8") for name in sorted(names)))
+
+
+def compile_source(folder, source, flags, target):
+    words = ["g++", *FLAGS, *flags, *(f"-I{name}" for name in FOLDERS)]
+    if source.startswith("tests/"):
+        words += ["-include", str(WORK / "gtest.h"), f"-I{ROOT}/tests",
+                  f"-DDEFAULT_RANDOM_CALLS={RANDOM_CALLS}",
+                  f'-DGOLDEN_CALLS="{ROOT}/tests/golden_calls.txt"', "-c", str(ROOT / source)]
+    else:
+        words += ["-include", str(WORK / "standard.h")] if "-O0" in flags else []
+        words += ["-fno-exceptions", "-c", source]
+    status, text = command([*words, "-o", str(target)], cwd=folder)
+    if status != 0:
+        raise Broken(first_error(text))
+
+
+STANDARD_HEADERS = ["algorithm", "cfloat", "cmath", "complex", "cstddef", "cstdint", "cstring",
+                    "limits", "type_traits"]
+
+
+class Bench(steps.Bench):
+    """What all copies of the module share: the objects that see no mutant, besides."""
+
+    def __init__(self, memory):
+        precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
+        precompile("standard.h", STANDARD_HEADERS, ["-O0", "-fno-exceptions"])
+        super().__init__(memory, UnharmedTree(WORK / "original"))
+        self.compiled = self._lines_compiled()
+        self.needs = {part: self._dependencies(part.mutated)
+                      for part in (*SCALARS, *PARTS, BLOCKS)}
+        self.suite = None
+        self.suite_lock = threading.Lock()
+
+    @staticmethod
+    def tree_of(folder):
+        return Tree(folder)
+
+    def is_compiled(self, mutant):
+        return (mutant.path, mutant.line) in self.compiled
+
+    def sources(self, program):
+        """What the finding depends on besides the module."""
+        return digest(repr(program), test_texts((*program.mutated, *program.fixed)))
+
+    def run(self, program, tree, seconds):
+        """Builds and runs the program with the tree's module; raises Killed where a test fails."""
+        objects = [tree.object(source, program.level) for source in program.mutated]
+        objects += [tree.object(MODULE, program.module_level), tree.object(TABLE, "-O0")]
+        objects += [self.tree.object(source, "-O1") for source in program.fixed]
+        target = tree.folder / "program"
+        status, text = command(["g++", "-fuse-ld=gold", *map(str, objects), *program.link,
+                                "-lgtest", "-lgtest_main", "-pthread", "-o", str(target)])
+        if status != 0:
+            raise Broken("does not link: " + first_error(text))
+        run_test([str(target), *program.run], seconds, cwd=tree.folder)
+
+    def steps(self, mutant, tree):
+        """Name, sources and action of each step, those that take long last."""
+        def step(program):
+            return (program.name, self.sources(program),
+                    lambda: self.run(program, tree, self.limit(program)))
+
+        def steps_of(parts):
+            return (step(part) for part in parts
+                    if mutant.path in self.needs[part] or mutant.path == MODULE)
+
+        yield from steps_of(SCALARS)
+        yield step(ARRAYS)
+        of_sets = "instruction_sets" in mutant.path
+        if "TalNumericArray" in mutant.path and not of_sets:
+            yield from steps_of([BLOCKS])
+            yield step(SMALL)
+        yield "same code", "", lambda: self._same_code(tree)
+        yield from steps_of(PARTS)
+        if "/compare.h" in mutant.path:
+            yield step(SIGNALS)
+        yield step(READING)
+        if of_sets:
+            yield step(BLOCKS_OF_SETS)
+        if mutant.change.text == "":
+            # An attribute, say, of which nothing but the built files tells.
+            yield "release build", checked_sources(), lambda: self._release(mutant, tree)
+
+    def _same_code(self, tree):
+        """No test of what is compiled can tell them apart."""
+        same = (tree.object(MODULE, "-O1").read_bytes()
+                == self.tree.object(MODULE, "-O1", tree.sets).read_bytes())
+        return (SURVIVES, "same machine code") if same else None
+
+    def _release(self, mutant, tree):
+        with self.suite_lock:
+            self.suite = self.suite or Suite()
+            self.suite.run_with(mutant.path, mutant.applied(tree.texts[mutant.path]))
+
+    def _dependencies(self, sources):
+        """The files of the module that the sources include, or are."""
+        found = set()
+        for source in sources:
+            path = ROOT / source if source.startswith("tests/") else Path(source)
+            words = ["g++", *FLAGS, *(f"-I{name}" for name in FOLDERS), f"-I{ROOT}/tests",
+                     "-MM", str(path)]
+            _, text = command(words, cwd=self.tree.folder)
+            found.update(name for name in text.replace("\\\n", " ").split()
+                         if name in self.tree.texts)
+        return found
+
+    def _lines_compiled(self):
+        """Pairs of a file and a line of it that the preprocessor leaves of the module here."""
+        compiled = set()
+        for source in (MODULE, TABLE):
+            words = ["g++", *FLAGS, *(f"-I{name}" for name in FOLDERS), "-E", source]
+            _, text = command(words, cwd=self.tree.folder)
+            compiled |= steps.lines_in(text)
+        return compiled
+
+
+# ---- The release build's own checks
+
+def checked_sources():
+    paths = sorted((ROOT / "tests" / "checks").iterdir())
+    return digest(CHECKED_TESTS, *(path.read_text(encoding="utf-8") for path in paths))
+
+
+class Suite:
+    """A copy of the project in which the module is built as a release, for one mutant at a time."""
+
+    def __init__(self):
+        self.folder = WORK / "suite"
+        files = subprocess.run(["git", "ls-files", "--cached", "--others", "--exclude-standard"],
+                               cwd=ROOT, check=True, text=True, stdout=subprocess.PIPE).stdout
+        for name in files.splitlines():
+            if not (ROOT / name).exists():
+                continue
+            target = self.folder / name
+            target.parent.mkdir(parents=True, exist_ok=True)
+            if not target.exists() or target.read_bytes() != (ROOT / name).read_bytes():
+                shutil.copy(ROOT / name, target)
+        status, text = command(["cmake", "--preset", "release"], cwd=self.folder)
+        if status != 0:
+            raise RuntimeError(text)
+        try:
+            self.run()
+        except Killed as failure:
+            raise RuntimeError(f"the release build fails without a mutant: {failure}") from None
+
+    def run_with(self, path, text):
+        target = self.folder / path
+        unharmed = target.read_text(encoding="utf-8")
+        target.write_text(text, encoding="utf-8")
+        try:
+            self.run()
+        finally:
+            target.write_text(unharmed, encoding="utf-8")
+
+    def run(self):
+        status, text = command(["cmake", "--build", "--preset", "release", "--target",
+                                *CHECKED_TARGETS, "--", "-j1"], cwd=self.folder)
+        if status != 0:
+            raise Killed("warning: " + first_error(text))
+        status, text = command(["ctest", "--preset", "release", "-j1", "--stop-on-failure",
+                                "--tests-regex", CHECKED_TESTS], cwd=self.folder)
+        if status != 0:
+            failed = re.search(r"^\s*\d+ - (\S+)", text, flags=re.MULTILINE)
+            raise Killed(failed.group(1) if failed else "ctest")
+
+
+# ---- The target
+
+GROUPS = {**{part.name: "parts" for part in (*SCALARS, *PARTS, SIGNALS)}, ARRAYS.name: "arrays",
+          SMALL.name: "arrays", READING.name: "reading", BLOCKS.name: "blocks",
+          "release build": "release"}
+
+
+class Module:
+    mark = "mutants"  # of the table in the document
+    columns = {"arrays": "whole arrays", "parts": "tests of parts", "reading": "`reading_test`",
+               "blocks": "`blocks_test`", "release": "release build", TIME_OUT: "time-out",
+               SURVIVES: "equivalent"}
+    bench = Bench
+
+    @staticmethod
+    def group(step):
+        return GROUPS[step]
+
+    @staticmethod
+    def mutants():
+        for path in sorted(path for pattern in FILES for path in ROOT.glob(pattern)):
+            name = str(path.relative_to(ROOT))
+            yield from chosen(mutants.mutants_of(name, path.read_text(encoding="utf-8")))

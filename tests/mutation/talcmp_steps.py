@@ -1,0 +1,259 @@
+"""talcmp as a target: its mutants, and the tests that are built and run with one after the other."""
+
+import hashlib
+import re
+import threading
+from collections import defaultdict
+from dataclasses import dataclass
+from pathlib import Path
+
+import module_steps
+import mutants
+import steps
+from statements import WholeSource
+from steps import (FLAGS, ROOT, SURVIVES, TIME_OUT, WORK, Broken, command, digest, first_error,
+                   precompile, run_test)
+
+TOOL = "tools/talcmp"
+FOLDERS = [*module_steps.FOLDERS, TOOL]
+INCLUDES = [*FOLDERS, *(f"{TOOL}/{name}" for name in ("arrays", "comparison", "text"))]
+MAIN = f"{TOOL}/main.cpp"
+TESTS = "tests/talcmp"
+RUN_TALCMP = f"{TESTS}/support/run_talcmp.cpp"
+MODULE = [module_steps.MODULE, module_steps.TABLE]
+# Of the module's support, what draws numbers.
+ORACLE = [f"tests/support/{name}.cpp" for name in ("oracle", "random_arrays")]
+STANDARD_HEADERS = ["algorithm", "array", "atomic", "charconv", "cmath", "complex", "filesystem",
+                    "functional", "future", "map", "memory", "mutex", "numeric", "optional",
+                    "string", "string_view", "thread", "vector"]
+
+# ---- The mutants to try
+
+CONDITIONS = ("true", "false")
+
+
+def is_condition(change):
+    return change.whole and (change.text in CONDITIONS or change.text.startswith("!("))
+
+
+def chance(mutant):
+    """From 0 to 1; the same in every run."""
+    return int(hashlib.sha256(mutant.name.encode()).hexdigest()[:8], 16) / 2**32
+
+
+def rank(mutant):
+    return not is_condition(mutant.change), not mutant.change.whole, chance(mutant)
+
+
+def share(change):
+    """How many are tried: all conditions, and of the many other lines some."""
+    return 1 if is_condition(change) else 1 / 4 if change.whole else 1 / 12
+
+
+def chosen(found):
+    """At most one mutant of each line."""
+    by_line = defaultdict(list)
+    for mutant in found:
+        by_line[mutant.line].append(mutant)
+    for _, line in sorted(by_line.items()):
+        best = min(line, key=rank)
+        if hashlib.sha256(best.name[::-1].encode()).digest()[0] < 256 * share(best.change):
+            yield best
+
+
+# ---- Copies of talcmp, and what is built from them
+
+class Tree(steps.Tree):
+    """talcmp with one file at a time another. Of what does not see that, the objects of the copy
+    without a mutant are taken."""
+
+    def __init__(self, folder, original=None):
+        super().__init__(folder, FOLDERS)
+        self.original = original or self
+        self.changed = None
+        self.lock = threading.RLock()
+        self.command = folder / "talcmp"
+
+    def put(self, path, text):
+        super().put(path, text)
+        self.changed = path
+
+    def restore(self, path):
+        super().restore(path)
+        self.changed = None
+
+    def sees(self, source):
+        """Whether it is, or includes, what is changed here."""
+        return self.changed is not None and self.changed in self.original.needs(source)
+
+    def object(self, source):
+        """The file that `source` is compiled to. Which talcmp to start differs between copies."""
+        if self is not self.original and source != RUN_TALCMP and not self.sees(source):
+            return self.original.object(source)
+        with self.lock:
+            if source not in self.objects:
+                self.objects[source] = self._compiled(source)
+            return self.objects[source]
+
+    def needs(self, source):
+        """The files of the copy and of the tests that `source` is compiled from."""
+        text = self.object(source).with_suffix(".d").read_text(encoding="utf-8")
+        names = text.replace("\\\n", " ").split()[1:]
+        return {name.removeprefix(f"{ROOT}/") for name in names if not name.startswith("/usr")}
+
+    def _compiled(self, source):
+        """What an earlier run compiled of the same texts is taken again."""
+        target = self.folder / f"{Path(source).stem}.o"
+        stamp = target.with_suffix(".stamp")
+        words = self._words(source)
+        if target.exists() and stamp.exists() and stamp.read_text() == self._stamp(target, words):
+            return target
+        stamp.unlink(missing_ok=True)
+        status, text = command([*words, "-MMD", "-o", str(target)], cwd=self.folder)
+        if status != 0:
+            raise Broken(first_error(text))
+        stamp.write_text(self._stamp(target, words))
+        return target
+
+    def _stamp(self, target, words):
+        names = target.with_suffix(".d").read_text(encoding="utf-8").replace("\\\n", " ").split()
+        texts = ((self.folder / name).read_text(encoding="utf-8") for name in names[1:]
+                 if not name.startswith(("/usr", str(WORK))) and (self.folder / name).exists())
+        return digest(*words, *texts)
+
+    def _words(self, source):
+        words = ["g++", *FLAGS, *(f"-I{name}" for name in INCLUDES)]
+        if source.startswith("tests/"):
+            words += ["-O1" if source in ORACLE else "-O0", "-include", str(WORK / "gtest.h"),
+                      f"-I{ROOT}/tests", f"-I{ROOT}/{TESTS}",
+                      f'-DTALCMP_COMMAND="{self.command}"',
+                      f"-DDEFAULT_RANDOM_CALLS={module_steps.RANDOM_CALLS}"]
+        elif source in MODULE:
+            words += ["-O1", f"-D{module_steps.ONE_SET}"]
+        else:
+            words += ["-O0", "-include", str(WORK / "talcmp.h"), '-DTALCMP_VERSION="0.0.0"']
+        return [*words, "-c", str(ROOT / source if source.startswith("tests/") else source)]
+
+
+# ---- The tests
+
+@dataclass(frozen=True)
+class Program:
+    """Tests in C++ that are linked together, or one in Python."""
+
+    name: str
+    sources: tuple
+    runs_talcmp: bool = True
+    run: tuple = ()
+
+
+def test_programs():
+    """Those of parts as one program; each that runs talcmp alone; in Python, all at once."""
+    paths = [str(path.relative_to(ROOT)) for path in sorted((ROOT / TESTS).glob("*_test.*"))]
+    sources = [path for path in paths if path.endswith(".cpp")]
+    whole = [path for path in sources if "run_talcmp.h" in (ROOT / path).read_text()]
+    parts = [path for path in sources if path not in whole]
+    fast = ("--gtest_filter=-Exhaustive*",)
+    yield Program("parts", (*parts, *ORACLE), False, fast)
+    for path in sorted(whole, key=lambda path: "answers" in path):
+        yield Program(Path(path).stem, (path, RUN_TALCMP), True, fast)
+    for path in paths:
+        if path.endswith(".py"):
+            yield Program(Path(path).stem, (path,))
+
+
+class Bench(steps.Bench):
+    """What all copies of talcmp share."""
+
+    def __init__(self, memory):
+        precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
+        precompile("talcmp.h", STANDARD_HEADERS, ["-O0"])
+        super().__init__(memory, Tree(WORK / "talcmp"))
+        self.sources_of_core = [path for path in self.tree.texts if path.startswith(TOOL)
+                                and path.endswith(".cpp") and path != MAIN]
+        self.programs = list(test_programs())
+        self.core = WORK / "talcmp" / "core.a"
+        self.core.unlink(missing_ok=True)
+        objects = [self.tree.object(path) for path in (*self.sources_of_core, *MODULE)]
+        command(["ar", "rcs", str(self.core), *map(str, objects)])
+        self.elsewhere = {path: self._lines_elsewhere(path) for path in self.sources_of_core
+                          if re.search(r"^#if", self.tree.texts[path], flags=re.MULTILINE)}
+
+    def tree_of(self, folder):
+        return Tree(folder, self.tree)
+
+    def is_compiled(self, mutant):
+        return mutant.line not in self.elsewhere.get(mutant.path, ())
+
+    def _lines_elsewhere(self, path):
+        """The lines that the preprocessor leaves out here."""
+        words = ["g++", *FLAGS, *(f"-I{name}" for name in INCLUDES), "-E", path]
+        _, text = command(words, cwd=self.tree.folder)
+        compiled = steps.lines_in(text)
+        count = self.tree.texts[path].count("\n")
+        return {line for line in range(1, count + 1) if (path, line) not in compiled}
+
+    def sources(self, program):
+        """What the finding depends on besides talcmp."""
+        names = set(program.sources)
+        for source in program.sources:
+            if source.endswith(".cpp"):
+                names |= self.tree.needs(source)
+        return digest(repr(program), *((ROOT / name).read_text(encoding="utf-8")
+                                       for name in sorted(names) if name.startswith("tests/")))
+
+    def run(self, program, tree, seconds):
+        """Builds and runs the program with the tree's talcmp; raises Killed where a test fails."""
+        if program.runs_talcmp:
+            self._link(tree, [tree.object(MAIN)], tree.command)
+        if program.sources[0].endswith(".py"):
+            words = ["/usr/bin/python3", "-B", str(ROOT / program.sources[0]), str(tree.command),
+                     "--", "--failfast"]
+        else:
+            target = tree.folder / program.name
+            self._link(tree, [tree.object(source) for source in program.sources], target,
+                       "-lgtest", "-lgtest_main")
+            words = [str(target), *program.run]
+        with steps.temporary_folder(tree.folder) as folder:
+            run_test(words, seconds, patience=6, cwd=folder, env={"TMPDIR": folder})
+
+    def _link(self, tree, objects, target, *libraries):
+        """Objects that see the mutant come before the archive, from which they are not taken then."""
+        changed = [tree.object(path) for path in self.sources_of_core if tree.sees(path)]
+        status, text = command(["g++", "-fuse-ld=gold", *map(str, (*objects, *changed, self.core)),
+                                *libraries, "-lzip", "-pthread", "-o", str(target)])
+        if status != 0:
+            raise Broken("does not link: " + first_error(text))
+
+    def steps(self, mutant, tree):
+        """Name, sources and action of each step; the parts first where the mutant is in one."""
+        of_part = mutant.path.startswith((f"{TOOL}/arrays", f"{TOOL}/comparison"))
+        for program in sorted(self.programs, key=lambda each: self._order(each, of_part)):
+            yield (program.name, self.sources(program),
+                   lambda program=program: self.run(program, tree, self.limit(program)))
+
+    @staticmethod
+    def _order(program, of_part):
+        return program.sources[0].endswith(".py"), program.runs_talcmp == of_part
+
+
+# ---- The target
+
+class Talcmp:
+    mark = "mutants of talcmp"  # of the table in the document
+    columns = {"parts": "tests of parts", "command": "tests of the command",
+               "python": "tests in Python", TIME_OUT: "time-out", SURVIVES: "equivalent"}
+    bench = Bench
+
+    @staticmethod
+    def group(step):
+        in_python = (ROOT / TESTS / f"{step}.py").exists()
+        return "parts" if step == "parts" else "python" if in_python else "command"
+
+    @staticmethod
+    def mutants():
+        for path in sorted((ROOT / TOOL).rglob("*.*")):
+            if path.suffix in (".cpp", ".h"):
+                name = str(path.relative_to(ROOT))
+                text = path.read_text(encoding="utf-8")
+                yield from chosen(mutants.mutants_of(name, text, WholeSource))
