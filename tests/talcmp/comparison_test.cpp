@@ -1,7 +1,9 @@
-// Comparisons of arrays that fail to be read, or are read in an order, such as no file is made to.
+// Comparisons of arrays in memory: what comes of them, by how many threads they ever are made, and
+// what no file is made to do.
 
 #include "comparison.h"
 
+#include "support/memory_array.h"
 #include "trouble.h"
 
 #include <gtest/gtest.h>
@@ -11,9 +13,11 @@
 #include <chrono>
 #include <cstdint>
 #include <memory>
+#include <ostream>
 #include <string>
 #include <thread>
 #include <utility>
+#include <vector>
 
 namespace {
 
@@ -78,12 +82,17 @@ class NoListener : public talcmp::ProgressListener {
     void advance(std::uint64_t /*bytes*/) override {}
 };
 
+talcmp::Question question_of(const unsigned threads) {
+    talcmp::Question question;
+    question.threads = threads;
+    return question;
+}
+
 class BrokenFiles : public testing::TestWithParam<unsigned> {
   protected:
     static talcmp::Comparison compare(const std::uint64_t broken, const std::uint64_t one,
                                       const bool report = false) {
-        talcmp::Question question;
-        question.threads = GetParam();
+        talcmp::Question question = question_of(GetParam());
         question.report = report;
         NoListener listener;
         return talcmp::compare({"broken.npy", std::make_unique<BrokenArray>(broken)},
@@ -120,6 +129,230 @@ TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceThatFails) {
     EXPECT_EQ(trouble_of([] { compare(1, length - 1); }), "broken.npy: cannot be read from 0 on");
 }
 
+TEST_P(BrokenFiles, AreTroubleAsTheSecondOperand) {
+    NoListener listener;
+    EXPECT_EQ(trouble_of([&] {
+                  talcmp::compare({"whole.npy", std::make_unique<ZerosAndOne>(length)},
+                                  {"broken.npy", std::make_unique<BrokenArray>(0)},
+                                  question_of(GetParam()), listener);
+              }),
+              "broken.npy: cannot be read from 0 on");
+}
+
 INSTANTIATE_TEST_SUITE_P(Threads, BrokenFiles, testing::Values(1U, 2U, 8U));
+
+// ---- Arrays that can be read
+
+using Bytes8 = std::vector<std::int8_t>;
+using talcmp::Difference;
+using talcmp::Shape;
+
+// Adds up what it is told.
+class Listener : public talcmp::ProgressListener {
+  public:
+    void begin(const std::uint64_t total_bytes) override {
+        begun_ += 1;
+        total_ += total_bytes;
+    }
+    void advance(const std::uint64_t bytes) override { done_ += bytes; }
+
+    int begun() const { return begun_; }
+    std::uint64_t total() const { return total_; }
+    std::uint64_t done() const { return done_; }
+
+  private:
+    int begun_ = 0;
+    std::uint64_t total_ = 0;
+    std::atomic<std::uint64_t> done_ = 0;
+};
+
+using Source = std::unique_ptr<talcmp::ArraySource>;
+
+template <typename T>
+Source array(Shape shape, std::vector<T> elements, const Order order = Order::c,
+             const Access access = Access::random) {
+    return std::make_unique<MemoryArray<T>>(std::move(shape), std::move(elements), order, access);
+}
+
+// What is told of a place of bytes.
+struct Told {
+    std::uint64_t order;
+    std::uint64_t position;
+    int first;
+    int second;
+
+    bool operator==(const Told& other) const {
+        return order == other.order && position == other.position && first == other.first
+               && second == other.second;
+    }
+};
+
+std::ostream& operator<<(std::ostream& out, const Told& told) {
+    return out << told.order << " at " << told.position << ": " << told.first << " and "
+               << told.second;
+}
+
+std::vector<Told> told(const std::vector<talcmp::Place>& places) {
+    std::vector<Told> all;
+    for (const talcmp::Place& place : places) {
+        all.push_back({place.order, place.position, static_cast<std::int8_t>(place.element1[0]),
+                       static_cast<std::int8_t>(place.element2[0])});
+    }
+    return all;
+}
+
+class Comparisons : public testing::TestWithParam<unsigned> {
+  protected:
+    talcmp::Question question_ = question_of(GetParam());
+    Listener listener_;
+
+    talcmp::Comparison compare(Source first, Source second) {
+        return talcmp::compare({"a", std::move(first)}, {"b", std::move(second)}, question_,
+                               listener_);
+    }
+};
+
+TEST_P(Comparisons, TellTheFirstPlacesOfMany) {
+    Bytes8 ones(length);
+    const std::vector<std::uint64_t> positions = {5, 9, 300000, 300001, 600000, 999990, 999999};
+    std::vector<Told> expected;
+    for (const std::uint64_t position : positions) {
+        ones[position] = 1;
+        expected.push_back({position, position, 0, 1});
+    }
+    while (!expected.empty()) {
+        SCOPED_TRACE(expected.size());
+        question_.differences = expected.size();
+        const auto result = compare(array<std::int8_t>({length}, Bytes8(length)),
+                                    array<std::int8_t>({length}, ones));
+        EXPECT_EQ(result.difference, Difference::elements);
+        EXPECT_EQ(told(result.places), expected);
+        expected.pop_back();
+    }
+}
+
+// In both orders on both sides, where boxes are cut off at the edges.
+TEST_P(Comparisons, TellPlacesInRowMajorOrderHoweverArraysAreStored) {
+    constexpr std::uint64_t side = 1500;
+    const Shape shape = {side, side};
+    const std::pair<std::uint64_t, std::uint64_t> indices[] = {
+        {2, 1499}, {3, 3}, {1447, 1448}, {1448, 2}, {1448, 1447}, {1499, 0}, {1499, 1499}};
+    question_.differences = 100;
+    for (const Order order1 : {Order::c, Order::fortran}) {
+        for (const Order order2 : {Order::c, Order::fortran}) {
+            Bytes8 first(side * side);
+            Bytes8 second(side * side);
+            std::vector<Told> expected;
+            for (const auto& [row, column] : indices) {
+                const std::uint64_t by_rows = row * side + column;
+                const std::uint64_t by_columns = column * side + row;
+                const auto value = static_cast<std::int8_t>(expected.size() + 1);
+                const std::uint64_t position = order1 == Order::c ? by_rows : by_columns;
+                first[position] = value;
+                second[order2 == Order::c ? by_rows : by_columns] =
+                    static_cast<std::int8_t>(-value);
+                expected.push_back({by_rows, position, value, -value});
+            }
+            const auto result = compare(array<std::int8_t>(shape, first, order1),
+                                        array<std::int8_t>(shape, second, order2));
+            EXPECT_EQ(told(result.places), expected);
+            EXPECT_EQ(listener_.done(), listener_.total());
+        }
+    }
+}
+
+TEST_P(Comparisons, CountAllPairsOfArraysOfTwoTypesInAStrictReport) {
+    question_.strict_type = true;
+    question_.report = true;
+    const auto result =
+        compare(array<std::int8_t>({3}, {1, 2, 3}), array<double>({3}, {1, 2, 3.5}));
+    EXPECT_EQ(result.difference, Difference::type);
+    EXPECT_EQ(told(result.places).size(), 1U);
+    ASSERT_TRUE(result.report.has_value());
+    EXPECT_EQ(result.report->pairs, 3U);
+    EXPECT_EQ(result.report->differing, 1U);
+}
+
+TEST_P(Comparisons, ReadNothingWhereTheTypesDifferAlready) {
+    question_.strict_type = true;
+    const auto result = compare(array<std::int8_t>({2}, {1, 2}), array<double>({2}, {1, 3}));
+    EXPECT_EQ(result.difference, Difference::type);
+    EXPECT_TRUE(result.places.empty());
+    EXPECT_FALSE(result.report.has_value());
+    EXPECT_EQ(listener_.begun(), 0);
+}
+
+TEST_P(Comparisons, KnowTheArrays) {
+    question_.selection = talcmp::read_selection("1:");
+    const auto result = compare(array<std::int8_t>({3, 2}, Bytes8(6), Order::fortran),
+                                array<double>({4, 2}, std::vector<double>(8)));
+    EXPECT_EQ(result.difference, Difference::shape);
+    EXPECT_EQ(result.array1.name, "a");
+    EXPECT_EQ(result.array1.type, element_type_id<std::int8_t>);
+    EXPECT_EQ(result.array1.shape, (Shape{3, 2}));
+    EXPECT_EQ(result.array1.selected_shape, (Shape{2, 2}));
+    EXPECT_TRUE(result.array1.fortran_order);
+    EXPECT_EQ(result.array2.name, "b");
+    EXPECT_EQ(result.array2.type, element_type_id<double>);
+    EXPECT_EQ(result.array2.shape, (Shape{4, 2}));
+    EXPECT_EQ(result.array2.selected_shape, (Shape{3, 2}));
+    EXPECT_FALSE(result.array2.fortran_order);
+    EXPECT_EQ(listener_.begun(), 0);
+}
+
+TEST_P(Comparisons, KnowWhetherThereIsAnyElement) {
+    EXPECT_TRUE(compare(array<std::int8_t>({1}, {1}), array<std::int8_t>({1}, {1})).has_elements);
+    EXPECT_FALSE(
+        compare(array<std::int8_t>({2, 0}, {}), array<std::int8_t>({2, 0}, {})).has_elements);
+}
+
+TEST_P(Comparisons, NeedTheSelectedPart) {
+    question_.selection = talcmp::read_selection("3");
+    try {
+        compare(array<std::int8_t>({4}, Bytes8(4)), array<std::int8_t>({3}, Bytes8(3)));
+        FAIL() << "no trouble";
+    } catch (const talcmp::Trouble& trouble) {
+        EXPECT_STREQ(trouble.what(), "b: has no index 3 in axis 0, whose length is 3");
+    }
+}
+
+// Also where elements come but once, and have to be copied to be read in another order.
+TEST_P(Comparisons, TellWhatTheyRead) {
+    constexpr std::uint64_t rows = 500;
+    constexpr std::uint64_t columns = 800;
+    constexpr std::uint64_t pairs = rows * columns;
+    const Shape shape = {rows, columns};
+    for (const Access access1 : {Access::random, Access::once}) {
+        for (const Access access2 : {Access::random, Access::once}) {
+            for (const Order order : {Order::c, Order::fortran}) {
+                Listener listener;
+                const auto result = talcmp::compare(
+                    {"a", array<std::int8_t>(shape, Bytes8(pairs), order, access1)},
+                    {"b", array<std::int32_t>(shape, std::vector<std::int32_t>(pairs), Order::c,
+                                              access2)},
+                    question_, listener);
+                EXPECT_EQ(result.difference, Difference::none);
+                const bool copied = order == Order::fortran;
+                EXPECT_EQ(listener.begun(), 1);
+                EXPECT_EQ(listener.total(),
+                          pairs * 5 + (copied && access1 == Access::once ? pairs : 0)
+                              + (copied && access2 == Access::once ? 4 * pairs : 0));
+                EXPECT_EQ(listener.done(), listener.total());
+            }
+        }
+    }
+}
+
+TEST_P(Comparisons, ReadNoFurtherThanToThePlacesThatAreTold) {
+    Bytes8 ones(length, 1);
+    compare(array<std::int8_t>({length}, Bytes8(length)), array<std::int8_t>({length}, ones));
+    EXPECT_EQ(listener_.total(), 2 * length);
+    if (GetParam() == 1) {
+        EXPECT_LT(listener_.done(), length);
+    }
+    EXPECT_GT(listener_.done(), 0U);
+}
+
+INSTANTIATE_TEST_SUITE_P(Threads, Comparisons, testing::Values(1U, 2U, 8U));
 
 } // namespace

@@ -1,0 +1,198 @@
+// The way through two arrays: every pair once, in order, and each element where it belongs.
+
+#include "traversal.h"
+
+#include "support/memory_array.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <complex>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <numeric>
+#include <ostream>
+#include <string>
+#include <type_traits>
+#include <utility>
+#include <vector>
+
+namespace {
+
+using talcmp::Shape;
+using talcmp::Side;
+
+// Where the element of an index is stored.
+std::uint64_t position_of(const Shape& shape, const Order order, const Shape& index) {
+    std::uint64_t position = 0;
+    for (std::size_t i = 0; i < shape.size(); ++i) {
+        const std::size_t axis = order == Order::c ? i : shape.size() - 1 - i;
+        position = position * shape[axis] + index[axis];
+    }
+    return position;
+}
+
+bool advance(Shape& index, const Shape& shape) {
+    for (std::size_t axis = shape.size(); axis-- > 0;) {
+        if (++index[axis] < shape[axis]) {
+            return true;
+        }
+        index[axis] = 0;
+    }
+    return false;
+}
+
+// The numbers of the places in row-major order, in the order in which `order` stores them.
+std::vector<std::uint64_t> numbers_of(const Shape& shape, const Order order) {
+    std::vector<std::uint64_t> numbers(
+        std::accumulate(shape.begin(), shape.end(), std::uint64_t{1}, std::multiplies<>()));
+    Shape index(shape.size());
+    std::uint64_t number = 0;
+    do {
+        numbers[position_of(shape, order, index)] = number++;
+    } while (advance(index, shape));
+    return numbers;
+}
+
+// The element that stands for a number; those of few bits stand for several.
+template <typename T>
+T element_of(const std::uint64_t number) {
+    if constexpr (std::is_integral_v<T>) {
+        return static_cast<T>(number);
+    } else {
+        return static_cast<T>(static_cast<double>(number));
+    }
+}
+
+template <typename T>
+MemoryArray<T> array_of(const Shape& shape, const std::vector<std::uint64_t>& numbers,
+                        const Order order) {
+    std::vector<T> elements(numbers.size());
+    std::transform(numbers.begin(), numbers.end(), elements.begin(), element_of<T>);
+    return {shape, std::move(elements), order};
+}
+
+struct Way {
+    const char* name;
+    Shape shape;
+    const char* slice;
+    Order first;
+    Order second;
+    std::uint64_t pairs;    // that are selected
+    bool is_linear = false; // whether both are read from the beginning to the end
+};
+
+void PrintTo(const Way& way, std::ostream* out) {
+    *out << way.name;
+}
+
+const Way ways[] = {
+    {"OneElement", {1, 1}, ":", Order::c, Order::fortran, 1, true},
+    {"NoAxis", {}, ":", Order::c, Order::c, 1, true},
+    {"Row", {70000}, ":", Order::c, Order::c, 70000, true},
+    {"RowInEitherOrder", {70000}, ":", Order::c, Order::fortran, 70000, true},
+    {"Stretch", {70000}, "7:69999", Order::c, Order::c, 69992, true},
+    {"COrder", {3, 5, 700}, ":", Order::c, Order::c, 10500, true},
+    {"FortranOrder", {3, 5, 700}, ":", Order::fortran, Order::fortran, 10500, true},
+    {"COrderAgainstFortran", {530, 370}, ":", Order::c, Order::fortran, 196100},
+    {"FortranOrderAgainstC", {370, 530}, ":", Order::fortran, Order::c, 196100},
+    {"FewLongColumns", {60000, 2}, ":", Order::c, Order::fortran, 120000},
+    {"FewLongRows", {2, 60000}, ":", Order::fortran, Order::c, 120000},
+    {"FourAxes", {7, 30, 11, 13}, ":", Order::c, Order::fortran, 30030},
+    {"AxesOfLengthOne", {1, 90, 1, 80, 1}, ":", Order::fortran, Order::c, 7200},
+    {"EverySecondRow", {60000, 2}, "::2", Order::c, Order::c, 60000},
+    {"EverySecondRowOfOtherOrders", {60000, 2}, "::2", Order::c, Order::fortran, 60000},
+    {"EverySecondRowOfColumns", {60000, 2}, "::2", Order::fortran, Order::fortran, 60000},
+    {"EveryFarRow", {60000, 2}, "5::999", Order::fortran, Order::c, 122},
+    {"OneColumn", {60000, 2}, ":,1", Order::c, Order::fortran, 60000},
+    {"Middle", {90, 100, 11}, "3:80,1:99,2:9", Order::c, Order::c, 77 * 98 * 7},
+    {"MiddleOfOtherOrders", {90, 100, 11}, "3:80,1:99,2:9", Order::c, Order::fortran, 77 * 98 * 7},
+    {"Steps", {90, 100, 11}, "3::3,1::7,::2", Order::fortran, Order::c, 29 * 15 * 6},
+};
+
+class Ways : public testing::TestWithParam<Way> {
+  protected:
+    const Way& way_ = GetParam();
+    talcmp::Selection selection_ =
+        way_.shape.empty() ? talcmp::Selection() : talcmp::read_selection(way_.slice);
+    bool column_major_ = way_.first == Order::fortran && way_.second == Order::fortran;
+    std::vector<std::uint64_t> numbers1_ = numbers_of(way_.shape, way_.first);
+    std::vector<std::uint64_t> numbers2_ = numbers_of(way_.shape, way_.second);
+
+    template <typename T>
+    void expect_every_pair_once() const {
+        SCOPED_TRACE(sizeof(T));
+        auto first = array_of<T>(way_.shape, numbers1_, way_.first);
+        auto second = array_of<T>(way_.shape, numbers2_, way_.second);
+        const talcmp::Traversal traversal(select(first, selection_), select(second, selection_),
+                                          column_major_, sizeof(T));
+        EXPECT_EQ(traversal.is_linear(), way_.is_linear);
+        EXPECT_EQ(traversal.pair_count(), way_.pairs);
+        EXPECT_EQ(walk(traversal, first, second), selected_numbers());
+    }
+
+    // How often each element was met, by its number.
+    template <typename T>
+    std::vector<int> walk(const talcmp::Traversal& traversal, MemoryArray<T>& first,
+                          MemoryArray<T>& second) const {
+        std::vector<int> met(numbers1_.size());
+        std::vector<T> elements1(traversal.largest_box());
+        std::vector<T> elements2(traversal.largest_box());
+        for (std::uint64_t i = 0; i < traversal.box_count(); ++i) {
+            const talcmp::Box box = traversal.box(i);
+            traversal.read(Side::first, first, box, elements1.data());
+            traversal.read(Side::second, second, box, elements2.data());
+            std::uint64_t last = 0;
+            for (std::size_t local = 0; local < box.count; ++local) {
+                const std::uint64_t position = traversal.first_position(box, local);
+                const std::uint64_t number = numbers1_.at(position);
+                const std::uint64_t order = column_major_ ? position : number;
+                const T element = element_of<T>(number);
+                if (elements1[local] != element || elements2[local] != element
+                    || (local != 0 && order <= last)) {
+                    ADD_FAILURE() << "box " << i << ", pair " << local << ", number " << number
+                                  << ": " << elements1[local] << " and " << elements2[local];
+                    return met;
+                }
+                ++met[number];
+                last = order;
+            }
+        }
+        return met;
+    }
+
+    // As `walk` returns them: 1 for each element that is selected.
+    std::vector<int> selected_numbers() const {
+        const Shape& shape = way_.shape;
+        std::vector<int> numbers;
+        Shape index(shape.size());
+        do {
+            bool inside = true;
+            for (std::size_t axis = 0; axis < selection_.size(); ++axis) {
+                const talcmp::AxisRange& range = selection_[axis];
+                const auto at = static_cast<std::int64_t>(index[axis]);
+                const std::int64_t start = range.start.value_or(0);
+                inside = inside && at >= start
+                         && (range.one_index ? at == start
+                                             : (at - start) % range.step == 0
+                                                   && (!range.stop || at < *range.stop));
+            }
+            numbers.push_back(inside ? 1 : 0);
+        } while (advance(index, shape));
+        return numbers;
+    }
+};
+
+TEST_P(Ways, LeadToEveryPairOnce) {
+    expect_every_pair_once<std::int8_t>();
+    expect_every_pair_once<std::uint16_t>();
+    expect_every_pair_once<std::int32_t>();
+    expect_every_pair_once<std::uint64_t>();
+    expect_every_pair_once<std::complex<double>>();
+}
+
+INSTANTIATE_TEST_SUITE_P(Traversal, Ways, testing::ValuesIn(ways),
+                         [](const auto& way) { return std::string(way.param.name); });
+
+} // namespace
