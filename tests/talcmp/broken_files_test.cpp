@@ -185,7 +185,7 @@ const BrokenFile dictionaries[] = {
     {"NulInKey", file(std::string("{'sha\0pe': 1}", 13)),
      "has a header with the unknown key 'sha?pe'"},
     {"NonAsciiKey", file("{'sh\xC3\xA4pe': 1}"), "has a header with the unknown key 'sh??pe'"},
-    {"NonAsciiDescr", with_descr("'<\xC3\xA4'"), unsupported_type("'<??'")},
+    {"NonAsciiDescr", with_descr("'<\xC3\xA4'"), unsupported_type("'<?\?'")},
     {"EscapeInKey", file("{'\x1B[31m\n': 1}"), "has a header with the unknown key '?[31m?'"},
 };
 

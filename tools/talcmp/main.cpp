@@ -10,6 +10,7 @@
 #include <cstdio>
 #include <exception>
 #include <memory>
+#include <new>
 
 namespace {
 
@@ -39,6 +40,8 @@ int run(const int argc, const char* const* argv) {
         return exit_status(summary);
     } catch (const talcmp::UsageError& error) {
         std::fprintf(stderr, "talcmp: %s; see 'talcmp --help'\n", error.what());
+    } catch (const std::bad_alloc&) {
+        std::fputs("talcmp: there is not enough memory\n", stderr);
     } catch (const std::exception& error) {
         std::fprintf(stderr, "talcmp: %s\n", talcmp::shown(error.what()).c_str());
     }

@@ -1,7 +1,8 @@
 #include "temporary_copy.h"
 
+#include "blocked_signals.h"
+
 #include <algorithm>
-#include <csignal>
 #include <cstdlib>
 #include <vector>
 
@@ -10,25 +11,9 @@
 namespace talcmp {
 namespace {
 
-// So that no signal ends the process between two steps.
-class NoSignals {
-  public:
-    NoSignals() {
-        sigset_t all;
-        ::sigfillset(&all);
-        ::pthread_sigmask(SIG_SETMASK, &all, &before_);
-    }
-    NoSignals(const NoSignals&) = delete;
-    NoSignals& operator=(const NoSignals&) = delete;
-    ~NoSignals() { ::pthread_sigmask(SIG_SETMASK, &before_, nullptr); }
-
-  private:
-    sigset_t before_ = {};
-};
-
 int open_without_name(const std::string& folder) {
     std::string path = folder + "/talcmp-XXXXXX";
-    const NoSignals none;
+    const BlockedSignals blocked; // or the file might be left behind
     const int file = ::mkostemp(path.data(), O_CLOEXEC);
     if (file >= 0) {
         ::unlink(path.c_str());

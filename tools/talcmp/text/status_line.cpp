@@ -1,5 +1,7 @@
 #include "status_line.h"
 
+#include "blocked_signals.h"
+
 #include <atomic>
 #include <csignal>
 #include <cstddef>
@@ -11,36 +13,11 @@
 namespace talcmp {
 namespace {
 
-constexpr int ending_signals[] = {SIGHUP, SIGINT, SIGTERM};
 constexpr std::string_view nothing = "\r\x1B[K";
 
 std::atomic<bool> is_shown = false;
 std::atomic<bool> is_written = false; // at the moment
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler uses them");
-
-sigset_t set_of_ending_signals() {
-    sigset_t set;
-    ::sigemptyset(&set);
-    for (const int signal : ending_signals) {
-        ::sigaddset(&set, signal);
-    }
-    return set;
-}
-
-// Keeps them from this thread: their handler would wait for what it has interrupted.
-class BlockedSignals {
-  public:
-    BlockedSignals() {
-        const sigset_t set = set_of_ending_signals();
-        ::pthread_sigmask(SIG_BLOCK, &set, &before_);
-    }
-    BlockedSignals(const BlockedSignals&) = delete;
-    BlockedSignals& operator=(const BlockedSignals&) = delete;
-    ~BlockedSignals() { ::pthread_sigmask(SIG_SETMASK, &before_, nullptr); }
-
-  private:
-    sigset_t before_ = {};
-};
 
 // In one piece, so that nothing else comes between. If the terminal takes nothing, nobody sees it.
 void write_to_terminal(const std::string_view text) {
@@ -66,11 +43,12 @@ void end_by_signal(const int signal) {
     if (stop_writing() && is_shown) {
         write_to_terminal(nothing);
     }
-    ::raise(
-        signal); // ends the process when the handler returns, as its action is the default again
+    // Ends the process when the handler returns, as its action is the default again.
+    ::raise(signal);
 }
 
 void write_status(const std::string& text, const bool shown) {
+    // Their handler would wait for what it has interrupted.
     const BlockedSignals blocked;
     if (!is_written.exchange(true)) {
         is_shown = shown;
@@ -92,13 +70,13 @@ void clear_status() {
 }
 
 void clear_status_at_signals() {
-    for (const int signal : ending_signals) {
+    for (const int signal : {SIGHUP, SIGINT, SIGTERM}) {
         struct sigaction action = {};
         if (::sigaction(signal, nullptr, &action) != 0 || action.sa_handler != SIG_DFL) {
             continue;
         }
         action.sa_handler = end_by_signal;
-        action.sa_mask = set_of_ending_signals();
+        action.sa_mask = BlockedSignals::ending_signals();
         action.sa_flags = static_cast<int>(SA_RESETHAND);
         ::sigaction(signal, &action, nullptr);
     }
