@@ -102,6 +102,8 @@ const Answer values[] = {
      "[0]: 1+1j and 1.5+2j (imaginary parts: no digit in common)"},
     {"RealPartsBeforeImaginaryOnes", c64({{1, 1}}), c64({{2, -1}}),
      "[0]: 1+1j and 2-1j (real parts: no digit in common)"},
+    {"NoDigitInCommonOfHugeRealParts", c128({{1e300, 1}}), c128({{4e300, 1.5}}),
+     "[0]: 1e+300+1j and 4e+300+1.5j (real parts: no digit in common)"},
     {"NumberAndNaN", f64({-1}), nan1, "[0]: -1 and nan(0x7ff8000000000123) (a NaN)"},
     {"ZeroAndNaN", f64({0}), nan1, "[0]: 0 and nan(0x7ff8000000000123) (a NaN)"},
     {"IntegerAndNaN", i32({1}), nan1, "[0]: 1 and nan(0x7ff8000000000123) (a NaN)"},

@@ -45,6 +45,7 @@ const BadUsage operands[] = {
     {"None", {}, too_few},
     {"One", {"a"}, too_few},
     {"EmptyOnes", {"", ""}, too_few},
+    {"EmptyFirst", {"", "b"}, too_few},
     {"EmptySecond", {"a", ""}, too_few},
     {"Three", {"a", "b", "c"}, too_many},
     {"ThirdBehindAPattern", {"a", "b", "--exclude", "x", "c"}, too_many},

@@ -131,34 +131,35 @@ class Reports(Folder):
             (status, plain.replace("\n", "\r\n")))
 
     def pairs(self):
-        special = [np.nan, -0.0, np.inf, -0.0, 1, 1, 1, 1]
-        other = [1, 1 + 2**-51, 0.0, 1 + 2**-51, np.inf, 1 + 2**-51, -0.0, 1]  # column by column
-        return (self.save("a.npy", np.array([special]).reshape(2, 4)),
-                self.save("b.npy", np.array([other]).reshape(2, 4, order="F")))
+        special = [[np.nan, -0.0, np.inf, -0.0, np.inf], [np.inf, 1, 1, 1, 1]]
+        near = 1 + 2**-51
+        other = [[1, 0.0, np.inf, -0.0, np.inf], [1e308, near, near, near, 1]]
+        return (self.save("a.npy", np.array(special)),
+                self.save("b.npy", np.array(other, order="F")))
 
     REPORT = """\
 a.npy b.npy {red}differ{end}: [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
-a.npy b.npy {red}differ{end}: [1, 0]: 1 and 1.0000000000000004 (the same from --tol 2 on)
-  first array           float64 (2, 4)
-  second array          float64 (2, 4), Fortran order
+a.npy b.npy {red}differ{end}: [1, 0]: inf and 1e+308 (no digit in common)
+  first array           float64 (2, 5)
+  second array          float64 (2, 5), Fortran order
   tolerance             1.5 binary digits
-  pairs                 8
-  differing             4 (50 %)
+  pairs                 10
+  differing             5 (50 %)
   first place           [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
   worst place           [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
   largest difference    53 binary digits
   smallest tolerance    none below all 53 digits; [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
   NaNs                  1 and 0
-  infinities            1 and 1
+  infinities            3 and 2
   negative zeros        2 and 1
   digits that differ, number of pairs
 """
 
     def test_of_special_values(self):
-        bars = {80: (61, 20, 61, 20), 40: (21, 7, 21, 7), 20: (1, 1, 1, 1), 5: (1, 1, 1, 1)}
+        bars = {80: (61, 15, 45, 30), 40: (21, 5, 15, 10), 20: (1, 1, 1, 1), 5: (1, 1, 1, 1)}
         for columns, lengths in bars.items():
             expected = self.REPORT
-            for digits, count, length in zip((0, 1, 2, 53), (3, 1, 3, 1), lengths):
+            for digits, count, length in zip((0, 1, 2, 53), (4, 1, 3, 2), lengths):
                 expected += f"  {digits:13} {count} {{blue}}{'#' * length}{{end}}\n"
             with self.subTest(columns=columns):
                 self.check(expected, "--report", "-n2", "--tol=1.5", *self.pairs(),
@@ -249,8 +250,8 @@ a.npy b.npy {red}differ{end}: [1]: 1 and 1.0000001 (the same from --tol 1 on)
 
     def test_nothing_but_colours_differs_elsewhere(self):
         expected = self.REPORT + "".join(
-            f"  {digits:13} {count} {'#' * (20 * count + (1 if count == 3 else 0))}\n"
-            for digits, count in ((0, 3), (1, 1), (2, 3), (53, 1)))
+            f"  {digits:13} {count} {'#' * length}\n"
+            for digits, count, length in ((0, 4, 61), (1, 1, 15), (2, 3, 45), (53, 2, 30)))
         a, b = self.pairs()
         done = subprocess.run(COMMAND + ["--report", "-n2", "--tol=1.5", "a.npy", "b.npy"],
                               cwd=self.folder, capture_output=True, check=False,
