@@ -7,6 +7,7 @@
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
 #include "support/temporary_folder.h"
+#include "support/zip_bytes.h"
 
 #include <gtest/gtest.h>
 
@@ -57,6 +58,11 @@ std::string shape_of_ones(const int rank) {
 // A file whose header says that its dictionary has `length` bytes.
 std::string with_length(const int major, const std::string& length) {
     return npy::magic + npy::version(major, 0) + length + good_dictionary + two_reals;
+}
+
+// Of spaces.
+std::string with_dictionary_of(const std::size_t length) {
+    return npy::header(std::string(length, ' '), 2);
 }
 
 std::string quoted(const char byte_order, const std::string& code) {
@@ -149,6 +155,9 @@ const BrokenFile beginnings[] = {
      short_header("65535 bytes of dictionary expected, 73 there")},
     {"LengthOf4GiB", with_length(2, "\xFF\xFF\xFF\xFF"),
      short_header("4294967295 bytes of dictionary expected, 73 there")},
+    {"LengthOf2To20And1", with_dictionary_of((std::size_t{1} << 20U) + 1),
+     "has a header of 1048577 bytes; 2^20 are supported"},
+    {"LengthOf2To20", with_dictionary_of(std::size_t{1} << 20U), expected("a dictionary", 1048576)},
     {"LengthOneTooLong",
      npy::magic + npy::version(1, 0) + npy::little_endian(good_dictionary.size() + 1, 2)
          + good_dictionary,
@@ -285,6 +294,22 @@ INSTANTIATE_TEST_SUITE_P(Dictionary, BrokenFiles, testing::ValuesIn(dictionaries
 INSTANTIATE_TEST_SUITE_P(Shape, BrokenFiles, testing::ValuesIn(shapes), name_of<BrokenFile>);
 INSTANTIATE_TEST_SUITE_P(Elements, BrokenFiles, testing::ValuesIn(unsupported),
                          name_of<BrokenFile>);
+
+// ---- Archives
+
+TEST(Archives, WithTwoMembersOfOneNameAreRefused) {
+    const TemporaryFolder folder;
+    const std::string broken =
+        folder.write("broken.npz", zip::of_empty_members({"a.npy", "b.npy", "a.npy"}));
+    expect_refused(folder, broken, "has two members of the name 'a'");
+}
+
+// NumPy calls both arrays so.
+TEST(Archives, WithAMemberThatIsCalledLikeAnotherWithoutItsSuffixAreRefused) {
+    const TemporaryFolder folder;
+    const std::string broken = folder.write("broken.npz", zip::of_empty_members({"a", "a.npy"}));
+    expect_refused(folder, broken, "has two members of the name 'a'");
+}
 
 // ---- What is no file that can be read
 

@@ -1,0 +1,213 @@
+// What --slice selects of an array, and where that lies.
+
+#include "selection.h"
+
+#include "support/memory_array.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <optional>
+#include <ostream>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace {
+
+using talcmp::Shape;
+
+template <typename Case>
+std::string name_of(const testing::TestParamInfo<Case>& info) {
+    return info.param.name;
+}
+
+template <typename Action>
+std::string complaint_of(const Action& action) {
+    try {
+        action();
+    } catch (const std::invalid_argument& error) {
+        return error.what();
+    }
+    return "none";
+}
+
+// ---- From text
+
+struct Range {
+    const char* name;
+    std::string text;
+    std::string meaning; // of each axis "start:stop:step", or "[index]"
+};
+
+void PrintTo(const Range& range, std::ostream* out) {
+    *out << range.name;
+}
+
+const Range ranges[] = {
+    {"Whole", ":", " ::1"},
+    {"TwoColons", "::", " ::1"},
+    {"Start", "5:", " 5::1"},
+    {"Stop", ":7", " :7:1"},
+    {"Step", "::3", " ::3"},
+    {"All", "1:20:4", " 1:20:4"},
+    {"Index", "3", " [3]"},
+    {"FromTheEnd", "-4:-2", " -4:-2:1"},
+    {"LastIndex", "-1", " [-1]"},
+    {"SeveralAxes", "0:10,:,3", " 0:10:1 ::1 [3]"},
+    {"Spaces", "  1 : 2  ,   7 ", " 1:2:1 [7]"},
+    {"Limits", "-9223372036854775808:9223372036854775807:9223372036854775807",
+     " -9223372036854775808:9223372036854775807:9223372036854775807"},
+};
+
+std::string text_of(const std::optional<std::int64_t>& number) {
+    return number ? std::to_string(*number) : "";
+}
+
+std::string meaning_of(const talcmp::Selection& selection) {
+    std::string text;
+    for (const talcmp::AxisRange& range : selection) {
+        text += range.one_index ? " [" + text_of(range.start) + "]"
+                                : " " + text_of(range.start) + ":" + text_of(range.stop) + ":"
+                                      + std::to_string(range.step);
+    }
+    return text;
+}
+
+class Ranges : public testing::TestWithParam<Range> {};
+
+TEST_P(Ranges, AreRead) {
+    EXPECT_EQ(meaning_of(talcmp::read_selection(GetParam().text)), GetParam().meaning);
+}
+
+INSTANTIATE_TEST_SUITE_P(Selection, Ranges, testing::ValuesIn(ranges), name_of<Range>);
+
+const Range bad_ranges[] = {
+    {"Nothing", "", "an axis has neither an index nor a colon"},
+    {"Space", " ", "an axis has neither an index nor a colon"},
+    {"NothingBetween", "1,,2", "an axis has neither an index nor a colon"},
+    {"NothingBehind", "1,", "an axis has neither an index nor a colon"},
+    {"Text", "x", "'x' is no index"},
+    {"TextBehindANumber", "1:2x", "'2x' is no index"},
+    {"SpaceInANumber", "1 2:", "'1 2' is no index"},
+    {"Fraction", " 1.5 ", "'1.5' is no index"},
+    {"TooLarge", "9223372036854775808", "'9223372036854775808' is no index"},
+    {"ThreeColons", "1:2:3:4", "'1:2:3:4' has more than two colons"},
+    {"StepZero", "::0", "the step 0 is not positive"},
+    {"Backwards", "::-1", "the step -1 is not positive"},
+};
+
+class BadRanges : public testing::TestWithParam<Range> {};
+
+TEST_P(BadRanges, AreRefused) {
+    EXPECT_EQ(complaint_of([] { talcmp::read_selection(GetParam().text); }), GetParam().meaning);
+}
+
+INSTANTIATE_TEST_SUITE_P(Selection, BadRanges, testing::ValuesIn(bad_ranges), name_of<Range>);
+
+// ---- Of an array
+
+MemoryArray<std::int8_t> array_of(const Shape& shape, const Order order) {
+    return {shape, {}, order};
+}
+
+struct Part {
+    const char* name;
+    Shape shape;
+    Order order;
+    std::string text;
+    std::uint64_t offset;
+    Shape selected;
+    std::vector<std::uint64_t> strides; // 0 where there is no second index
+};
+
+void PrintTo(const Part& part, std::ostream* out) {
+    *out << part.name;
+}
+
+const Part parts[] = {
+    {"Whole", {4, 5, 6}, Order::c, ":", 0, {4, 5, 6}, {30, 6, 1}},
+    {"WholeOfColumns", {4, 5, 6}, Order::fortran, ":", 0, {4, 5, 6}, {1, 4, 20}},
+    {"Middle", {4, 5, 6}, Order::c, "1:3,2:,:4", 42, {2, 3, 4}, {30, 6, 1}},
+    {"MiddleOfColumns", {4, 5, 6}, Order::fortran, "1:3,2:,:4", 9, {2, 3, 4}, {1, 4, 20}},
+    {"Index", {4, 5, 6}, Order::c, "2,:,5", 65, {5}, {6}},
+    {"IndexFromTheEnd", {4, 5, 6}, Order::c, "-4,-1", 24, {6}, {1}},
+    {"Steps", {4, 5, 6}, Order::c, "::2,1::3,5::7", 11, {2, 2, 1}, {60, 18, 0}},
+    {"StepOntoTheEnd", {7}, Order::c, "::3", 0, {3}, {3}},
+    {"StepBeforeTheEnd", {6}, Order::c, "::3", 0, {2}, {3}},
+    {"FromTheEnd", {9}, Order::c, "-4:-1", 5, {3}, {1}},
+    {"CutOff", {9}, Order::c, "-100:100", 0, {9}, {1}},
+    {"BehindTheEnd", {9}, Order::c, "100:", 9, {0}, {0}},
+    {"Backwards", {9}, Order::c, "5:5", 5, {0}, {0}},
+    {"FarthestStart", {9}, Order::c, "-9223372036854775808:", 0, {9}, {1}},
+    {"OneElement", {9}, Order::c, "8:", 8, {1}, {0}},
+    {"Longest",
+     {1, 18446744073709551615U},
+     Order::c,
+     ":,1:",
+     1,
+     {1, 18446744073709551614U},
+     {0, 1}},
+};
+
+class Parts : public testing::TestWithParam<Part> {};
+
+TEST_P(Parts, LieWhereTheyAreSelected) {
+    const Part& part = GetParam();
+    const talcmp::View view =
+        select(array_of(part.shape, part.order), talcmp::read_selection(part.text));
+    EXPECT_EQ(view.offset, part.offset);
+    EXPECT_EQ(view.shape, part.selected);
+    EXPECT_EQ(view.strides, part.strides);
+}
+
+INSTANTIATE_TEST_SUITE_P(Selection, Parts, testing::ValuesIn(parts), name_of<Part>);
+
+TEST(NoPart, IsSelectedWhereThereIsNone) {
+    const auto complaint = [](const Shape& shape, const std::string& text) {
+        return complaint_of(
+            [&] { select(array_of(shape, Order::c), talcmp::read_selection(text)); });
+    };
+    EXPECT_EQ(complaint({2, 4}, "1,3"), "none");
+    EXPECT_EQ(complaint({2, 4}, ":,4"), "has no index 4 in axis 1, whose length is 4");
+    EXPECT_EQ(complaint({2, 4}, "-2,-4"), "none");
+    EXPECT_EQ(complaint({2, 4}, "-3"), "has no index -3 in axis 0, whose length is 2");
+    EXPECT_EQ(complaint({0}, "0"), "has no index 0 in axis 0, whose length is 0");
+    EXPECT_EQ(complaint({2, 4}, "0,0,0"), "has fewer dimensions (2) than --slice (3)");
+    EXPECT_EQ(complaint({}, ":"), "has fewer dimensions (0) than --slice (1)");
+}
+
+// ---- Positions
+
+// All indices in row-major order.
+std::vector<Shape> indices_of(const Shape& shape) {
+    std::vector<Shape> indices = {{}};
+    for (const std::uint64_t extent : shape) {
+        std::vector<Shape> longer;
+        for (const Shape& index : indices) {
+            for (std::uint64_t i = 0; i < extent; ++i) {
+                longer.push_back(index);
+                longer.back().push_back(i);
+            }
+        }
+        indices = longer;
+    }
+    return indices;
+}
+
+TEST(Positions, AreThoseOfIndices) {
+    const Shape shape = {3, 1, 4, 2};
+    const auto indices = indices_of(shape);
+    const talcmp::RowMajorOrder by_rows(array_of(shape, Order::c));
+    const talcmp::RowMajorOrder by_columns(array_of(shape, Order::fortran));
+    for (std::uint64_t number = 0; number < indices.size(); ++number) {
+        const Shape& index = indices[number];
+        const std::uint64_t in_columns = index[0] + 3 * (index[2] + 4 * index[3]);
+        EXPECT_EQ(talcmp::index_of(shape, false, number), index);
+        EXPECT_EQ(talcmp::index_of(shape, true, in_columns), index);
+        EXPECT_EQ(by_rows.of(number), number);
+        EXPECT_EQ(by_columns.of(in_columns), number);
+    }
+}
+
+} // namespace
