@@ -11,8 +11,10 @@
 #include <algorithm>
 #include <atomic>
 #include <chrono>
+#include <condition_variable>
 #include <cstdint>
 #include <memory>
+#include <mutex>
 #include <ostream>
 #include <string>
 #include <thread>
@@ -40,7 +42,8 @@ class Bytes : public talcmp::ArraySource {
 // others have failed, if anybody asks for those meanwhile.
 class BrokenArray : public Bytes {
   public:
-    explicit BrokenArray(const std::uint64_t broken) : broken_(broken) {}
+    BrokenArray(const std::uint64_t broken, std::atomic<int>& failures)
+        : broken_(broken), failures_(failures) {}
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         for (int patience = 200; first == 0 && failures_ == 0 && patience > 0; --patience) {
@@ -56,7 +59,25 @@ class BrokenArray : public Bytes {
 
   private:
     std::uint64_t broken_;
-    std::atomic<int> failures_ = 0;
+    std::atomic<int>& failures_;
+};
+
+// Comes but once, by columns, and cannot be read.
+class BrokenPipe : public talcmp::ArraySource {
+  public:
+    explicit BrokenPipe(std::string name) : name_(std::move(name)) {}
+
+    type_t element_type() const override { return 1; }
+    const talcmp::Shape& shape() const override { return shape_; }
+    bool fortran_order() const override { return true; }
+    bool random_access() const override { return false; }
+    void read(std::uint64_t /*first*/, std::uint64_t /*count*/, void* /*elements*/) override {
+        throw talcmp::Trouble(name_, "cannot be read");
+    }
+
+  private:
+    talcmp::Shape shape_ = {3, 4};
+    std::string name_;
 };
 
 // A one at the position `one`, zeros elsewhere.
@@ -94,8 +115,9 @@ class BrokenFiles : public testing::TestWithParam<unsigned> {
                                       const bool report = false) {
         talcmp::Question question = question_of(GetParam());
         question.report = report;
+        std::atomic<int> failures = 0;
         NoListener listener;
-        return talcmp::compare({"broken.npy", std::make_unique<BrokenArray>(broken)},
+        return talcmp::compare({"broken.npy", std::make_unique<BrokenArray>(broken, failures)},
                                {"other.npy", std::make_unique<ZerosAndOne>(one)}, question,
                                listener);
     }
@@ -129,11 +151,36 @@ TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceThatFails) {
     EXPECT_EQ(trouble_of([] { compare(1, length - 1); }), "broken.npy: cannot be read from 0 on");
 }
 
+TEST(BrokenFile, IsReadNoFurtherThanToWhereItFails) {
+    std::atomic<int> failures = 0;
+    NoListener listener;
+    EXPECT_THROW(talcmp::compare({"broken.npy", std::make_unique<BrokenArray>(0, failures)},
+                                 {"other.npy", std::make_unique<ZerosAndOne>(length)},
+                                 question_of(1), listener),
+                 talcmp::Trouble);
+    EXPECT_EQ(failures, 1);
+}
+
+// However they are read, also where they have to be copied first.
+TEST_P(BrokenFiles, AreTroubleOfTheFirstOfTwo) {
+    for (const char* const slice : {":", ":,::2"}) {
+        talcmp::Question question = question_of(GetParam());
+        question.selection = talcmp::read_selection(slice);
+        NoListener listener;
+        EXPECT_EQ(trouble_of([&] {
+                      talcmp::compare({"a", std::make_unique<BrokenPipe>("a")},
+                                      {"b", std::make_unique<BrokenPipe>("b")}, question, listener);
+                  }),
+                  "a: cannot be read");
+    }
+}
+
 TEST_P(BrokenFiles, AreTroubleAsTheSecondOperand) {
+    std::atomic<int> failures = 0;
     NoListener listener;
     EXPECT_EQ(trouble_of([&] {
                   talcmp::compare({"whole.npy", std::make_unique<ZerosAndOne>(length)},
-                                  {"broken.npy", std::make_unique<BrokenArray>(0)},
+                                  {"broken.npy", std::make_unique<BrokenArray>(0, failures)},
                                   question_of(GetParam()), listener);
               }),
               "broken.npy: cannot be read from 0 on");
@@ -231,32 +278,54 @@ TEST_P(Comparisons, TellTheFirstPlacesOfMany) {
     }
 }
 
-// In both orders on both sides, where boxes are cut off at the edges.
+using Indices = std::vector<std::pair<std::uint64_t, std::uint64_t>>;
+
+// Arrays of `rows` rows that differ at the indices, which are in row-major order.
+void expect_first_places(talcmp::Question question, const std::uint64_t rows,
+                         const std::uint64_t columns, const Indices& indices, const Order order1,
+                         const Order order2) {
+    Bytes8 first(rows * columns);
+    Bytes8 second(rows * columns);
+    std::vector<Told> expected;
+    for (const auto& [row, column] : indices) {
+        const std::uint64_t by_rows = row * columns + column;
+        const std::uint64_t by_columns = column * rows + row;
+        const std::uint64_t position = order1 == Order::c ? by_rows : by_columns;
+        const auto value = static_cast<std::int8_t>(expected.size() + 1);
+        first[position] = value;
+        second[order2 == Order::c ? by_rows : by_columns] = static_cast<std::int8_t>(-value);
+        expected.push_back({by_rows, position, value, -value});
+    }
+    Listener listener;
+    const auto result = talcmp::compare({"a", array<std::int8_t>({rows, columns}, first, order1)},
+                                        {"b", array<std::int8_t>({rows, columns}, second, order2)},
+                                        question, listener);
+    expected.resize(std::min(expected.size(), question.differences));
+    EXPECT_EQ(told(result.places), expected);
+}
+
+constexpr Order orders[] = {Order::c, Order::fortran};
+
+// Where boxes are cut off at the edges.
 TEST_P(Comparisons, TellPlacesInRowMajorOrderHoweverArraysAreStored) {
-    constexpr std::uint64_t side = 1500;
-    const Shape shape = {side, side};
-    const std::pair<std::uint64_t, std::uint64_t> indices[] = {
-        {2, 1499}, {3, 3}, {1447, 1448}, {1448, 2}, {1448, 1447}, {1499, 0}, {1499, 1499}};
+    const Indices indices = {{2, 1499},    {3, 3},    {1447, 1448}, {1448, 2},
+                             {1448, 1447}, {1499, 0}, {1499, 1499}};
     question_.differences = 100;
-    for (const Order order1 : {Order::c, Order::fortran}) {
-        for (const Order order2 : {Order::c, Order::fortran}) {
-            Bytes8 first(side * side);
-            Bytes8 second(side * side);
-            std::vector<Told> expected;
-            for (const auto& [row, column] : indices) {
-                const std::uint64_t by_rows = row * side + column;
-                const std::uint64_t by_columns = column * side + row;
-                const auto value = static_cast<std::int8_t>(expected.size() + 1);
-                const std::uint64_t position = order1 == Order::c ? by_rows : by_columns;
-                first[position] = value;
-                second[order2 == Order::c ? by_rows : by_columns] =
-                    static_cast<std::int8_t>(-value);
-                expected.push_back({by_rows, position, value, -value});
+    for (const Order order1 : orders) {
+        for (const Order order2 : orders) {
+            expect_first_places(question_, 1500, 1500, indices, order1, order2);
+        }
+    }
+}
+
+// Also where a place is met before one that comes earlier.
+TEST_P(Comparisons, TellTheFirstOfPlacesThatAreMetInAnotherOrder) {
+    const Indices indices = {{0, 40}, {0, 49}, {1, 1}, {2, 0}, {3, 30}, {39, 0}, {39, 2}};
+    for (question_.differences = 1; question_.differences <= 8; ++question_.differences) {
+        for (const Order order1 : orders) {
+            for (const Order order2 : orders) {
+                expect_first_places(question_, 40, 50, indices, order1, order2);
             }
-            const auto result = compare(array<std::int8_t>(shape, first, order1),
-                                        array<std::int8_t>(shape, second, order2));
-            EXPECT_EQ(told(result.places), expected);
-            EXPECT_EQ(listener_.done(), listener_.total());
         }
     }
 }
@@ -351,6 +420,59 @@ TEST_P(Comparisons, ReadNoFurtherThanToThePlacesThatAreTold) {
         EXPECT_LT(listener_.done(), length);
     }
     EXPECT_GT(listener_.done(), 0U);
+}
+
+// ---- Threads
+
+// Of threads that read at once.
+class Meeting {
+  public:
+    explicit Meeting(const unsigned expected) : expected_(expected) {}
+
+    // Waits until as many are there as are expected, or in vain.
+    void attend() {
+        std::unique_lock<std::mutex> lock(mutex_);
+        most_ = std::max(most_, ++present_);
+        changed_.notify_all();
+        changed_.wait_for(lock, 10s, [this] { return most_ >= expected_; });
+        --present_;
+    }
+
+    unsigned most() const { return most_; }
+
+  private:
+    unsigned expected_;
+    unsigned present_ = 0;
+    unsigned most_ = 0;
+    std::mutex mutex_;
+    std::condition_variable changed_;
+};
+
+class MeetingPlace : public ZerosAndOne {
+  public:
+    explicit MeetingPlace(Meeting& meeting) : ZerosAndOne(length), meeting_(meeting) {}
+
+    void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
+        meeting_.attend();
+        ZerosAndOne::read(first, count, elements);
+    }
+
+  private:
+    Meeting& meeting_;
+};
+
+TEST(Threads, AreAsManyAsAreAskedForAndOfUse) {
+    const unsigned usual = std::clamp(std::thread::hardware_concurrency(), 1U, 4U);
+    const std::pair<unsigned, unsigned> threads[] = {{1, 1}, {2, 2}, {3, 3}, {8, 4}, {0, usual}};
+    for (const auto& [asked, expected] : threads) {
+        Meeting meeting(expected);
+        NoListener listener;
+        const auto result = talcmp::compare({"a", std::make_unique<MeetingPlace>(meeting)},
+                                            {"b", std::make_unique<ZerosAndOne>(length)},
+                                            question_of(asked), listener);
+        EXPECT_EQ(result.difference, Difference::none);
+        EXPECT_EQ(meeting.most(), expected) << asked;
+    }
 }
 
 INSTANTIATE_TEST_SUITE_P(Threads, Comparisons, testing::Values(1U, 2U, 8U));

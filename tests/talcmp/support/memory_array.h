@@ -7,8 +7,11 @@
 #include "taldata_array_element_types.h"
 
 #include <algorithm>
+#include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <stdexcept>
+#include <thread>
 #include <utility>
 #include <vector>
 
@@ -34,19 +37,30 @@ class MemoryArray : public talcmp::ArraySource {
             throw std::logic_error("elements are read that the array has not");
         }
         if (access_ == Access::once) {
-            if (first < read_) {
-                throw std::logic_error("elements are read twice that come but once");
-            }
-            read_ = first + count;
+            read_once(first, count);
         }
         std::copy_n(elements_.data() + first, count, static_cast<T*>(elements));
     }
 
   private:
+    // Takes its time, so that another thread that reads meanwhile is noticed.
+    void read_once(const std::uint64_t first, const std::uint64_t count) {
+        if (reading_.exchange(true)) {
+            throw std::logic_error("elements that come but once are read by two threads");
+        }
+        std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        if (first < read_) {
+            throw std::logic_error("elements that come but once are read twice");
+        }
+        read_ = first + count;
+        reading_ = false;
+    }
+
     talcmp::Shape shape_;
     std::vector<T> elements_;
     Order order_;
     Access access_;
+    std::atomic<bool> reading_ = false;
     std::uint64_t read_ = 0; // elements that come but once
 };
 
