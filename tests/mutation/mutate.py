@@ -80,6 +80,7 @@ class Run:
     def __init__(self, target, memory):
         self.memory = memory
         self.bench = target.bench(memory)
+        self.codes = {path: mutants.code_of(text) for path, text in self.bench.tree.texts.items()}
         self.trees = [self.bench.tree_of(WORK / f"{target.__name__.lower()}{i}")
                       for i in range(WORKERS)]
 
@@ -95,8 +96,9 @@ class Run:
             self.trees.append(tree)
 
     def _outcome(self, mutant, tree):
-        texts = {**tree.texts, mutant.path: mutant.applied(tree.texts[mutant.path])}
-        code = steps.digest(*(mutants.code_of(texts[path]) for path in sorted(texts)))
+        mutated = mutants.code_of(mutant.applied(tree.texts[mutant.path]))
+        codes = {**self.codes, mutant.path: mutated}
+        code = steps.digest(*(codes[path] for path in sorted(codes)))
         for name, sources, find in self.bench.steps(mutant, tree):
             key = steps.digest(code, name, sources)
             kind, by = self.memory.ask(key, lambda find=find: self._found(find))
