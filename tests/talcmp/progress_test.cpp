@@ -4,10 +4,20 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <array>
+#include <chrono>
+#include <cstddef>
 #include <cstdint>
+#include <cstdlib>
 #include <limits>
 #include <ostream>
 #include <string>
+#include <thread>
+
+#include <fcntl.h>
+#include <pty.h>
+#include <unistd.h>
 
 namespace {
 
@@ -67,5 +77,82 @@ std::string name_of(const testing::TestParamInfo<Progress>& progress) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Bar, ProgressText, testing::ValuesIn(cases), name_of);
+
+// ---- When it is drawn
+
+// Takes the place of standard error.
+class TerminalAsErrors {
+  public:
+    TerminalAsErrors() {
+        struct winsize size = {};
+        size.ws_col = 50;
+        if (::openpty(&controller_, &device_, nullptr, nullptr, &size) == 0) {
+            ::dup2(device_, STDERR_FILENO);
+            ::fcntl(controller_, F_SETFL, O_NONBLOCK);
+        }
+    }
+    TerminalAsErrors(const TerminalAsErrors&) = delete;
+    TerminalAsErrors& operator=(const TerminalAsErrors&) = delete;
+    ~TerminalAsErrors() {
+        ::dup2(old_errors_, STDERR_FILENO);
+        for (const int file : {controller_, device_, old_errors_}) {
+            ::close(file);
+        }
+    }
+
+    bool is_there() const { return controller_ >= 0; }
+
+    // What has been written to it since the last call.
+    std::string take() const {
+        std::array<char, 4096> text = {};
+        const ssize_t length = ::read(controller_, text.data(), text.size());
+        return {text.data(), static_cast<std::size_t>(std::max<ssize_t>(length, 0))};
+    }
+
+  private:
+    int old_errors_ = ::dup(STDERR_FILENO);
+    int controller_ = -1;
+    int device_ = -1;
+};
+
+constexpr auto patience = std::chrono::milliseconds(550);
+
+TEST(ProgressBar, BeginsAnewWithEachPair) {
+    ::setenv("TERM", "xterm", 1);
+    const TerminalAsErrors terminal;
+    if (!terminal.is_there()) {
+        GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
+    }
+    talcmp::ProgressBar bar(true);
+    for (const std::uint64_t total : {200, 1000}) {
+        bar.begin(total);
+        bar.advance(50);
+        EXPECT_EQ(terminal.take(), "");
+        std::this_thread::sleep_for(patience);
+        bar.advance(50);
+        bar.advance(50); // too soon after the last time
+        const std::string drawn = terminal.take();
+        EXPECT_NE(drawn.find(total == 200 ? "]  50 %" : "]  10 %"), std::string::npos) << drawn;
+        EXPECT_EQ(std::count(drawn.begin(), drawn.end(), '%'), 1) << drawn;
+        bar.clear();
+        EXPECT_EQ(terminal.take(), "\r\x1B[K");
+        bar.clear();
+        EXPECT_EQ(terminal.take(), "");
+    }
+}
+
+TEST(ProgressBar, IsNotDrawnWhereItIsNotWanted) {
+    ::setenv("TERM", "xterm", 1);
+    const TerminalAsErrors terminal;
+    if (!terminal.is_there()) {
+        GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
+    }
+    talcmp::ProgressBar bar(false);
+    bar.begin(100);
+    std::this_thread::sleep_for(patience);
+    bar.advance(50);
+    bar.clear();
+    EXPECT_EQ(terminal.take(), "");
+}
 
 } // namespace

@@ -288,31 +288,20 @@ class Progress(Folder):
         with open(self.save("values.npy", values), "rb") as file:
             return file.read()
 
-    @staticmethod
-    def write_slowly(contents, seconds, open_file):
-        """In a child process, of which the id is returned."""
-        writer = os.fork()
-        if writer == 0:
-            try:
-                file = open_file()
-                pieces = 20
-                for piece in range(pieces):
-                    begin, end = (len(contents) * i // pieces for i in (piece, piece + 1))
-                    os.write(file, contents[begin:end])
-                    time.sleep(seconds / pieces)
-            finally:
-                os._exit(0)
-        return writer
-
     def run_slowly(self, seconds, options=(), order="C", **settings):
         contents = self.contents(order)
         read_end, write_end = os.pipe()
-
-        def open_file():
-            os.close(read_end)
-            return write_end
-
-        writer = self.write_slowly(contents, seconds, open_file)
+        writer = os.fork()
+        if writer == 0:
+            try:
+                os.close(read_end)
+                pieces = 20
+                for piece in range(pieces):
+                    begin, end = (len(contents) * i // pieces for i in (piece, piece + 1))
+                    os.write(write_end, contents[begin:end])
+                    time.sleep(seconds / pieces)
+            finally:
+                os._exit(0)
         os.close(write_end)
         result = run_on_terminal("-", self.other, *options, stdin=read_end, **settings)
         os.close(read_end)
@@ -344,33 +333,6 @@ class Progress(Folder):
         self.assertGreaterEqual(len(shares), 2)
         self.assertEqual(shares, sorted(shares))
         self.assertGreater(shares[0], 5)
-
-    def test_bar_of_each_pair_begins_anew(self):
-        contents = self.contents()
-        for folder in ("one", "two"):
-            os.mkdir(os.path.join(self.folder, folder))
-            for name in ("a.npy", "b.npy"):
-                os.mkfifo(os.path.join(self.folder, folder, name))
-        writers = []
-        for name in ("a.npy", "b.npy"):
-            for folder, seconds in (("one", 1.6), ("two", 0)):
-                path = os.path.join(self.folder, folder, name)
-                writers.append(self.write_slowly(contents, seconds,
-                                                 lambda path=path: os.open(path, os.O_WRONLY)))
-        status, text = run_on_terminal(os.path.join(self.folder, "one"),
-                                       os.path.join(self.folder, "two"), output=False)
-        for writer in writers:
-            os.waitpid(writer, 0)
-        self.assertEqual(status, 0)
-        parts = text.split(self.END)
-        self.assertEqual(len(parts), 3)
-        for part in parts[:2]:
-            shares = self.shares(part + self.END)
-            self.assertGreaterEqual(len(shares), 2)
-            self.assertEqual(shares, sorted(shares))
-            self.assertLess(shares[0], 60)
-        self.assertTrue(parts[2].endswith("2 the same, 0 different, 0 only in the first, 0 only in "
-                                          "the second, 0 in trouble\n"), parts[2])
 
     def test_no_bar_on_a_terminal_that_takes_no_escapes(self):
         for name in ("dumb", "", None):
