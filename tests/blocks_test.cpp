@@ -5,6 +5,7 @@
 
 #include "support/checked_calls.h"
 #include "support/element_types.h"
+#include "support/emulation.h"
 #include "support/floating_point_modes.h"
 #include "support/hard_pairs.h"
 
@@ -354,7 +355,8 @@ bool as_element_loop(const Pair& pair, const Remembered& before, const double to
 }
 
 // One pair of types under one tolerance. Any `step` tolerances in a row have the planted pair at
-// every place of two blocks, each of them at another share of the places.
+// every place of two blocks, each of them at another share of the places. Emulated, each has a
+// share of the lengths too.
 class PlantedRuns {
   public:
     PlantedRuns(const Pair& pair, const double tol, const std::size_t turn, const std::size_t step)
@@ -408,7 +410,9 @@ class PlantedRuns {
 
     bool run_among_these() {
         for (const Planted& planted : planted_) {
-            for (const std::size_t length : lengths_) {
+            const std::size_t stride = std::min(step_, emulated_stride);
+            for (std::size_t i = first_ % stride; i < lengths_.size(); i += stride) {
+                const std::size_t length = lengths_[i];
                 // 7919 has no factor in common with a length here, so that no place is preferred.
                 if (!run(planted, length, length == 0 ? 0 : runs_ * 7919 % length)) {
                     return false;
@@ -464,7 +468,7 @@ TEST(BlockLoops, AnswerAndRememberAsTheElementLoop) {
     int near_fills = 0;
     for_each_pair_with_a_loop([&](const Pair& pair) {
         const std::vector<double> tolerances = tolerances_of(pair);
-        const std::size_t step = std::min<std::size_t>(tolerances.size(), 3);
+        const std::size_t step = std::min(tolerances.size(), 3 * emulated_stride);
         for (std::size_t turn = 0; turn < tolerances.size(); ++turn) {
             PlantedRuns runs(pair, tolerances[turn], turn, step);
             if (!runs.run_all()) {
@@ -499,9 +503,9 @@ class DrawnRuns {
           data2_(sevens(pair.side2)) {}
 
     bool run_all(oracle::Random& random, const double tol) {
-        constexpr int draws = 150;
+        constexpr std::size_t draws = 150 / emulated_stride;
         const Remembered factors = factors_of(tol);
-        for (int draw = 0; draw < draws; ++draw) {
+        for (std::size_t draw = 0; draw < draws; ++draw) {
             const std::size_t index = random.below(static_cast<std::uint32_t>(count_));
             unsigned char* const element1 = data1_.data() + index * pair_.side1.size;
             unsigned char* const element2 = data2_.data() + index * pair_.side2.size;

@@ -4,6 +4,7 @@
 #include "talnumericarray_compare.h"
 
 #include "support/element_types.h"
+#include "support/emulation.h"
 #include "support/protected_memory.h"
 
 #include <gtest/gtest.h>
@@ -93,7 +94,7 @@ std::vector<std::size_t> positions(const ElementType& type1, const ElementType& 
         }
     };
     choose(0, 2 * longest_block + 2, 1);
-    choose(0, 2 * page / std::min(type1.size, type2.size), 97);
+    choose(0, 2 * page / std::min(type1.size, type2.size), 97 * emulated_stride);
     for (const ElementType& type : {type1, type2}) {
         for (const std::size_t edge : {page / type.size, 2 * page / type.size}) {
             choose(edge - 2, edge + 2, 1);
@@ -206,8 +207,10 @@ TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
         const std::vector<std::size_t> places = positions(type1, type2);
         const auto check = [&](const TwoMemories::Ends& ends, const Filling& filling) {
             for (const std::size_t position : places) {
-                for (const Behind& readable : behind(type1, type2, runs)) {
-                    expect_to_stop_at(position, type1, type2, ends, filling, readable);
+                const std::vector<Behind> all = behind(type1, type2, runs);
+                const std::size_t stride = std::min(emulated_stride, all.size());
+                for (std::size_t i = runs % stride; i < all.size(); i += stride) {
+                    expect_to_stop_at(position, type1, type2, ends, filling, all[i]);
                 }
                 ++runs;
             }

@@ -1,0 +1,16 @@
+// How much of a long loop over lengths, places and draws a test makes.
+
+#ifndef TALNUMERICARRAY_TESTS_EMULATION_H
+#define TALNUMERICARRAY_TESTS_EMULATION_H
+
+#include <cstddef>
+
+// An emulator takes twenty times as long. There only every so many-th step is made of loops that
+// are the same code on every platform and run in full on this machine's.
+#ifdef TALNUMERICARRAY_EMULATED
+inline constexpr std::size_t emulated_stride = 8;
+#else
+inline constexpr std::size_t emulated_stride = 1;
+#endif
+
+#endif
