@@ -89,11 +89,11 @@ TEST(ExhaustiveAllValuesOf16Bits, SignedAgainstSigned) {
     EXPECT_EQ((wrong_answers_of_pair_routine<BIT16, BIT16>()), 0U);
 }
 
-TEST(AllValuesOf16Bits, SignedAgainstUnsigned) {
+TEST(ExhaustiveAllValuesOf16Bits, SignedAgainstUnsigned) {
     EXPECT_EQ((wrong_answers_of_pair_routine<BIT16, UBIT16>()), 0U);
 }
 
-TEST(AllValuesOf16Bits, UnsignedAgainstSigned) {
+TEST(ExhaustiveAllValuesOf16Bits, UnsignedAgainstSigned) {
     EXPECT_EQ((wrong_answers_of_pair_routine<UBIT16, BIT16>()), 0U);
 }
 
