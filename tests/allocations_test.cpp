@@ -49,7 +49,7 @@ const int hooks_installed = __sanitizer_install_malloc_and_free_hooks(
 #else
 
 // The names under which the C library has what is replaced.
-// NOLINTBEGIN(bugprone-reserved-identifier,readability-inconsistent-declaration-parameter-name)
+// NOLINTBEGIN(clang-diagnostic-reserved-identifier,readability-inconsistent-declaration-parameter-name)
 extern "C" void* __libc_malloc(std::size_t size);
 extern "C" void* __libc_calloc(std::size_t count, std::size_t size);
 extern "C" void* __libc_realloc(void* block, std::size_t size);
@@ -91,7 +91,7 @@ extern "C" void free(void* block) {
     allocator_calls = allocator_calls + 1;
     __libc_free(block);
 }
-// NOLINTEND(bugprone-reserved-identifier,readability-inconsistent-declaration-parameter-name)
+// NOLINTEND(clang-diagnostic-reserved-identifier,readability-inconsistent-declaration-parameter-name)
 
 #endif
 

@@ -24,7 +24,7 @@ void forget_calls() {
 } // namespace
 
 // The names that the linker's --wrap option gives to a function and to what stands before it.
-// NOLINTBEGIN(bugprone-reserved-identifier)
+// NOLINTBEGIN(clang-diagnostic-reserved-identifier)
 extern "C" double __real_pow(double base, double exponent);
 extern "C" float __real_powf(float base, float exponent);
 
@@ -39,7 +39,7 @@ extern "C" float __wrap_powf(float base, float exponent) {
     last_base = static_cast<double>(base);
     return __real_powf(base, exponent);
 }
-// NOLINTEND(bugprone-reserved-identifier)
+// NOLINTEND(clang-diagnostic-reserved-identifier)
 
 namespace {
 
