@@ -164,6 +164,12 @@ const Counted counted[] = {
     {"AlmostThree", ones, others, 2.75, "6 pairs, 2 differ" + digits_of_others, "3@13 5@15"},
     {"Three", ones, others, 3, "6 pairs, 2 differ" + digits_of_others, "3@13 5@15"},
     {"AlmostAll", ones, others, 52.5, "6 pairs, 2 differ" + digits_of_others, "3@13 5@15"},
+    {"FarAsTheFactorIsRemembered",
+     {1},
+     {2.5},
+     52.5,
+     "1 pairs, 0 differ; digits 1x53; from 53, worst 53 at 0@10; 0 0 0, 0 0 0",
+     ""},
     {"All", ones, others, 53, "6 pairs, 1 differ" + digits_of_others, "5@15"},
     {"MoreThanAll", ones, others, 1e300, "6 pairs, 1 differ" + digits_of_others, "5@15"},
     {"Zeros",
@@ -212,7 +218,6 @@ TEST_P(Reports, CountAllPairsAndTellTheFirst) {
         SCOPED_TRACE(in_order);
         talcmp::Reporter reporter(GetParam().tolerance);
         talcmp::FirstPlaces first(3);
-        talcmp::remember_factor_of(GetParam().tolerance);
         reporter.add(
             pairs_of(GetParam().first, GetParam().second),
             [](const std::size_t i) { return place_at(i, 0); }, in_order, first);
