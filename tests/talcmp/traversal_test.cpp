@@ -97,6 +97,7 @@ const Way ways[] = {
     {"FortranOrder", {3, 5, 700}, ":", Order::fortran, Order::fortran, 10500, true},
     {"COrderAgainstFortran", {530, 370}, ":", Order::c, Order::fortran, 196100},
     {"FortranOrderAgainstC", {370, 530}, ":", Order::fortran, Order::c, 196100},
+    {"EdgesOfOneElement", {363, 363}, ":", Order::c, Order::fortran, 131769},
     {"FewLongColumns", {20000, 2}, ":", Order::c, Order::fortran, 40000},
     {"FewLongRows", {2, 20000}, ":", Order::fortran, Order::c, 40000},
     {"FourAxes", {7, 30, 11, 13}, ":", Order::c, Order::fortran, 30030},
