@@ -8,6 +8,7 @@ from mutants import Change, Source, closing
 SCOPES = ("namespace", "class", "struct", "enum")
 LEAVES = ("throw", "break", "continue")
 DECLARES = ("using", "constexpr", "const", "static", "auto")
+TYPE_ENDS = (">", ">>", "&", "*")
 NO_VALUES = ("{}", "0", "false", "nullptr", "std::nullopt", '""')
 
 
@@ -115,14 +116,13 @@ class Bodies:
         first = self._text(begin)
         if first in (*LEAVES, "return") or first in DECLARES:
             return first not in DECLARES
+        begin += first == "*"
         words = []
         while self._text(begin) not in ("=", "(", "[", ";", "{"):
             words.append(self.tokens[begin])
             begin += 1
-        pairs = zip(words, words[1:])
-        return not any(two.kind == "word" and (one.kind == "word" or one.text in (">", ">>", "&", "*"))
-                       and one is not words[0] or one.kind == two.kind == "word"
-                       for one, two in pairs)
+        return not any(two.kind == "word" and (one.kind == "word" or one.text in TYPE_ENDS)
+                       for one, two in zip(words, words[1:]))
 
 
 class WholeSource(Source):

@@ -134,6 +134,8 @@ def precompile(name, headers, *flags_of_variants):
 class Bench:
     """What all copies of a target share; `tree` is the copy without a mutant."""
 
+    spare = 10  # seconds that a program may take longer than three times as long
+
     def __init__(self, memory, tree):
         self.memory = memory
         self.tree = tree
@@ -150,4 +152,4 @@ class Bench:
             return resource.getrusage(resource.RUSAGE_CHILDREN).ru_utime - before
         key = digest("unharmed", *self.tree.texts.values(), self.sources(program))
         with self.lock:
-            return int(10 + 3 * self.memory.ask(key, seconds))
+            return int(self.spare + 3 * self.memory.ask(key, seconds))

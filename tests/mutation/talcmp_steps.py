@@ -1,4 +1,4 @@
-"""talcmp as a target: its mutants, and the tests that are built and run with one after the other."""
+"""talcmp as a target: its mutants, and the tests that are run with one after the other."""
 
 import hashlib
 import re
@@ -29,11 +29,8 @@ STANDARD_HEADERS = ["algorithm", "array", "atomic", "charconv", "cmath", "comple
 
 # ---- The mutants to try
 
-CONDITIONS = ("true", "false")
-
-
 def is_condition(change):
-    return change.whole and (change.text in CONDITIONS or change.text.startswith("!("))
+    return change.whole and (change.text in ("true", "false") or change.text.startswith("!("))
 
 
 def chance(mutant):
@@ -165,6 +162,8 @@ def test_programs():
 class Bench(steps.Bench):
     """What all copies of talcmp share."""
 
+    spare = 4
+
     def __init__(self, memory):
         precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
         precompile("talcmp.h", STANDARD_HEADERS, ["-O0"])
@@ -219,7 +218,7 @@ class Bench(steps.Bench):
             run_test(words, seconds, patience=6, cwd=folder, env=variables)
 
     def _link(self, tree, objects, target, *libraries):
-        """Objects that see the mutant come before the archive, from which they are not taken then."""
+        """Objects that see the mutant come first, so that the archive's are not taken."""
         changed = [tree.object(path) for path in self.sources_of_core if tree.sees(path)]
         status, text = command(["g++", "-fuse-ld=gold", *map(str, (*objects, *changed, self.core)),
                                 *libraries, "-lzip", "-pthread", "-o", str(target)])
