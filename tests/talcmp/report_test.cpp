@@ -294,11 +294,19 @@ TEST(Report, TellsTheFirstOfEquallyBadPlaces) {
 }
 
 TEST(Report, KnowsTheSmallestToleranceForAll) {
-    EXPECT_EQ(smallest_tolerance(report_of({}, 0)), 0);
-    EXPECT_EQ(smallest_tolerance(report_of({1, 1}, 0)), 0);
-    EXPECT_EQ(smallest_tolerance(report_of({1, with_digits(7)}, 0)), 7);
-    EXPECT_EQ(smallest_tolerance(report_of({with_digits(53), with_digits(7)}, 0)), 53);
-    EXPECT_EQ(smallest_tolerance(report_of({1, -1}, 0)), std::nullopt);
+    EXPECT_EQ(smallest_tolerance(report_of({}, 0), 53), 0);
+    EXPECT_EQ(smallest_tolerance(report_of({1, 1}, 0), 53), 0);
+    EXPECT_EQ(smallest_tolerance(report_of({1, with_digits(7)}, 0), 53), 7);
+    EXPECT_EQ(smallest_tolerance(report_of({with_digits(52), with_digits(7)}, 0), 53), 52);
+    EXPECT_EQ(smallest_tolerance(report_of({1, -1}, 0), 53), std::nullopt);
+}
+
+// That of all digits is one that says nothing.
+TEST(Report, KnowsNoSmallestToleranceWhereNoDigitIsInCommon) {
+    EXPECT_EQ(smallest_tolerance(report_of({with_digits(53), with_digits(7)}, 0), 53),
+              std::nullopt);
+    EXPECT_EQ(smallest_tolerance(report_of({with_digits(24)}, 0), 24), std::nullopt);
+    EXPECT_EQ(smallest_tolerance(report_of({with_digits(23)}, 0), 24), 23);
 }
 
 // ---- First places
