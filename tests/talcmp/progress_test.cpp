@@ -1,6 +1,7 @@
 // What the bar says that shows how far a comparison is.
 
 #include "progress_bar.h"
+#include "status_line.h"
 
 #include <gtest/gtest.h>
 
@@ -134,9 +135,9 @@ TEST(ProgressBar, BeginsAnewWithEachPair) {
         const std::string drawn = terminal.take();
         EXPECT_NE(drawn.find(total == 200 ? "]  50 %" : "]  10 %"), std::string::npos) << drawn;
         EXPECT_EQ(std::count(drawn.begin(), drawn.end(), '%'), 1) << drawn;
-        bar.clear();
+        talcmp::clear_status();
         EXPECT_EQ(terminal.take(), "\r\x1B[K");
-        bar.clear();
+        talcmp::clear_status();
         EXPECT_EQ(terminal.take(), "");
     }
 }
@@ -151,7 +152,7 @@ TEST(ProgressBar, IsNotDrawnWhereItIsNotWanted) {
     bar.begin(100);
     std::this_thread::sleep_for(patience);
     bar.advance(50);
-    bar.clear();
+    talcmp::clear_status();
     EXPECT_EQ(terminal.take(), "");
 }
 

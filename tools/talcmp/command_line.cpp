@@ -100,21 +100,21 @@ CommandLine command_line_of(const Words& words) {
     constexpr std::size_t most_differences = 1000000; // that memory holds in every thread
     constexpr unsigned most_threads = 64;
     CommandLine line;
-    line.json = words.has("--json");
-    line.quiet = words.has("--quiet");
-    line.verbose = words.has("--verbose");
-    line.filter = {words.all("--include"), words.all("--exclude")};
-    line.slice = words.value("--slice", "");
-    line.question.tolerance = tolerance_from(words.value("--tol", "0"));
-    line.question.strict_type = words.has("--strict-type");
-    line.question.differences =
-        number_from("--max-differences", words.value("--max-differences", "1"), most_differences);
-    line.question.report = words.has("--report");
-    if (words.has("--threads")) {
+    line.json = has(words, "--json");
+    line.quiet = has(words, "--quiet");
+    line.verbose = has(words, "--verbose");
+    line.filter = {values_of(words, "--include"), values_of(words, "--exclude")};
+    line.slice = value_of(words, "--slice", "");
+    line.question.tolerance = tolerance_from(value_of(words, "--tol", "0"));
+    line.question.strict_type = has(words, "--strict-type");
+    line.question.differences = number_from(
+        "--max-differences", value_of(words, "--max-differences", "1"), most_differences);
+    line.question.report = has(words, "--report");
+    if (has(words, "--threads")) {
         line.question.threads =
-            number_from("--threads", words.value("--threads", ""), most_threads);
+            number_from("--threads", value_of(words, "--threads", ""), most_threads);
     }
-    if (words.has("--slice")) {
+    if (has(words, "--slice")) {
         line.question.selection = selection_from(line.slice);
     }
     return line;
@@ -145,8 +145,8 @@ void check_together(const CommandLine& line) {
 
 std::optional<CommandLine> read_command_line(const int argc, const char* const* argv) {
     const Words words = sort_words(options(), {argv + 1, argv + argc});
-    if (words.has("--help") || words.has("--version")) {
-        std::fputs(words.has("--help") ? help : "talcmp " TALCMP_VERSION "\n", stdout);
+    if (has(words, "--help") || has(words, "--version")) {
+        std::fputs(has(words, "--help") ? help : "talcmp " TALCMP_VERSION "\n", stdout);
         return std::nullopt;
     }
     CommandLine line = command_line_of(words);

@@ -2,6 +2,7 @@
 
 #include "array_file.h"
 #include "operands.h"
+#include "status_line.h"
 #include "trouble.h"
 
 #include <new>
@@ -142,7 +143,7 @@ class Run {
     }
 
     void tell(const Outcome& outcome) {
-        progress_.clear();
+        clear_status();
         count(summary_, outcome.kind);
         answers_.tell(outcome);
     }

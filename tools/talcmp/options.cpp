@@ -20,10 +20,10 @@ bool begins_with(const std::string& text, const std::string& beginning) {
 std::size_t distance(const std::string& one, const std::string& other) {
     std::vector<std::size_t> row(other.size() + 1);
     std::iota(row.begin(), row.end(), std::size_t{0});
-    for (std::size_t i = 0; i < one.size(); ++i) {
+    for (const char letter : one) {
         std::size_t diagonal = row[0]++;
         for (std::size_t j = 0; j < other.size(); ++j) {
-            const std::size_t replaced = diagonal + (one[i] == other[j] ? 0 : 1);
+            const std::size_t replaced = diagonal + (letter == other[j] ? 0 : 1);
             diagonal = row[j + 1];
             row[j + 1] = std::min({replaced, row[j] + 1, row[j + 1] + 1});
         }
@@ -185,13 +185,13 @@ class Sorter {
 
 } // namespace
 
-std::vector<std::string> Words::all(const std::string& option) const {
-    const auto found = values.find(option);
-    return found == values.end() ? std::vector<std::string>() : found->second;
+std::vector<std::string> values_of(const Words& words, const std::string& option) {
+    const auto found = words.values.find(option);
+    return found == words.values.end() ? std::vector<std::string>() : found->second;
 }
 
-std::string Words::value(const std::string& option, const std::string& otherwise) const {
-    return has(option) ? all(option).front() : otherwise;
+std::string value_of(const Words& words, const std::string& option, const std::string& otherwise) {
+    return has(words, option) ? words.values.at(option).front() : otherwise;
 }
 
 Words sort_words(const std::vector<Option>& options, const std::vector<std::string>& words) {

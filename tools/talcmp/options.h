@@ -32,15 +32,17 @@ struct Option {
 struct Words {
     std::map<std::string, std::vector<std::string>> values; // by the name of the option
     std::vector<std::string> operands;
-
-    bool has(const std::string& option) const { return values.count(option) != 0; }
-
-    // All values that the option was given.
-    std::vector<std::string> all(const std::string& option) const;
-
-    // Its only value; `otherwise` where it was not given.
-    std::string value(const std::string& option, const std::string& otherwise) const;
 };
+
+inline bool has(const Words& words, const std::string& option) {
+    return words.values.count(option) != 0;
+}
+
+// All values that the option was given.
+std::vector<std::string> values_of(const Words& words, const std::string& option);
+
+// Its only value; `otherwise` where it was not given.
+std::string value_of(const Words& words, const std::string& option, const std::string& otherwise);
 
 // `--name value`, `--name=value`, `-nvalue`, `-n value`; several flags in one word, `-qv`. Behind
 // `--` all words are operands. Throws UsageError.

@@ -40,13 +40,6 @@ bool column_major(const ArraySource& first, const ArraySource& second) {
 
 // What is to be done.
 struct Task {
-    Task(const Traversal& traversal, ArraySource& array1, ArraySource& array2,
-         const Question& asked, ProgressListener& listener)
-        : way(traversal), first(array1), second(array2), question(asked), progress(listener),
-          in_order(asked.only_whether || !column_major(array1, array2)),
-          order(asked.only_whether && column_major(array1, array2) ? RowMajorOrder()
-                                                                   : RowMajorOrder(array1)) {}
-
     const Traversal& way;
     ArraySource& first;
     ArraySource& second;
@@ -55,6 +48,19 @@ struct Task {
     bool in_order;       // whether places are met in their order
     RowMajorOrder order; // of places; as they are met, where any of them will do
 };
+
+Task make_task(const Traversal& way, ArraySource& first, ArraySource& second,
+               const Question& question, ProgressListener& progress) {
+    const bool as_stored = !column_major(first, second);
+    const bool as_met = question.only_whether && !as_stored;
+    return {way,
+            first,
+            second,
+            question,
+            progress,
+            as_stored || as_met,
+            as_met ? RowMajorOrder() : RowMajorOrder(first)};
+}
 
 // How far it is.
 class Work {
@@ -287,7 +293,7 @@ void compare_elements(NamedArray& first, NamedArray& second, const View& view1, 
         make_readable_in_any_order(first, progress);
         make_readable_in_any_order(second, progress);
     }
-    const Task task(way, *first.source, *second.source, question, progress);
+    const Task task = make_task(way, *first.source, *second.source, question, progress);
     const unsigned threads = thread_count(task);
     try {
         compare_all_boxes(task, threads, result);

@@ -78,7 +78,7 @@ void ProgressBar::advance(const std::uint64_t bytes) {
     }
 }
 
-void ProgressBar::clear() {
+ProgressBar::~ProgressBar() {
     clear_status();
 }
 

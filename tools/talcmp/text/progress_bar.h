@@ -25,13 +25,10 @@ class ProgressBar : public ProgressListener {
     explicit ProgressBar(bool wanted);
     ProgressBar(const ProgressBar&) = delete;
     ProgressBar& operator=(const ProgressBar&) = delete;
-    ~ProgressBar() override { clear(); }
+    ~ProgressBar() override;
 
     void begin(std::uint64_t total_bytes) override;
     void advance(std::uint64_t bytes) override;
-
-    // Takes the bar off the terminal.
-    void clear();
 
   private:
     using Clock = std::chrono::steady_clock;
