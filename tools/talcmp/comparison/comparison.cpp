@@ -45,8 +45,8 @@ struct Task {
     ArraySource& second;
     const Question& question;
     ProgressListener& progress;
-    bool in_order;       // whether places are met in their order
-    RowMajorOrder order; // of places; as they are met, where any of them will do
+    bool in_order = true; // whether places are met in their order
+    RowMajorOrder order;  // of places; as they are met, where any of them will do
 };
 
 Task make_task(const Traversal& way, ArraySource& first, ArraySource& second,
