@@ -1,0 +1,203 @@
+// Where bytes come from: streams that hand out some at a time, files, pipes, and what is told when
+// they cannot be read.
+
+#include "array_file.h"
+#include "byte_stream.h"
+#include "descriptor.h"
+#include "pipe.h"
+#include "regular_file.h"
+#include "trouble.h"
+
+#include "support/npy_bytes.h"
+#include "support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <ostream>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace {
+
+std::string text_of_length(const std::size_t length) {
+    std::string text(length, '\0');
+    for (std::size_t i = 0; i < length; ++i) {
+        text[i] = static_cast<char>('a' + i % 23);
+    }
+    return text;
+}
+
+std::string read(talcmp::ByteSource& source, const std::uint64_t offset, const std::size_t count) {
+    std::string bytes(count, '\0');
+    bytes.resize(source.read(offset, bytes.data(), count));
+    return bytes;
+}
+
+template <typename Action>
+std::string trouble_of(const Action& action) {
+    try {
+        action();
+    } catch (const talcmp::Trouble& trouble) {
+        return trouble.what();
+    }
+    return "none";
+}
+
+// ---- Streams
+
+// Hands out no more than `at_once` bytes.
+class Drops : public talcmp::ByteStream {
+  public:
+    Drops(std::string bytes, const std::size_t at_once)
+        : bytes_(std::move(bytes)), at_once_(at_once) {}
+
+    std::optional<std::uint64_t> size() const override { return std::nullopt; }
+
+  private:
+    std::size_t read_next(void* const bytes, const std::size_t count) override {
+        const std::size_t there = std::min({count, at_once_, bytes_.size() - position_});
+        std::copy_n(bytes_.data() + position_, there, static_cast<char*>(bytes));
+        position_ += there;
+        return there;
+    }
+
+    std::string bytes_;
+    std::size_t at_once_;
+    std::size_t position_ = 0;
+};
+
+struct Reading {
+    const char* name;
+    std::vector<std::pair<std::uint64_t, std::size_t>> parts; // offset and count
+};
+
+void PrintTo(const Reading& reading, std::ostream* out) {
+    *out << reading.name;
+}
+
+const Reading readings[] = {
+    {"All", {{0, 200000}}},
+    {"OneAfterTheOther", {{0, 1}, {1, 7}, {8, 0}, {8, 199992}}},
+    {"WithFewBytesBetween", {{3, 4}, {9, 10}, {100, 5}}},
+    {"WithManyBytesBetween", {{65536, 3}, {131075, 5}, {199999, 1}}},
+    {"PastTheEnd", {{199990, 100}, {200000, 1}}},
+    {"BehindTheEnd", {{199999, 1}, {300000, 4}}},
+    {"FarBehindTheEnd", {{5, 1}, {200001, 4}}},
+};
+
+class Streams : public testing::TestWithParam<Reading> {};
+
+TEST_P(Streams, AreReadInPiecesOfWhateverLength) {
+    const std::string bytes = text_of_length(200000);
+    for (const std::size_t at_once : {1U, 3U, 4096U, 65536U, 1000000U}) {
+        Drops stream(bytes, at_once);
+        EXPECT_FALSE(stream.random_access());
+        for (const auto& [offset, count] : GetParam().parts) {
+            EXPECT_EQ(read(stream, offset, count),
+                      offset < bytes.size() ? bytes.substr(offset, count) : "")
+                << offset << ", " << at_once << " at once";
+        }
+    }
+}
+
+INSTANTIATE_TEST_SUITE_P(Bytes, Streams, testing::ValuesIn(readings),
+                         [](const auto& of) { return std::string(of.param.name); });
+
+// ---- Descriptors
+
+bool is_open(const int descriptor) {
+    return ::fcntl(descriptor, F_GETFD) != -1;
+}
+
+TEST(Descriptors, AreClosedAtTheEnd) {
+    const int number = ::open("/dev/null", O_RDONLY | O_CLOEXEC);
+    {
+        const talcmp::Descriptor descriptor(number);
+        EXPECT_EQ(descriptor.number(), number);
+        EXPECT_TRUE(is_open(number));
+    }
+    EXPECT_FALSE(is_open(number));
+}
+
+TEST(Files, AreReadAnywhere) {
+    const TemporaryFolder folder;
+    const std::string bytes = text_of_length(1000);
+    talcmp::RegularFile file(folder.write("file", bytes));
+    EXPECT_TRUE(file.random_access());
+    EXPECT_EQ(file.size(), 1000U);
+    EXPECT_EQ(read(file, 990, 100), bytes.substr(990));
+    EXPECT_EQ(read(file, 10, 20), bytes.substr(10, 20));
+    EXPECT_EQ(read(file, 1000, 1), "");
+    EXPECT_EQ(read(file, 5000, 1), "");
+}
+
+TEST(Files, OfOneArrayHaveOneMemberWithoutAName) {
+    const TemporaryFolder folder;
+    const auto file = talcmp::open_array_file(folder.write("a.npy", npy::row<double>({1, 2})));
+    EXPECT_FALSE(file->is_archive());
+    EXPECT_EQ(file->members(), std::vector<std::string>{""});
+    EXPECT_EQ(file->open("")->shape(), talcmp::Shape{2});
+}
+
+TEST(Files, ThatAreNoneAreTrouble) {
+    const TemporaryFolder folder;
+    const auto trouble = [](const std::string& path) {
+        return trouble_of([&path] { talcmp::RegularFile file(path); });
+    };
+    const std::string missing = folder.path_of("missing");
+    EXPECT_EQ(trouble(missing), missing + ": cannot be opened: No such file or directory");
+    const std::string path = folder.path_of("");
+    EXPECT_EQ(trouble(path), path + ": is a folder; name a file in it, or two folders");
+    EXPECT_EQ(trouble("/dev/null"),
+              "/dev/null: is neither a file nor a pipe; save the array to a file first");
+}
+
+TEST(Files, ThatCannotBeReadAreTrouble) {
+    const TemporaryFolder folder;
+    const talcmp::Descriptor descriptor(
+        ::open(folder.path_of("").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+    char byte = 0;
+    EXPECT_EQ(trouble_of([&] { talcmp::read_at(descriptor.number(), "name", 0, &byte, 1); }),
+              "name: cannot be read: Is a directory");
+    talcmp::Pipe pipe("pipe", ::dup(descriptor.number()));
+    EXPECT_EQ(trouble_of([&] { pipe.read(0, &byte, 1); }), "pipe: cannot be read: Is a directory");
+}
+
+TEST(Pipes, AreReadToTheirEnd) {
+    int ends[2] = {};
+    ASSERT_EQ(::pipe(ends), 0);
+    talcmp::Pipe pipe("pipe", ends[0]);
+    ASSERT_EQ(::write(ends[1], "abcdef", 6), 6);
+    ::close(ends[1]);
+    EXPECT_FALSE(pipe.size().has_value());
+    EXPECT_EQ(read(pipe, 2, 3), "cde");
+    EXPECT_EQ(read(pipe, 5, 9), "f");
+}
+
+TEST(Pipes, MayBeNamed) {
+    const TemporaryFolder folder;
+    const std::string path = folder.path_of("pipe");
+    ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
+    const talcmp::Descriptor writer(::open(path.c_str(), O_RDWR | O_CLOEXEC));
+    ASSERT_EQ(::write(writer.number(), "abc", 3), 3);
+    talcmp::Pipe pipe(path);
+    EXPECT_EQ(read(pipe, 0, 3), "abc");
+}
+
+TEST(Pipes, ThatCannotBeOpenedAreTrouble) {
+    const TemporaryFolder folder;
+    const std::string path = folder.path_of("missing");
+    EXPECT_EQ(trouble_of([&] { talcmp::Pipe pipe(path); }),
+              path + ": cannot be opened: No such file or directory");
+}
+
+} // namespace
