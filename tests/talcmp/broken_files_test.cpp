@@ -13,6 +13,8 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstdint>
+#include <optional>
 #include <ostream>
 #include <string>
 #include <utility>
@@ -419,6 +421,34 @@ TEST_P(Headers, AreRefusedWithTheDictionaryCutAnywhere) {
         const std::string header = npy::header(good_dictionary.substr(0, length), GetParam());
         EXPECT_THROW(read_at_end(memory, header), talcmp::NpyError) << length;
     }
+}
+
+// ---- Files of which only the end tells how long they are
+
+class Stream : public MemoryBytes {
+  public:
+    using MemoryBytes::MemoryBytes;
+    std::optional<std::uint64_t> size() const override { return std::nullopt; }
+};
+
+// What is wrong with the header; nothing where it is read.
+std::string wrong_in_stream(const std::string& shape) {
+    const std::string bytes = npy::header(npy::dictionary(real, "False", shape));
+    Stream stream(bytes);
+    try {
+        talcmp::read_npy_header(stream);
+    } catch (const talcmp::NpyError& error) {
+        return error.what();
+    }
+    return "";
+}
+
+TEST(Streams, AreRefusedWhereTheirElementsCannotBeCounted) {
+    const std::string too_many = "has a shape of more than 2^58 elements";
+    EXPECT_EQ(wrong_in_stream("(2, 3)"), "");
+    EXPECT_EQ(wrong_in_stream("(288230376151711744,)"), ""); // 2^58
+    EXPECT_EQ(wrong_in_stream("(288230376151711745,)"), too_many);
+    EXPECT_EQ(wrong_in_stream("(4294967296, 4294967296)"), too_many);
 }
 
 INSTANTIATE_TEST_SUITE_P(Version, Headers, testing::Values(1, 2, 3));
