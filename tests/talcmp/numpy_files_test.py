@@ -31,7 +31,7 @@ TYPES = [np.dtype(name) for name in
 NEVER = 54  # digits of a pair that is the same under no tolerance
 # Emulation is slow.
 ROUNDS = int(os.environ.get("TALNUMERICARRAY_ROUNDS",
-                            1 if any("qemu" in argument for argument in sys.argv) else 4))
+                            1 if any("qemu" in argument for argument in sys.argv) else 2))
 print(f"seed {SEED}", file=sys.stderr)
 
 
