@@ -17,7 +17,7 @@
 #include <optional>
 #include <ostream>
 #include <string>
-#include <utility>
+#include <vector>
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -71,15 +71,17 @@ std::string quoted(const char byte_order, const std::string& code) {
     return "'" + (byte_order + code) + "'";
 }
 
+void expect_errors(const Outcome& outcome, const std::string& message) {
+    EXPECT_EQ(outcome.status, 2);
+    EXPECT_EQ(outcome.output, "");
+    EXPECT_EQ(outcome.errors, "talcmp: " + message + "\n");
+}
+
 void expect_refused(const TemporaryFolder& folder, const std::string& broken,
                     const std::string& message) {
     const std::string good = folder.write("good.npy", file(good_dictionary));
-    for (const auto& operands : {std::pair(broken, good), std::pair(good, broken)}) {
-        const Outcome outcome = run_talcmp({operands.first, operands.second});
-        EXPECT_EQ(outcome.status, 2);
-        EXPECT_EQ(outcome.output, "");
-        EXPECT_EQ(outcome.errors, "talcmp: " + broken + ": " + message + "\n");
-    }
+    expect_errors(run_talcmp({broken, good}), broken + message);
+    expect_errors(run_talcmp({good, broken}), broken + message);
 }
 
 // ---- Files with something wrong in them
@@ -281,7 +283,7 @@ class BrokenFiles : public testing::TestWithParam<BrokenFile> {};
 TEST_P(BrokenFiles, AreRefused) {
     const TemporaryFolder folder;
     const std::string broken = folder.write("broken.npy", GetParam().bytes);
-    expect_refused(folder, broken, GetParam().message);
+    expect_refused(folder, broken, ": " + GetParam().message);
 }
 
 template <typename Case>
@@ -299,19 +301,38 @@ INSTANTIATE_TEST_SUITE_P(Elements, BrokenFiles, testing::ValuesIn(unsupported),
 
 // ---- Archives
 
-TEST(Archives, WithTwoMembersOfOneNameAreRefused) {
-    const TemporaryFolder folder;
-    const std::string broken =
-        folder.write("broken.npz", zip::of_empty_members({"a.npy", "b.npy", "a.npy"}));
-    expect_refused(folder, broken, "has two members of the name 'a'");
+struct BrokenArchive {
+    const char* name;
+    std::vector<zip::Member> members;
+    std::string message; // behind the name of the file
+};
+
+void PrintTo(const BrokenArchive& broken, std::ostream* out) {
+    *out << broken.name;
 }
 
-// NumPy calls both arrays so.
-TEST(Archives, WithAMemberThatIsCalledLikeAnotherWithoutItsSuffixAreRefused) {
+const BrokenArchive archives[] = {
+    {"TwoMembersOfOneName", {{"a.npy"}, {"b.npy"}, {"a.npy"}}, ": has two members of the name 'a'"},
+    // NumPy calls both arrays so.
+    {"NamesWithAndWithoutSuffix", {{"a"}, {"a.npy"}}, ": has two members of the name 'a'"},
+    {"UnknownMethod",
+     {{"a.npy", file(good_dictionary), 0, 97}},
+     "[a]: cannot be opened: Compression method not supported"},
+    {"WrongChecksum",
+     {{"a.npy", file(good_dictionary)}},
+     "[a]: cannot be read: CRC error; is the archive damaged?"},
+};
+
+class BrokenArchives : public testing::TestWithParam<BrokenArchive> {};
+
+TEST_P(BrokenArchives, AreRefused) {
     const TemporaryFolder folder;
-    const std::string broken = folder.write("broken.npz", zip::of_empty_members({"a", "a.npy"}));
-    expect_refused(folder, broken, "has two members of the name 'a'");
+    const std::string broken = folder.write("broken.npz", zip::archive(GetParam().members));
+    expect_refused(folder, broken, GetParam().message);
 }
+
+INSTANTIATE_TEST_SUITE_P(Member, BrokenArchives, testing::ValuesIn(archives),
+                         name_of<BrokenArchive>);
 
 // ---- What is no file that can be read
 
@@ -357,7 +378,7 @@ TEST_P(NoFiles, AreRefused) {
     const std::string path = folder.path_of("broken.npy");
     GetParam().make(folder, path);
     if (!IsSkipped() && !HasFatalFailure()) {
-        expect_refused(folder, path, GetParam().message);
+        expect_refused(folder, path, ": " + GetParam().message);
     }
 }
 
