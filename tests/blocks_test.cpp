@@ -647,25 +647,29 @@ struct Ruling {
     bool beyond_doubt;
 };
 
+// Whether a set said what it may; compiled once, where the block tests are for each pair of types.
+bool follows_rule(const Ruling& ruling, const char* const set, const bool certain) {
+    const bool follows = certain ? ruling.same : !(ruling.same && ruling.beyond_doubt);
+    EXPECT_TRUE(follows) << set << " is " << (certain ? "certain" : "in doubt")
+                         << " of a pair that is " << (ruling.same ? "" : "not ") << "the same";
+    return follows;
+}
+
 template <typename Bound, typename T1, typename T2, typename... Sets>
 bool as_ruled(type_list<Sets...> /*sets*/, const Ruling& ruling, const Bound bound,
               const Block<T1, T2>& block) {
     [[maybe_unused]] const auto follows = [&](auto tag) {
         using Set = typename decltype(tag)::type;
-        bool follows_rule = true;
         if constexpr (Set::template pays<Bound, T1, T2>()) {
             if (Set::supported()) {
                 constexpr std::size_t length = Block<T1, T2>::length;
                 const bool certain =
                     Set::leading_certainly_same(bound, block.data1(), block.data2(), length)
                     == length;
-                follows_rule = certain ? ruling.same : !(ruling.same && ruling.beyond_doubt);
-                EXPECT_TRUE(follows_rule)
-                    << Set::name << " is " << (certain ? "certain" : "in doubt")
-                    << " of a pair that is " << (ruling.same ? "" : "not ") << "the same";
+                return follows_rule(ruling, Set::name, certain);
             }
         }
-        return follows_rule;
+        return true;
     };
     return (true && ... && follows(type_tag<Sets>{}));
 }
