@@ -138,7 +138,6 @@ class DictionaryReader {
     }
 
     std::uint64_t dimension() {
-        skip_space();
         if (peek() == '-') {
             throw NpyError("has a shape with a negative dimension");
         }
