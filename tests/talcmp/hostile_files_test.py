@@ -165,6 +165,13 @@ class FoldersThatCannotBeRead(Folder):
                     f"talcmp: {one}/names/b.npy: cannot be followed: Permission denied\n", one, two,
                     prefix=self.prefix)
 
+    def test_folder_of_a_pattern(self):
+        one, two = self.two_folders()
+        self.lock(one, 0)
+        self.expect(2, "", f"talcmp: {self.folder}/*/*.npy: cannot be matched: one of its folders "
+                           "cannot be read\n", self.folder + "/*/*.npy", two,
+                    prefix=self.prefix)
+
     def test_operand(self):
         one, two = self.two_folders()
         self.lock(one, 0)

@@ -1,5 +1,7 @@
 // The command lines that talcmp understands, and what it says of others.
 
+#include "options.h"
+
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
 #include "support/temporary_folder.h"
@@ -254,5 +256,17 @@ TEST_P(Usages, AreUnderstood) {
 }
 
 INSTANTIATE_TEST_SUITE_P(CommandLine, Usages, testing::ValuesIn(usages), name_of<Usage>);
+
+TEST(SortedWords, DoNotDependOnThoseSortedBefore) {
+    const std::vector<talcmp::Option> options = {{"--flag", talcmp::Option::Kind::flag, 'f'},
+                                                 {"--value", talcmp::Option::Kind::value}};
+    for (int times = 0; times < 2; ++times) {
+        const talcmp::Words sorted =
+            talcmp::sort_words(options, {"-f", "a", "--value=b", "--", "-c"});
+        EXPECT_TRUE(has(sorted, "--flag"));
+        EXPECT_EQ(value_of(sorted, "--value", "otherwise"), "b");
+        EXPECT_EQ(sorted.operands, (Words{"a", "-c"}));
+    }
+}
 
 } // namespace

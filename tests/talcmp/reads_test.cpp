@@ -1,7 +1,12 @@
 // How often, and how far, arrays are read until the answer is known.
 
+#include "byte_stream.h"
 #include "comparison.h"
+#include "npy_array.h"
 #include "trouble.h"
+
+#include "support/memory_bytes.h"
+#include "support/npy_bytes.h"
 
 #include <gtest/gtest.h>
 
@@ -10,8 +15,11 @@
 #include <cstdint>
 #include <limits>
 #include <memory>
+#include <optional>
 #include <string>
+#include <string_view>
 #include <utility>
+#include <vector>
 
 namespace {
 
@@ -163,5 +171,77 @@ TEST_P(OnlyWhether, DoesNotReachWhatIsBrokenBehindADifference) {
 
 INSTANTIATE_TEST_SUITE_P(Threads, OnlyWhether, testing::Values(1U, 2U, 8U),
                          testing::PrintToStringParamName());
+
+// ---- To the end of a file
+
+// The bytes of a file, which counts how many of them are asked for.
+class CountedBytes : public MemoryBytes {
+  public:
+    CountedBytes(const std::string_view bytes, std::uint64_t& asked)
+        : MemoryBytes(bytes), asked_(asked) {}
+
+    std::size_t read(const std::uint64_t offset, void* const bytes,
+                     const std::size_t count) override {
+        asked_ += count;
+        return MemoryBytes::read(offset, bytes, count);
+    }
+
+  private:
+    std::uint64_t& asked_;
+};
+
+// The same bytes, which come but once.
+class Stream : public talcmp::ByteStream {
+  public:
+    explicit Stream(std::string bytes) : bytes_(std::move(bytes)) {}
+
+    std::optional<std::uint64_t> size() const override { return std::nullopt; }
+
+  private:
+    std::size_t read_next(void* const bytes, const std::size_t count) override {
+        const std::size_t there = bytes_.copy(static_cast<char*>(bytes), count, position_);
+        position_ += there;
+        return there;
+    }
+
+    std::string bytes_;
+    std::size_t position_ = 0;
+};
+
+std::string trouble_at_the_end(const std::string& bytes, const std::uint64_t read_before) {
+    std::vector<double> elements(static_cast<std::size_t>(read_before));
+    talcmp::NpyArray array("array", std::make_unique<Stream>(bytes));
+    array.read(0, read_before, elements.data());
+    try {
+        array.check_to_end();
+    } catch (const talcmp::Trouble& trouble) {
+        return trouble.what();
+    }
+    return "none";
+}
+
+TEST(End, IsNotReadOfAFileWhoseSizeIsKnown) {
+    const std::string bytes = npy::row<double>(std::vector<double>(100000, 1.0));
+    std::uint64_t asked = 0;
+    talcmp::NpyArray array("array", std::make_unique<CountedBytes>(bytes, asked));
+    const std::uint64_t asked_for_header = asked;
+    array.check_to_end();
+    EXPECT_EQ(asked, asked_for_header);
+    EXPECT_LT(asked, 1000U);
+}
+
+TEST(End, IsReadOfAStreamFromWhereverReadingStopped) {
+    const std::string bytes = npy::row<double>(std::vector<double>(100000, 1.0));
+    for (const std::uint64_t read_before : {0U, 1U, 8192U, 99999U, 100000U}) {
+        SCOPED_TRACE(read_before);
+        EXPECT_EQ(trouble_at_the_end(bytes, read_before), "none");
+        EXPECT_EQ(trouble_at_the_end(bytes + "x", read_before),
+                  "array: has more data than its shape says; save one array per file");
+    }
+    EXPECT_EQ(trouble_at_the_end(bytes.substr(0, bytes.size() - 1), 5),
+              "array: ends after 99999 of 100000 elements; is it complete, or is it still being "
+              "written?");
+    EXPECT_EQ(trouble_at_the_end(npy::row<double>({}), 0), "none");
+}
 
 } // namespace

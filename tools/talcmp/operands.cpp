@@ -70,12 +70,15 @@ bool is_pattern(const std::string& operand) {
 FilesByName files_that_match(const std::string& pattern) {
     glob_t found = {};
     // NOLINTNEXTLINE(concurrency-mt-unsafe): no other thread is there yet.
-    const int status = ::glob(pattern.c_str(), 0, nullptr, &found);
+    const int status = ::glob(pattern.c_str(), GLOB_ERR, nullptr, &found);
     std::vector<std::string> paths;
     if (status == 0) {
         paths.assign(found.gl_pathv, found.gl_pathv + found.gl_pathc);
     }
     ::globfree(&found);
+    if (status == GLOB_ABORTED) {
+        throw Trouble(pattern, "cannot be matched: one of its folders cannot be read");
+    }
     if (paths.empty()) {
         throw Trouble(pattern, "there is no such file, and no file matches it as a pattern");
     }
