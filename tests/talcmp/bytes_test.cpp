@@ -103,7 +103,8 @@ TEST_P(Streams, AreReadInPiecesOfWhateverLength) {
         EXPECT_FALSE(stream.random_access());
         for (const auto& [offset, count] : GetParam().parts) {
             EXPECT_EQ(read(stream, offset, count),
-                      offset < bytes.size() ? bytes.substr(offset, count) : "")
+                      offset < bytes.size() ? bytes.substr(static_cast<std::size_t>(offset), count)
+                                            : "")
                 << offset << ", " << at_once << " at once";
         }
     }
