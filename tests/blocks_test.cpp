@@ -648,7 +648,8 @@ struct Ruling {
 };
 
 // Whether a set said what it may; compiled once, where the block tests are for each pair of types.
-bool follows_rule(const Ruling& ruling, const char* const set, const bool certain) {
+[[maybe_unused]] bool follows_rule(const Ruling& ruling, const char* const set,
+                                   const bool certain) {
     const bool follows = certain ? ruling.same : !(ruling.same && ruling.beyond_doubt);
     EXPECT_TRUE(follows) << set << " is " << (certain ? "certain" : "in doubt")
                          << " of a pair that is " << (ruling.same ? "" : "not ") << "the same";

@@ -264,7 +264,7 @@ TEST_P(Comparisons, TellTheFirstPlacesOfMany) {
     const std::vector<std::uint64_t> positions = {5, 9, 300000, 300001, 600000, 999990, 999999};
     std::vector<Told> expected;
     for (const std::uint64_t position : positions) {
-        ones[position] = 1;
+        ones[static_cast<std::size_t>(position)] = 1;
         expected.push_back({position, position, 0, 1});
     }
     while (!expected.empty()) {
@@ -284,16 +284,17 @@ using Indices = std::vector<std::pair<std::uint64_t, std::uint64_t>>;
 void expect_first_places(talcmp::Question question, const std::uint64_t rows,
                          const std::uint64_t columns, const Indices& indices, const Order order1,
                          const Order order2) {
-    Bytes8 first(rows * columns);
-    Bytes8 second(rows * columns);
+    Bytes8 first(static_cast<std::size_t>(rows * columns));
+    Bytes8 second(first.size());
     std::vector<Told> expected;
     for (const auto& [row, column] : indices) {
         const std::uint64_t by_rows = row * columns + column;
         const std::uint64_t by_columns = column * rows + row;
         const std::uint64_t position = order1 == Order::c ? by_rows : by_columns;
         const auto value = static_cast<std::int8_t>(expected.size() + 1);
-        first[position] = value;
-        second[order2 == Order::c ? by_rows : by_columns] = static_cast<std::int8_t>(-value);
+        const std::uint64_t position2 = order2 == Order::c ? by_rows : by_columns;
+        first[static_cast<std::size_t>(position)] = value;
+        second[static_cast<std::size_t>(position2)] = static_cast<std::int8_t>(-value);
         expected.push_back({by_rows, position, value, -value});
     }
     Listener listener;

@@ -4,6 +4,8 @@
 
 #include "../support/protected_memory.h"
 
+#include "support/type_names.h"
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -17,7 +19,7 @@ template <typename T>
 class PairSearch : public testing::Test {};
 
 using Types = testing::Types<std::int8_t, std::int64_t, float, double>;
-TYPED_TEST_SUITE(PairSearch, Types);
+TYPED_TEST_SUITE(PairSearch, Types, TypeNames);
 
 TYPED_TEST(PairSearch, FindsTheFirstDifferenceAndReadsNothingBehindTheElements) {
     using T = TypeParam;

@@ -125,7 +125,7 @@ TEST(ProgressBar, BeginsAnewWithEachPair) {
         GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
     }
     talcmp::ProgressBar bar(true);
-    for (const std::uint64_t total : {200, 1000}) {
+    for (const std::uint64_t total : {200U, 1000U}) {
         bar.begin(total);
         bar.advance(50);
         EXPECT_EQ(terminal.take(), "");

@@ -4,6 +4,8 @@
 
 #include "taldata_array_element_types.h"
 
+#include "support/type_names.h"
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -41,7 +43,7 @@ template <typename T>
 class SpecialValues : public testing::Test {};
 
 using RealTypes = testing::Types<float, double>;
-TYPED_TEST_SUITE(SpecialValues, RealTypes);
+TYPED_TEST_SUITE(SpecialValues, RealTypes, TypeNames);
 
 TYPED_TEST(SpecialValues, AreCountedWhereverTheyAre) {
     using T = TypeParam;

@@ -200,7 +200,7 @@ TEST(Positions, AreThoseOfIndices) {
     const auto indices = indices_of(shape);
     const talcmp::RowMajorOrder by_rows(array_of(shape, Order::c));
     const talcmp::RowMajorOrder by_columns(array_of(shape, Order::fortran));
-    for (std::uint64_t number = 0; number < indices.size(); ++number) {
+    for (std::size_t number = 0; number < indices.size(); ++number) {
         const Shape& index = indices[number];
         const std::uint64_t in_columns = index[0] + 3 * (index[2] + 4 * index[3]);
         EXPECT_EQ(talcmp::index_of(shape, false, number), index);

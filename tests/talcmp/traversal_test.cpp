@@ -45,12 +45,12 @@ bool advance(Shape& index, const Shape& shape) {
 
 // The numbers of the places in row-major order, in the order in which `order` stores them.
 std::vector<std::uint64_t> numbers_of(const Shape& shape, const Order order) {
-    std::vector<std::uint64_t> numbers(
-        std::accumulate(shape.begin(), shape.end(), std::uint64_t{1}, std::multiplies<>()));
+    std::vector<std::uint64_t> numbers(static_cast<std::size_t>(
+        std::accumulate(shape.begin(), shape.end(), std::uint64_t{1}, std::multiplies<>())));
     Shape index(shape.size());
     std::uint64_t number = 0;
     do {
-        numbers[position_of(shape, order, index)] = number++;
+        numbers[static_cast<std::size_t>(position_of(shape, order, index))] = number++;
     } while (advance(index, shape));
     return numbers;
 }
@@ -147,7 +147,7 @@ class Ways : public testing::TestWithParam<Way> {
             std::uint64_t last = 0;
             for (std::size_t local = 0; local < box.count; ++local) {
                 const std::uint64_t position = traversal.first_position(box, local);
-                const std::uint64_t number = numbers1_.at(position);
+                const std::uint64_t number = numbers1_.at(static_cast<std::size_t>(position));
                 const std::uint64_t order = column_major_ ? position : number;
                 const T element = element_of<T>(number);
                 if (elements1[local] != element || elements2[local] != element
@@ -156,7 +156,7 @@ class Ways : public testing::TestWithParam<Way> {
                                   << ": " << elements1[local] << " and " << elements2[local];
                     return met;
                 }
-                ++met[number];
+                ++met[static_cast<std::size_t>(number)];
                 last = order;
             }
         }
