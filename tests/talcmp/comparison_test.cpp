@@ -241,6 +241,7 @@ std::ostream& operator<<(std::ostream& out, const Told& told) {
 
 std::vector<Told> told(const std::vector<talcmp::Place>& places) {
     std::vector<Told> all;
+    all.reserve(places.size());
     for (const talcmp::Place& place : places) {
         all.push_back({place.order, place.position, static_cast<std::int8_t>(place.element1[0]),
                        static_cast<std::int8_t>(place.element2[0])});
@@ -281,7 +282,7 @@ TEST_P(Comparisons, TellTheFirstPlacesOfMany) {
 using Indices = std::vector<std::pair<std::uint64_t, std::uint64_t>>;
 
 // Arrays of `rows` rows that differ at the indices, which are in row-major order.
-void expect_first_places(talcmp::Question question, const std::uint64_t rows,
+void expect_first_places(const talcmp::Question& question, const std::uint64_t rows,
                          const std::uint64_t columns, const Indices& indices, const Order order1,
                          const Order order2) {
     Bytes8 first(static_cast<std::size_t>(rows * columns));

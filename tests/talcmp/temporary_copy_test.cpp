@@ -52,8 +52,8 @@ class Bytes : public talcmp::ArraySource {
 
 class TemporaryCopies : public testing::Test {
   protected:
-    TemporaryCopies() { ::setenv("TMPDIR", folder_.path_of("").c_str(), 1); }
-    ~TemporaryCopies() override { ::unsetenv("TMPDIR"); }
+    void SetUp() override { ::setenv("TMPDIR", folder_.path_of("").c_str(), 1); }
+    void TearDown() override { ::unsetenv("TMPDIR"); }
 
     talcmp::TemporaryCopy take() {
         return {std::make_unique<Bytes>(checked_),

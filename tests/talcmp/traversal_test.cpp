@@ -107,9 +107,14 @@ const Way ways[] = {
     {"EverySecondRowOfColumns", {20000, 2}, "::2", Order::fortran, Order::fortran, 20000},
     {"EveryFarRow", {20000, 2}, "5::999", Order::fortran, Order::c, 42},
     {"OneColumn", {20000, 2}, ":,1", Order::c, Order::fortran, 20000},
-    {"Middle", {90, 100, 11}, "3:80,1:99,2:9", Order::c, Order::c, 77 * 98 * 7},
-    {"MiddleOfOtherOrders", {90, 100, 11}, "3:80,1:99,2:9", Order::c, Order::fortran, 77 * 98 * 7},
-    {"Steps", {90, 100, 11}, "3::3,1::7,::2", Order::fortran, Order::c, 29 * 15 * 6},
+    {"Middle", {90, 100, 11}, "3:80,1:99,2:9", Order::c, Order::c, std::uint64_t{77} * 98 * 7},
+    {"MiddleOfOtherOrders",
+     {90, 100, 11},
+     "3:80,1:99,2:9",
+     Order::c,
+     Order::fortran,
+     std::uint64_t{77} * 98 * 7},
+    {"Steps", {90, 100, 11}, "3::3,1::7,::2", Order::fortran, Order::c, std::uint64_t{29} * 15 * 6},
 };
 
 class Ways : public testing::TestWithParam<Way> {
