@@ -71,6 +71,12 @@ def run_on_terminal(*arguments, columns=80, output=True, errors=True, stdin=None
         return process.returncode, terminal.text + elsewhere.read().decode()
 
 
+def heed_signals():
+    """What nohup or a shell's & has started ignores some of them, and so would talcmp."""
+    for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):
+        signal.signal(number, signal.SIG_DFL)
+
+
 class Folder(unittest.TestCase):
     def setUp(self):
         folder = tempfile.TemporaryDirectory()
@@ -338,7 +344,7 @@ class Progress(Folder):
         for name in ("dumb", "", None):
             self.assertEqual(self.run_slowly(1, TERM=name), (0, ""))
 
-    def check_signal(self, number, sent_by, before=None):
+    def check_signal(self, number, sent_by, before=heed_signals):
         """Sends the signal while the bar is shown."""
         sent = []
 
