@@ -3,12 +3,14 @@
 #include "taldata_array_element_types.h"
 
 #include "../support/element_types.h"
+#include "../support/emulation.h"
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
 #include "support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <complex>
 #include <cstddef>
@@ -332,6 +334,9 @@ TEST(Parts, ThatAnArrayHasNotAreTrouble) {
 
 // ---- All types, versions, places and alignments
 
+// Starting talcmp takes an emulator long. Seven leaves out no version of the format and no type.
+constexpr std::size_t stride = std::min<std::size_t>(emulated_stride, 7);
+
 const std::string type_names[] = {"int8",    "uint8",   "int16",     "uint16",
                                   "int32",   "uint32",  "int64",     "uint64",
                                   "float32", "float64", "complex64", "complex128"};
@@ -355,7 +360,7 @@ std::vector<std::string> files_of(type_list<Types...> /*types*/, const int versi
 TEST(EveryType, IsReadInEveryVersionAndAtEveryOffset) {
     const TemporaryFolder folder;
     const auto plain = files_of(element_type_list{}, 1, 0);
-    for (std::size_t variant = 0; variant < 24; ++variant) {
+    for (std::size_t variant = 0; variant < 24; variant += stride) {
         const int version = 1 + static_cast<int>(variant % 3);
         const auto files = files_of(element_type_list{}, version, variant / 3);
         for (std::size_t i = 0; i < files.size(); ++i) {
@@ -393,7 +398,11 @@ TEST(OtherByteOrder, ValuesAreToldAsWhatTheyAre) {
 TEST(EveryType, IsComparedByValueWithEveryOther) {
     const TemporaryFolder folder;
     const auto files = files_of(element_type_list{}, 1, 0);
+    std::size_t pairs = 0;
     for_each_pair([&](const ElementType& type1, const ElementType& type2) {
+        if (++pairs % stride != 0) {
+            return;
+        }
         const std::string name1 = name_of_type(type1.id);
         const std::string name2 = name_of_type(type2.id);
         const std::string& first = files[static_cast<std::size_t>(type1.id - 1)];

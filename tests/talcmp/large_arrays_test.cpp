@@ -84,8 +84,8 @@ TEST_F(ExhaustiveLargeArrays, DifferInTheLastElement) {
 }
 
 TEST_F(ExhaustiveLargeArrays, TakeLittleMemory) {
-    const std::string first = write_doubles("a.npy", "False", "(1073741824,)", 8 * GiB);
-    const std::string second = write_doubles("b.npy", "False", "(1073741824,)", 8 * GiB);
+    const std::string first = write_doubles("a.npy", "False", "(603979776,)", 9 * GiB / 2);
+    const std::string second = write_doubles("b.npy", "False", "(603979776,)", 9 * GiB / 2);
     expect_same(run_talcmp({first, second}));
 }
 
