@@ -62,6 +62,33 @@ class BrokenArray : public Bytes {
     std::atomic<int>& failures_;
 };
 
+// Cannot be read, and of what several threads read at once the first elements fail first.
+class BrokenInOrder : public Bytes {
+  public:
+    void read(const std::uint64_t first, std::uint64_t /*count*/, void* /*elements*/) override {
+        if (first == 0) {
+            wait_for(others_begun_);
+            first_failed_ = true;
+        } else {
+            others_begun_ = true;
+            wait_for(first_failed_);
+            std::this_thread::sleep_for(20ms); // until that is known
+        }
+        throw talcmp::Trouble("broken.npy", "cannot be read from " + std::to_string(first) + " on");
+    }
+
+  private:
+    // Not for ever, as there may be no other thread.
+    static void wait_for(const std::atomic<bool>& event) {
+        for (int patience = 200; !event && patience > 0; --patience) {
+            std::this_thread::sleep_for(1ms);
+        }
+    }
+
+    std::atomic<bool> others_begun_ = false;
+    std::atomic<bool> first_failed_ = false;
+};
+
 // Comes but once, by columns, and cannot be read.
 class BrokenPipe : public talcmp::ArraySource {
   public:
@@ -149,6 +176,16 @@ TEST_P(BrokenFiles, AreTroubleWhereTheyFailBeforeTheyDiffer) {
 
 TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceThatFails) {
     EXPECT_EQ(trouble_of([] { compare(1, length - 1); }), "broken.npy: cannot be read from 0 on");
+}
+
+TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceWhateverFailsLater) {
+    EXPECT_EQ(trouble_of([] {
+                  NoListener listener;
+                  talcmp::compare({"broken.npy", std::make_unique<BrokenInOrder>()},
+                                  {"other.npy", std::make_unique<ZerosAndOne>(length)},
+                                  question_of(GetParam()), listener);
+              }),
+              "broken.npy: cannot be read from 0 on");
 }
 
 TEST(BrokenFile, IsReadNoFurtherThanToWhereItFails) {
