@@ -142,6 +142,22 @@ TEST(ProgressBar, BeginsAnewWithEachPair) {
     }
 }
 
+TEST(ProgressBar, TakesItselfOffAtItsEnd) {
+    ::setenv("TERM", "xterm", 1);
+    const TerminalAsErrors terminal;
+    if (!terminal.is_there()) {
+        GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
+    }
+    {
+        talcmp::ProgressBar bar(true);
+        bar.begin(100);
+        std::this_thread::sleep_for(patience);
+        bar.advance(50);
+        EXPECT_NE(terminal.take().find("]  50 %"), std::string::npos);
+    }
+    EXPECT_EQ(terminal.take(), "\r\x1B[K");
+}
+
 TEST(ProgressBar, IsNotDrawnWhereItIsNotWanted) {
     ::setenv("TERM", "xterm", 1);
     const TerminalAsErrors terminal;
