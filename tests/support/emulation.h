@@ -5,9 +5,9 @@
 
 #include <cstddef>
 
-// An emulator takes twenty times as long, and a build that counts lines nearly so. There only every
-// so many-th step is made of loops that are the same code everywhere and run in full elsewhere.
-#ifdef TALNUMERICARRAY_SLOW
+// An emulator takes twenty times as long. There only every so many-th step is made of loops that
+// are the same code on every platform and run in full on this machine's.
+#ifdef TALNUMERICARRAY_EMULATED
 inline constexpr std::size_t emulated_stride = 8;
 #else
 inline constexpr std::size_t emulated_stride = 1;
