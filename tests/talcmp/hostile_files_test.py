@@ -199,6 +199,13 @@ class NoRegularFiles(Folder):
         self.expect(2, f"{one}/a.npy {two}/a.npy are the same\n" + summary(same=1, trouble=2),
                     f"talcmp: {one}/p.npy: {self.what}talcmp: {two}/s.npy: {self.what}", one, two)
 
+    def test_in_both_folders(self):
+        one, two = self.path("one"), self.path("two")
+        os.remove(f"{two}/p.npy")
+        os.mkfifo(f"{two}/p.npy")
+        self.expect(2, f"{one}/a.npy {two}/a.npy are the same\n" + summary(same=1, trouble=1),
+                    f"talcmp: {one}/p.npy: {self.what}", one, two)
+
     def test_of_patterns(self):
         one, two = self.path("one"), self.path("two")
         self.expect(2, f"{one}/a.npy {two}/a.npy are the same\n" + summary(same=1, trouble=1),
