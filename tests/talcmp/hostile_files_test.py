@@ -220,6 +220,14 @@ class NoRegularFiles(Folder):
                            "file first\n", "/dev/null", self.path("one/a.npy"))
 
 
+class FilesOfOneName(Folder):
+    def test_that_a_pattern_matches_are_trouble(self):
+        self.two_folders()
+        pattern, one, two = self.path("*/a.npy"), self.path("one"), self.path("two")
+        self.expect(2, "", f"talcmp: {pattern}: matches two files of one name, {one}/a.npy and "
+                    f"{two}/a.npy; files are matched by name\n", pattern, two + "/*.npy")
+
+
 class DamagedArchives(Folder):
     """A member is read to its end before a difference is believed."""
 
