@@ -13,6 +13,7 @@ import subprocess
 import sys
 import tempfile
 import termios
+import threading
 import time
 import unittest
 
@@ -51,10 +52,10 @@ class Terminal:
 
 
 def run_on_terminal(*arguments, columns=80, output=True, errors=True, stdin=None, notice=None,
-                    before=None, folder=None, **variables):
+                    before=None, started=None, folder=None, **variables):
     """Runs talcmp with a terminal as its standard output or error, or both; what goes elsewhere is
-    behind what is on the terminal. `notice` is called with the process and the text so far. A
-    variable that is None is not set."""
+    behind what is on the terminal. `started` is called with the process, `notice` with that and
+    the text so far. A variable that is None is not set."""
     terminal = Terminal(columns)
     environment = {name: value for name, value in os.environ.items() if name != "NO_COLOR"}
     environment.update({"TERM": "xterm"}, **variables)
@@ -65,6 +66,8 @@ def run_on_terminal(*arguments, columns=80, output=True, errors=True, stdin=None
             stdin=stdin if stdin is not None else subprocess.DEVNULL,
             stdout=terminal.device if output else elsewhere,
             stderr=terminal.device if errors else elsewhere, preexec_fn=before)
+        if started:
+            started(process)
         terminal.read_until_end(process,
                                 (lambda text: notice(process, text)) if notice else lambda _: None)
         elsewhere.seek(0)
@@ -366,6 +369,16 @@ class Progress(Folder):
                 self.assertEqual(status, -number)
                 self.assertEqual(len(self.shares(text)), 1)
                 self.assertEqual(set(os.listdir(self.folder)), before)
+
+    def test_signals_before_there_is_a_bar(self):
+        read_end, write_end = os.pipe()
+        os.write(write_end, self.contents("C")[:128])  # the header, so that it waits for elements
+        status, text = run_on_terminal(
+            "-", self.other, stdin=read_end, before=heed_signals,
+            started=lambda process: threading.Timer(0.5, process.terminate).start())
+        os.close(read_end)
+        os.close(write_end)
+        self.assertEqual((status, text), (-signal.SIGTERM, ""))
 
     def test_two_signals_end_it_too(self):
         def both(process):
