@@ -193,9 +193,10 @@ class NoRegularFiles(Folder):
     def test_in_folders(self):
         one, two = self.path("one"), self.path("two")
         with socket.socket(socket.AF_UNIX) as unix:
-            folder = os.open(two, os.O_RDONLY)  # as names of sockets have to be short
-            unix.bind(f"/proc/self/fd/{folder}/s.npy")
-            os.close(folder)
+            before = os.getcwd()
+            os.chdir(two)  # as names of sockets have to be short
+            unix.bind("s.npy")
+            os.chdir(before)
         self.expect(2, f"{one}/a.npy {two}/a.npy are the same\n" + summary(same=1, trouble=2),
                     f"talcmp: {one}/p.npy: {self.what}talcmp: {two}/s.npy: {self.what}", one, two)
 

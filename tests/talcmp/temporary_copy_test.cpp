@@ -132,6 +132,9 @@ TEST_F(TemporaryCopies, AreTroubleWhereThereIsNoFolder) {
 }
 
 TEST_F(TemporaryCopies, AreTroubleWhereTheyWereCutShort) {
+    if (!fs::exists("/proc/self/fd")) {
+        GTEST_SKIP() << "NOT TESTED: /proc is not mounted, where the file could be found";
+    }
     auto copy = take();
     ASSERT_EQ(::truncate(open_file().c_str(), 50000), 0);
     std::vector<std::uint8_t> elements(10);
