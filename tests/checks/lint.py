@@ -9,6 +9,7 @@ that, its sources are linted one by one, which tells what is wrong and where.
 """
 
 import json
+import os
 import re
 import shlex
 import subprocess
@@ -19,7 +20,7 @@ from dataclasses import dataclass
 from pathlib import Path
 
 ROOT = Path(__file__).resolve().parents[2]
-WORKERS = 2
+WORKERS = os.cpu_count()
 TOGETHER = 9  # sources
 
 
@@ -111,7 +112,7 @@ def main():
                             for path in paths if str(path) in commands))
     with ThreadPoolExecutor(WORKERS) as pool:
         clean = pool.map(lambda item: is_clean(build, *item), enumerate(groups))
-        done = {source.path for group, is_clean in zip(groups, clean) if is_clean
+        done = {source.path for group, passed in zip(groups, clean) if passed
                 for source in group}
         alone = [path for path in paths if path not in done]
         found = list(pool.map(lambda path: complaints("-p", str(build), str(path)), alone))

@@ -38,6 +38,14 @@ class Bytes : public talcmp::ArraySource {
     talcmp::Shape shape_ = {length};
 };
 
+// Not for ever, as there may be no other thread.
+template <typename Event>
+void wait_for(const Event& has_come) {
+    for (int patience = 200; !has_come() && patience > 0; --patience) {
+        std::this_thread::sleep_for(1ms);
+    }
+}
+
 // Zeros, of which those from `broken` on cannot be read. The first are handed out only after the
 // others have failed, if anybody asks for those meanwhile.
 class BrokenArray : public Bytes {
@@ -46,9 +54,7 @@ class BrokenArray : public Bytes {
         : broken_(broken), failures_(failures) {}
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
-        for (int patience = 200; first == 0 && failures_ == 0 && patience > 0; --patience) {
-            std::this_thread::sleep_for(1ms);
-        }
+        wait_for([&] { return first != 0 || failures_ != 0; });
         if (first + count > broken_) {
             failures_ += 1;
             throw talcmp::Trouble("broken.npy",
@@ -67,24 +73,17 @@ class BrokenInOrder : public Bytes {
   public:
     void read(const std::uint64_t first, std::uint64_t /*count*/, void* /*elements*/) override {
         if (first == 0) {
-            wait_for(others_begun_);
+            wait_for([this] { return others_begun_.load(); });
             first_failed_ = true;
         } else {
             others_begun_ = true;
-            wait_for(first_failed_);
+            wait_for([this] { return first_failed_.load(); });
             std::this_thread::sleep_for(20ms); // until that is known
         }
         throw talcmp::Trouble("broken.npy", "cannot be read from " + std::to_string(first) + " on");
     }
 
   private:
-    // Not for ever, as there may be no other thread.
-    static void wait_for(const std::atomic<bool>& event) {
-        for (int patience = 200; !event && patience > 0; --patience) {
-            std::this_thread::sleep_for(1ms);
-        }
-    }
-
     std::atomic<bool> others_begun_ = false;
     std::atomic<bool> first_failed_ = false;
 };

@@ -118,58 +118,58 @@ class TerminalAsErrors {
 
 constexpr auto patience = std::chrono::milliseconds(550);
 
-TEST(ProgressBar, BeginsAnewWithEachPair) {
-    ::setenv("TERM", "xterm", 1);
-    const TerminalAsErrors terminal;
-    if (!terminal.is_there()) {
-        GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
+class ProgressBar : public testing::Test {
+  protected:
+    void SetUp() override {
+        ::setenv("TERM", "xterm", 1);
+        if (!terminal_.is_there()) {
+            GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
+        }
     }
+
+    std::string take() const { return terminal_.take(); }
+
+  private:
+    TerminalAsErrors terminal_;
+};
+
+TEST_F(ProgressBar, BeginsAnewWithEachPair) {
     talcmp::ProgressBar bar(true);
     for (const std::uint64_t total : {200U, 1000U}) {
         bar.begin(total);
         bar.advance(50);
-        EXPECT_EQ(terminal.take(), "");
+        EXPECT_EQ(take(), "");
         std::this_thread::sleep_for(patience);
         bar.advance(50);
         bar.advance(50); // too soon after the last time
-        const std::string drawn = terminal.take();
+        const std::string drawn = take();
         EXPECT_NE(drawn.find(total == 200 ? "]  50 %" : "]  10 %"), std::string::npos) << drawn;
         EXPECT_EQ(std::count(drawn.begin(), drawn.end(), '%'), 1) << drawn;
         talcmp::clear_status();
-        EXPECT_EQ(terminal.take(), "\r\x1B[K");
+        EXPECT_EQ(take(), "\r\x1B[K");
         talcmp::clear_status();
-        EXPECT_EQ(terminal.take(), "");
+        EXPECT_EQ(take(), "");
     }
 }
 
-TEST(ProgressBar, TakesItselfOffAtItsEnd) {
-    ::setenv("TERM", "xterm", 1);
-    const TerminalAsErrors terminal;
-    if (!terminal.is_there()) {
-        GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
-    }
+TEST_F(ProgressBar, TakesItselfOffAtItsEnd) {
     {
         talcmp::ProgressBar bar(true);
         bar.begin(100);
         std::this_thread::sleep_for(patience);
         bar.advance(50);
-        EXPECT_NE(terminal.take().find("]  50 %"), std::string::npos);
+        EXPECT_NE(take().find("]  50 %"), std::string::npos);
     }
-    EXPECT_EQ(terminal.take(), "\r\x1B[K");
+    EXPECT_EQ(take(), "\r\x1B[K");
 }
 
-TEST(ProgressBar, IsNotDrawnWhereItIsNotWanted) {
-    ::setenv("TERM", "xterm", 1);
-    const TerminalAsErrors terminal;
-    if (!terminal.is_there()) {
-        GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
-    }
+TEST_F(ProgressBar, IsNotDrawnWhereItIsNotWanted) {
     talcmp::ProgressBar bar(false);
     bar.begin(100);
     std::this_thread::sleep_for(patience);
     bar.advance(50);
     talcmp::clear_status();
-    EXPECT_EQ(terminal.take(), "");
+    EXPECT_EQ(take(), "");
 }
 
 } // namespace
