@@ -1,5 +1,6 @@
 // The table of element sizes for programs without a runtime that defines one. It is an archive
-// member of its own, so that the linker leaves it out where the runtime's table is there.
+// member of its own, so that the linker leaves it out where the runtime's table is there, and weak,
+// so that it gives way even where the linker is told to take all members.
 
 #include "taldata_array_element_types.h"
 
@@ -8,15 +9,5 @@
 #include "talnumericarray.h"
 #pragma GCC visibility pop
 
-constexpr std::size_t TalNumericArray_typeSizeTable[13] = {0, 1, 1, 2, 2, 4, 4, 8, 8, 4, 8, 8, 16};
-
-namespace {
-
-template <typename... Types>
-constexpr bool table_agrees(type_list<Types...> /*types*/) noexcept {
-    return (... && (TalNumericArray_typeSizeTable[element_type_id<Types>] == sizeof(Types)));
-}
-
-static_assert(table_agrees(element_type_list{}));
-
-} // namespace
+[[gnu::weak]] extern const std::size_t TalNumericArray_typeSizeTable[13] = {0, 1, 1, 2, 2, 4, 4,
+                                                                            8, 8, 4, 8, 8, 16};

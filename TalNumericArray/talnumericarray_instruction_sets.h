@@ -1,25 +1,92 @@
-// The block test, compiled for each instruction set that is worth it, and the choice among them.
+// The loops over elements that are certainly the same, compiled for each instruction set that is
+// worth it, and the choice among them.
 
 #ifndef TALNUMERICARRAY_INSTRUCTION_SETS_H
 #define TALNUMERICARRAY_INSTRUCTION_SETS_H
 
 #include "taldata_array_element_types.h"
-#include "talnumericarray_sameq_blocks.h"
+#include "talnumericarray_sameq_certainty.h"
 #include "to_type.h"
 #include "type_properties.h"
 
+#include <algorithm>
 #include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <limits>
 #include <type_traits>
+
+#if defined(__SSE2__)
+#    include <immintrin.h>
+#elif defined(__ARM_NEON)
+#    include <arm_neon.h>
+#endif
+
+// The order of bytes matters where numbers are widened.
+#if (defined(__SSE2__) || defined(__ARM_NEON)) && __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__
+#    define TALNUMERICARRAY_HAS_VECTORS 1
+#else
+#    define TALNUMERICARRAY_HAS_VECTORS 0
+#endif
 
 #pragma GCC visibility push(hidden)
 
 namespace talnumericarray {
 
+// The smallest page of any platform's memory; the larger ones are multiples of it.
+inline constexpr std::size_t page_bytes = 4096;
+
+// The number of whole elements from `data` on to the end of its page.
+template <typename T>
+inline std::size_t elements_before_page_end(const T* const data) noexcept {
+    const std::size_t behind = reinterpret_cast<std::uintptr_t>(data) % page_bytes;
+    return (page_bytes - behind) / sizeof(T);
+}
+
+// The same of both arrays, or `len` if that is less.
+template <typename T1, typename T2>
+inline std::size_t elements_before_page_end(const T1* const data1, const T2* const data2,
+                                            const std::size_t len) noexcept {
+    return std::min({len, elements_before_page_end(data1), elements_before_page_end(data2)});
+}
+
+// ---- Integers of some size, and what becomes of them when they are widened
+
+template <std::size_t size>
+using unsigned_of_size = std::conditional_t<
+    size == 1, std::uint8_t,
+    std::conditional_t<size == 2, std::uint16_t,
+                       std::conditional_t<size == 4, std::uint32_t, std::uint64_t>>>;
+
+template <std::size_t size>
+using signed_of_size = std::make_signed_t<unsigned_of_size<size>>;
+
+template <typename T, std::size_t times>
+using wider = std::conditional_t<std::is_signed_v<T>, signed_of_size<times * sizeof(T)>,
+                                 unsigned_of_size<times * sizeof(T)>>;
+
 // ---- The sets
 //
-// Each has one function, which is `leading_certainly_same` compiled for it. What that calls is
-// inlined into it, so that nothing else of the program is compiled for the set. `pays` tells where
-// it is faster than the sets behind it and the element test.
+// Each set says for which bounds and types it has loops, and how many leading elements of two
+// arrays they find to be certainly the same.
+
+// The elements one by one.
+struct none {
+    static constexpr const char* name = "none";
+
+    static bool supported() noexcept { return true; }
+
+    template <typename Bound, typename T1, typename T2>
+    static constexpr bool has_loop = false;
+};
+
+#if TALNUMERICARRAY_HAS_VECTORS
+
+namespace for_baseline {
+#    define TALNUMERICARRAY_VECTOR_BYTES 16
+#    include "talnumericarray_sameq_vectors.h"
+#    undef TALNUMERICARRAY_VECTOR_BYTES
+} // namespace for_baseline
 
 // What the compiler has been told that the processor has.
 struct baseline {
@@ -27,59 +94,93 @@ struct baseline {
 
     static bool supported() noexcept { return true; }
 
-    // NEON on 32-bit ARM takes subnormal singles for zero and knows no doubles; on 64-bit ARM it
-    // does not convert 64-bit integers to singles. SSE2 converts no 64-bit integers at all, and GCC
-    // is slow at testing a vector of two doubles.
+    // NEON on 32-bit ARM takes subnormal numbers for zero and knows no doubles, so that it may only
+    // look at the bits of reals.
     template <typename Bound, typename T1, typename T2>
-    static constexpr bool pays() noexcept {
-        [[maybe_unused]] constexpr bool integers = std::is_integral_v<comparison_t<T1, T2>>;
-        [[maybe_unused]] constexpr bool singles = std::is_same_v<comparison_t<T1, T2>, float>;
-        [[maybe_unused]] constexpr bool near = !std::is_same_v<Bound, equality>;
-#if defined(__arm__)
-        return integers;
-#elif defined(__aarch64__)
-        return integers || near || !singles || sizeof(T1) < 8;
-#elif defined(__SSE2__) && !defined(__clang__)
-        return integers || near || std::is_same_v<T1, T2> || (singles && sizeof(T1) < 8);
-#else
-        return true;
-#endif
-    }
+#    if defined(__arm__)
+    static constexpr bool has_loop =
+        std::is_integral_v<
+            comparison_t<T1, T2>> || (std::is_same_v<T1, T2> && std::is_same_v<Bound, equality>);
+#    else
+    static constexpr bool has_loop = true;
+#    endif
+
+    template <typename T1, typename T2>
+    static constexpr std::size_t elements = for_baseline::elements_of_vectors<T1, T2>;
 
     template <typename Bound, typename T1, typename T2>
-    [[gnu::noinline]] static std::size_t leading_certainly_same(const Bound bound, const T1* data1,
-                                                                const T2* data2,
-                                                                const std::size_t len) noexcept {
-        return talnumericarray::leading_certainly_same(bound, data1, data2, len);
+    static std::size_t leading_certainly_same(const Bound bound, const T1* const data1,
+                                              const T2* const data2, const std::size_t end,
+                                              const std::size_t len) noexcept {
+        return for_baseline::leading_certainly_same(bound, data1, data2, end, len);
     }
 };
 
+#endif
+
 #if defined(__x86_64__)
+
+#    if defined(__clang__)
+#        pragma clang attribute push(__attribute__((target("avx2,fma"))), apply_to = function)
+#    else
+#        pragma GCC push_options
+#        pragma GCC target("avx2,fma")
+#    endif
+namespace for_avx2 {
+#    define TALNUMERICARRAY_VECTOR_BYTES 32
+#    include "talnumericarray_sameq_vectors.h"
+#    undef TALNUMERICARRAY_VECTOR_BYTES
+} // namespace for_avx2
+#    if defined(__clang__)
+#        pragma clang attribute pop
+#    else
+#        pragma GCC pop_options
+#    endif
 
 struct avx2 {
     static constexpr const char* name = "AVX2";
 
-    static bool supported() noexcept { return static_cast<bool>(__builtin_cpu_supports("avx2")); }
-
-    // There is no instruction that converts 64-bit integers, and GCC does so one at a time.
-    template <typename Bound, typename T1, typename T2>
-    static constexpr bool pays() noexcept {
-#    if defined(__clang__)
-        return true;
-#    else
-        constexpr bool converts = std::is_integral_v<T1> && sizeof(T1) == 8
-                                  && std::is_floating_point_v<comparison_t<T1, T2>>;
-        return !converts || !std::is_same_v<Bound, equality>;
-#    endif
+    static bool supported() noexcept {
+        return static_cast<bool>(__builtin_cpu_supports("avx2"))
+               && static_cast<bool>(__builtin_cpu_supports("fma"));
     }
 
     template <typename Bound, typename T1, typename T2>
-    [[gnu::noinline, gnu::target("avx2")]] static std::size_t
-    leading_certainly_same(const Bound bound, const T1* data1, const T2* data2,
-                           const std::size_t len) noexcept {
-        return talnumericarray::leading_certainly_same(bound, data1, data2, len);
+    static constexpr bool has_loop = true;
+
+    template <typename T1, typename T2>
+    static constexpr std::size_t elements = for_avx2::elements_of_vectors<T1, T2>;
+
+    template <typename Bound, typename T1, typename T2>
+    static std::size_t leading_certainly_same(const Bound bound, const T1* const data1,
+                                              const T2* const data2, const std::size_t end,
+                                              const std::size_t len) noexcept {
+        return for_avx2::leading_certainly_same(bound, data1, data2, end, len);
     }
 };
+
+#    if defined(__clang__)
+#        pragma clang attribute push(                                                              \
+            __attribute__((target("fma,avx512f,avx512bw,avx512dq,avx512vl"))),                     \
+            apply_to = function)
+#    else
+#        pragma GCC push_options
+#        pragma GCC diagnostic push
+// GCC 12 takes what its own header leaves undefined for a mistake.
+#        pragma GCC diagnostic ignored "-Wmaybe-uninitialized"
+#        pragma GCC target("fma,avx512f,avx512bw,avx512dq,avx512vl")
+#    endif
+namespace for_avx512 {
+#    define TALNUMERICARRAY_VECTOR_BYTES 64
+#    include "talnumericarray_sameq_vectors.h"
+#    undef TALNUMERICARRAY_VECTOR_BYTES
+} // namespace for_avx512
+#    if defined(__clang__)
+#        pragma clang attribute pop
+#    else
+#        pragma GCC diagnostic pop
+#        pragma GCC pop_options
+#    endif
 
 struct avx512 {
     static constexpr const char* name = "AVX-512";
@@ -91,114 +192,129 @@ struct avx512 {
                && static_cast<bool>(__builtin_cpu_supports("avx512vl"));
     }
 
-    // For equality of reals GCC's loops are hardly faster than those for AVX2, but for conversions
-    // that only this set has.
     template <typename Bound, typename T1, typename T2>
-    static constexpr bool pays() noexcept {
-#    if defined(__clang__)
-        return true;
-#    else
-        constexpr bool converted_by_avx2 =
-            std::is_floating_point_v<T1> || sizeof(T1) < 4 || std::is_same_v<T1, BIT32>;
-        return std::is_integral_v<comparison_t<T1, T2>> || is_complex_v<T2> || !converted_by_avx2
-               || !std::is_same_v<Bound, equality>;
-#    endif
-    }
+    static constexpr bool has_loop = true;
+
+    template <typename T1, typename T2>
+    static constexpr std::size_t elements = for_avx512::elements_of_vectors<T1, T2>;
 
     template <typename Bound, typename T1, typename T2>
-#    if defined(__clang__)
-    [[gnu::noinline, gnu::target("avx512f,avx512bw,avx512dq,avx512vl")]]
-#    else
-    [[gnu::noinline, gnu::target("avx512f,avx512bw,avx512dq,avx512vl,prefer-vector-width=512")]]
-#    endif
-    static std::size_t
-    leading_certainly_same(const Bound bound, const T1* data1, const T2* data2,
-                           const std::size_t len) noexcept {
-        return talnumericarray::leading_certainly_same(bound, data1, data2, len);
+    static std::size_t leading_certainly_same(const Bound bound, const T1* const data1,
+                                              const T2* const data2, const std::size_t end,
+                                              const std::size_t len) noexcept {
+        return for_avx512::leading_certainly_same(bound, data1, data2, end, len);
     }
 };
 
 #endif
 
-// The sets that there are block tests for, the best one first. TALNUMERICARRAY_INSTRUCTION_SETS, a
-// list with commas between, chooses fewer of them.
-#if defined(__OPTIMIZE_SIZE__)
-using instruction_sets = type_list<>;
-#elif defined(TALNUMERICARRAY_INSTRUCTION_SETS)
+// The sets that there are loops for, the best one first. TALNUMERICARRAY_INSTRUCTION_SETS, a list
+// with commas between, chooses others.
+#if defined(TALNUMERICARRAY_INSTRUCTION_SETS)
 using instruction_sets = type_list<TALNUMERICARRAY_INSTRUCTION_SETS>;
+#elif defined(__OPTIMIZE_SIZE__)
+using instruction_sets = type_list<none>;
 #elif defined(__x86_64__)
 using instruction_sets = type_list<avx512, avx2, baseline>;
-#elif defined(__SSE2__) || defined(__ARM_NEON)
+#elif TALNUMERICARRAY_HAS_VECTORS
 using instruction_sets = type_list<baseline>;
 #else
-using instruction_sets = type_list<>;
+using instruction_sets = type_list<none>;
 #endif
 
 // ---- The choice
 
-// Whether a block test of any of the sets is ever faster than the element test. Between reals, one
-// for nearness is wherever one for equality is.
-template <typename T1, typename T2, typename... Sets>
-constexpr bool blocks_pay(type_list<Sets...> /*sets*/) noexcept {
-    if constexpr ((element_type_id<T1>) > element_type_id<T2>) {
-        return blocks_pay<T2, T1>(type_list<Sets...>{});
-    } else if constexpr (is_complex_v<T1>) {
-        return blocks_pay<to_real_type_t<T1>, to_real_type_t<T2>>(type_list<Sets...>{});
-    } else {
-        using T = comparison_t<T1, T2>;
-        using Bound = std::conditional_t<std::is_integral_v<T>, equality, nearness<T>>;
-        return (... || Sets::template pays<Bound, T1, T2>());
-    }
+template <typename Bound, typename T1, typename T2, typename... Sets>
+constexpr bool any_has_loop(type_list<Sets...> /*sets*/) noexcept {
+    return (... || Sets::template has_loop<Bound, T1, T2>);
 }
 
-// `leading_certainly_same` by the best set that the processor has and that pays; 0 if none does.
+// Leading elements that are certainly the same, by the best set that the processor has and that has
+// vectors as short as what lies before the next end of a page.
 template <typename... Sets, typename Bound, typename T1, typename T2>
-inline std::size_t by_best_set(type_list<Sets...> /*sets*/, const Bound bound, const T1* data1,
+inline std::size_t by_best_set(type_list<Sets...> sets, const Bound bound, const T1* data1,
                                const T2* data2, const std::size_t len) noexcept {
-    std::size_t passed = 0;
-    [[maybe_unused]] const auto ask = [&](auto tag) noexcept {
-        using Set = typename decltype(tag)::type;
-        if constexpr (Set::template pays<Bound, T1, T2>()) {
-            if (Set::supported()) {
-                passed = Set::leading_certainly_same(bound, data1, data2, len);
+    if constexpr (!any_has_loop<Bound, T1, T2>(sets)) {
+        return leading_one_by_one(bound, data1, data2, len);
+    }
+#if TALNUMERICARRAY_HAS_VECTORS
+    else {
+        for (std::size_t passed = 0;;) {
+            const std::size_t left = len - passed;
+            const std::size_t end = elements_before_page_end(data1 + passed, data2 + passed, left);
+            std::size_t found = 0;
+            const auto ask = [&](auto tag) noexcept {
+                using Set = typename decltype(tag)::type;
+                if (end < Set::template elements<T1, T2> || !Set::supported()) {
+                    return false;
+                }
+                found =
+                    Set::leading_certainly_same(bound, data1 + passed, data2 + passed, end, left);
                 return true;
+            };
+            if ((... || ask(type_tag<Sets>{}))) {
+                return passed + found;
+            }
+            found =
+                for_baseline::leading_certainly_same(bound, data1 + passed, data2 + passed, end);
+            passed += found;
+            if (passed == len || found < end || found == 0) {
+                return passed;
             }
         }
-        return false;
-    };
-    (void)(... || ask(type_tag<Sets>{}));
-    return passed;
+    }
+#endif
 }
 
 // By what is known of the tolerance at this moment. For a pair of types in the order of the list.
+//
+// Where vectors find out only whether numbers are equal, they do that first; and equal numbers need
+// no bound.
 template <typename Sets, typename T1, typename T2>
 [[gnu::noinline]] std::size_t by_known_bound(const talreal& tol, const T1* data1, const T2* data2,
                                              const std::size_t len) noexcept {
     using T = comparison_t<T1, T2>;
-    if constexpr (std::is_floating_point_v<T>) {
+    if constexpr (std::is_integral_v<T>) {
+        return by_best_set(Sets{}, equality{}, data1, data2, len);
+    } else {
+        constexpr bool equal_first = !any_has_loop<nearness<T>, T1, T2>(Sets{});
+        std::size_t passed = 0;
+        if constexpr (equal_first) {
+            passed = by_best_set(Sets{}, equality{}, data1, data2, len);
+            if (passed == len) {
+                return passed;
+            }
+        }
         const T divisor = certain_divisor(static_cast<T>(tol));
         if (divisor != 0) {
-            return by_best_set(Sets{}, nearness<T>{divisor}, data1, data2, len);
+            return passed
+                   + by_best_set(Sets{}, nearness<T>{divisor}, data1 + passed, data2 + passed,
+                                 len - passed);
         }
+        return equal_first ? passed : by_best_set(Sets{}, equality{}, data1, data2, len);
     }
-    return by_best_set(Sets{}, equality{}, data1, data2, len);
 }
 
 // The number of leading elements of two arrays of `len` that can be passed over as the same.
 //
-// Being certainly the same is symmetric, so that a pair of types and its reverse share a loop; and
-// two arrays of complex numbers are arrays of twice as many reals.
+// Being certainly the same is a question that the rule answers alike in either order, so that a
+// pair of types and its reverse share a loop; and two arrays of complex numbers are arrays of twice
+// as many reals.
 template <typename Sets, typename T1, typename T2>
-inline std::size_t passed_over(const talreal& tol, const T1* data1, const T2* data2,
-                               const std::size_t len) noexcept {
+inline talint passed_over(const talreal& tol, const T1* data1, const T2* data2,
+                          const talint len) noexcept {
+    if (len == 0) {
+        return 0;
+    }
+    const auto count = static_cast<std::size_t>(len);
     if constexpr (is_complex_v<T1> && is_complex_v<T2>) {
-        return passed_over<Sets>(tol, reinterpret_cast<const to_real_type_t<T1>*>(data1),
-                                 reinterpret_cast<const to_real_type_t<T2>*>(data2), 2 * len)
-               / 2;
+        const auto* const parts1 = reinterpret_cast<const to_real_type_t<T1>*>(data1);
+        const auto* const parts2 = reinterpret_cast<const to_real_type_t<T2>*>(data2);
+        return static_cast<talint>(by_known_bound<Sets>(tol, parts1, parts2, 2 * count) / 2);
     } else if constexpr ((element_type_id<T1>) > element_type_id<T2>) {
-        return by_known_bound<Sets>(tol, data2, data1, len);
+        return static_cast<talint>(by_known_bound<Sets>(tol, data2, data1, count));
     } else {
-        return by_known_bound<Sets>(tol, data1, data2, len);
+        return static_cast<talint>(by_known_bound<Sets>(tol, data1, data2, count));
     }
 }
 

@@ -18,15 +18,16 @@ NESK_STRICT_SINGLES_BEGIN
 
 namespace talnumericarray {
 
-// The parts of a complex number. Not by its own functions: those of the standard library are
-// compiled with other features than these on 32-bit ARM, and so would not be inlined.
+// The parts of a complex number, where they lie: one that is not looked at is not read. Not by its
+// own functions: those of the standard library are compiled with other features than these on
+// 32-bit ARM, and so would not be inlined.
 template <typename T>
-inline T real_part(const std::complex<T>& number) noexcept {
+inline const T& real_part(const std::complex<T>& number) noexcept {
     return reinterpret_cast<const T(&)[2]>(number)[0];
 }
 
 template <typename T>
-inline T imaginary_part(const std::complex<T>& number) noexcept {
+inline const T& imaginary_part(const std::complex<T>& number) noexcept {
     return reinterpret_cast<const T(&)[2]>(number)[1];
 }
 
@@ -45,8 +46,8 @@ template <typename T1, typename T2,
           std::enable_if_t<!is_complex_v<T1> && is_complex_v<T2>, int> = 0>
 inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const T1& rdata1 = data1;
-    const to_real_type_t<T2> rdata2 = talnumericarray::real_part(data2);
-    const to_real_type_t<T2> idata2 = talnumericarray::imaginary_part(data2);
+    const to_real_type_t<T2>& rdata2 = talnumericarray::real_part(data2);
+    const to_real_type_t<T2>& idata2 = talnumericarray::imaginary_part(data2);
     return sameQ_test(tol, rdata1, rdata2) && idata2 == 0;
 }
 
@@ -54,8 +55,8 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 template <typename T1, typename T2,
           std::enable_if_t<is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
 inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
-    const to_real_type_t<T1> rdata1 = talnumericarray::real_part(data1);
-    const to_real_type_t<T1> idata1 = talnumericarray::imaginary_part(data1);
+    const to_real_type_t<T1>& rdata1 = talnumericarray::real_part(data1);
+    const to_real_type_t<T1>& idata1 = talnumericarray::imaginary_part(data1);
     const T2& rdata2 = data2;
     return sameQ_test(tol, rdata1, rdata2) && idata1 == 0;
 }
@@ -63,10 +64,10 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 // Complex against complex.
 template <typename T1, typename T2, std::enable_if_t<is_complex_v<T1> && is_complex_v<T2>, int> = 0>
 inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
-    const to_real_type_t<T1> rdata1 = talnumericarray::real_part(data1);
-    const to_real_type_t<T1> idata1 = talnumericarray::imaginary_part(data1);
-    const to_real_type_t<T2> rdata2 = talnumericarray::real_part(data2);
-    const to_real_type_t<T2> idata2 = talnumericarray::imaginary_part(data2);
+    const to_real_type_t<T1>& rdata1 = talnumericarray::real_part(data1);
+    const to_real_type_t<T1>& idata1 = talnumericarray::imaginary_part(data1);
+    const to_real_type_t<T2>& rdata2 = talnumericarray::real_part(data2);
+    const to_real_type_t<T2>& idata2 = talnumericarray::imaginary_part(data2);
     return sameQ_test(tol, rdata1, rdata2) && sameQ_test(tol, idata1, idata2);
 }
 

@@ -41,41 +41,40 @@ inline int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
     return 1;
 }
 
-// The same answer for arrays whose first pair is the same, and the same factor remembered after it.
+// The same answer, and the same factor remembered after it.
 //
-// Blocks that are certainly the same are passed over up to one that is in doubt, from which on a
-// stretch of elements is judged. As long as no block can be passed the stretches grow, so that
-// asking in vain costs next to nothing.
-template <typename Sets, typename T1, typename T2>
-[[gnu::noinline]] int rest_sameQ(const talreal& tol, const T1* data1, const T2* data2,
-                                 const talint len) noexcept {
-    constexpr auto block = static_cast<talint>(block_length<T1, T2>);
-    talint stretch = block / 2;
-    for (talint i = 1; i < len;) {
-        const auto passed = static_cast<talint>(
-            passed_over<Sets>(tol, data1 + i, data2 + i, static_cast<std::size_t>(len - i)));
-        i += passed;
-        stretch = passed > 0 ? block : std::min(2 * stretch, 64 * block);
-        const talint judged = std::min(stretch, len - i);
-        if (each_sameQ(tol, data1 + i, data2 + i, judged) == 0) {
-            return 0;
-        }
-        i += judged;
-    }
-    return 1;
-}
-
-// The elements of both arrays, with blocks passed over if there are as many. The first pair is
-// judged before: it is where most different arrays differ, and it may put the factor in the cache.
+// The rule is asked about the first pair, where most different arrays differ and which may put the
+// factor in the cache, and about every pair in doubt; the others are passed over.
 template <typename Sets, typename T1, typename T2>
 inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                           const talint len) noexcept {
-    if constexpr (blocks_pay<T1, T2>(Sets{})) {
-        const bool in_blocks = len > static_cast<talint>(block_length<T1, T2>);
-        const int same = each_sameQ(tol, data1, data2, in_blocks ? 1 : len);
-        return same != 0 && in_blocks ? rest_sameQ<Sets>(tol, data1, data2, len) : same;
+    if constexpr (any_has_loop<equality, T1, T2>(Sets{})) {
+        // As long as vectors pass none, the stretches that the rule is asked about grow, so that
+        // looking in vain costs next to nothing.
+        constexpr talint longest_stretch = 1024;
+        talint stretch = 1;
+        for (talint i = 0; i < len;) {
+            const talint judged = std::min(stretch, len - i);
+            if (each_sameQ(tol, data1 + i, data2 + i, judged) == 0) {
+                return 0;
+            }
+            i += judged;
+            const talint passed = passed_over<Sets>(tol, data1 + i, data2 + i, len - i);
+            i += passed;
+            stretch = passed > 0 ? 1 : std::min(2 * stretch, longest_stretch);
+        }
+        return 1;
+    } else if constexpr (std::is_floating_point_v<comparison_t<T1, T2>>) {
+        for (talint i = 0; i < len; ++i) {
+            if (!sameQ_test(tol, data1[i], data2[i])) {
+                return 0;
+            }
+            i += passed_over<Sets>(tol, data1 + i + 1, data2 + i + 1, len - i - 1);
+        }
+        return 1;
+    } else {
+        return each_sameQ(tol, data1, data2, len);
     }
-    return each_sameQ(tol, data1, data2, len);
 }
 
 // Calls `routine` with the tag of the element type that `id` names and returns its answer; 0 for an

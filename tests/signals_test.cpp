@@ -345,6 +345,23 @@ TEST_F(Stepped, ComparisonsMayBeLeftForGood) {
     expect_all_right(tally);
 }
 
+// A factor goes on being remembered in a thread of which a handler has left a comparison for good.
+TEST_F(Stepped, ComparisonsThatAreLeftDoNotKeepFactorsFromBeingRemembered) {
+    const Questions<double> questions(1, {4, 17.5});
+    const Array<double> one({1}, {1.0});
+    const Array<double> near_one({1}, {1.1});
+    const Array<double> far_from_one({1}, {2.5});
+    const Question needs_factor = {52.5, one.handle(), near_one.handle(), 1};
+    // Numbers that are the same only if the factor is remembered.
+    const Question finds_factor = {52.5, one.handle(), far_from_one.handle(), 1};
+    const HandlerScope scope(SIGTRAP);
+    Tally tally;
+    is_answered_right(questions[2]);
+    EXPECT_FALSE(is_answered_right(finds_factor));
+    leave_after_each_step(tally, questions[0], needs_factor, finds_factor);
+    expect_all_right(tally);
+}
+
 // ---- Interrupted by a timer, wherever the comparison happens to be
 
 class IntervalTimer {

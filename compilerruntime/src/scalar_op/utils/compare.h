@@ -85,14 +85,26 @@ struct remembered_factor {
 // comparison never looks up, as it answers for tolerances of `bits` or more before.
 //
 // A signal handler that compares may come between any two instructions of a comparison in its
-// thread. `changes` is odd while a factor is being written, and is another number afterwards, so
-// that two halves of different factors are never taken for one; volatile keeps the order of reads
-// and writes.
+// thread, and may leave it for good. So that two halves of different factors are never taken for
+// one, `changes` says what is valid: bit 0 is set while a factor is being written, the next two
+// bits say in which place the factor is or is going to be, and the rest counts, so that `changes`
+// is another number whenever the factor is another one. Volatile keeps the order of reads and
+// writes.
 template <typename T>
 struct factor_cache {
+    static constexpr unsigned being_written = 1;
+    static constexpr unsigned next_place = 2;
+    static constexpr unsigned places = 4;
+    static constexpr unsigned next_count = 8;
+
+    static constexpr unsigned place(const unsigned changes) noexcept {
+        return changes / next_place % places;
+    }
+
     volatile unsigned changes = 0;
-    volatile T lasttol = std::numeric_limits<T>::digits;
-    volatile T tolfactor = 1;
+    struct {
+        volatile T lasttol, tolfactor;
+    } factors[places] = {{std::numeric_limits<T>::digits, 1}, {}, {}, {}};
 };
 
 // Each thread has its own: nothing is shared, nothing is locked.
@@ -110,23 +122,33 @@ template <typename T>
 inline bool recall_factor(const T tol, T& factor) noexcept {
     const factor_cache<T>& cache = factor_cache_of_thread<T>();
     const unsigned changes = cache.changes;
-    const T lasttol = cache.lasttol;
-    factor = cache.tolfactor;
-    // No even number is equal to `changes` if it is odd.
-    const unsigned unchanged = changes & ~1U;
+    const auto& kept = cache.factors[cache.place(changes)];
+    const T lasttol = kept.lasttol;
+    factor = kept.tolfactor;
+    // That is not equal to `changes` while a factor is being written.
+    const unsigned unchanged = changes & ~cache.being_written;
     return tol == lasttol && cache.changes == unchanged;
 }
 
-// In a handler that has interrupted this very function nothing is remembered.
+// Where a factor is being written already, this is in a handler that has interrupted that, or after
+// one that has left it for good. Its place is left alone, as it may go on being written later; then
+// what has been remembered meanwhile stays. Four handlers would have to interrupt each other here,
+// in these few instructions, for one of them to come to a place that is still in use.
 template <typename T>
 inline void remember_factor(const remembered_factor<T> remembered) noexcept {
-    factor_cache<T>& cache = factor_cache_of_thread<T>();
-    const unsigned changes = cache.changes;
-    if (changes % 2 == 0) {
-        cache.changes = changes + 1;
-        cache.lasttol = remembered.lasttol;
-        cache.tolfactor = remembered.tolfactor;
-        cache.changes = changes + 2;
+    using cache_t = factor_cache<T>;
+    cache_t& cache = factor_cache_of_thread<T>();
+    const unsigned before = cache.changes;
+    const unsigned interrupted = before & cache_t::being_written;
+    const unsigned place = (cache_t::place(before) + interrupted) % cache_t::places;
+    const unsigned count = before / cache_t::next_count + 1;
+    const unsigned changes =
+        count * cache_t::next_count + place * cache_t::next_place + cache_t::being_written;
+    cache.changes = changes;
+    cache.factors[place].lasttol = remembered.lasttol;
+    cache.factors[place].tolfactor = remembered.tolfactor;
+    if (cache.changes == changes) {
+        cache.changes = changes & ~cache_t::being_written;
     }
 }
 
