@@ -9,6 +9,7 @@
 #include "support/emulation.h"
 #include "support/floating_point_modes.h"
 #include "support/hard_pairs.h"
+#include "support/sanitizers.h"
 
 #include <gtest/gtest.h>
 
@@ -19,6 +20,10 @@
 #include <limits>
 #include <string>
 #include <vector>
+
+#if defined(__SANITIZE_ADDRESS__)
+#    include <sanitizer/asan_interface.h>
+#endif
 
 namespace {
 
@@ -478,6 +483,70 @@ TEST(Loops, AnswerAndRememberAsTheElementLoop) {
     EXPECT_EQ(near_fills, 80 * 8);
 }
 
+// ---- What is read without vectors
+
+void set_poisoned([[maybe_unused]] const bool poisoned, [[maybe_unused]] unsigned char* const begin,
+                  [[maybe_unused]] const std::size_t size) {
+#if defined(__SANITIZE_ADDRESS__)
+    (poisoned ? __asan_poison_memory_region : __asan_unpoison_memory_region)(begin, size);
+#endif
+}
+
+// Elements behind a pair that differs, which a sanitizer says may not be read.
+class Poison {
+  public:
+    Poison(unsigned char* const begin, unsigned char* const end)
+        : begin_(begin), size_(static_cast<std::size_t>(end - begin)) {
+        set_poisoned(true, begin_, size_);
+    }
+    Poison(const Poison&) = delete;
+    Poison& operator=(const Poison&) = delete;
+    ~Poison() { set_poisoned(false, begin_, size_); }
+
+  private:
+    unsigned char* begin_;
+    std::size_t size_;
+};
+
+std::vector<unsigned char> sevens(const Side& side, const std::size_t count) {
+    std::vector<unsigned char> bytes(count * side.size);
+    for (std::size_t i = 0; i < count; ++i) {
+        side.store(bytes.data() + i * side.size, 7, 0);
+    }
+    return bytes;
+}
+
+TEST(Loops, WithoutVectorsReadNothingBehindTheFirstDifference) {
+    if (!address_sanitizer) {
+        GTEST_SKIP() << "NOT TESTED: only a sanitizer tells single bytes that are read";
+    }
+    constexpr std::size_t count = 70;
+    for_each_pair_with_a_loop([&](const Pair& pair) {
+        const auto without_vectors =
+            std::find_if(pair.loops.begin(), pair.loops.end(), [](const LoopOfSets& loop) {
+                return std::string(loop.sets) == none::name;
+            });
+        ASSERT_NE(without_vectors, pair.loops.end());
+        std::vector<unsigned char> data1 = sevens(pair.side1, count);
+        std::vector<unsigned char> data2 = sevens(pair.side2, count);
+        for (const double tol : {-1.0, 10.0}) {
+            for (std::size_t index = 0; index < count; ++index) {
+                unsigned char* const element2 = data2.data() + index * pair.side2.size;
+                pair.side2.store(element2, 9, 0);
+                {
+                    const Poison behind1(data1.data() + (index + 1) * pair.side1.size,
+                                         data1.data() + data1.size());
+                    const Poison behind2(element2 + pair.side2.size, data2.data() + data2.size());
+                    remember(factors_of(tol));
+                    EXPECT_FALSE(without_vectors->loop(tol, data1.data(), data2.data(), count))
+                        << index;
+                }
+                pair.side2.store(element2, 7, 0);
+            }
+        }
+    });
+}
+
 // ---- Random pairs among pairs that are the same, in every direction of rounding
 
 double share_of(const int bits, const Remembered& factors) {
@@ -495,7 +564,7 @@ std::uint64_t printed_seed() {
 class DrawnRuns {
   public:
     explicit DrawnRuns(const Pair& pair)
-        : pair_(pair), data1_(sevens(pair.side1)), data2_(sevens(pair.side2)) {}
+        : pair_(pair), data1_(sevens(pair.side1, longest)), data2_(sevens(pair.side2, longest)) {}
 
     bool run_all(oracle::Random& random, const double tol) {
         constexpr std::size_t draws = 150 / emulated_stride;
@@ -515,14 +584,6 @@ class DrawnRuns {
     }
 
   private:
-    std::vector<unsigned char> sevens(const Side& side) const {
-        std::vector<unsigned char> bytes(longest * side.size);
-        for (std::size_t i = 0; i < longest; ++i) {
-            side.store(bytes.data() + i * side.size, 7, 0);
-        }
-        return bytes;
-    }
-
     const Pair& pair_;
     std::vector<unsigned char> data1_;
     std::vector<unsigned char> data2_;

@@ -50,7 +50,7 @@ ARRAYS = Program("whole arrays", (),
                  (*(f"tests/{name}.cpp" for name in
                     ("complex_pairs_test", "golden_calls_test", "random_calls_test",
                      "threads_test")), *SUPPORT))
-# Without blocks, as with the option to optimise for size.
+# Without vectors, as with the option to optimise for size.
 SMALL = replace(ARRAYS, name="whole arrays, built for size", module_level="-Os")
 SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
                           "tolerance_shift_factor_test")))
@@ -64,10 +64,10 @@ PARTS = (
 )
 SIGNALS = Program("signals_test", (), ("tests/signals_test.cpp", *SUPPORT), link=("-Wl,-z,now",))
 READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O1")
-BLOCKS = own("blocks_test", *SUPPORT)
+CERTAINTY = own("certainty_test", *SUPPORT)
 # Of all sets, and so without the longest of the tests, which says no more of them than of one.
-BLOCKS_OF_SETS = own("blocks_test", *SUPPORT,
-                     run=("--gtest_filter=-BlockLoops.AnswerAndRememberAsTheElementLoop",))
+CERTAINTY_OF_SETS = own("certainty_test", *SUPPORT,
+                     run=("--gtest_filter=-Loops.AnswerAndRememberAsTheElementLoop",))
 
 # All sets have the same loops, so that one will do but where sets are chosen.
 ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
@@ -185,7 +185,7 @@ class Bench(steps.Bench):
         super().__init__(memory, UnharmedTree(WORK / "original"))
         self.compiled = self._lines_compiled()
         self.needs = {part: self._dependencies(part.mutated)
-                      for part in (*SCALARS, *PARTS, BLOCKS)}
+                      for part in (*SCALARS, *PARTS, CERTAINTY)}
         self.suite = None
         self.suite_lock = threading.Lock()
 
@@ -226,7 +226,7 @@ class Bench(steps.Bench):
         yield step(ARRAYS)
         of_sets = "instruction_sets" in mutant.path
         if "TalNumericArray" in mutant.path and not of_sets:
-            yield from steps_of([BLOCKS])
+            yield from steps_of([CERTAINTY])
             yield step(SMALL)
         yield "same code", "", lambda: self._same_code(tree)
         yield from steps_of(PARTS)
@@ -234,7 +234,7 @@ class Bench(steps.Bench):
             yield step(SIGNALS)
         yield step(READING)
         if of_sets:
-            yield step(BLOCKS_OF_SETS)
+            yield step(CERTAINTY_OF_SETS)
         if mutant.change.text == "":
             # An attribute, say, of which nothing but the built files tells.
             yield "release build", checked_sources(), lambda: self._release(mutant, tree)
@@ -325,14 +325,14 @@ class Suite:
 # ---- The target
 
 GROUPS = {**{part.name: "parts" for part in (*SCALARS, *PARTS, SIGNALS)}, ARRAYS.name: "arrays",
-          SMALL.name: "arrays", READING.name: "reading", BLOCKS.name: "blocks",
+          SMALL.name: "arrays", READING.name: "reading", CERTAINTY.name: "certainty",
           "release build": "release"}
 
 
 class Module:
     mark = "mutants"  # of the table in the document
     columns = {"arrays": "whole arrays", "parts": "tests of parts", "reading": "`reading_test`",
-               "blocks": "`blocks_test`", "release": "release build", TIME_OUT: "time-out",
+               "certainty": "`certainty_test`", "release": "release build", TIME_OUT: "time-out",
                SURVIVES: "equivalent"}
     bench = Bench
 

@@ -42,23 +42,7 @@ def tokens_of(source):
         for match in _TOKEN.finditer(source)
         if match.lastgroup not in ("comment", "directive")
     ]
-    return without_choices(without_heads(without_assertions(tokens)))
-
-
-# What these answer decides nothing but speed, as every set is right of every block.
-CHOICES = ("pays", "blocks_pay")
-
-
-def without_choices(tokens):
-    """Without the bodies of the functions that choose what is fastest."""
-    kept, index = [], 0
-    while index < len(tokens):
-        kept.append(tokens[index])
-        if tokens[index].text in CHOICES and tokens[index - 1].text == "bool":
-            body = closing(tokens, index + 1) + 2
-            index = closing(tokens, body)
-        index += 1
-    return kept
+    return without_heads(without_assertions(tokens))
 
 
 def without_assertions(tokens):
