@@ -64,9 +64,9 @@
 // Two arrays of one shape without elements are the same whatever their types. Otherwise an array
 // whose `data_type` is outside 1 to 12 is the same as none.
 //
-// Only the first array's `nelems` is read. An element behind the first pair that is not the same may
-// be read where it lies in one page of 4096 bytes with an element that is not behind it, and where
-// the arrays are compared as bytes. Built without vectors, for lack of them or with
+// Only the first array's `nelems` is read. An element behind the first pair that is not the same
+// may be read where it lies in one page of 4096 bytes with an element that is not behind it, and
+// where the arrays are compared as bytes. Built without vectors, for lack of them or with
 // TALNUMERICARRAY_INSTRUCTION_SETS set to `none`, it is read in the latter case alone.
 extern "C" [[gnu::visibility("hidden")]] int TalNumericArray_sameQ(talreal tol,
                                                                    int compare_different_types,

@@ -12,7 +12,7 @@ inline constexpr std::size_t vector_bytes = TALNUMERICARRAY_VECTOR_BYTES;
 template <typename T, std::size_t lanes>
 struct vector_of {
     static constexpr std::size_t bytes = std::max<std::size_t>(16, lanes * sizeof(T));
-    typedef T type [[gnu::vector_size(bytes)]];
+    using type [[gnu::vector_size(bytes)]] = T;
 };
 
 template <typename T, std::size_t lanes>
@@ -70,7 +70,7 @@ inline bits_16 twice_as_wide(const bits_16& numbers) noexcept {
 // The first half of a vector.
 template <typename T>
 struct half_of {
-    typedef T type [[gnu::vector_size(8)]];
+    using type [[gnu::vector_size(8)]] = T;
 };
 
 template <typename T>
@@ -372,13 +372,13 @@ template <typename Bits>
 inline bool all_zero(const Bits& bits) noexcept {
 #if TALNUMERICARRAY_VECTOR_BYTES >= 64
     if constexpr (sizeof(Bits) == 64) {
-        const __m512i all = bits_as<__m512i>(bits);
+        const auto all = bits_as<__m512i>(bits);
         return _mm512_test_epi64_mask(all, all) == 0;
     } else
 #endif
 #if TALNUMERICARRAY_VECTOR_BYTES >= 32
         if constexpr (sizeof(Bits) == 32) {
-        const __m256i all = bits_as<__m256i>(bits);
+        const auto all = bits_as<__m256i>(bits);
         return _mm256_testz_si256(all, all) != 0;
     } else
 #endif
