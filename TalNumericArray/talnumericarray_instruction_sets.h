@@ -167,6 +167,7 @@ struct avx2 {
 #        pragma GCC push_options
 #        pragma GCC diagnostic push
 // GCC 12 takes what its own header leaves undefined for a mistake.
+#        pragma GCC diagnostic ignored "-Wuninitialized"
 #        pragma GCC diagnostic ignored "-Wmaybe-uninitialized"
 #        pragma GCC target("fma,avx512f,avx512bw,avx512dq,avx512vl")
 #    endif

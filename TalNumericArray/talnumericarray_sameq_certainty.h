@@ -41,31 +41,45 @@ struct nearness {
     T divisor;
 };
 
+// Whether the processor takes results that are subnormal for zero, but not operands, which only
+// that of x86 can be told to do. Trying it out would raise flags.
+inline bool flushes_results_alone() noexcept {
+#if defined(__SSE2__)
+    constexpr unsigned results = 0x8000;
+    constexpr unsigned operands = 0x0040;
+    return (__builtin_ia32_stmxcsr() & (results | operands)) == results;
+#else
+    return false;
+#endif
+}
+
 // The divisor under which pairs are certainly the same, or 0 if there is none (yet).
 //
-// Let d be |x - y| and m be |y|, max the larger of |x| and |y|, and D the divisor. The test is
-// m - D * d >= d, with D * d rounded to a number before it is subtracted or not. A NaN and an
-// infinity in either place make the left side NaN or an infinity below zero, and the answer doubt.
-// If d is 0, x and y are equal numbers, or both so small that the processor takes d for zero; then
-// the rule finds the same. Let d be above 0 now. As D >= 1, m is at least d plus the number in
-// front of d: so d < m <= max, which is never so with signs that differ, beside a zero, or where
-// the smaller vanishes beside the larger.
+// Let d be |x - y| and m be |y| as the test has them, max the larger of |x| and |y|, and D the
+// divisor. The test is m - D * d >= d, with D * d rounded to a number before it is subtracted or
+// not. A NaN and an infinity in either place make the left side NaN or an infinity below zero, and
+// the answer doubt. If d is 0, x and y are equal numbers; or, where subnormal numbers are taken for
+// zero, of one sign and so near that the rule finds the same. But where only results are, subnormal
+// numbers of different signs would pass, and no divisor is given. Let d be above 0 now. What is
+// above zero when it has been rounded was so before, and what is below a number was below it: hence
+// D * d < m exactly, in either form and in any direction of rounding. As D >= 1, so is d, which is
+// never so with signs that differ or beside a zero.
 //
 // A `tol` of `bits` or more: that is all, and 1 is divisor enough.
 //
-// f remembered: with e = epsilon, D is at least (1/f)(1 + 5e) + 1 - e however its four operations
-// are rounded, and so at least (1/f)(1 + 4e) and, as 1/f is 1 or more, at least 1/f + 1. Where no
-// result is subnormal, an operation changes its result by less than the share e, and the test says
-// (1/f)(1 + 4e) d < m (1 + e). For max >= 1 the rule tests d < max * f, and max * f (1 - e) is
-// above d; for max < 1 it tests d / f < max, and (d / f)(1 + e) is below max. Where d / f is
-// subnormal, let s be the least number above 0, of which all these are multiples but for D * d and
-// d / f themselves. D * d is at least d / f + s. If it is rounded before, it is then rounded to one
-// number above what d / f is rounded to, or more; else m - D * d is at least s before it is
-// rounded, hence d / f <= m - s. Either way d / f, rounded, is below m.
+// f remembered: with e = epsilon, D is at least ((1/f)(1 + 8e)(1 - e)^2 + 1)(1 - e) however its
+// operations are rounded, and so at least (1/f)(1 + 4e) and, as 1/f is 1 or more, at least 1/f + 1.
+// A rounded result is off by less than the share e, or less than the least number s above zero if
+// it is subnormal; a subnormal difference is exact. The rule's difference, which upward and
+// downward may be rounded the other way, is at most d (1 + e)/(1 - e). For max >= 1 it has to be
+// below max * f, rounded, which is at least max * f (1 - e) > d (1 + 4e)(1 - e). For max < 1 it is
+// divided by f: if the quotient is not subnormal, it is at most (d / f)(1 + e)^2/(1 - e) <= D * d <
+// max; else it is below d / f + s <= d / f + d <= D * d < max. Either way the difference is below
+// max too.
 template <typename T>
 inline T certain_divisor(const T tol) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
-    if (!(tol > 0)) {
+    if (!(tol > 0) || flushes_results_alone()) {
         return 0;
     }
     if (tol >= bits) {

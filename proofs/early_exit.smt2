@@ -7,7 +7,7 @@
 ; fault: (and (not remembered) (far_apart d m)) s => (not remembered) s
 ; fault: (far_apart (diff x y) (larger x y)) => (fp.isNaN x)
 
-; What the three files about the early exit prove of these two reals.
+; What the other two files about the early exit prove of these two reals.
 (declare-const factor T)
 (assert (=> (far_apart (diff x y) (larger x y))
             (not (within factor (diff x y) (larger x y)))))

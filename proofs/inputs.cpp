@@ -4,12 +4,16 @@
 
 #include "compare.h"
 #include "taldata_array_element_types.h"
-#include "talnumericarray_sameq_blocks.h"
+#include "talnumericarray_instruction_sets.h"
+#include "talnumericarray_sameq_certainty.h"
 #include "talnumericarray_sameq_impl.h"
 #include "type_properties.h"
 
+#include <cfenv>
 #include <cinttypes>
 #include <cmath>
+#include <complex>
+#include <cstddef>
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
@@ -34,7 +38,7 @@ std::string bits_literal(const D bits) {
 template <typename T>
 std::string literal(const T value) {
     if constexpr (std::is_floating_point_v<T>) {
-        talnumericarray::unsigned_of_size_t<T> bits = 0;
+        talnumericarray::unsigned_of_size<sizeof(T)> bits = 0;
         std::memcpy(&bits, &value, sizeof bits);
         return "(real " + bits_literal(bits) + ")";
     } else {
@@ -60,10 +64,50 @@ void print_equation(const std::string& instance, const char* formula, const std:
     std::puts((row + ") " + value + ")").c_str());
 }
 
+// ---- What vectors say of a pair
+
+template <typename Set, typename Bound, typename T1, typename T2>
+bool certain_by(const Bound bound, const T1& x, const T2& y) {
+    constexpr std::size_t count = Set::template elements<T1, T2>;
+    const std::vector<T1> xs(count, x);
+    const std::vector<T2> ys(count, y);
+    return Set::leading_certainly_same(bound, xs.data(), ys.data(), count, count) == count;
+}
+
+// Calls `print` with every answer, and whether it is one of fused operations.
+template <typename Bound, typename T1, typename T2, typename Print, typename... Sets>
+void for_each_answer(const Bound bound, const T1& x, const T2& y, const Print& print,
+                     type_list<Sets...> /*sets*/) {
+    const auto ask = [&](auto tag) {
+        using Set = typename decltype(tag)::type;
+        if constexpr (Set::template has_loop<Bound, T1, T2>) {
+            if (Set::supported()) {
+                print(std::string(Set::name) != "baseline", certain_by<Set>(bound, x, y));
+            }
+        }
+    };
+    (ask(type_tag<Sets>{}), ...);
+}
+
+template <typename Bound, typename T1, typename T2, typename Print>
+void for_each_answer(const Bound bound, const T1& x, const T2& y, const Print& print) {
+    for_each_answer(bound, x, y, print, talnumericarray::instruction_sets{});
+}
+
 // ---- Reals
 
+struct Direction {
+    const char* name;
+    int mode;
+};
+
+constexpr Direction directions[] = {
+    {"RTP", FE_UPWARD}, {"RTN", FE_DOWNWARD}, {"RTZ", FE_TOWARDZERO}, {"RNE", FE_TONEAREST}};
+
 template <typename T>
-constexpr const char* name_of_reals = sizeof(T) == sizeof(float) ? "single" : "double";
+std::string name_of_reals(const Direction& direction) {
+    return std::string(sizeof(T) == sizeof(float) ? "single " : "double ") + direction.name;
+}
 
 // Those at which a step of the rule decides otherwise.
 template <typename T>
@@ -74,22 +118,45 @@ std::vector<T> numbers() {
 }
 
 template <typename T>
-void print_comparisons(const T tol, const T factor, const T x, const T y) {
+void print_comparisons(const std::string& instance, const T tol, const T factor, const T x,
+                       const T y) {
     constexpr int bits = std::numeric_limits<T>::digits;
     const T other_tol = 0.25;
     for (const bool remembered : {false, true}) {
         // The factor is made from the tolerance where it is not remembered.
         nesk::detail::remember_factor<T>({remembered ? tol : other_tol, factor});
-        print_equation(name_of_reals<T>, "compare_impl",
+        print_equation(instance, "compare_impl",
                        verdict_literal(nesk::detail::compare_impl(tol, x, y)), tol, factor,
                        remembered && tol > 0 && tol < bits, x, y);
     }
 }
 
+// Of two reals, and of the second one as an imaginary part beside a real.
 template <typename T>
-void print_certainty(const T divisor, const T x, const T y) {
-    const bool certain = talnumericarray::doubt(talnumericarray::nearness<T>{divisor}, x, y) == 0;
-    print_equation(name_of_reals<T>, "certain", literal(certain), divisor, x, y);
+void print_certainty(const std::string& instance, const T divisor, const T x, const T y) {
+    const talnumericarray::nearness<T> near{divisor};
+    const auto print = [&](const bool fused, const bool answer) {
+        print_equation(instance, "certain", literal(answer), fused, divisor, x, y);
+    };
+    print(false, talnumericarray::certainly_same(near, x, y));
+    for_each_answer(near, x, y, print);
+    const auto print_part = [&](const bool fused, const bool answer) {
+        print_equation(instance, "certain", literal(answer), fused, divisor, T{0}, y);
+    };
+    for_each_answer(near, T{7}, std::complex<T>(7, y), print_part);
+}
+
+template <typename T>
+void print_equality(const std::string& instance, const T x, const T y) {
+    const auto print = [&](bool /*fused*/, const bool answer) {
+        print_equation(instance, "fp.eq", literal(answer), x, y);
+    };
+    print(false, talnumericarray::certainly_same(talnumericarray::equality{}, x, y));
+    for_each_answer(talnumericarray::equality{}, x, y, print);
+    const auto print_part = [&](bool /*fused*/, const bool answer) {
+        print_equation(instance, "fp.eq", literal(answer), T{0}, y);
+    };
+    for_each_answer(talnumericarray::equality{}, T{7}, std::complex<T>(7, y), print_part);
 }
 
 // Each number with each, and with those at the limit of the tolerance below and above it.
@@ -109,39 +176,57 @@ void for_each_pair_of_reals(const T factor, const Print& print) {
     }
 }
 
+// Those at the limit of the test, where it matters whether the product is rounded.
 template <typename T>
-void print_reals() {
+void print_certainty_at_limit(const std::string& instance, const T divisor) {
+    for (int k = 1; k <= 8; ++k) {
+        const T y = 1 + T(k) / 11;
+        const T limit = y + y / (divisor + 1);
+        print_certainty(instance, divisor, limit, y);
+        print_certainty(instance, divisor, std::nextafter(limit, T{0}), y);
+    }
+}
+
+template <typename T>
+void print_reals(const std::string& instance, const std::vector<T>& tolerances) {
     constexpr int bits = std::numeric_limits<T>::digits;
-    for (const T tol : {T{-1}, T{0}, T(0.5), T{1}, T{7}, T(10.5), T{bits - 1}, T(bits - 0.5),
-                        T{bits}, std::numeric_limits<T>::quiet_NaN()}) {
+    for (const T tol : tolerances) {
         const bool has_factor = tol > 0 && tol < bits;
         const T factor = has_factor ? nesk::ToleranceShiftFactor(tol) : T{1};
         nesk::detail::remember_factor<T>({tol, factor});
         const T divisor = talnumericarray::certain_divisor(tol);
         if (has_factor) {
-            print_equation(name_of_reals<T>, "certain_divisor", literal(divisor),
-                           std::trunc(tol) == tol, factor);
+            print_equation(instance, "certain_divisor", literal(divisor), factor);
+            print_certainty_at_limit(instance, divisor);
         }
         for_each_pair_of_reals(factor, [&](const T x, const T y) {
             // What a NaN tolerance makes is no factor of a table.
             if (!std::isnan(tol)) {
-                print_comparisons(tol, factor, x, y);
+                print_comparisons(instance, tol, factor, x, y);
             }
             if (divisor != 0) {
-                print_certainty(divisor, x, y);
+                print_certainty(instance, divisor, x, y);
+            } else {
+                print_equality(instance, x, y);
             }
         });
     }
-    for (const T number : numbers<T>()) {
-        for (const T imaginary : {number, -number}) {
-            using D = talnumericarray::unsigned_of_size_t<T>;
-            D bits_of_part = 0;
-            std::memcpy(&bits_of_part, &imaginary, sizeof imaginary);
-            const D doubt =
-                talnumericarray::doubt(talnumericarray::equality{}, T{7}, T{7}, imaginary);
-            print_equation(name_of_reals<T>, "imaginary_doubt", literal(doubt), bits_of_part);
+}
+
+// Of other directions than to nearest those tolerances are enough whose factor is rounded.
+template <typename T>
+void print_reals(const Direction& direction) {
+    constexpr int bits = std::numeric_limits<T>::digits;
+    std::vector<T> tolerances = {T(10.5), T(bits - 0.5)};
+    if (direction.mode == FE_TONEAREST) {
+        for (const T tol : {T{-1}, T{0}, T(0.5), T{1}, T{7}, T{bits - 1}, T{bits},
+                            std::numeric_limits<T>::quiet_NaN()}) {
+            tolerances.push_back(tol);
         }
     }
+    std::fesetround(direction.mode);
+    print_reals(name_of_reals<T>(direction), tolerances);
+    std::fesetround(FE_TONEAREST);
 }
 
 // ---- Integers
@@ -170,9 +255,10 @@ void print_pair_of_integers() {
         for (const T2 y : integers<T2>()) {
             print_equation(instance, "compare_impl",
                            verdict_literal(nesk::detail::compare_impl(x, y)), x, y);
-            print_equation(instance, "doubt",
-                           literal(talnumericarray::doubt(talnumericarray::equality{}, x, y)), x,
-                           y);
+            for_each_answer(talnumericarray::equality{}, x, y,
+                            [&](bool /*fused*/, const bool answer) {
+                                print_equation(instance, "certain", literal(answer), x, y);
+                            });
         }
     }
 }
@@ -211,8 +297,10 @@ void print_ids() {
 } // namespace
 
 int main() {
-    print_reals<float>();
-    print_reals<double>();
+    for (const Direction& direction : directions) {
+        print_reals<float>(direction);
+        print_reals<double>(direction);
+    }
     print_integers(element_type_list{});
     print_ids();
 }

@@ -1,6 +1,6 @@
 ; Proves: on the table of inputs the formulas for integers have the values that the code has.
-; Stands for: the integer overloads of compare_impl (compare.h), and doubt for equality of integers
-;   (talnumericarray_sameq_blocks.h).
+; Stands for: the integer overloads of compare_impl (compare.h), and Doubts::add_integers
+;   (talnumericarray_sameq_vectors.h).
 ; for: integers
 ; with: integer_tests
 ; fault: (bvor bits (bvand (wide_x x) sign)) => bits

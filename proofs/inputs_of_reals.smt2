@@ -1,8 +1,8 @@
 ; Proves: on the table of inputs the formulas for reals have the values that the code has.
-; Stands for: compare_impl (compare.h), certain_divisor and doubt
-;   (talnumericarray_sameq_blocks.h).
-; for: single, double
-; with: real_type arithmetic rule block_test
+; Stands for: compare_impl (compare.h), certain_divisor and certainly_same_reals
+;   (talnumericarray_sameq_certainty.h), and Doubts::add (talnumericarray_sameq_vectors.h).
+; for: rounded single, rounded double
+; with: real_type arithmetic rule certainty
 ; fault: (fp.lt d (times m factor)) => (fp.leq d (times m factor))
 ; fault: (fp.lt (over d factor) m) => (fp.leq (over d factor) m)
 ; fault: (fp.leq m (plus d d)) => (fp.lt m (plus d d))
@@ -11,10 +11,9 @@
 ; fault: (fp.geq tol bits) => (fp.gt tol bits)
 ; fault: (fp.leq tol zero) => (fp.lt tol zero)
 ; fault: (= (fp.lt x zero) (fp.lt y zero)) => (= x y)
-; fault: (fp.lt (times (difference x y) divisor) => (fp.leq (times (difference x y) divisor)
-; fault: larger least))) => larger zero)))
-; fault: (times inverse slack) => inverse
-; fault: (bvshl imaginary => (bvlshr imaginary
+; fault: (fp.geq (remainder fused divisor d m) d) => (fp.gt (remainder fused divisor d m) d)
+; fault: (fp.abs y))) => (fp.abs x)))
+; fault: (times (over one factor) slack) => (over one factor)
 
 (define-fun claim () Bool (and
 $table))

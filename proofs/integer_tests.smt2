@@ -1,4 +1,4 @@
-; The comparison and the block test of two integers of given widths and signednesses.
+; The comparison and the test for equality of two integers of given widths and signednesses.
 (define-sort X () (_ BitVec $x_width))
 (define-sort Y () (_ BitVec $y_width))
 (define-fun x_signed () Bool $x_signed)
@@ -16,10 +16,11 @@
   (ite (and x_signed (not y_signed) (bvslt x (_ bv0 $x_width))) #xff
     (compare_equal_types (wide_x x) (wide_y y)))))
 
-; `doubt` for equality of integers in talnumericarray_sameq_blocks.h.
+; The bits that Doubts::add_integers in talnumericarray_sameq_vectors.h gathers.
 (define-fun sign () (_ BitVec $width) (bvshl (_ bv1 $width) (_ bv$sign_position $width)))
 (define-fun doubt ((x X) (y Y)) (_ BitVec $width)
   (let ((bits (bvxor (wide_x x) (wide_y y))))
     (ite (and (not (= x_signed y_signed)) $unsigned_is_widest)
       (bvor bits (bvand (wide_x x) sign))
       bits)))
+(define-fun certain ((x X) (y Y)) Bool (= (doubt x y) (_ bv0 $width)))

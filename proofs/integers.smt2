@@ -1,7 +1,7 @@
-; Proves: the three-way comparison of two integers is that of the numbers, and the block test is
-;   without doubt exactly of equal numbers, for every two widths and signednesses.
-; Stands for: the integer overloads of compare_impl (compare.h), and doubt for equality of integers
-;   (talnumericarray_sameq_blocks.h).
+; Proves: the three-way comparison of two integers is that of the numbers, and the test is certain
+;   exactly of equal numbers, for every two widths and signednesses.
+; Stands for: the integer overloads of compare_impl (compare.h), and Doubts::add_integers
+;   (talnumericarray_sameq_vectors.h).
 ; for: integers
 ; with: integer_tests
 ; fault: (bvor bits (bvand (wide_x x) sign)) => bits
@@ -20,5 +20,4 @@
 (define-fun claim_comparison () Bool
   (= (compare_impl x y)
      (ite (= number_x number_y) #x00 (ite (bvslt number_x number_y) #xff #x01))))
-(define-fun claim_doubt () Bool
-  (= (= (doubt x y) (_ bv0 $width)) (= number_x number_y)))
+(define-fun claim_certainty () Bool (= (certain x y) (= number_x number_y)))

@@ -5,5 +5,4 @@
 (define-fun zero () T (_ +zero $exponent_bits $significand_bits))
 (define-fun half () T ((_ to_fp $exponent_bits $significand_bits) RNE 0.5))
 (define-fun one () T ((_ to_fp $exponent_bits $significand_bits) RNE 1.0))
-(define-fun least () T (real (_ bv1 $width)))
 (define-fun bits () T ((_ to_fp $exponent_bits $significand_bits) RNE $significand_bits.0))

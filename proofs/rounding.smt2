@@ -1,33 +1,43 @@
-; Proves: what the proofs about any factor use of rounding: it keeps the order, it does not bring an
-;   exact result below a number that it was not below, and it is off by half a unit at most.
-; Stands for: every multiplication and division of compare.h and talnumericarray_sameq_blocks.h, as
-;   IEEE 754 defines them: of the numbers of the type, the result is one nearest to the exact one.
-; for: single, double
+; Proves: what the other proofs use of rounding, in any direction: it keeps the order, it does not
+;   bring an exact result past a number, and it is off by less than the numbers there are apart.
+; Stands for: every operation of compare.h and talnumericarray_sameq_certainty.h, as IEEE 754
+;   defines them: of the numbers of the type on the side that is asked for, the result is one nearest
+;   to the exact one.
+; for: directions
 ; with:
 ; fault: (=> (= v w) (= rounded_v rounded_w)) => true
-; fault: (<= (distance p w) (/ spacing 2.0)) => (<= (distance p w) spacing)
-; fault: (assert (<= (distance rounded_w w) (distance z w))) =>
+; fault: (=> (on_side z w) => (=> (not (on_side z w))
+; fault: (<= (- q p) spacing) => (<= (- q p) (* 2.1 spacing))
 
 (define-fun distance ((a Real) (b Real)) Real (ite (< a b) (- b a) (- a b)))
+(define-fun on_side ((z Real) (w Real)) Bool
+  (ite (= $direction RTP) (>= z w)
+  (ite (= $direction RTN) (<= z w)
+  (ite (= $direction RTZ) (ite (< w 0.0) (>= z w) (<= z w))
+    true))))
+; `rounded` is what `w` is rounded to, as far as the number `z` can tell.
+(define-fun rounds ((w Real) (rounded Real) (z Real)) Bool
+  (and (on_side rounded w)
+       (=> (on_side z w) (<= (distance rounded w) (distance z w)))))
+
 ; Two exact results, and what they are rounded to.
 (declare-const v Real)
 (declare-const rounded_v Real)
 (declare-const w Real)
 (declare-const rounded_w Real)
 (assert (=> (= v w) (= rounded_v rounded_w)))
-(assert (<= (distance rounded_w w) (distance rounded_v w)))
-(assert (<= (distance rounded_v v) (distance rounded_w v)))
-; Any number of the type.
+(assert (and (rounds v rounded_v rounded_w) (rounds w rounded_w rounded_v)))
+; Zero is a number, and here is any other.
 (declare-const z Real)
-(assert (<= (distance rounded_w w) (distance z w)))
-; Numbers lie at most that far from each other around w, which is no subnormal.
-(declare-const spacing Real)
-(assert (and (> spacing 0.0) (<= (* $half_of_two_to_digits spacing) (distance w 0.0))))
+(assert (and (rounds v rounded_v 0.0) (rounds w rounded_w 0.0) (rounds w rounded_w z)))
+; Two numbers with w between them.
 (declare-const p Real)
-(assert (<= (distance p w) (/ spacing 2.0)))
-(assert (<= (distance rounded_w w) (distance p w)))
+(declare-const q Real)
+(declare-const spacing Real)
+(assert (and (<= p w q) (> spacing 0.0) (<= (- q p) spacing)))
+(assert (and (rounds w rounded_w p) (rounds w rounded_w q)))
 
 (define-fun claim_order () Bool (=> (<= v w) (<= rounded_v rounded_w)))
 (define-fun claim_below_a_number () Bool (=> (< rounded_w z) (< w z)))
-(define-fun claim_half_a_unit () Bool
-  (<= (distance rounded_w w) (* $unit_roundoff (distance w 0.0))))
+(define-fun claim_above_a_number () Bool (=> (> rounded_w z) (> w z)))
+(define-fun claim_less_than_spacing () Bool (< (distance rounded_w w) spacing))

@@ -1,9 +1,9 @@
 ; Proves: two reals in either order are the same, and a factor is made for them in either order; and
 ;   where both are numbers, what is above in one order is below in the other.
-; Stands for: compare_impl (compare.h); that a pair of element types and its reverse share a block
-;   test (passed_over in talnumericarray_instruction_sets.h).
+; Stands for: compare_impl (compare.h); that a pair of element types and its reverse share a loop
+;   (passed_over in talnumericarray_instruction_sets.h).
 ; for: single, double
-; with: real_type any_arithmetic rule two_reals nan_stays_nan
+; with: real_type any_arithmetic rule two_reals
 ; fault: (minus y x)) => (minus x y))
 ; fault: (ite (fp.lt y zero) (fp.neg x) y) => (ite (fp.lt y zero) (fp.neg x) x)
 ; fault: (ite (fp.lt x zero) below above) => above
@@ -11,6 +11,11 @@
 (declare-const tol T)
 (declare-const factor T)
 (declare-const remembered Bool)
+; Of the operations: NaN in, NaN out.
+(assert (=> (or (fp.isNaN x) (fp.isNaN y)) (and (fp.isNaN (minus x y)) (fp.isNaN (minus y x)))))
+(define-fun nan_stays ((factor T) (d T) (m T)) Bool
+  (and (=> (fp.isNaN d) (and (fp.isNaN (plus d d)) (fp.isNaN (over d factor))))
+       (=> (fp.isNaN m) (and (fp.isNaN (times m half)) (fp.isNaN (times m factor))))))
 (assert (and (nan_stays factor (diff x y) (larger x y))
              (nan_stays factor (diff y x) (larger y x))))
 

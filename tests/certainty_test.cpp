@@ -165,6 +165,7 @@ struct Side {
     std::size_t alignment;
     bool is_complex;
     bool is_signed;
+    bool is_floating;
     bool has_comparison_type; // its parts need no conversion
     void (*store)(void* element, double real, double imaginary);
 };
@@ -193,6 +194,7 @@ constexpr Side side_of() {
             alignof(T),
             is_complex_v<T>,
             std::is_signed_v<Part>,
+            std::is_floating_point_v<Part>,
             std::is_same_v<Part, Comparison>,
             store_parts<T>};
 }
@@ -605,6 +607,15 @@ TEST(Loops, AnswerAsTheElementLoopInEveryDirectionOfRounding) {
     });
 }
 
+// Results, operands or both.
+std::vector<std::uint64_t> parts_of_flushing() {
+    std::vector<std::uint64_t> parts = {flushing};
+    for (std::uint64_t part = flushing & (flushing - 1); part != 0; part = (part - 1) & flushing) {
+        parts.push_back(part);
+    }
+    return parts;
+}
+
 TEST(Loops, AnswerAsTheElementLoopWhereSubnormalNumbersAreTakenForZero) {
     if (flushing == 0) {
         GTEST_SKIP() << "NOT TESTED: this processor takes none for zero";
@@ -612,17 +623,53 @@ TEST(Loops, AnswerAsTheElementLoopWhereSubnormalNumbersAreTakenForZero) {
     oracle::Random random(printed_seed());
     for_each_pair_with_a_loop([&](const Pair& pair) {
         DrawnRuns runs(pair);
-        for (const double tol : tolerances_of(pair)) {
-            const FlushingScope scope;
-            if (!runs.run_all(random, tol)) {
-                return;
+        for (const std::uint64_t part : parts_of_flushing()) {
+            SCOPED_TRACE(part);
+            for (const double tol : tolerances_of(pair)) {
+                const FlushingScope scope(part);
+                if (!runs.run_all(random, tol)) {
+                    return;
+                }
             }
         }
     });
 }
 
-// As large as the argument for it needs, however its operations are rounded. The long double may be
-// no more than a double, whose own roundings are a fifth of the margin.
+// Of small numbers of either sign, and zeros, the drawn pairs are few.
+TEST(Loops, TellSubnormalNumbersApartWhateverIsTakenForZero) {
+    for_each_pair_with_a_loop([&](const Pair& pair) {
+        if (pair.bits == 0 || !pair.side1.is_floating || !pair.side2.is_floating) {
+            return;
+        }
+        const double least = pair.bits == std::numeric_limits<float>::digits
+                                 ? std::numeric_limits<float>::denorm_min()
+                                 : std::numeric_limits<double>::denorm_min();
+        std::vector<std::uint64_t> parts = parts_of_flushing();
+        parts.push_back(0);
+        std::vector<unsigned char> data1 = sevens(pair.side1, longest);
+        std::vector<unsigned char> data2 = sevens(pair.side2, longest);
+        for (const Planted& planted : {Planted{"signs", {3 * least, 0}, {-5 * least, 0}},
+                                       {"a zero", {0, 0}, {3 * least, 0}},
+                                       {"another zero", {3 * least, 0}, {0, 0}},
+                                       {"an imaginary part", {7, 3 * least}, {7, 3 * least}},
+                                       {"another", {7, 3 * least}, {7, -3 * least}}}) {
+            SCOPED_TRACE(planted.name);
+            constexpr std::size_t index = 200;
+            pair.side1.store(data1.data() + index * pair.side1.size, planted.element1.real,
+                             planted.element1.imaginary);
+            pair.side2.store(data2.data() + index * pair.side2.size, planted.element2.real,
+                             planted.element2.imaginary);
+            for (const std::uint64_t part : parts) {
+                for (const double tol : {7.5, 10.0, pair.bits + 0.0}) {
+                    const Remembered factors = factors_of(tol);
+                    const FlushingScope scope(part);
+                    as_element_loop(pair, factors, tol, data1.data(), data2.data(), longest);
+                }
+            }
+        }
+    });
+}
+
 template <typename T>
 void expect_divisors_large_enough() {
     constexpr int bits = std::numeric_limits<T>::digits;

@@ -108,11 +108,13 @@ inline void set_control_word(const std::uint64_t word) {
 #    error "this processor's control word of floating point is not known here"
 #endif
 
-// Takes subnormal numbers for zero for as long as it lives, if the processor can.
+// Takes subnormal numbers for zero for as long as it lives, if the processor can: all, or a part of
+// `flushing`.
 class FlushingScope {
   public:
-    FlushingScope() : before_(control_word() & flushing) {
-        set_control_word(control_word() | flushing);
+    explicit FlushingScope(const std::uint64_t part = flushing)
+        : before_(control_word() & flushing) {
+        set_control_word((control_word() & ~flushing) | part);
     }
     FlushingScope(const FlushingScope&) = delete;
     FlushingScope& operator=(const FlushingScope&) = delete;

@@ -1,4 +1,5 @@
-; Proves: the same for any factor up to 1/2, with exact results; rounding.smt2 carries it over.
+; Proves: a pair that is far apart is not within any factor up to 1/2, with exact results; as
+;   rounding.smt2 says, rounding keeps the order.
 ; Stands for: `far_apart` in compare_impl (compare.h).
 ; for: any
 ; with:
