@@ -5,14 +5,14 @@
 // Both predicates only read the records and what they point to, and take no reference on them; the
 // caller keeps them alive and unchanged for the length of a call. Any number of threads may compare
 // the same records at once. Neither predicate allocates, throws, locks, logs or calls the system,
-// and each takes at most 2 KiB of stack, what it calls of the C library included. A signal handler
-// may interrupt a comparison anywhere, compare itself, and leave it for good; a child may compare
-// after a fork.
+// and each, compiled with optimisation, takes at most 2 KiB of stack, what it calls of the C
+// library included. A signal handler may interrupt a comparison anywhere, compare itself, and leave
+// it for good; a child may compare after a fork.
 //
 // errno, the direction of rounding, traps and other modes of floating point stay as they are, and
 // no status flag is cleared. The comparison of reals may raise flags: invalid where an element is a
-// NaN or an infinity or `tol` is a NaN; overflow by a `tol` too large for a single and, in long
-// arrays, by elements far apart; underflow by a `tol` or elements of about the least normal number;
+// NaN or an infinity or `tol` is a NaN; overflow by a `tol` too large for a single and by
+// elements far apart; underflow by a `tol` or elements of about the least normal number;
 // inexact by anything; division by zero never. A program that traps on these has to mask them for
 // the call. The answer is that of the rule in the direction of rounding in force; where the
 // processor takes subnormal numbers for zero, they count as zero unless bits are compared.

@@ -17,7 +17,12 @@
 namespace {
 
 // Bytes below the frame of the function that calls, the power function of the C library included.
+// Without optimisation every vector that is computed with has a place on the stack of its own.
+#if defined(__OPTIMIZE__)
 constexpr std::ptrdiff_t limit = 2048;
+#else
+constexpr std::ptrdiff_t limit = 8192;
+#endif
 
 constexpr unsigned char paint = 0xA5;
 
