@@ -6,8 +6,15 @@
 
 #include "taldata_array_element_types.h"
 #include "talnumericarray_sameq_certainty.h"
+#include "talnumericarray_vectors.h"
 #include "to_type.h"
 #include "type_properties.h"
+
+#if defined(__SSE2__)
+#    include <immintrin.h>
+#elif defined(__ARM_NEON)
+#    include <arm_neon.h>
+#endif
 
 #include <algorithm>
 #include <cstddef>
@@ -16,54 +23,9 @@
 #include <limits>
 #include <type_traits>
 
-#if defined(__SSE2__)
-#    include <immintrin.h>
-#elif defined(__ARM_NEON)
-#    include <arm_neon.h>
-#endif
-
-// The order of bytes matters where numbers are widened.
-#if (defined(__SSE2__) || defined(__ARM_NEON)) && __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__
-#    define TALNUMERICARRAY_HAS_VECTORS 1
-#else
-#    define TALNUMERICARRAY_HAS_VECTORS 0
-#endif
-
 #pragma GCC visibility push(hidden)
 
 namespace talnumericarray {
-
-// The smallest page of any platform's memory; the larger ones are multiples of it.
-inline constexpr std::size_t page_bytes = 4096;
-
-// The number of whole elements from `data` on to the end of its page.
-template <typename T>
-inline std::size_t elements_before_page_end(const T* const data) noexcept {
-    const std::size_t behind = reinterpret_cast<std::uintptr_t>(data) % page_bytes;
-    return (page_bytes - behind) / sizeof(T);
-}
-
-// The same of both arrays, or `len` if that is less.
-template <typename T1, typename T2>
-inline std::size_t elements_before_page_end(const T1* const data1, const T2* const data2,
-                                            const std::size_t len) noexcept {
-    return std::min({len, elements_before_page_end(data1), elements_before_page_end(data2)});
-}
-
-// ---- Integers of some size, and what becomes of them when they are widened
-
-template <std::size_t size>
-using unsigned_of_size = std::conditional_t<
-    size == 1, std::uint8_t,
-    std::conditional_t<size == 2, std::uint16_t,
-                       std::conditional_t<size == 4, std::uint32_t, std::uint64_t>>>;
-
-template <std::size_t size>
-using signed_of_size = std::make_signed_t<unsigned_of_size<size>>;
-
-template <typename T, std::size_t times>
-using wider = std::conditional_t<std::is_signed_v<T>, signed_of_size<times * sizeof(T)>,
-                                 unsigned_of_size<times * sizeof(T)>>;
 
 // ---- The sets
 //
@@ -83,36 +45,59 @@ struct none {
 #if TALNUMERICARRAY_HAS_VECTORS
 
 namespace for_baseline {
-#    define TALNUMERICARRAY_VECTOR_BYTES 16
+
+inline constexpr std::size_t vector_bytes = 16;
+#    if defined(__SSE2__)
+#        include "talnumericarray_sse2.h"
+#    else
+#        include "talnumericarray_neon.h"
+#    endif
 #    include "talnumericarray_sameq_vectors.h"
-#    undef TALNUMERICARRAY_VECTOR_BYTES
+
+// How many leading elements are found to be certainly the same by two vectors of `lanes` that
+// overlap, or by shorter ones.
+template <std::size_t lanes, typename Bound, typename T1, typename T2>
+inline std::size_t leading_of_few(const Bound bound, const T1* const data1, const T2* const data2,
+                                  const std::size_t len) noexcept {
+    constexpr std::size_t elements = is_complex_v<T2> ? lanes / 2 : lanes;
+    if constexpr (lanes < 2) {
+        return 0;
+    } else {
+        if (len < elements) {
+            return leading_of_few<lanes / 2>(bound, data1, data2, len);
+        }
+        const std::size_t count = std::min(len, 2 * elements);
+        Doubts<T1, T2, lanes> doubts;
+        add_doubts<lanes>(doubts, bound, data1, data2);
+        add_doubts<lanes>(doubts, bound, data1 + (count - elements), data2 + (count - elements));
+        return doubts.none() ? count : 0;
+    }
+}
+
 } // namespace for_baseline
 
 // What the compiler has been told that the processor has.
-struct baseline {
+struct baseline : for_baseline::loops {
     static constexpr const char* name = "baseline";
 
     static bool supported() noexcept { return true; }
 
+#    if defined(__arm__)
     // NEON on 32-bit ARM takes subnormal numbers for zero and knows no doubles, so that it may only
     // look at the bits of reals.
     template <typename Bound, typename T1, typename T2>
-#    if defined(__arm__)
     static constexpr bool has_loop =
         std::is_integral_v<
             comparison_t<T1, T2>> || (std::is_same_v<T1, T2> && std::is_same_v<Bound, equality>);
-#    else
-    static constexpr bool has_loop = true;
 #    endif
 
-    template <typename T1, typename T2>
-    static constexpr std::size_t elements = for_baseline::elements_of_vectors<T1, T2>;
-
+    // The same for fewer elements than a vector takes.
     template <typename Bound, typename T1, typename T2>
-    static std::size_t leading_certainly_same(const Bound bound, const T1* const data1,
-                                              const T2* const data2, const std::size_t end,
-                                              const std::size_t len) noexcept {
-        return for_baseline::leading_certainly_same(bound, data1, data2, end, len);
+    [[gnu::noinline]] static std::size_t leading_of_few(const Bound bound, const T1* const data1,
+                                                        const T2* const data2,
+                                                        const std::size_t len) noexcept {
+        constexpr std::size_t lanes = for_baseline::vector_bytes / sizeof(comparison_t<T1, T2>);
+        return for_baseline::leading_of_few<lanes / 2>(bound, data1, data2, len);
     }
 };
 
@@ -127,9 +112,9 @@ struct baseline {
 #        pragma GCC target("avx2,fma")
 #    endif
 namespace for_avx2 {
-#    define TALNUMERICARRAY_VECTOR_BYTES 32
+inline constexpr std::size_t vector_bytes = 32;
+#    include "talnumericarray_avx2.h"
 #    include "talnumericarray_sameq_vectors.h"
-#    undef TALNUMERICARRAY_VECTOR_BYTES
 } // namespace for_avx2
 #    if defined(__clang__)
 #        pragma clang attribute pop
@@ -137,25 +122,12 @@ namespace for_avx2 {
 #        pragma GCC pop_options
 #    endif
 
-struct avx2 {
+struct avx2 : for_avx2::loops {
     static constexpr const char* name = "AVX2";
 
     static bool supported() noexcept {
         return static_cast<bool>(__builtin_cpu_supports("avx2"))
                && static_cast<bool>(__builtin_cpu_supports("fma"));
-    }
-
-    template <typename Bound, typename T1, typename T2>
-    static constexpr bool has_loop = true;
-
-    template <typename T1, typename T2>
-    static constexpr std::size_t elements = for_avx2::elements_of_vectors<T1, T2>;
-
-    template <typename Bound, typename T1, typename T2>
-    static std::size_t leading_certainly_same(const Bound bound, const T1* const data1,
-                                              const T2* const data2, const std::size_t end,
-                                              const std::size_t len) noexcept {
-        return for_avx2::leading_certainly_same(bound, data1, data2, end, len);
     }
 };
 
@@ -172,9 +144,9 @@ struct avx2 {
 #        pragma GCC target("fma,avx512f,avx512bw,avx512dq,avx512vl")
 #    endif
 namespace for_avx512 {
-#    define TALNUMERICARRAY_VECTOR_BYTES 64
+inline constexpr std::size_t vector_bytes = 64;
+#    include "talnumericarray_avx512.h"
 #    include "talnumericarray_sameq_vectors.h"
-#    undef TALNUMERICARRAY_VECTOR_BYTES
 } // namespace for_avx512
 #    if defined(__clang__)
 #        pragma clang attribute pop
@@ -183,7 +155,7 @@ namespace for_avx512 {
 #        pragma GCC pop_options
 #    endif
 
-struct avx512 {
+struct avx512 : for_avx512::loops {
     static constexpr const char* name = "AVX-512";
 
     static bool supported() noexcept {
@@ -191,19 +163,6 @@ struct avx512 {
                && static_cast<bool>(__builtin_cpu_supports("avx512bw"))
                && static_cast<bool>(__builtin_cpu_supports("avx512dq"))
                && static_cast<bool>(__builtin_cpu_supports("avx512vl"));
-    }
-
-    template <typename Bound, typename T1, typename T2>
-    static constexpr bool has_loop = true;
-
-    template <typename T1, typename T2>
-    static constexpr std::size_t elements = for_avx512::elements_of_vectors<T1, T2>;
-
-    template <typename Bound, typename T1, typename T2>
-    static std::size_t leading_certainly_same(const Bound bound, const T1* const data1,
-                                              const T2* const data2, const std::size_t end,
-                                              const std::size_t len) noexcept {
-        return for_avx512::leading_certainly_same(bound, data1, data2, end, len);
     }
 };
 
@@ -256,8 +215,7 @@ inline std::size_t by_best_set(type_list<Sets...> sets, const Bound bound, const
             if ((... || ask(type_tag<Sets>{}))) {
                 return passed + found;
             }
-            found =
-                for_baseline::leading_certainly_same(bound, data1 + passed, data2 + passed, end);
+            found = baseline::leading_of_few(bound, data1 + passed, data2 + passed, end);
             passed += found;
             if (passed == len || found < end || found == 0) {
                 return passed;

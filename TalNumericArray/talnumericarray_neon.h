@@ -1,0 +1,148 @@
+// What is done with vectors of 16 bytes, by NEON: in the compilers' own terms, which stand for its
+// instructions one by one.
+//
+// `talnumericarray_instruction_sets.h` includes this in the namespace and under the target of its
+// set.
+
+template <std::size_t bytes>
+struct operations;
+
+template <>
+struct operations<16> {
+    using Bits = vector<std::uint64_t, 2>;
+
+    // The first `bytes` of a vector, zeros behind them.
+    template <std::size_t bytes>
+    static Bits load(const void* const from) noexcept {
+        if constexpr (bytes == 16) {
+            Bits all;
+            std::memcpy(&all, from, bytes);
+            return all;
+        } else {
+            unsigned_of_size<bytes> number;
+            std::memcpy(&number, from, bytes);
+            return Bits{number, 0};
+        }
+    }
+
+    // `lanes` numbers, integers widened to `size` bytes with their signs.
+    template <std::size_t size, std::size_t lanes, typename From>
+    static Bits widened(const From* const from) noexcept {
+        Bits numbers = load<lanes * sizeof(From)>(from);
+        if constexpr (sizeof(From) < size) {
+            numbers = twice_as_wide<From>(numbers);
+        }
+        if constexpr (2 * sizeof(From) < size) {
+            numbers = twice_as_wide<wider<From, 2>>(numbers);
+        }
+        if constexpr (4 * sizeof(From) < size) {
+            numbers = twice_as_wide<wider<From, 4>>(numbers);
+        }
+        return numbers;
+    }
+
+    // 32-bit integers as reals; of doubles, there are two.
+    template <typename T>
+    static vector_of_bytes<T, 16> reals(const Bits numbers) noexcept {
+        if constexpr (std::is_same_v<T, float>) {
+            return __builtin_convertvector(reinterpret_cast<vector<std::int32_t, 4>>(numbers),
+                                           vector<float, 4>);
+        } else {
+            const auto wide = twice_as_wide<std::int32_t>(numbers);
+            return __builtin_convertvector(reinterpret_cast<vector<std::int64_t, 2>>(wide),
+                                           vector<double, 2>);
+        }
+    }
+
+    template <std::size_t lanes>
+    static vector<double, 2> doubles(const float* const from) noexcept {
+        return __builtin_convertvector(first_half<float>(load<lanes * sizeof(float)>(from)),
+                                       vector<double, 2>);
+    }
+
+    // Integers that become reals by an instruction for just that.
+    template <typename T, typename From>
+#if defined(__aarch64__)
+    static constexpr bool converts = sizeof(From) == sizeof(T);
+#else
+    static constexpr bool converts = false;
+#endif
+
+    template <typename T, std::size_t lanes, typename From>
+    static vector_of_bytes<T, 16> converted(const From* const from) noexcept {
+        const auto numbers =
+            reinterpret_cast<vector_of_bytes<From, 16>>(load<lanes * sizeof(From)>(from));
+        return __builtin_convertvector(numbers, vector_of_bytes<T, 16>);
+    }
+
+    // Reals, the first half of a vector, with a zero behind each.
+    template <typename T>
+    static Bits with_zeros_between(const vector_of_bytes<T, 16> reals) noexcept {
+        const auto bits = reinterpret_cast<Bits>(reals);
+        return std::is_same_v<T, float> ? twice_as_wide<std::uint32_t>(bits) : Bits{bits[0], 0};
+    }
+
+    // m - factor * d.
+    template <typename T>
+    static vector_of_bytes<T, 16> minus_product(const vector_of_bytes<T, 16> m, const T factor,
+                                                const vector_of_bytes<T, 16> d) noexcept {
+        return m - factor * d;
+    }
+
+    static constexpr bool has_masks = false;
+
+    static bool all_zeros(const Bits bits) noexcept {
+        return (bits[0] | bits[1]) == 0;
+    }
+
+    static bool all_ones(const Bits bits) noexcept {
+        return (bits[0] & bits[1]) == std::numeric_limits<std::uint64_t>::max();
+    }
+
+  private:
+    template <typename T>
+    struct half_of {
+        using type [[gnu::vector_size(8)]] = T;
+    };
+
+    // The first half of a vector.
+    template <typename T>
+    static typename half_of<T>::type first_half(const Bits numbers) noexcept {
+        return reinterpret_cast<typename half_of<T>::type>(numbers[0]);
+    }
+
+    // The first half of the `From` in a vector, widened to twice their size.
+    template <typename From>
+    static Bits twice_as_wide(const Bits numbers) noexcept {
+        using Wide = vector<wider<From, 2>, 8 / sizeof(From)>;
+        return reinterpret_cast<Bits>(__builtin_convertvector(first_half<From>(numbers), Wide));
+    }
+};
+
+#if defined(__arm__)
+
+// Doubts about reals by their bits: the same, and none of them a NaN or an infinity.
+template <typename T>
+class DoubtsAboutBits {
+  public:
+    using Values = vector_of_bytes<T, 16>;
+
+    void add(equality /*bound*/, const Values& x, const Values& y) noexcept {
+        bits_ |= reinterpret_cast<uint32x4_t>(x) ^ reinterpret_cast<uint32x4_t>(y);
+        largest_ = vmaxq_u32(largest_, vshlq_n_u32(reinterpret_cast<uint32x4_t>(y), 1));
+    }
+
+    bool none() const noexcept {
+        constexpr std::uint32_t infinity = std::is_same_v<T, double> ? 0xffe00000 : 0xff000000;
+        constexpr std::uint32_t lower = std::is_same_v<T, double> ? 0xffffffff : infinity;
+        constexpr uint32x4_t infinities = {lower, infinity, lower, infinity};
+        return operations<16>::all_zeros(
+            reinterpret_cast<operations<16>::Bits>(bits_ | vcgeq_u32(largest_, infinities)));
+    }
+
+  private:
+    uint32x4_t bits_ = {};
+    uint32x4_t largest_ = {}; // twice their bits, whose upper word says whether all are finite
+};
+
+#endif
