@@ -262,7 +262,8 @@ template <typename Sets, typename T1, typename T2>
 template <typename Sets, typename T1, typename T2>
 inline talint passed_over(const talreal& tol, const T1* data1, const T2* data2,
                           const talint len) noexcept {
-    if (len == 0) {
+    // A last pair alone is judged as fast as it is passed over.
+    if (len < 2) {
         return 0;
     }
     const auto count = static_cast<std::size_t>(len);

@@ -45,8 +45,9 @@ std::vector<SetOfBuild> sets_in(type_list<Sets...> /*sets*/) {
     return {SetOfBuild{Sets::name, Sets::supported()}...};
 }
 
-TEST(InstructionSets, StandBestFirstAndOneIsSupported) {
-    const char* const best_first[] = {"AVX-512", "AVX2", "baseline", "none"};
+TEST(InstructionSets, StandBestFirst) {
+    const char* const best_first[] = {"AVX-512", "AVX-512 in plain code", "AVX2", "baseline",
+                                      "none"};
     const auto* expected = std::begin(best_first);
     int supported = 0;
     for (const SetOfBuild& set : sets_in(instruction_sets{})) {
@@ -59,7 +60,9 @@ TEST(InstructionSets, StandBestFirstAndOneIsSupported) {
         ++expected;
         supported += set.supported ? 1 : 0;
     }
-    EXPECT_GT(supported, 0);
+    if (supported == 0) {
+        GTEST_SKIP() << "NOT TESTED: this processor supports no set of this build";
+    }
 }
 
 // Skipped where it is not so, which CTest reports after all tests.
