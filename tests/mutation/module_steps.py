@@ -69,8 +69,13 @@ CERTAINTY = own("certainty_test", *SUPPORT)
 CERTAINTY_OF_SETS = own("certainty_test", *SUPPORT,
                      run=("--gtest_filter=-Loops.AnswerAndRememberAsTheElementLoop",))
 
+# With plain code for the instructions, which takes its time without optimisation.
+CERTAINTY_OF_AVX512 = Program("certainty_of_avx512_test", ("tests/certainty_of_avx512_test.cpp",),
+                              SUPPORT, level="-O1 -Wno-psabi -DTALNUMERICARRAY_EMULATED")
+
 # All sets have the same loops, so that one will do but where sets are chosen.
 ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
+BASELINE = "TALNUMERICARRAY_INSTRUCTION_SETS=baseline"
 ALL_SETS = "ALL_SETS"
 
 # What the release build makes of the module beside the test programs, and the tests of that.
@@ -104,6 +109,13 @@ def chosen(found):
 
 # ---- A copy of the module, and what is built from it
 
+def sets_for(path):
+    """The sets that the module is built with for mutants of a file."""
+    if "instruction_sets" in path or "avx512" in path:
+        return ALL_SETS
+    return BASELINE if "sse2" in path else ONE_SET
+
+
 class Tree(steps.Tree):
     """The module with one file at a time another."""
 
@@ -113,7 +125,7 @@ class Tree(steps.Tree):
 
     def put(self, path, text):
         super().put(path, text)
-        self.sets = ALL_SETS if "instruction_sets" in path else ONE_SET
+        self.sets = sets_for(path)
 
     def object(self, source, level):
         """The file that `source` is compiled to, once."""
@@ -222,6 +234,10 @@ class Bench(steps.Bench):
             return (step(part) for part in parts
                     if mutant.path in self.needs[part] or mutant.path == MODULE)
 
+        if "avx512" in mutant.path:
+            yield step(CERTAINTY_OF_AVX512)
+            yield "same code", "", lambda: self._same_code(tree)
+            return
         yield from steps_of(SCALARS)
         yield step(ARRAYS)
         of_sets = "instruction_sets" in mutant.path
@@ -326,13 +342,13 @@ class Suite:
 
 GROUPS = {**{part.name: "parts" for part in (*SCALARS, *PARTS, SIGNALS)}, ARRAYS.name: "arrays",
           SMALL.name: "arrays", READING.name: "reading", CERTAINTY.name: "certainty",
-          "release build": "release"}
+          CERTAINTY_OF_AVX512.name: "certainty", "release build": "release"}
 
 
 class Module:
     mark = "mutants"  # of the table in the document
     columns = {"arrays": "whole arrays", "parts": "tests of parts", "reading": "`reading_test`",
-               "certainty": "`certainty_test`", "release": "release build", TIME_OUT: "time-out",
+               "certainty": "`certainty_test`s", "release": "release build", TIME_OUT: "time-out",
                SURVIVES: "equivalent"}
     bench = Bench
 
