@@ -1,12 +1,12 @@
 ; Proves: what nearness.smt2 uses of the difference of two reals, and of the test where it is zero,
 ;   infinite or NaN.
-; Stands for: certainly_same_reals (talnumericarray_sameq_certainty.h), and Doubts::add for nearness
-;   (talnumericarray_sameq_vectors.h).
+; Stands for: certainly_same_reals (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add for
+;   nearness (talnumericarray_sameq_vectors.h).
 ; for: rounded single, rounded double
 ; with: real_type arithmetic certainty two_reals
 ; fault: (= (fp.lt x zero) (fp.lt y zero)) => (fp.lt x zero)
-; fault: (fp.geq (remainder fused divisor d m) d) => (fp.gt (remainder fused divisor d m) d)
-; fault: (fp.geq (remainder fused divisor d m) d) => (not (fp.lt (remainder fused divisor d m) d))
+; fault: (fp.geq (left_over fused divisor d m) d) => (fp.gt (left_over fused divisor d m) d)
+; fault: (fp.geq (left_over fused divisor d m) d) => (not (fp.lt (left_over fused divisor d m) d))
 
 (define-fun claim_not_finite () Bool
   (=> (not (and (finite x) (finite y))) (not (finite (difference x y)))))

@@ -1,6 +1,6 @@
 ; Proves: on the table of inputs the formulas for reals have the values that the code has.
 ; Stands for: compare_impl (compare.h), certain_divisor and certainly_same_reals
-;   (talnumericarray_sameq_certainty.h), and Doubts::add (talnumericarray_sameq_vectors.h).
+;   (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add (talnumericarray_sameq_vectors.h).
 ; for: rounded single, rounded double
 ; with: real_type arithmetic rule certainty
 ; fault: (fp.lt d (times m factor)) => (fp.leq d (times m factor))
@@ -11,7 +11,7 @@
 ; fault: (fp.geq tol bits) => (fp.gt tol bits)
 ; fault: (fp.leq tol zero) => (fp.lt tol zero)
 ; fault: (= (fp.lt x zero) (fp.lt y zero)) => (= x y)
-; fault: (fp.geq (remainder fused divisor d m) d) => (fp.gt (remainder fused divisor d m) d)
+; fault: (fp.geq (left_over fused divisor d m) d) => (fp.gt (left_over fused divisor d m) d)
 ; fault: (fp.abs y))) => (fp.abs x)))
 ; fault: (times (over one factor) slack) => (over one factor)
 

@@ -16,7 +16,7 @@
   (ite (and x_signed (not y_signed) (bvslt x (_ bv0 $x_width))) #xff
     (compare_equal_types (wide_x x) (wide_y y)))))
 
-; The bits that Doubts::add_integers in talnumericarray_sameq_vectors.h gathers.
+; The bits that DoubtsAboutIntegers::add in talnumericarray_sameq_vectors.h gathers.
 (define-fun sign () (_ BitVec $width) (bvshl (_ bv1 $width) (_ bv$sign_position $width)))
 (define-fun doubt ((x X) (y Y)) (_ BitVec $width)
   (let ((bits (bvxor (wide_x x) (wide_y y))))

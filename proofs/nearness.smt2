@@ -2,10 +2,10 @@
 ;   test is certain only of pairs that are the same; equal numbers are the same under any tolerance;
 ;   and beside a real an imaginary part passes exactly if it is a zero.
 ; Stands for: compare_impl (compare.h), certainly_same_reals (talnumericarray_sameq_certainty.h),
-;   and Doubts::add and the zeros beside imaginary parts (talnumericarray_sameq_vectors.h).
+;   and DoubtsAboutReals::add and the zeros beside imaginary parts (talnumericarray_sameq_vectors.h).
 ; for: single, double
 ; with: real_type any_arithmetic rule certainty two_reals
-; fault: (fp.geq (remainder => (fp.leq (remainder
+; fault: (fp.geq (left_over => (fp.leq (left_over
 ; fault: (fp.geq tol bits) => (fp.gt tol bits)
 ; fault: (fp.eq d m) s => (fp.leq d m) s
 ; fault: (ite (fp.eq x y) the_same => (ite (= x y) the_same
@@ -30,7 +30,7 @@
 ; exactly below m if it is so as rounded. Hence in either form the exact product is below the
 ; magnitude, and so is the difference, as the divisor is at least 1.
 (declare-const product_is_below Bool)
-(assert (=> (fp.gt (remainder fused divisor d (fp.abs y)) zero) product_is_below))
+(assert (=> (fp.gt (left_over fused divisor d (fp.abs y)) zero) product_is_below))
 (assert (=> product_is_below (fp.lt d (fp.abs y))))
 ; And what scaling.smt2 does then.
 (assert (=> (and product_is_below of_one_sign (fp.lt tol bits))

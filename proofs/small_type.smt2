@@ -1,6 +1,6 @@
 ; Proves: what nearness.smt2 does, at one go and without its lemmas, for reals of six digits.
 ; Stands for: compare_impl (compare.h), certain_divisor and certainly_same_reals
-;   (talnumericarray_sameq_certainty.h), and Doubts::add (talnumericarray_sameq_vectors.h).
+;   (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add (talnumericarray_sameq_vectors.h).
 ; for: rounded small
 ; with: real_type arithmetic rule certainty two_reals
 ; fault: (plus (times (over one factor) slack) one) => (times (over one factor) slack)
