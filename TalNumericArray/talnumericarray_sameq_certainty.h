@@ -12,7 +12,6 @@
 #include "talnumericarray_sameq_elements.h"
 #include "to_type.h"
 
-#include <cmath>
 #include <cstddef>
 #include <limits>
 #include <type_traits>
@@ -94,6 +93,15 @@ inline T certain_divisor(const T tol) noexcept {
 
 // ---- One pair
 
+// Not by std::fabs, which Clang would call on 32-bit ARM: see `real_part`.
+inline float magnitude(const float x) noexcept {
+    return __builtin_fabsf(x);
+}
+
+inline double magnitude(const double x) noexcept {
+    return __builtin_fabs(x);
+}
+
 template <typename T>
 inline bool certainly_same_reals(equality /*bound*/, const T x, const T y) noexcept {
     return x == y;
@@ -101,8 +109,8 @@ inline bool certainly_same_reals(equality /*bound*/, const T x, const T y) noexc
 
 template <typename T>
 inline bool certainly_same_reals(const nearness<T> bound, const T x, const T y) noexcept {
-    const T difference = std::fabs(x - y);
-    return std::fabs(y) - bound.divisor * difference >= difference;
+    const T difference = magnitude(x - y);
+    return magnitude(y) - bound.divisor * difference >= difference;
 }
 
 // An integer or a real beside a real, or beside a complex number, whose imaginary part has to be a

@@ -48,6 +48,26 @@ TEST(Shape, EqualShapesAndTypesAreEquivalentWhateverTheElements) {
     EXPECT_EQ(sameQ(0, array1, array2), 0);
 }
 
+// No array has such dimensions, but records of them are told apart by every bit all the same.
+TEST(Shape, DimensionsThatDifferInTheSignAloneAreNeitherSameNorEquivalent) {
+    constexpr talint sign = std::numeric_limits<talint>::min();
+    for (const std::size_t place : {0U, 1U}) {
+        for (const bool negated : {false, true}) {
+            const auto array1 = six({2, 3});
+            std::vector<talint> dimensions = {2, 3};
+            talint& dimension = dimensions[place];
+            dimension = negated ? -dimension : dimension + sign;
+            const auto array2 = six(dimensions);
+            EXPECT_EQ(sameQ(0, array1, array2), 0) << place << ", " << negated;
+            EXPECT_EQ(sameQ(0, array2, array1), 0) << place << ", " << negated;
+            EXPECT_EQ(TalNumericArray_equivalentQ(array1.handle(), array2.handle()), 0)
+                << place << ", " << negated;
+            EXPECT_EQ(TalNumericArray_equivalentQ(array2.handle(), array1.handle()), 0)
+                << place << ", " << negated;
+        }
+    }
+}
+
 TEST(Shape, RankZeroIsOneElement) {
     const Array<double> array1({}, {1.5});
     const Array<double> array2({}, {1.5});

@@ -203,6 +203,38 @@ TEST(RememberedFactor, OfSingles) {
     });
 }
 
+// Whether a thread that has compared nothing yet recalls a factor for `tol`, and then which; -1 if
+// it recalls none.
+template <typename T>
+T recalled_in_a_new_thread(const T tol) {
+    T factor = -1;
+    in_new_thread([&] {
+        T recalled = 0;
+        if (nesk::detail::recall_factor(tol, recalled)) {
+            factor = recalled;
+        }
+    });
+    return factor;
+}
+
+// No comparison can tell which it is, as none looks it up.
+template <typename T>
+void expect_a_true_factor_at_first() {
+    constexpr T bits = std::numeric_limits<T>::digits;
+    EXPECT_EQ(recalled_in_a_new_thread<T>(bits), 1);
+    for (T tol = -1; tol <= 2 * bits; tol += T(0.25)) {
+        if (tol != bits) {
+            EXPECT_EQ(recalled_in_a_new_thread<T>(tol), -1) << tol;
+        }
+    }
+    EXPECT_EQ(recalled_in_a_new_thread<T>(std::nextafter(bits, T(0))), -1);
+}
+
+TEST(RememberedFactor, IsAtFirstThatOfAllDigits) {
+    expect_a_true_factor_at_first<double>();
+    expect_a_true_factor_at_first<float>();
+}
+
 TEST(RememberedFactor, TheInitialOneIsNeverUsed) {
     in_new_thread([] {
         EXPECT_EQ(compare_impl(52.999999, 1.0, 2.5), -1);

@@ -145,6 +145,8 @@ WORDS = {
     "epsilon": ("min",),
     "digits": ("digits10",),
     "fabs": ("trunc",),
+    "__builtin_fabs": ("__builtin_trunc",),
+    "__builtin_fabsf": ("__builtin_truncf",),
     "volatile": ("",),
     "thread_local": ("",),
     "equality": ("nearness<float>",),

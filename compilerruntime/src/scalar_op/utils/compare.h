@@ -10,9 +10,12 @@
 #include <limits>
 #include <type_traits>
 
-// Expanded into each element loop the comparison is fast; Clang would do so for small code as well.
+// Expanded into each element loop the comparison is fast. GCC finds it too large for some; Clang
+// has to be told only not to for small code, and told to would refuse to in code with NEON.
 #if defined(__OPTIMIZE_SIZE__)
 #    define NESK_EXPANDED [[gnu::noinline]] inline
+#elif defined(__OPTIMIZE__) && !defined(__clang__)
+#    define NESK_EXPANDED [[gnu::always_inline]] inline
 #else
 #    define NESK_EXPANDED inline
 #endif
