@@ -1,21 +1,24 @@
 // Whole calls over long arrays of every pair of element types that has a loop, each next to memcmp
-// over as many bytes of the same memory.
+// over as many bytes of memory like theirs.
+//
+//   element_loops [--quick]
+//
+// Writes an object of JSON.
 
 #include "array_record.h"
 #include "filled_arrays.h"
+#include "json_rows.h"
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
 #include "talnumericarray_instruction_sets.h"
-
-#include <benchmark/benchmark.h>
+#include "turns.h"
 
 #include <cstddef>
-#include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <string>
-#include <utility>
 #include <vector>
 
 namespace {
@@ -25,14 +28,18 @@ namespace {
 struct Size {
     const char* name;
     std::size_t bytes; // of both arrays together
-    bool in_cache;
+    Effort effort;
 };
 
+constexpr std::size_t KiB = std::size_t{1} << 10;
+constexpr std::size_t MiB = std::size_t{1} << 20;
+
 constexpr Size sizes[] = {
-    {"32KiB", std::size_t{32} << 10, true},
-    {"256KiB", std::size_t{256} << 10, true},
-    {"256MiB", std::size_t{256} << 20, false},
+    {"32KiB", 32 * KiB, {100'000, 12}},
+    {"256KiB", 256 * KiB, {200'000, 12}},
+    {"256MiB", 256 * MiB, {0, 5}},
 };
+constexpr Size quick_sizes[] = {{"32KiB", 32 * KiB, {0, 1}}};
 
 struct Workload {
     const char* name;
@@ -50,109 +57,79 @@ constexpr Workload workloads[] = {
 
 // ---- Memory
 
-// One block for all arrays, as large as the largest two. Filling it takes longer than a comparison,
-// so that it is filled only where others than those wanted are in it.
-class Memory {
+// One block for the two arrays of a comparison, one behind the other.
+class Block {
   public:
-    static constexpr std::size_t bytes = std::size_t{256} << 20;
+    explicit Block(const std::size_t bytes)
+        : bytes_(bytes), storage_(std::vector<unsigned char>(bytes + alignment, 1)) {}
 
-    template <typename Fill>
-    void hold(const std::string& arrays, const Fill& fill_memory) {
-        if (held_ != arrays) {
-            fill_memory();
-            held_ = arrays;
-        }
-    }
-
-    unsigned char* begin() { return begin_; }
-
-  private:
-    static constexpr std::size_t alignment = std::size_t{2} << 20; // a large page
-
-    unsigned char* aligned() {
+    unsigned char* begin() {
         void* place = storage_.data();
         std::size_t space = storage_.size();
-        return static_cast<unsigned char*>(std::align(alignment, bytes, place, space));
+        return static_cast<unsigned char*>(std::align(alignment, bytes_, place, space));
     }
 
-    std::vector<unsigned char> storage_ = std::vector<unsigned char>(bytes + alignment);
-    unsigned char* begin_ = aligned();
-    std::string held_;
-};
+  private:
+    static constexpr std::size_t alignment = 2 * MiB; // a large page
 
-Memory& memory() {
-    static Memory all;
-    return all;
-}
+    std::size_t bytes_;
+    std::vector<unsigned char> storage_;
+};
 
 // ---- The two measurements
 
-// Both arrays, one behind the other. Their length makes the second one aligned too.
+// The length makes the second array aligned too.
 template <typename T1, typename T2>
 constexpr std::size_t length(const std::size_t bytes) {
     constexpr std::size_t granule = 64;
     return bytes / (sizeof(T1) + sizeof(T2)) / granule * granule;
 }
 
-void count_bytes(benchmark::State& state, const std::size_t bytes) {
-    state.SetBytesProcessed(static_cast<std::int64_t>(bytes) * state.iterations());
-}
-
 template <typename T1, typename T2>
-void measure_sameQ(benchmark::State& state, const std::string& name, const Size& size,
-                   const Workload& workload) {
+void measure_pair(const Size& size, Block& arrays, Block& equal_bytes, RowMark& mark) {
     const std::size_t len = length<T1, T2>(size.bytes);
-    unsigned char* const data1 = memory().begin();
+    unsigned char* const data1 = arrays.begin();
     unsigned char* const data2 = data1 + len * sizeof(T1);
-    memory().hold(name, [&] { fill<T1, T2>(workload.contents, data1, data2, len); });
-
     ArrayRecord array1(element_type_id<T1>, data1, len);
     ArrayRecord array2(element_type_id<T2>, data2, len);
-    int answer = -1;
-    for (auto _ : state) {
-        answer = TalNumericArray_sameQ(workload.tol, 1, array1.handle(), array2.handle());
-    }
-    if (answer != right_answer(workload.contents)) {
-        state.SkipWithError("the answer is wrong");
-    }
-    count_bytes(state, len * (sizeof(T1) + sizeof(T2)));
-}
 
-template <typename T1, typename T2>
-void measure_memcmp(benchmark::State& state, const Size& size) {
-    const std::size_t half = length<T1, T2>(size.bytes) * (sizeof(T1) + sizeof(T2)) / 2;
-    unsigned char* const data1 = memory().begin();
-    unsigned char* const data2 = data1 + half;
-    memory().hold("equal bytes", [&] { std::memset(memory().begin(), 1, Memory::bytes); });
+    const std::size_t half = len * (sizeof(T1) + sizeof(T2)) / 2;
+    const unsigned char* const bytes1 = equal_bytes.begin();
+    const unsigned char* const bytes2 = bytes1 + half;
 
-    for (auto _ : state) {
-        benchmark::DoNotOptimize(std::memcmp(data1, data2, half));
-    }
-    count_bytes(state, 2 * half);
-}
-
-// ---- The benchmarks
-
-template <typename Measure>
-void add(const std::string& name, const Size& size, Measure&& measure) {
-    auto* const added = benchmark::RegisterBenchmark(name.c_str(), std::forward<Measure>(measure));
-    if (!size.in_cache) {
-        added->Iterations(1)->Repetitions(5);
-    }
-}
-
-template <typename T1, typename T2>
-void add_pair(const Size& size) {
+    const Workload* filled = nullptr;
     for (const Workload& workload : workloads) {
         if (!compared_under_tolerance<T1, T2> && !workload.for_integers_too) {
             continue;
         }
-        const std::string name = std::string("/") + size.name + "/" + workload.name + "/"
-                                 + type_name<T1>() + "/" + type_name<T2>();
-        add("sameQ" + name, size,
-            [=](benchmark::State& state) { measure_sameQ<T1, T2>(state, name, size, workload); });
-        add("memcmp" + name, size,
-            [=](benchmark::State& state) { measure_memcmp<T1, T2>(state, size); });
+        if (filled == nullptr || filled->contents != workload.contents) {
+            fill<T1, T2>(workload.contents, data1, data2, len);
+            filled = &workload;
+        }
+        std::vector<Contender> contenders;
+        contenders.emplace_back([&] {
+            return TalNumericArray_sameQ(workload.tol, 1, array1.handle(), array2.handle())
+                   == right_answer(workload.contents);
+        });
+        contenders.emplace_back([=] { return std::memcmp(bytes1, bytes2, half) == 0; });
+        take_turns(contenders, size.effort);
+        std::printf(R"(%s{"size": "%s", "workload": "%s", "type1": "%s", "type2": "%s", )"
+                    R"("sameQ": %.2f, "memcmp": %.2f})",
+                    mark.next(), size.name, workload.name, type_name<T1>().c_str(),
+                    type_name<T2>().c_str(), contenders[0].nanoseconds(),
+                    contenders[1].nanoseconds());
+    }
+}
+
+template <std::size_t count>
+void measure_all(const Size (&all_sizes)[count], RowMark& mark) {
+    for (const Size& size : all_sizes) {
+        Block arrays(size.bytes);
+        Block equal_bytes(size.bytes); // for memcmp
+        for_each_pair_with_loop([&](auto tag1, auto tag2) {
+            measure_pair<typename decltype(tag1)::type, typename decltype(tag2)::type>(
+                size, arrays, equal_bytes, mark);
+        });
     }
 }
 
@@ -166,18 +143,19 @@ const char* best_set(type_list<Sets...> /*sets*/) {
 } // namespace
 
 int main(int count, char** arguments) {
-    for (const Size& size : sizes) {
-        for_each_pair_with_loop([&](auto tag1, auto tag2) {
-            add_pair<typename decltype(tag1)::type, typename decltype(tag2)::type>(size);
-        });
+    const std::string option = count == 2 ? arguments[1] : "";
+    if (count > 2 || (count == 2 && option != "--quick")) {
+        std::fputs("usage: element_loops [--quick]\n", stderr);
+        return 2;
     }
-    benchmark::Initialize(&count, arguments);
-    if (benchmark::ReportUnrecognizedArguments(count, arguments)) {
-        return EXIT_FAILURE;
+    std::printf(R"({"compiler": "%s", "instruction_set": "%s", "rows": )", COMPILER,
+                best_set(talnumericarray::instruction_sets{}));
+    RowMark mark;
+    if (option.empty()) {
+        measure_all(sizes, mark);
+    } else {
+        measure_all(quick_sizes, mark);
     }
-    benchmark::AddCustomContext("compiler", COMPILER);
-    benchmark::AddCustomContext("instruction_set", best_set(talnumericarray::instruction_sets{}));
-    benchmark::RunSpecifiedBenchmarks();
-    benchmark::Shutdown();
+    std::puts("\n]}");
     return EXIT_SUCCESS;
 }

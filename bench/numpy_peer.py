@@ -30,19 +30,20 @@ def nanoseconds(function, repetitions):
 
 def main():
     repetitions = 5 if "--quick" in sys.argv[1:] else 500
-    times = {}
+    rows = []
     for dtype in (np.float64, np.float32):
         first, near = arrays(dtype)
         identical = first.copy()
         relative = 2.0 ** (TOLERANCE - 1 - np.finfo(dtype).nmant)
         name = np.dtype(dtype).name
-        times[f"{name}/NumPy_allclose"] = nanoseconds(
-            lambda: np.allclose(first, near, rtol=relative, atol=0), repetitions
-        )
-        times[f"{name}/NumPy_array_equal"] = nanoseconds(
-            lambda: np.array_equal(first, identical), repetitions
-        )
-    json.dump({"numpy": np.__version__, "nanoseconds": times}, sys.stdout, indent=1)
+        for function, time in (
+            ("NumPy allclose", nanoseconds(
+                lambda: np.allclose(first, near, rtol=relative, atol=0), repetitions)),
+            ("NumPy array_equal", nanoseconds(
+                lambda: np.array_equal(first, identical), repetitions)),
+        ):
+            rows.append({"type": name, "len": len(first), "name": function, "nanoseconds": time})
+    json.dump({"numpy": np.__version__, "rows": rows}, sys.stdout, indent=1)
     print()
 
 

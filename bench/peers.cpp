@@ -1,22 +1,25 @@
 // Near reals in cache, by this library and by others that compare arrays under a tolerance.
 //
-// The other libraries are templates, which take the instructions that this file is compiled for:
-// all of the processor's.
+//   peers [--quick]
+//
+// Writes an object of JSON. The other libraries are templates, which take the instructions that
+// this file is compiled for: all of the processor's.
 
 #include "array_record.h"
 #include "filled_arrays.h"
+#include "json_rows.h"
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
+#include "turns.h"
 
 #include <Eigen/Core>
 #include <armadillo>
-#include <benchmark/benchmark.h>
 #include <xtensor/xadapt.hpp>
 #include <xtensor/xmath.hpp>
 
 #include <cmath>
 #include <cstddef>
-#include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <limits>
 #include <string>
@@ -24,7 +27,16 @@
 
 namespace {
 
-constexpr std::size_t bytes = std::size_t{256} << 10; // of both arrays together
+constexpr std::size_t sizes[] = {std::size_t{32} << 10, std::size_t{256} << 10}; // of both arrays
+constexpr std::size_t lengths[] = {8, 9, 12, 16, 24, 32, 48, 64, 100, 128, 256, 512, 1024};
+
+struct Efforts {
+    Effort sizes;
+    Effort lengths;
+};
+
+constexpr Efforts full = {{200'000, 20}, {3000, 100}};
+constexpr Efforts quick = {{0, 1}, {0, 1}};
 
 // The difference, relative to the larger, that `whole_tolerance` stands for.
 template <typename T>
@@ -32,75 +44,113 @@ T relative_tolerance() {
     return std::ldexp(T{1}, static_cast<int>(whole_tolerance) - std::numeric_limits<T>::digits);
 }
 
-// Measures `same(first, second)`, which is to find two near arrays the same.
-template <typename T, typename Same>
-void add(const std::string& name, const Same& same) {
-    const std::string full_name = type_name<T>() + "/" + name;
-    benchmark::RegisterBenchmark(full_name.c_str(), [same](benchmark::State& state) {
-        std::vector<T> first(bytes / 2 / sizeof(T));
-        std::vector<T> second(first.size());
-        fill<T, T>(Contents::near, first.data(), second.data(), first.size());
-        bool answer = false;
-        for (auto _ : state) {
-            answer = same(first, second);
-            benchmark::DoNotOptimize(answer);
-            benchmark::ClobberMemory();
+// Two near arrays, and the ways to find them the same.
+template <typename T>
+class NearArrays {
+  public:
+    explicit NearArrays(const std::size_t len) : first_(len), second_(len) {
+        fill<T, T>(Contents::near, first_.data(), second_.data(), len);
+    }
+
+    bool by_sameQ() {
+        return TalNumericArray_sameQ(whole_tolerance, 0, array1_.handle(), array2_.handle()) != 0;
+    }
+
+    bool by_eigen_elementwise() const {
+        const auto a = eigen_array(first_);
+        const auto b = eigen_array(second_);
+        return ((a - b).abs() <= tolerance_ * a.abs().max(b.abs())).all();
+    }
+
+    bool by_eigen_isApprox() const {
+        return eigen_array(first_).matrix().isApprox(eigen_array(second_).matrix(), tolerance_);
+    }
+
+    bool by_xtensor() const {
+        return xt::allclose(xt::adapt(first_), xt::adapt(second_), tolerance_, 0.0);
+    }
+
+    bool by_armadillo() {
+        return arma::approx_equal(armadillo_column(first_), armadillo_column(second_), "reldiff",
+                                  tolerance_);
+    }
+
+  private:
+    static auto eigen_array(const std::vector<T>& elements) {
+        using Elements = Eigen::Array<T, Eigen::Dynamic, 1>;
+        return Eigen::Map<const Elements>(elements.data(),
+                                          static_cast<Eigen::Index>(elements.size()));
+    }
+
+    static auto armadillo_column(std::vector<T>& elements) {
+        return arma::Col<T>(elements.data(), elements.size(), false, true);
+    }
+
+    std::vector<T> first_;
+    std::vector<T> second_;
+    ArrayRecord array1_ = ArrayRecord(element_type_id<T>, first_.data(), first_.size());
+    ArrayRecord array2_ = ArrayRecord(element_type_id<T>, second_.data(), second_.size());
+    T tolerance_ = relative_tolerance<T>();
+};
+
+void print_row(RowMark& mark, const std::string& type, const std::size_t len,
+               const char* const name, const Contender& contender) {
+    std::printf(R"(%s{"type": "%s", "len": %zu, "name": "%s", "nanoseconds": %.3f})", mark.next(),
+                type.c_str(), len, name, contender.nanoseconds());
+}
+
+// All of them, over arrays that fit the cache.
+template <typename T>
+void measure_sizes(const Effort& effort, RowMark& mark) {
+    for (const std::size_t size : sizes) {
+        const std::size_t len = size / 2 / sizeof(T);
+        NearArrays<T> arrays(len);
+        const char* const names[] = {"sameQ", "Eigen elementwise", "Eigen isApprox",
+                                     "xtensor allclose", "Armadillo approx_equal"};
+        std::vector<Contender> contenders;
+        contenders.emplace_back([&] { return arrays.by_sameQ(); });
+        contenders.emplace_back([&] { return arrays.by_eigen_elementwise(); });
+        contenders.emplace_back([&] { return arrays.by_eigen_isApprox(); });
+        contenders.emplace_back([&] { return arrays.by_xtensor(); });
+        contenders.emplace_back([&] { return arrays.by_armadillo(); });
+        take_turns(contenders, effort);
+        for (std::size_t i = 0; i < contenders.size(); ++i) {
+            print_row(mark, type_name<T>(), len, names[i], contenders[i]);
         }
-        if (!answer) {
-            state.SkipWithError("near arrays are not found the same");
-        }
-        state.SetBytesProcessed(static_cast<std::int64_t>(bytes) * state.iterations());
-    });
+    }
 }
 
+// The best of them, over short arrays.
 template <typename T>
-auto eigen_array(const std::vector<T>& elements) {
-    using Elements = Eigen::Array<T, Eigen::Dynamic, 1>;
-    return Eigen::Map<const Elements>(elements.data(), static_cast<Eigen::Index>(elements.size()));
-}
-
-template <typename T>
-auto armadillo_column(std::vector<T>& elements) {
-    return arma::Col<T>(elements.data(), elements.size(), false, true);
-}
-
-template <typename T>
-void add_all() {
-    using Elements = std::vector<T>;
-    const T tolerance = relative_tolerance<T>();
-
-    add<T>("sameQ", [](Elements& first, Elements& second) {
-        ArrayRecord array1(element_type_id<T>, first.data(), first.size());
-        ArrayRecord array2(element_type_id<T>, second.data(), second.size());
-        return TalNumericArray_sameQ(whole_tolerance, 0, array1.handle(), array2.handle()) != 0;
-    });
-    add<T>("Eigen_elementwise", [tolerance](const Elements& first, const Elements& second) {
-        const auto a = eigen_array(first);
-        const auto b = eigen_array(second);
-        return ((a - b).abs() <= tolerance * a.abs().max(b.abs())).all();
-    });
-    add<T>("Eigen_isApprox", [tolerance](const Elements& first, const Elements& second) {
-        return eigen_array(first).matrix().isApprox(eigen_array(second).matrix(), tolerance);
-    });
-    add<T>("xtensor_allclose", [tolerance](const Elements& first, const Elements& second) {
-        return xt::allclose(xt::adapt(first), xt::adapt(second), tolerance, 0.0);
-    });
-    add<T>("Armadillo_approx_equal", [tolerance](Elements& first, Elements& second) {
-        return arma::approx_equal(armadillo_column(first), armadillo_column(second), "reldiff",
-                                  tolerance);
-    });
+void measure_lengths(const Effort& effort, RowMark& mark) {
+    for (const std::size_t len : lengths) {
+        NearArrays<T> arrays(len);
+        std::vector<Contender> contenders;
+        contenders.emplace_back([&] { return arrays.by_sameQ(); });
+        contenders.emplace_back([&] { return arrays.by_eigen_elementwise(); });
+        take_turns(contenders, effort);
+        print_row(mark, type_name<T>(), len, "sameQ", contenders[0]);
+        print_row(mark, type_name<T>(), len, "Eigen elementwise", contenders[1]);
+    }
 }
 
 } // namespace
 
 int main(int count, char** arguments) {
-    add_all<double>();
-    add_all<float>();
-    benchmark::Initialize(&count, arguments);
-    if (benchmark::ReportUnrecognizedArguments(count, arguments)) {
-        return EXIT_FAILURE;
+    const std::string option = count == 2 ? arguments[1] : "";
+    if (count > 2 || (count == 2 && option != "--quick")) {
+        std::fputs("usage: peers [--quick]\n", stderr);
+        return 2;
     }
-    benchmark::RunSpecifiedBenchmarks();
-    benchmark::Shutdown();
+    const Efforts& efforts = option.empty() ? full : quick;
+    std::printf("{\"sizes\": ");
+    RowMark of_sizes;
+    measure_sizes<double>(efforts.sizes, of_sizes);
+    measure_sizes<float>(efforts.sizes, of_sizes);
+    std::printf("\n], \"lengths\": ");
+    RowMark of_lengths;
+    measure_lengths<double>(efforts.lengths, of_lengths);
+    measure_lengths<float>(efforts.lengths, of_lengths);
+    std::puts("\n]}");
     return EXIT_SUCCESS;
 }

@@ -1,9 +1,9 @@
 #!/usr/bin/python3
-"""Turns what the benchmarks wrote into tables and pictures: report.py RESULTS DOCUMENTS.
+"""Turns what the benchmarks wrote into tables and pictures: report.py [--arm] RESULTS DOCUMENTS.
 
-Reads the files of JSON in the folder RESULTS, writes performance_<size>.svg into the folder
-DOCUMENTS, renews what stands between marks in its performance.md, and prints each bar with what
-was measured.
+Reads the files of JSON in the folder RESULTS, writes pictures into the folder DOCUMENTS, renews what
+stands between marks in its performance.md, and prints each bar with what was measured. With --arm it
+does so with the instructions on 32-bit ARM, and without with all else.
 """
 
 import json
@@ -11,32 +11,69 @@ import math
 import re
 import sys
 from collections import defaultdict
+from dataclasses import dataclass
 from pathlib import Path
 
-# The most that a time may be of the time it is measured against.
-BARS = {"256KiB": {"mean": 1.6, "worst": 3.0}, "256MiB": {"mean": 1.1, "worst": 1.35}}
+from pictures import charts, heat_map
+
+# ---- The bars: the most that a value may be, but where it says the least
+
+USER_BAR = 5.0  # nanoseconds
+USER_BARS_OF_REALS = {"AVX-512": {32: 1 / 2, 128: 1 / 4}, "AVX2": {32: 1 / 2, 128: 1 / 2}}
+FIRST_BAR = 1.0  # nanoseconds
+PLACES_BAR = 1.5
+GROWTH_BAR = 1.1
+MEMCMP_BARS = {
+    ("256KiB", "near"): {"mean": 1.25, "worst": 2.5},
+    ("256KiB", "near_fractional"): {"mean": 1.25, "worst": 2.5},
+    ("256MiB", "identical"): {"mean": 1.1, "worst": 1.35},
+    ("256MiB", "near"): {"mean": 1.1, "worst": 1.35},
+    ("256MiB", "near_fractional"): {"mean": 1.1, "worst": 1.35},
+    ("256MiB", "last_differs"): {"mean": 1.1, "worst": 1.35},
+}
+MEMCMP_BAR_OF_REALS = 1.6
+MEMCMP_BARS_OF_DOUBLES = {"AVX-512": 1.0, "AVX2": 1.7}
 FRACTIONAL_BAR = 1.5
-SMALL_BAR = 1.05
-SMALL_LENGTHS = 64
 PEER_BAR = 3.0  # the least
+SHORT_PEER_BAR = 1.0  # the least
 FILE_BAR = 1.3
 REPORT_BAR = 3.0
 ALLCLOSE_BAR = 10.0  # the least
+ARM_NEAR_BAR = 20
+ARM_IDENTICAL_BARS = {("VFP", "float64"): 8, ("VFP", "float32"): 8,
+                      ("NEON", "float64"): 4, ("NEON", "float32"): 3}
+
+# ---- Names
+
+REALS = ("float32", "float64", "complex64", "complex128")
 
 WORKLOADS = {
     "identical": "identical",
     "near": "near",
     "near_fractional": "near, fractional tolerance",
-    "first_differs": "first element differs",
     "last_differs": "last element differs",
 }
 
 # These answer another question than element by element under a tolerance.
-NOT_ELEMENTWISE = {"Eigen_isApprox", "NumPy_array_equal"}
+NOT_ELEMENTWISE = {"Eigen isApprox", "NumPy array_equal"}
+
+# How calls over short arrays are drawn, and whether near.
+CHARTS = [
+    ("float64", "float64", "near"),
+    ("float64", "float64", "identical"),
+    ("float32", "float32", "near"),
+    ("int8", "float64", "near"),
+]
+CONTENDERS = {
+    "library": "the module",
+    "user": "a plain loop, same flags",
+    "user_native": "a plain loop, -O3 -march=native",
+}
 
 
 def mean(ratios):
     """The geometric mean."""
+    ratios = list(ratios)
     return math.exp(sum(map(math.log, ratios)) / len(ratios))
 
 
@@ -44,64 +81,54 @@ def spaced(size):
     return re.sub(r"(?<=\d)(?=[KM]iB)", " ", size)
 
 
+def pair_text(pair):
+    return " and ".join(pair)
+
+
+def pair_of(row):
+    return row["type1"], row["type2"]
+
+
+def where(row):
+    """A row of calls over short arrays."""
+    words = [pair_text(pair_of(row)), row.get("workload"), f"n = {row['len']}"]
+    return ", ".join(word for word in words if word)
+
+
 # ---- What was measured
 
 
-def shortest_times(results):
-    """The shortest time of a processor, in nanoseconds, of each benchmark by the parts of its name.
-
-    That is what a wall clock shows on a machine with nothing else to do.
-    """
-    to_nanoseconds = {"ns": 1, "us": 1e3, "ms": 1e6, "s": 1e9}
-    times = {}
-    for run in results["benchmarks"]:
-        if "error_message" in run:
-            sys.exit(f"report: {run['name']}: {run['error_message']}")
-        if run["run_type"] != "iteration":
-            continue
-        # Behind these parts stand settings, as iterations:1.
-        name = tuple(part for part in run["name"].split("/") if ":" not in part)
-        time = run["cpu_time"] * to_nanoseconds[run["time_unit"]]
-        times[name] = min(time, times.get(name, math.inf))
-    return times
+def check_pairs(pairs, workload, place):
+    """All that have a loop, or, where near, all but those of integers."""
+    expected = 144 - 8 * 8 if workload.startswith("near") else 144 - 8
+    if len(set(pairs)) != expected:
+        sys.exit(f"report: {place}, {workload}: {len(set(pairs))} pairs instead of {expected}")
 
 
 class Loops:
     """Times of whole calls over long arrays, as multiples of memcmp's."""
 
     def __init__(self, results):
-        self.context = results["context"]
-        times = shortest_times(results)
+        self.compiler = results["compiler"].replace("GNU", "GCC")
+        self.instruction_set = results["instruction_set"]
         self.ratios = defaultdict(dict)  # by size and workload, then by pair
-        for (routine, size, workload, *pair), time in times.items():
-            if routine == "sameQ":
-                reference = times["memcmp", size, workload, *pair]
-                self.ratios[size, workload][tuple(pair)] = time / reference
+        for row in results["rows"]:
+            ratio = row["sameQ"] / row["memcmp"]
+            self.ratios[row["size"], row["workload"]][pair_of(row)] = ratio
         self.sizes = list(dict.fromkeys(size for size, _ in self.ratios))
         self.ratios = {
             (size, workload): self.ratios[size, workload]
             for size in self.sizes
             for workload in WORKLOADS
-            if (size, workload) in self.ratios
         }
-        self.types = list(dict.fromkeys(name[3] for name in times))
-        self.check_pairs()
-
-    def check_pairs(self):
-        integers = sum("int" in name for name in self.types)
-        if len(self.types) != 12 or integers != 8:
-            sys.exit(f"report: these are not the twelve element types: {self.types}")
         for (size, workload), ratios in self.ratios.items():
-            pairs = 144 - integers**2 if workload.startswith("near") else 144 - integers
-            if len(ratios) != pairs:
-                sys.exit(f"report: {size}, {workload}: {len(ratios)} pairs instead of {pairs}")
-
-    def workloads(self, size):
-        return [workload for other, workload in self.ratios if other == size]
+            check_pairs(ratios, workload, size)
+        self.types = list(dict.fromkeys(row["type2"] for row in results["rows"]))
+        self.types.sort(key=[row["type1"] for row in results["rows"]].index)
 
     def worst_workload(self, size, pair):
         """The ratio and the workload."""
-        ratios = ((self.ratios[size, w].get(pair, 0), w) for w in self.workloads(size))
+        ratios = ((self.ratios[size, w].get(pair, 0), w) for w in WORKLOADS)
         return max(ratios)
 
     def pairs(self, size):
@@ -117,26 +144,164 @@ class Loops:
         return {pair: r / near[pair] for pair, r in self.ratios[size, "near_fractional"].items()}
 
 
+class ShortCalls:
+    """Times of calls over short arrays."""
+
+    def __init__(self, results):
+        self.rows = results["lengths"]
+        self.first_differs = results["first_differs"]
+        self.places = results["places"]
+        self.bytes = results["bytes"]
+        self.by_call = defaultdict(list)  # by pair and workload
+        for row in self.rows:
+            self.by_call[(*pair_of(row), row["workload"])].append(row)
+        for workload in ("identical", "near"):
+            pairs = [pair_of(row) for row in self.rows if row["workload"] == workload]
+            check_pairs(pairs, workload, "short arrays")
+        for rows, name in ((self.first_differs, "first differs"), (self.places, "places")):
+            check_pairs([pair_of(row) for row in rows], "identical", name)
+
+    def line(self, call, contender):
+        return [(row["len"], row[contender]) for row in self.by_call[call]]
+
+    def of_one_real_type(self, length):
+        return [row for row in self.rows
+                if row["len"] == length and row["type1"] == row["type2"] and row["type1"] in REALS]
+
+    def greatest_drop(self):
+        """A call's time as a multiple of that of a longer one, and both."""
+        return max(
+            ((row["library"] / longer["library"], row, longer)
+             for rows in self.by_call.values()
+             for i, row in enumerate(rows)
+             for longer in rows[i + 1:]),
+            key=lambda drop: drop[0],
+        )
+
+
 class Peers:
-    """Times of the same question to other libraries, by type and name."""
+    """Times of the same question to other libraries, by type and length, then by name."""
 
     def __init__(self, results, numpy_results):
-        names = shortest_times(results)
-        names.update(
-            {tuple(name.split("/")): t for name, t in numpy_results["nanoseconds"].items()}
-        )
-        self.times = defaultdict(dict)
-        for (element_type, name), time in names.items():
-            self.times[element_type][name] = time
+        self.sizes = defaultdict(dict)
+        self.lengths = defaultdict(dict)
+        for times, rows in ((self.sizes, results["sizes"]), (self.lengths, results["lengths"])):
+            for row in rows:
+                times[row["type"], row["len"]][row["name"]] = row["nanoseconds"]
+        for row in numpy_results["rows"]:
+            self.sizes[row["type"], row["len"]][row["name"]] = row["nanoseconds"]
 
-    def least_ratio(self, element_type):
+    @staticmethod
+    def least_ratio(times):
         """The fastest elementwise one's time as a multiple of ours, and its name."""
-        times = self.times[element_type]
         return min(
             (time / times["sameQ"], name)
             for name, time in times.items()
             if name != "sameQ" and name not in NOT_ELEMENTWISE
         )
+
+
+# ---- The bars with their values
+
+
+@dataclass
+class Measured:
+    what: str
+    value: float
+    bar: float = None
+    at_least: bool = False
+
+    def met(self):
+        return self.value >= self.bar if self.at_least else self.value <= self.bar
+
+    def bar_text(self):
+        return f"{'at least' if self.at_least else 'at most'} {self.bar:g}"
+
+
+def bars_of_short_calls(short, instruction_set):
+    for contender in ("user", "user_native"):
+        name = CONTENDERS[contender]
+        worst = max(short.rows, key=lambda row, c=contender: row["library"] - row[c])
+        slower = worst["library"] - worst[contender]
+        yield Measured(f"slower than {name}, ns ({where(worst)})", slower, USER_BAR)
+        for length in (32, 128):
+            rows = short.of_one_real_type(length)
+            worst = max(rows, key=lambda row, c=contender: row["library"] / row[c])
+            bar = USER_BARS_OF_REALS.get(instruction_set, {}).get(length)
+            yield Measured(f"reals of one type, to {name} ({where(worst)})",
+                           worst["library"] / worst[contender], bar)
+    worst = max(short.first_differs, key=lambda row: row["library"] - row["one_by_one"])
+    yield Measured(f"first element differs, slower than the rule one by one, ns ({where(worst)})",
+                   worst["library"] - worst["one_by_one"], FIRST_BAR)
+    constants = sorted(row["library"] - row["memcmp"] for row in short.bytes)
+    yield Measured("compared as bytes, slower than memcmp, ns, least", constants[0])
+    yield Measured("compared as bytes, slower than memcmp, ns, most", constants[-1])
+    for length in dict.fromkeys(row["len"] for row in short.places):
+        rows = [row for row in short.places if row["len"] == length]
+        worst = max(rows, key=lambda row: row["slowest"] / row["median"])
+        yield Measured(f"slowest of 64 places to their median ({where(worst)})",
+                       worst["slowest"] / worst["median"], PLACES_BAR)
+    drop, row, longer = short.greatest_drop()
+    yield Measured(f"time to that of more elements ({where(row)} to {longer['len']})",
+                   drop, GROWTH_BAR)
+
+
+def bars_of_long_calls(loops):
+    for (size, workload), ratios in loops.ratios.items():
+        all_mean = mean(loops.all_pairs(size, workload).values())
+        worst = max(ratios, key=ratios.get)
+        name = f"{spaced(size)}, {WORKLOADS[workload]}, to memcmp"
+        bars = MEMCMP_BARS.get((size, workload), {})
+        yield Measured(f"{name}, mean", all_mean, bars.get("mean"))
+        yield Measured(f"{name}, worst ({pair_text(worst)})", ratios[worst], bars.get("worst"))
+    near = loops.ratios["32KiB", "near"]
+    of_reals = [ratio for pair, ratio in near.items() if set(pair) <= set(REALS)]
+    yield Measured("32 KiB, near, to memcmp, mean of the pairs of reals and complex numbers",
+                   mean(of_reals), MEMCMP_BAR_OF_REALS)
+    yield Measured("32 KiB, near, to memcmp, float64", near["float64", "float64"],
+                   MEMCMP_BARS_OF_DOUBLES.get(loops.instruction_set))
+    for size in loops.sizes:
+        ratios = loops.fractional(size)
+        worst = max(ratios, key=ratios.get)
+        yield Measured(f"{spaced(size)}, fractional to whole tolerance, worst ({pair_text(worst)})",
+                       ratios[worst], FRACTIONAL_BAR)
+
+
+def bars_of_peers(peers):
+    for (element_type, length), times in peers.sizes.items():
+        ratio, peer = peers.least_ratio(times)
+        yield Measured(f"{element_type}, n = {length}, {peer} to ours", ratio, PEER_BAR, True)
+    for element_type in dict.fromkeys(name for name, _ in peers.lengths):
+        least, length, peer = min(
+            (ratio, length, peer)
+            for (name, length), times in peers.lengths.items()
+            if name == element_type
+            for ratio, peer in [peers.least_ratio(times)]
+        )
+        yield Measured(f"{element_type}, n from 8 on, {peer} to ours (n = {length})", least,
+                       SHORT_PEER_BAR, True)
+
+
+def bars_of_files(files):
+    seconds = {row["name"]: row["seconds"] for row in files["rows"]}
+    cmp_seconds, near = seconds["cmp, identical"], seconds["talcmp --tol 20, near"]
+    yield Measured("identical files, talcmp to cmp", seconds["talcmp, identical"] / cmp_seconds,
+                   FILE_BAR)
+    yield Measured("near files, talcmp to cmp of identical ones", near / cmp_seconds, FILE_BAR)
+    report = seconds["talcmp --tol 20 --report, near"]
+    yield Measured("near files, talcmp with a report to without", report / near, REPORT_BAR)
+    allclose = seconds["NumPy allclose of loaded arrays, near"]
+    yield Measured("near files, NumPy allclose of loaded arrays to talcmp", allclose / near,
+                   ALLCLOSE_BAR, True)
+
+
+def print_bars(measured):
+    for one in measured:
+        verdict = ""
+        if one.bar is not None:
+            sign = ">=" if one.at_least else "<="
+            verdict = f"{'met' if one.met() else 'MISSED':7}{sign} {one.bar:g}"
+        print(f"{one.value:8.2f}  {verdict:16}{one.what}")
 
 
 # ---- Tables
@@ -147,30 +312,40 @@ def table(head, rows):
     return lines[0] + "|---" * len(head) + "|\n" + "".join(lines[1:])
 
 
-def pair_text(pair):
-    return " and ".join(pair)
+def bars_table(measured):
+    rows = [(one.what, f"{one.value:.2f}", one.bar_text(), "yes" if one.met() else "**no**")
+            for one in measured if one.bar is not None]
+    return table(("what", "measured", "bar", "met"), rows)
 
 
 def processor():
-    for line in Path("/proc/cpuinfo").read_text(encoding="utf-8").splitlines():
-        name, _, value = line.partition(":")
-        if name.strip() == "model name":
-            return value.strip()
-    return "unknown"
+    text = Path("/proc/cpuinfo").read_text(encoding="utf-8")
+    model = re.search(r"^model name\s*:\s*(.+)$", text, re.MULTILINE)
+    clock = re.search(r"^cpu MHz\s*:\s*(\d+)", text, re.MULTILINE)
+    cores = len(re.findall(r"^processor\s*:", text, re.MULTILINE))
+    words = [model.group(1) if model else "unknown", f"{clock.group(1)} MHz" if clock else "",
+             f"{cores} cores"]
+    return ", ".join(word for word in words if word)
 
 
-def machine_table(context):
+def caches():
+    for folder in sorted(Path("/sys/devices/system/cpu/cpu0/cache").glob("index*")):
+        kind, level, size = ((folder / name).read_text(encoding="utf-8").strip()
+                             for name in ("type", "level", "size"))
+        if kind != "Instruction":
+            yield f"cache, level {level}", size.replace("K", " KiB")
+
+
+def machine_table(loops, start):
+    day, load = start.split()
     rows = [
-        ("processor", f"{processor()}, {context['mhz_per_cpu']} MHz, {context['num_cpus']} cores"),
-        ("instruction set of the loops", context["instruction_set"]),
+        ("processor", processor()),
+        ("instruction set of the loops", loops.instruction_set),
+        *caches(),
+        ("compiler", loops.compiler),
+        ("load when it began", f"{load} processes"),
+        ("day", day),
     ]
-    for cache in context["caches"]:
-        if cache["type"] != "Instruction":
-            size = f"{cache['size'] // 1024} KiB"
-            rows.append((f"cache, level {cache['level']}", size))
-    rows.append(("compiler", context["compiler"].replace("GNU", "GCC")))
-    rows.append(("load when it began", f"{context['load_avg'][0]:.1f} processes"))
-    rows.append(("day", context["date"][:10]))
     return table(("", "of this run"), rows)
 
 
@@ -204,51 +379,14 @@ def worst_pairs_table(loops, shown=5):
     return table(("size", "pair", "workload", "ratio"), rows)
 
 
-def slowdown(row):
-    return row["library"] / row["plain"]
-
-
-def small_table(small):
-    workloads = [name for name in WORKLOADS if any(row["workload"] == name for row in small)]
-    by_length = defaultdict(list)
-    for row in small:
-        by_length[row["len"]].append(row)
-    rows = []
-    for length, measured in by_length.items():
-        by_workload = defaultdict(list)
-        for row in measured:
-            by_workload[row["workload"]].append(slowdown(row))
-        worst = max(measured, key=slowdown)
-        rows.append(
-            (
-                length,
-                *(f"{mean(by_workload[workload]):.2f}" for workload in workloads),
-                f"{sum(slowdown(row) > SMALL_BAR for row in measured)} of {len(measured)}",
-                f"{slowdown(worst):.2f}",
-                f"{worst['library']:.1f} and {worst['plain']:.1f}",
-                f"{worst['type1']} and {worst['type2']}, {WORKLOADS[worst['workload']]}",
-            )
-        )
-    means = (f"mean, {WORKLOADS[workload]}" for workload in workloads)
-    head = ("elements", *means, f"above {SMALL_BAR}", "worst", "its two times, ns", "where")
-    return table(head, rows)
-
-
 def peers_table(peers):
     rows = []
-    for element_type, times in peers.times.items():
+    for (element_type, length), times in peers.sizes.items():
         for name, time in times.items():
             elementwise = "no" if name in NOT_ELEMENTWISE else "yes"
-            rows.append(
-                (
-                    element_type,
-                    name.replace("_", " "),
-                    elementwise,
-                    f"{time / 1000:.1f}",
-                    f"{time / times['sameQ']:.1f}",
-                )
-            )
-    return table(("elements", "function", "elementwise", "time, µs", "of ours"), rows)
+            rows.append((element_type, length, name, elementwise, f"{time / 1000:.2f}",
+                         f"{time / times['sameQ']:.1f}"))
+    return table(("elements", "n", "function", "elementwise", "time, µs", "of ours"), rows)
 
 
 def files_table(files):
@@ -265,83 +403,79 @@ def files_table(files):
     return table(("command and files", "time, s", "of cmp", "memory, MiB"), rows)
 
 
-# ---- Pictures
+# ---- 32-bit ARM
+
+ARM_COLUMNS = [("VFP", "identical"), ("VFP", "near"), ("NEON", "identical"), ("NEON", "near")]
+ARM_ROWS = [("float64", "float64"), ("float32", "float32"), ("int32", "float64"),
+            ("int8", "float64")]
 
 
-def colour(ratio):
-    """From pale green, no slower than memcmp, to red, three times its time or more."""
-    share = min(max(math.log(ratio) / math.log(3), 0), 1)
-    pale, red = (229, 245, 224), (203, 24, 29)
-    return "#" + "".join(f"{round(p + share * (r - p)):02x}" for p, r in zip(pale, red))
+def group_of(pair):
+    """What takes about as many instructions."""
+    integers = [name for name in pair if "int" in name]
+    complexes = [name for name in pair if name.startswith("complex")]
+    if len(integers) == 2:
+        return "two integers" + (", one of 64 bits" if any("64" in i for i in integers) else "")
+    if integers:
+        width = "an integer of 64 bits" if integers[0].endswith("64") else "a smaller integer"
+        return f"{width} and a {'complex number' if complexes else 'real'}"
+    return ("two reals", "a real and a complex number", "two complex numbers")[len(complexes)]
 
 
-def heat_map(loops, size):
-    cell_width, cell_height, left, top = 62, 24, 78, 58
-    count = len(loops.types)
-    width, height = left + count * cell_width + 8, top + count * cell_height + 8
-    lines = [
-        f'<svg xmlns="http://www.w3.org/2000/svg" viewBox="0 0 {width} {height}" '
-        'font-family="sans-serif" font-size="11" text-anchor="middle">',
-        f'<rect width="{width}" height="{height}" fill="#ffffff"/>',
-        f'<text x="{width // 2}" y="20" font-size="14">{spaced(size)}: time as a multiple of '
-        "memcmp&#8217;s, the worst of the workloads</text>",
-    ]
-    for i, name in enumerate(loops.types):
-        x, y = left + i * cell_width + cell_width // 2, top + i * cell_height + 16
-        lines.append(f'<text x="{x}" y="{top - 8}">{name}</text>')
-        lines.append(f'<text x="{left - 6}" y="{y}" text-anchor="end">{name}</text>')
-    for type1, type2 in loops.pairs(size):
-        ratio, _ = loops.worst_workload(size, (type1, type2))
-        x = left + loops.types.index(type2) * cell_width
-        y = top + loops.types.index(type1) * cell_height
-        lines.append(
-            f'<rect x="{x}" y="{y}" width="{cell_width - 1}" height="{cell_height - 1}" '
-            f'fill="{colour(ratio)}"/>'
-        )
-        lines.append(f'<text x="{x + cell_width // 2}" y="{y + 16}">{ratio:.2f}</text>')
-    return "\n".join([*lines, "</svg>", ""])
+class Arm:
+    """Instructions a pair of elements, by build and workload, then by pair of types."""
+
+    def __init__(self, results):
+        self.results = results
+        self.counts = defaultdict(dict)
+        for row in results["rows"]:
+            self.counts[row["build"], row["workload"]][pair_of(row)] = row["a_pair"]
+        for build, workload in ARM_COLUMNS:
+            check_pairs(self.counts[build, workload], workload, build)
+        self.types = list(dict.fromkeys(row["type2"] for row in results["rows"]))
+        self.types.sort(key=[row["type1"] for row in results["rows"]].index)
+
+    def worst_workload(self, build):
+        return {pair: max(count, self.counts[build, "near"].get(pair, 0))
+                for pair, count in self.counts[build, "identical"].items()}
 
 
-# ---- Bars
+def arm_table(arm):
+    def cells(pairs):
+        for column in ARM_COLUMNS:
+            counts = [arm.counts[column][pair] for pair in pairs if pair in arm.counts[column]]
+            if len(counts) > 1:
+                yield f"{mean(counts):.1f}, {max(counts):.1f}"
+            else:
+                yield f"{counts[0]:.1f}" if counts else ""
+
+    groups = defaultdict(list)
+    for pair in arm.counts["VFP", "identical"]:
+        groups[group_of(pair)].append(pair)
+    rows = [(pair_text(pair), 1, *cells([pair])) for pair in ARM_ROWS]
+    rows += [(name, len(pairs), *cells(pairs)) for name, pairs in groups.items()]
+    columns = (f"{build}, {workload}" for build, workload in ARM_COLUMNS)
+    return table(("types", "pairs", *columns), rows)
 
 
-def bars(loops, small, peers, files):
-    """What is measured, its value, the bar, and whether the value may not be below it."""
-    for (size, workload), ratios in loops.ratios.items():
-        all_mean = mean(loops.all_pairs(size, workload).values())
-        for statistic, value in (("mean", all_mean), ("worst", max(ratios.values()))):
-            bar = BARS.get(size, {}).get(statistic)
-            yield f"{spaced(size)}, {WORKLOADS[workload]}, {statistic}", value, bar, False
-    for size in loops.sizes:
-        ratios = loops.fractional(size)
-        worst = max(ratios, key=ratios.get)
-        name = f"{spaced(size)}, fractional to whole tolerance, worst ({pair_text(worst)})"
-        yield name, ratios[worst], FRACTIONAL_BAR, False
-    ratios = [slowdown(row) for row in small if row["len"] <= SMALL_LENGTHS]
-    name = f"up to {SMALL_LENGTHS} elements, library to plain loop"
-    yield f"{name}, mean", mean(ratios), SMALL_BAR, False
-    yield f"{name}, worst", max(ratios), SMALL_BAR, False
-    for element_type in peers.times:
-        ratio, peer = peers.least_ratio(element_type)
-        yield f"{element_type}, {peer.replace('_', ' ')} to ours", ratio, PEER_BAR, True
-    seconds = {row["name"]: row["seconds"] for row in files["rows"]}
-    cmp_seconds, near = seconds["cmp, identical"], seconds["talcmp --tol 20, near"]
-    yield "identical files, talcmp to cmp", seconds["talcmp, identical"] / cmp_seconds, FILE_BAR, False
-    yield "near files, talcmp to cmp of identical ones", near / cmp_seconds, FILE_BAR, False
-    report = seconds["talcmp --tol 20 --report, near"]
-    yield "near files, talcmp with a report to without", report / near, REPORT_BAR, False
-    allclose = seconds["NumPy allclose of loaded arrays, near"]
-    yield "near files, NumPy allclose of loaded arrays to talcmp", allclose / near, ALLCLOSE_BAR, True
-
-
-def print_bars(measured):
-    for name, value, bar, at_least in measured:
-        if bar is None:
-            verdict = ""
-        else:
-            kept = value >= bar if at_least else value <= bar
-            verdict = f"{'kept' if kept else 'MISSED':7}{'>=' if at_least else '<='} {bar}"
-        print(f"{value:7.2f}  {verdict:16}{name}")
+def bars_of_arm(arm):
+    for build in ("VFP", "NEON"):
+        near = arm.counts[build, "near"]
+        worst = max(near, key=near.get)
+        yield Measured(f"{build}, near, worst ({pair_text(worst)})", near[worst], ARM_NEAR_BAR)
+    yield Measured("divisions a pair, worst",
+                   max(row["divisions_a_pair"] for row in arm.results["rows"]), 0)
+    for (build, name), bar in ARM_IDENTICAL_BARS.items():
+        yield Measured(f"{build}, identical, {name}", arm.counts[build, "identical"][name, name], bar)
+    more, pair, workload = max(
+        (count - arm.counts["VFP", workload][pair], pair, workload)
+        for workload in ("identical", "near")
+        for pair, count in arm.counts["NEON", workload].items()
+    )
+    yield Measured(f"NEON, more than VFP ({pair_text(pair)}, {workload})", more, 0)
+    beginnings = [row["beginning"] for row in arm.results["rows"]]
+    yield Measured("beginning of a call, instructions, least", min(beginnings))
+    yield Measured("beginning of a call, instructions, most", max(beginnings))
 
 
 # ---- The documents
@@ -356,32 +490,76 @@ def renew(text, block, content):
     return f"{head}{begin}{content}{tail[tail.index(end):]}"
 
 
-def main():
-    if len(sys.argv) != 3:
-        sys.exit("usage: report.py RESULTS DOCUMENTS")
-    results, documents = map(Path, sys.argv[1:])
-
-    def read(name):
-        return json.loads((results / f"{name}.json").read_text(encoding="utf-8"))
-
-    loops = Loops(read("element_loops"))
-    small = read("small_arrays")
-    peers = Peers(read("peers"), read("numpy_peer"))
-    files = read("talcmp_files")
-
-    for size in loops.sizes:
-        picture = documents / f"performance_{size}.svg"
-        picture.write_text(heat_map(loops, size), encoding="utf-8")
+def renew_blocks(documents, blocks):
     document = documents / "performance.md"
     text = document.read_text(encoding="utf-8")
-    text = renew(text, "machine", machine_table(loops.context))
-    text = renew(text, "long arrays", loops_table(loops))
-    text = renew(text, "worst pairs", worst_pairs_table(loops))
-    text = renew(text, "short arrays", small_table(small))
-    text = renew(text, "peers", peers_table(peers))
-    text = renew(text, "files", files_table(files))
+    for block, content in blocks.items():
+        text = renew(text, block, content)
     document.write_text(text, encoding="utf-8")
-    print_bars(bars(loops, small, peers, files))
+
+
+def read(results, name):
+    return json.loads((results / f"{name}.json").read_text(encoding="utf-8"))
+
+
+def report_of_arm(results, documents):
+    arm = Arm(read(results, "arm_instructions"))
+    for build in ("VFP", "NEON"):
+        title = f"{build}: instructions a pair, the worse of the workloads"
+        picture = heat_map(title, arm.types, arm.worst_workload(build), (8, 48), 1)
+        (documents / f"performance_arm_{build}.svg").write_text(picture, encoding="utf-8")
+    measured = list(bars_of_arm(arm))
+    renew_blocks(documents, {"32-bit ARM": arm_table(arm), "bars of 32-bit ARM": bars_table(measured)})
+    print_bars(measured)
+
+
+def report_of_times(results, documents):
+    loops = Loops(read(results, "element_loops"))
+    short = ShortCalls(read(results, "small_arrays"))
+    peers = Peers(read(results, "peers"), read(results, "numpy_peer"))
+    files = read(results, "talcmp_files")
+
+    for size in loops.sizes:
+        title = f"{spaced(size)}: time as a multiple of memcmp&#8217;s, the worst of the workloads"
+        worst = {pair: loops.worst_workload(size, pair)[0] for pair in loops.pairs(size)}
+        picture = heat_map(title, loops.types, worst, (1, 3), 2)
+        (documents / f"performance_{size}.svg").write_text(picture, encoding="utf-8")
+    all_charts = [
+        (f"{type1} and {type2}, {workload}",
+         [short.line((type1, type2, workload), contender) for contender in CONTENDERS])
+        for type1, type2, workload in CHARTS
+    ]
+    picture = charts("A call over short arrays", CONTENDERS.values(), all_charts, "elements",
+                     "time, ns")
+    (documents / "performance_short.svg").write_text(picture, encoding="utf-8")
+
+    measured = [
+        *bars_of_short_calls(short, loops.instruction_set),
+        *bars_of_long_calls(loops),
+        *bars_of_peers(peers),
+        *bars_of_files(files),
+    ]
+    start = (results / "start").read_text(encoding="utf-8")
+    renew_blocks(documents, {
+        "machine": machine_table(loops, start),
+        "bars": bars_table(measured),
+        "long arrays": loops_table(loops),
+        "worst pairs": worst_pairs_table(loops),
+        "peers": peers_table(peers),
+        "files": files_table(files),
+    })
+    print_bars(measured)
+
+
+def main():
+    arguments = sys.argv[1:]
+    report = report_of_times
+    if arguments[:1] == ["--arm"]:
+        report = report_of_arm
+        arguments = arguments[1:]
+    if len(arguments) != 2:
+        sys.exit("usage: report.py [--arm] RESULTS DOCUMENTS")
+    report(*map(Path, arguments))
 
 
 if __name__ == "__main__":

@@ -1,157 +1,294 @@
-// What looking at blocks costs short arrays: the loops of the library against the plain loop over
-// the same element test, for every pair of element types that has a loop.
+// Whole calls over short arrays of every pair of element types that has a loop, each next to what
+// else a program could call: a plain loop of its own, the rule one by one, or memcmp. And calls
+// over arrays that begin at different places of a page.
 //
 //   small_arrays [--quick]
 //
-// Writes an array of JSON. The two are to be told apart by a few hundredths, so that they take
-// turns in short batches of calls, and the shortest time of each counts.
+// Writes an object of JSON.
 
+#include "array_record.h"
 #include "filled_arrays.h"
+#include "json_rows.h"
+#include "one_by_one.h"
 #include "taldata_array_element_types.h"
-#include "talnumericarray_instruction_sets.h"
-#include "talnumericarray_sameq_impl.h"
+#include "talnumericarray_compare.h"
+#include "turns.h"
 #include "type_properties.h"
+#include "user_loops.h"
 
 #include <algorithm>
-#include <chrono>
+#include <cmath>
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
+#include <deque>
 #include <limits>
 #include <string>
+#include <type_traits>
+#include <vector>
 
 namespace {
 
-// ---- The two loops
-
-template <typename T1, typename T2>
-using Loop = int (*)(const talreal& tol, const T1* data1, const T2* data2, talint len);
-
-template <typename T1, typename T2>
-[[gnu::noinline]] int loop_of_library(const talreal& tol, const T1* data1, const T2* data2,
-                                      const talint len) {
-    return talnumericarray::elements_sameQ<talnumericarray::instruction_sets>(tol, data1, data2,
-                                                                              len);
-}
-
 // ---- What is measured
 
-constexpr talint lengths[] = {1,  2,  3,  4,  7,  8,  12, 16,  24,  31,
-                              32, 33, 48, 63, 64, 65, 96, 128, 129, 256};
-constexpr std::size_t longest = 256;
+constexpr talint lengths[] = {1,   2,   3,   4,   5,   6,   7,   8,   9,   12, 15,
+                              16,  17,  24,  31,  32,  33,  48,  63,  64,  65, 96,
+                              127, 128, 129, 192, 255, 256, 257, 384, 511, 512};
+constexpr talint lengths_that_differ[] = {1, 2, 8, 32, 512};
+constexpr talint lengths_at_places[] = {32, 100, 512, 4096};
+constexpr std::size_t longest = 4096;
+constexpr std::size_t page = 4096;
+constexpr std::size_t places = 64;
 
-struct Workload {
-    const char* name;
-    Contents contents;
-    bool for_integers_too;
+struct Efforts {
+    Effort lengths;
+    Effort first_differs;
+    Effort places;
 };
 
-constexpr Workload workloads[] = {
-    {"identical", Contents::identical, true},
-    {"near", Contents::near, false},
-    {"first_differs", Contents::first_differs, true},
-    {"last_differs", Contents::last_differs, true},
+constexpr Efforts full = {{3000, 100}, {3000, 400}, {6000, 30}};
+constexpr Efforts quick = {{0, 1}, {0, 1}, {0, 1}};
+
+// ---- Memory
+
+struct alignas(page) Memory {
+    unsigned char bytes[page + longest * sizeof(std::complex<double>)];
 };
 
-// How long to measure.
-struct Effort {
-    double batch; // nanoseconds
-    int turns;
-    int rounds; // more than one only where the library looks slower
-};
+Memory memory1;
+Memory memory2;
+Memory filled1;
+Memory filled2;
 
-constexpr Effort full = {10000, 25, 8};
-constexpr Effort quick = {200, 2, 1};
-constexpr double looks_slower = 1.03;
+// ---- The contenders
 
-// ---- Time
-
-template <typename T1, typename T2>
-struct Call {
-    const T1* data1;
-    const T2* data2;
-    talint len;
-    int right_answer;
-};
-
-template <typename T1, typename T2>
-[[gnu::noinline]] double nanoseconds(const Loop<T1, T2> loop, const Call<T1, T2>& call,
-                                     const int calls) {
-    const talreal tol = whole_tolerance;
-    // Read anew for each call, so that a loop that is known is not found to answer the same again.
-    const Loop<T1, T2> volatile called = loop;
-    int wrong = 0;
-    const auto start = std::chrono::steady_clock::now();
-    for (int i = 0; i < calls; ++i) {
-        wrong |= called(tol, call.data1, call.data2, call.len) ^ call.right_answer;
-    }
-    const std::chrono::duration<double, std::nano> time = std::chrono::steady_clock::now() - start;
-    if (wrong != 0) {
-        std::fputs("small_arrays: an answer is wrong\n", stderr);
-        std::abort();
-    }
-    return time.count();
-}
-
-struct Times {
-    double library = std::numeric_limits<double>::infinity(); // nanoseconds a call
-    double plain = std::numeric_limits<double>::infinity();
-};
-
-template <typename T1, typename T2>
-Times measure(const Loop<T1, T2> library, const Loop<T1, T2> plain, const Call<T1, T2>& call,
-              const Effort& effort) {
-    int calls = 1;
-    while (nanoseconds(plain, call, calls) < effort.batch) {
-        calls *= 2;
-    }
-    Times best;
-    for (int round = 0; round < effort.rounds; ++round) {
-        for (int turn = 0; turn < effort.turns; ++turn) {
-            best.library = std::min(best.library, nanoseconds(library, call, calls) / calls);
-            best.plain = std::min(best.plain, nanoseconds(plain, call, calls) / calls);
-        }
-        if (best.library < looks_slower * best.plain) {
-            break;
-        }
-    }
-    return best;
-}
-
-// ---- Output
-
-class Rows {
+// One question, put to each of them.
+class Question {
   public:
-    void add(const std::string& type1, const std::string& type2, const Workload& workload,
-             const talint len, const Times& times) {
-        std::printf(R"(%s{"type1": "%s", "type2": "%s", "workload": "%s", "len": %d, )"
-                    R"("library": %.3f, "plain": %.3f})",
-                    separator_, type1.c_str(), type2.c_str(), workload.name, static_cast<int>(len),
-                    times.library, times.plain);
-        separator_ = ",\n";
+    Question(const type_t id1, void* const data1, const type_t id2, void* const data2,
+             const talint len, const Contents contents)
+        : array1_(id1, data1, static_cast<std::size_t>(len)),
+          array2_(id2, data2, static_cast<std::size_t>(len)),
+          right_answer_(right_answer(contents)) {}
+
+    Contender library(const talreal tol) {
+        return Contender([this, tol] {
+            return TalNumericArray_sameQ(tol, 1, array1_.handle(), array2_.handle())
+                   == right_answer_;
+        });
+    }
+
+    Contender one_by_one() {
+        return Contender([this] {
+            return one_by_one_sameQ(whole_tolerance, 1, array1_.handle(), array2_.handle())
+                   == right_answer_;
+        });
+    }
+
+    // `bits` is that of the type in which the elements are compared.
+    Contender user(UserLoop (&loop_of)(type_t, type_t), const int bits) {
+        const auto* const first = array1_.handle();
+        const auto* const second = array2_.handle();
+        const UserLoop loop = loop_of(first->data_type, second->data_type);
+        const double relative = std::exp2(whole_tolerance - bits);
+        const bool right = right_answer_ != 0;
+        return Contender(
+            [=] { return loop(relative, first->data, second->data, first->nelems) == right; });
+    }
+
+    Contender bytes(const std::size_t size) {
+        const auto* const first = array1_.handle();
+        const auto* const second = array2_.handle();
+        return Contender([=] {
+            return std::memcmp(first->data, second->data,
+                               static_cast<std::size_t>(first->nelems) * size)
+                   == 0;
+        });
     }
 
   private:
-    const char* separator_ = "";
+    ArrayRecord array1_;
+    ArrayRecord array2_;
+    int right_answer_;
 };
 
+// They stay where they are, as contenders refer to them.
+using Questions = std::deque<Question>;
+
 template <typename T1, typename T2>
-void measure_pair(const Effort& effort, Rows& rows) {
-    constexpr std::size_t page = 4096;
-    alignas(page) static T1 data1[longest];
-    alignas(page) static T2 data2[longest];
-    for (const Workload& workload : workloads) {
-        if (!compared_under_tolerance<T1, T2> && !workload.for_integers_too) {
-            continue;
-        }
-        for (const talint len : lengths) {
-            fill<T1, T2>(workload.contents, data1, data2, static_cast<std::size_t>(len));
-            const Call<T1, T2> call = {data1, data2, len, right_answer(workload.contents)};
-            const Times times = measure<T1, T2>(loop_of_library<T1, T2>,
-                                                talnumericarray::each_sameQ<T1, T2>, call, effort);
-            rows.add(type_name<T1>(), type_name<T2>(), workload, len, times);
+Question& add_question(Questions& questions, const talint len, const Contents contents) {
+    return questions.emplace_back(element_type_id<T1>, memory1.bytes, element_type_id<T2>,
+                                  memory2.bytes, len, contents);
+}
+
+// The same numbers begin arrays of every length.
+template <typename T1, typename T2>
+void fill_all(const Contents contents) {
+    fill<T1, T2>(contents, memory1.bytes, memory2.bytes, longest);
+}
+
+// ---- Measurements, a list of rows each
+
+// Next to the user's loop, in both builds.
+template <typename T1, typename T2>
+void measure_lengths(const Contents contents, const char* const workload, const Effort& effort,
+                     RowMark& mark) {
+    constexpr int bits =
+        std::numeric_limits<type_common_t<to_real_type_t<T1>, to_real_type_t<T2>>>::digits;
+    fill_all<T1, T2>(contents);
+    Questions questions;
+    std::vector<Contender> contenders;
+    for (const talint len : lengths) {
+        Question& question = add_question<T1, T2>(questions, len, contents);
+        contenders.push_back(question.library(whole_tolerance));
+        contenders.push_back(question.user(user_loop, bits));
+        contenders.push_back(question.user(user_loop_for_this_processor, bits));
+    }
+    take_turns(contenders, effort);
+    const Contender* contender = contenders.data();
+    for (const talint len : lengths) {
+        std::printf(R"(%s{"type1": "%s", "type2": "%s", "workload": "%s", "len": %d, )"
+                    R"("library": %.3f, "user": %.3f, "user_native": %.3f})",
+                    mark.next(), type_name<T1>().c_str(), type_name<T2>().c_str(), workload,
+                    static_cast<int>(len), contender[0].nanoseconds(), contender[1].nanoseconds(),
+                    contender[2].nanoseconds());
+        contender += 3;
+    }
+}
+
+// A difference in the first element, next to the rule one by one.
+template <typename T1, typename T2>
+void measure_first_differs(const Effort& effort, RowMark& mark) {
+    fill_all<T1, T2>(Contents::first_differs);
+    Questions questions;
+    std::vector<Contender> contenders;
+    for (const talint len : lengths_that_differ) {
+        Question& question = add_question<T1, T2>(questions, len, Contents::first_differs);
+        contenders.push_back(question.library(whole_tolerance));
+        contenders.push_back(question.one_by_one());
+    }
+    take_turns(contenders, effort);
+    const Contender* contender = contenders.data();
+    for (const talint len : lengths_that_differ) {
+        std::printf(R"(%s{"type1": "%s", "type2": "%s", "len": %d, )"
+                    R"("library": %.3f, "one_by_one": %.3f})",
+                    mark.next(), type_name<T1>().c_str(), type_name<T2>().c_str(),
+                    static_cast<int>(len), contender[0].nanoseconds(), contender[1].nanoseconds());
+        contender += 2;
+    }
+}
+
+// What is compared as bytes, next to memcmp.
+template <typename T>
+void measure_bytes(const Effort& effort, RowMark& mark) {
+    constexpr talreal no_tolerance = 0;
+    fill_all<T, T>(Contents::identical);
+    Questions questions;
+    std::vector<Contender> contenders;
+    for (const talint len : lengths) {
+        Question& question = add_question<T, T>(questions, len, Contents::identical);
+        contenders.push_back(question.library(no_tolerance));
+        contenders.push_back(question.bytes(sizeof(T)));
+    }
+    take_turns(contenders, effort);
+    const Contender* contender = contenders.data();
+    for (const talint len : lengths) {
+        std::printf(R"(%s{"type": "%s", "len": %d, "library": %.3f, "memcmp": %.3f})", mark.next(),
+                    type_name<T>().c_str(), static_cast<int>(len), contender[0].nanoseconds(),
+                    contender[1].nanoseconds());
+        contender += 2;
+    }
+}
+
+// Somewhere in each line of a page, and at each place of a line that alignment allows.
+template <typename T>
+std::size_t place_in_page(const std::size_t place) {
+    constexpr std::size_t line = page / places;
+    return place * line + place * alignof(T) % line;
+}
+
+// Both arrays at `places` places. Near reals, or identical integers.
+template <typename T1, typename T2>
+void measure_places(const talint len, const Effort& effort, RowMark& mark) {
+    constexpr Contents contents =
+        compared_under_tolerance<T1, T2> ? Contents::near : Contents::identical;
+    constexpr std::size_t far_apart = 37;
+    const auto count = static_cast<std::size_t>(len);
+    fill<T1, T2>(contents, filled1.bytes, filled2.bytes, count);
+    Questions questions;
+    std::vector<Contender> contenders;
+    const auto data1 = [](const std::size_t place) {
+        return memory1.bytes + place_in_page<T1>(place);
+    };
+    const auto data2 = [](const std::size_t place) {
+        return memory2.bytes + place_in_page<T2>(place * far_apart % places);
+    };
+    const auto put = [&](const std::size_t place) {
+        std::memcpy(data1(place), filled1.bytes, count * sizeof(T1));
+        std::memcpy(data2(place), filled2.bytes, count * sizeof(T2));
+    };
+    for (std::size_t place = 0; place < places; ++place) {
+        Question& question = questions.emplace_back(
+            element_type_id<T1>, data1(place), element_type_id<T2>, data2(place), len, contents);
+        contenders.push_back(question.library(whole_tolerance));
+        put(place);
+        contenders.back().choose_calls(effort.batch);
+    }
+    for (int turn = 0; turn < effort.turns; ++turn) {
+        for (std::size_t place = 0; place < places; ++place) {
+            put(place);
+            contenders[place].take_turn();
         }
     }
+    std::vector<double> times;
+    times.reserve(places);
+    for (const Contender& contender : contenders) {
+        times.push_back(contender.nanoseconds());
+    }
+    std::sort(times.begin(), times.end());
+    std::printf(R"(%s{"type1": "%s", "type2": "%s", "len": %d, "median": %.3f, "slowest": %.3f})",
+                mark.next(), type_name<T1>().c_str(), type_name<T2>().c_str(),
+                static_cast<int>(len), times[places / 2], times.back());
+}
+
+// ---- All of them
+
+// Calls `measure` with the tags of each pair, and the mark of a list called `name`.
+template <typename Measure>
+void list_of_pairs(const char* const name, const Measure& measure) {
+    std::printf("\"%s\": ", name);
+    RowMark mark;
+    for_each_pair_with_loop([&](auto tag1, auto tag2) { measure(tag1, tag2, mark); });
+    std::puts("\n],");
+}
+
+void measure_all(const Efforts& efforts) {
+    std::puts("{");
+    list_of_pairs("lengths", [&](auto tag1, auto tag2, RowMark& mark) {
+        using T1 = typename decltype(tag1)::type;
+        using T2 = typename decltype(tag2)::type;
+        measure_lengths<T1, T2>(Contents::identical, "identical", efforts.lengths, mark);
+        if constexpr (compared_under_tolerance<T1, T2>) {
+            measure_lengths<T1, T2>(Contents::near, "near", efforts.lengths, mark);
+        }
+    });
+    list_of_pairs("first_differs", [&](auto tag1, auto tag2, RowMark& mark) {
+        measure_first_differs<typename decltype(tag1)::type, typename decltype(tag2)::type>(
+            efforts.first_differs, mark);
+    });
+    list_of_pairs("places", [&](auto tag1, auto tag2, RowMark& mark) {
+        for (const talint len : lengths_at_places) {
+            measure_places<typename decltype(tag1)::type, typename decltype(tag2)::type>(
+                len, efforts.places, mark);
+        }
+    });
+    std::printf("\"bytes\": ");
+    RowMark mark;
+    for_each_type(
+        [&](auto tag) { measure_bytes<typename decltype(tag)::type>(efforts.lengths, mark); },
+        element_type_list{});
+    std::puts("\n]}");
 }
 
 } // namespace
@@ -162,12 +299,6 @@ int main(int count, char** arguments) {
         std::fputs("usage: small_arrays [--quick]\n", stderr);
         return 2;
     }
-    const Effort& effort = option.empty() ? full : quick;
-    Rows rows;
-    std::puts("[");
-    for_each_pair_with_loop([&](auto tag1, auto tag2) {
-        measure_pair<typename decltype(tag1)::type, typename decltype(tag2)::type>(effort, rows);
-    });
-    std::puts("\n]");
+    measure_all(option.empty() ? full : quick);
     return EXIT_SUCCESS;
 }

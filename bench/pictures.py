@@ -1,0 +1,102 @@
+"""Pictures as text of SVG: heat maps of pairs of types, and charts of lines on logarithmic axes."""
+
+import math
+
+# Of three lines: told apart by those who are colour-blind, too.
+LINE_COLOURS = ("#0072b2", "#d55e00", "#7f7f7f")
+
+
+def svg(width, height, lines):
+    head = (
+        f'<svg xmlns="http://www.w3.org/2000/svg" viewBox="0 0 {width} {height}" '
+        'font-family="sans-serif" font-size="11" text-anchor="middle">',
+        f'<rect width="{width}" height="{height}" fill="#ffffff"/>',
+    )
+    return "\n".join([*head, *lines, "</svg>", ""])
+
+
+def colour(value, pale_at, red_at):
+    """From pale green, at `pale_at` or less, to red, at `red_at` or more."""
+    share = min(max(math.log(value / pale_at) / math.log(red_at / pale_at), 0), 1)
+    pale, red = (229, 245, 224), (203, 24, 29)
+    return "#" + "".join(f"{round(p + share * (r - p)):02x}" for p, r in zip(pale, red))
+
+
+def heat_map(title, types, values, scale, digits):
+    """`values` by pairs of types: a row for the first type, a column for the second."""
+    cell_width, cell_height, left, top = 62, 24, 78, 58
+    count = len(types)
+    width, height = left + count * cell_width + 8, top + count * cell_height + 8
+    lines = [f'<text x="{width // 2}" y="20" font-size="14">{title}</text>']
+    for i, name in enumerate(types):
+        x, y = left + i * cell_width + cell_width // 2, top + i * cell_height + 16
+        lines.append(f'<text x="{x}" y="{top - 8}">{name}</text>')
+        lines.append(f'<text x="{left - 6}" y="{y}" text-anchor="end">{name}</text>')
+    for (type1, type2), value in values.items():
+        x = left + types.index(type2) * cell_width
+        y = top + types.index(type1) * cell_height
+        lines.append(
+            f'<rect x="{x}" y="{y}" width="{cell_width - 1}" height="{cell_height - 1}" '
+            f'fill="{colour(value, *scale)}"/>'
+        )
+        lines.append(f'<text x="{x + cell_width // 2}" y="{y + 16}">{value:.{digits}f}</text>')
+    return svg(width, height, lines)
+
+
+class LogAxis:
+    """From a number to a place between `begin` and `end`."""
+
+    def __init__(self, least, most, begin, end):
+        self.least, self.most, self.begin, self.end = least, most, begin, end
+
+    def __call__(self, value):
+        share = math.log(value / self.least) / math.log(self.most / self.least)
+        return round(self.begin + share * (self.end - self.begin), 1)
+
+    def ticks(self, base):
+        power = math.ceil(math.log(self.least, base) - 1e-9)
+        while base**power <= self.most * (1 + 1e-9):
+            yield base**power
+            power += 1
+
+
+def chart(title, lines_of_chart, x_axis, y_axis):
+    """A list of lines, each one of points."""
+    middle = (x_axis.begin + x_axis.end) / 2
+    yield f'<text x="{middle}" y="{y_axis.end - 10}" font-size="13">{title}</text>'
+    for tick in x_axis.ticks(4):
+        x = x_axis(tick)
+        yield f'<path d="M{x} {y_axis.begin}V{y_axis.end}" stroke="#e5e5e5"/>'
+        yield f'<text x="{x}" y="{y_axis.begin + 15}">{tick}</text>'
+    for tick in y_axis.ticks(10):
+        y = y_axis(tick)
+        yield f'<path d="M{x_axis.begin} {y}H{x_axis.end}" stroke="#e5e5e5"/>'
+        yield f'<text x="{x_axis.begin - 6}" y="{y + 4}" text-anchor="end">{tick}</text>'
+    for points, line_colour in reversed(list(zip(lines_of_chart, LINE_COLOURS))):
+        places = " ".join(f"{x_axis(x)},{y_axis(y)}" for x, y in points)
+        yield f'<polyline points="{places}" fill="none" stroke="{line_colour}" stroke-width="2"/>'
+
+
+def charts(title, names_of_lines, all_charts, x_text, y_text):
+    """`all_charts` is a list of titles and lists of lines; two charts stand side by side."""
+    chart_width, chart_height, left, top, gap = 340, 220, 62, 88, 64
+    points = [point for _, lines in all_charts for line in lines for point in line]
+    least_x, most_x = (pick(x for x, _ in points) for pick in (min, max))
+    least_y, most_y = (pick(y for _, y in points) for pick in (min, max))
+    rows = -(-len(all_charts) // 2)
+    width, height = left + 2 * chart_width + gap + 12, top + rows * (chart_height + gap)
+    lines = [f'<text x="{width // 2}" y="20" font-size="14">{title}</text>']
+    for i, (name, line_colour) in enumerate(zip(names_of_lines, LINE_COLOURS)):
+        x = left + i * 250
+        lines.append(f'<path d="M{x} 42h24" stroke="{line_colour}" stroke-width="2"/>')
+        lines.append(f'<text x="{x + 30}" y="46" text-anchor="start">{name}</text>')
+    for i, (chart_title, lines_of_chart) in enumerate(all_charts):
+        x = left + i % 2 * (chart_width + gap)
+        y = top + i // 2 * (chart_height + gap)
+        x_axis = LogAxis(least_x, most_x, x, x + chart_width)
+        y_axis = LogAxis(10 ** math.floor(math.log10(least_y)), 10 ** math.ceil(math.log10(most_y)),
+                         y + chart_height, y)
+        lines.extend(chart(chart_title, lines_of_chart, x_axis, y_axis))
+        lines.append(f'<text x="{x + chart_width // 2}" y="{y + chart_height + 31}">{x_text}</text>')
+        lines.append(f'<text x="{x - 34}" y="{y - 10}">{y_text}</text>')
+    return svg(width, height, lines)
