@@ -42,6 +42,14 @@ struct none {
     static constexpr bool has_loop = false;
 };
 
+// So many vectors are asked before anything is made of their answers, which takes 32-bit ARM as
+// long as two of them.
+#if defined(__arm__)
+inline constexpr std::size_t vectors_together = 8;
+#else
+inline constexpr std::size_t vectors_together = 4;
+#endif
+
 #if TALNUMERICARRAY_HAS_VECTORS
 
 namespace for_baseline {

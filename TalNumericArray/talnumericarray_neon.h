@@ -92,7 +92,14 @@ struct operations<16> {
     static constexpr bool has_masks = false;
 
     static bool all_zeros(const Bits bits) noexcept {
+#if defined(__arm__)
+        // GCC would move each half to the core on its own.
+        const auto words = reinterpret_cast<uint32x4_t>(bits);
+        const uint32x2_t both = vorr_u32(vget_low_u32(words), vget_high_u32(words));
+        return vget_lane_u64(vreinterpret_u64_u32(both), 0) == 0;
+#else
         return (bits[0] | bits[1]) == 0;
+#endif
     }
 
     static bool all_ones(const Bits bits) noexcept {

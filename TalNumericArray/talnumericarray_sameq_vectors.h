@@ -237,11 +237,11 @@ struct loops {
                            std::size_t end, const std::size_t len) noexcept {
         constexpr std::size_t step = elements<T1, T2>;
         constexpr std::size_t lanes = is_complex_v<T2> ? 2 * step : step;
-        constexpr std::size_t vectors = 4;
+        constexpr std::size_t step_of_group = vectors_together * step;
         for (std::size_t passed = 0;;) {
-            while (end - passed >= vectors * step
-                   && certain_of<lanes, vectors>(bound, data1 + passed, data2 + passed)) {
-                passed += vectors * step;
+            while (end - passed >= step_of_group
+                   && certain_of<lanes, vectors_together>(bound, data1 + passed, data2 + passed)) {
+                passed += step_of_group;
             }
             while (passed < end) {
                 const std::size_t begin = std::min(passed, end - step);

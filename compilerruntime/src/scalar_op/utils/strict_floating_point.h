@@ -3,8 +3,8 @@
 //
 // The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width. A
 // compiler that may assume that there are no NaNs, reassociate, take reciprocals or keep excess
-// precision can give other answers, silently. GCC tells of each of these from version 12 on; earlier
-// ones and Clang only of -ffast-math and -ffinite-math-only.
+// precision can give other answers, silently. GCC tells of each of these from version 12 on;
+// earlier ones and Clang only of -ffast-math and -ffinite-math-only.
 
 #ifndef NESK_STRICT_FLOATING_POINT_H
 #define NESK_STRICT_FLOATING_POINT_H
