@@ -122,7 +122,7 @@ struct baseline : for_baseline::loops {
 namespace for_avx2 {
 inline constexpr std::size_t vector_bytes = 32;
 #    include "talnumericarray_avx2.h"
-#    include "talnumericarray_sameq_vectors.h"
+#    include "talnumericarray_sameq_vectors.h" // NOLINT(readability-duplicate-include)
 } // namespace for_avx2
 #    if defined(__clang__)
 #        pragma clang attribute pop
@@ -154,7 +154,7 @@ struct avx2 : for_avx2::loops {
 namespace for_avx512 {
 inline constexpr std::size_t vector_bytes = 64;
 #    include "talnumericarray_avx512.h"
-#    include "talnumericarray_sameq_vectors.h"
+#    include "talnumericarray_sameq_vectors.h" // NOLINT(readability-duplicate-include)
 } // namespace for_avx512
 #    if defined(__clang__)
 #        pragma clang attribute pop

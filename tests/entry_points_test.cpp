@@ -53,16 +53,16 @@ TEST(Shape, DimensionsThatDifferInTheSignAloneAreNeitherSameNorEquivalent) {
     constexpr talint sign = std::numeric_limits<talint>::min();
     for (const std::size_t place : {0U, 1U}) {
         for (const bool negated : {false, true}) {
-            const auto array1 = six({2, 3});
+            const auto array = six({2, 3});
             std::vector<talint> dimensions = {2, 3};
             talint& dimension = dimensions[place];
             dimension = negated ? -dimension : dimension + sign;
-            const auto array2 = six(dimensions);
-            EXPECT_EQ(sameQ(0, array1, array2), 0) << place << ", " << negated;
-            EXPECT_EQ(sameQ(0, array2, array1), 0) << place << ", " << negated;
-            EXPECT_EQ(TalNumericArray_equivalentQ(array1.handle(), array2.handle()), 0)
+            const auto other = six(dimensions);
+            EXPECT_EQ(sameQ(0, array, other), 0) << place << ", " << negated;
+            EXPECT_EQ(sameQ(0, other, array), 0) << place << ", " << negated;
+            EXPECT_EQ(TalNumericArray_equivalentQ(array.handle(), other.handle()), 0)
                 << place << ", " << negated;
-            EXPECT_EQ(TalNumericArray_equivalentQ(array2.handle(), array1.handle()), 0)
+            EXPECT_EQ(TalNumericArray_equivalentQ(other.handle(), array.handle()), 0)
                 << place << ", " << negated;
         }
     }

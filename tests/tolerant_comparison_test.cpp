@@ -220,14 +220,15 @@ T recalled_in_a_new_thread(const T tol) {
 // No comparison can tell which it is, as none looks it up.
 template <typename T>
 void expect_a_true_factor_at_first() {
-    constexpr T bits = std::numeric_limits<T>::digits;
+    constexpr int bits = std::numeric_limits<T>::digits;
     EXPECT_EQ(recalled_in_a_new_thread<T>(bits), 1);
-    for (T tol = -1; tol <= 2 * bits; tol += T(0.25)) {
+    for (int quarters = -4; quarters <= 8 * bits; ++quarters) {
+        const T tol = static_cast<T>(quarters) / 4;
         if (tol != bits) {
             EXPECT_EQ(recalled_in_a_new_thread<T>(tol), -1) << tol;
         }
     }
-    EXPECT_EQ(recalled_in_a_new_thread<T>(std::nextafter(bits, T(0))), -1);
+    EXPECT_EQ(recalled_in_a_new_thread<T>(std::nextafter(T(bits), T(0))), -1);
 }
 
 TEST(RememberedFactor, IsAtFirstThatOfAllDigits) {
