@@ -103,13 +103,11 @@ inline double magnitude(const double x) noexcept {
     return __builtin_fabs(x);
 }
 
-#if defined(__arm__)
-
 // 32-bit ARM has no instruction that converts integers of 64 bits; compilers call a function of 25
 // instructions, which knows one direction of rounding alone. What is exact is the same in all: the
 // double of 53 bits whose halves are exact doubles, and the single of 24 bits.
 template <typename T, typename From>
-inline T from_64_bits(const From number) noexcept {
+inline T by_halves(const From number) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
     constexpr auto limit = static_cast<std::uint64_t>(1) << bits;
     constexpr std::uint64_t below_zero = std::is_signed_v<From> ? limit : 0;
@@ -125,17 +123,20 @@ inline T from_64_bits(const From number) noexcept {
     }
 }
 
-#endif
-
 // A number in the type of comparison, rounded as the language rounds it.
 template <typename T, typename From>
 inline T converted(const From number) noexcept {
-#if defined(__arm__)
-    if constexpr (std::is_integral_v<From> && sizeof(From) == 8 && std::is_floating_point_v<T>) {
-        return from_64_bits<T>(number);
-    }
+#if defined(__arm__) && !defined(__OPTIMIZE_SIZE__)
+    constexpr bool in_halves =
+        std::is_integral_v<From> && sizeof(From) == 8 && std::is_floating_point_v<T>;
+#else
+    constexpr bool in_halves = false;
 #endif
-    return static_cast<T>(number);
+    if constexpr (in_halves) {
+        return by_halves<T>(number);
+    } else {
+        return static_cast<T>(number);
+    }
 }
 
 template <typename T>
