@@ -74,20 +74,23 @@ inline Bits rounded_to_53_bits(const Bits& numbers) noexcept {
     return (numbers & fits) | (rounded & ~fits);
 }
 
-template <typename From, std::size_t lanes>
+template <std::size_t lanes, typename From>
+inline vector<double, lanes> doubles_of_53_bits(const From* const from) noexcept {
+    constexpr bool is_signed = std::is_signed_v<From>;
+    const auto numbers = widened<std::uint64_t, lanes>(from);
+    return from_64_bits<is_signed, lanes>(rounded_to_53_bits<is_signed>(numbers));
+}
+
+template <std::size_t lanes, typename From>
 inline vector<float, lanes> singles_from_64_bits(const From* const from) noexcept {
     using Operations = operations_on<float, lanes>;
-    constexpr bool is_signed = std::is_signed_v<From>;
-    constexpr std::size_t half = std::max<std::size_t>(lanes / 2, 2);
-    const auto doubles = [](const From* const numbers) noexcept {
-        return from_64_bits<is_signed, half>(
-            rounded_to_53_bits<is_signed>(widened<std::uint64_t, half>(numbers)));
-    };
-    if constexpr (lanes == half) {
-        return reinterpret_cast<vector<float, lanes>>(Operations::singles(doubles(from)));
-    } else {
+    if constexpr (lanes <= 2) {
         return reinterpret_cast<vector<float, lanes>>(
-            Operations::singles(doubles(from), doubles(from + half)));
+            Operations::singles(doubles_of_53_bits<lanes>(from)));
+    } else {
+        constexpr std::size_t half = lanes / 2;
+        return reinterpret_cast<vector<float, lanes>>(Operations::singles(
+            doubles_of_53_bits<half>(from), doubles_of_53_bits<half>(from + half)));
     }
 }
 
@@ -102,7 +105,7 @@ inline vector<T, lanes> load(const From* const from) noexcept {
     } else if constexpr (Operations::template converts<T, From>) {
         return reinterpret_cast<vector<T, lanes>>(Operations::template converted<T, lanes>(from));
     } else if constexpr (sizeof(From) == 8 && std::is_same_v<T, float>) {
-        return singles_from_64_bits<From, lanes>(from);
+        return singles_from_64_bits<lanes>(from);
     } else if constexpr (sizeof(From) == 8) {
         return from_64_bits<std::is_signed_v<From>, lanes>(widened<std::uint64_t, lanes>(from));
     } else if constexpr (std::is_same_v<From, std::uint32_t>) {
