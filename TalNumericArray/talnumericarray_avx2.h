@@ -67,10 +67,6 @@ struct operations<32> {
         return _mm256_cvtps_pd(_mm_loadu_ps(from));
     }
 
-    static __m256 singles(const __m256d lower, const __m256d upper) noexcept {
-        return _mm256_set_m128(_mm256_cvtpd_ps(upper), _mm256_cvtpd_ps(lower));
-    }
-
     template <typename T, typename From>
     static constexpr bool converts = false;
 

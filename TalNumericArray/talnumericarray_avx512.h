@@ -7,6 +7,18 @@ template <std::size_t bytes>
 struct operations : for_avx2::operations<bytes> {};
 
 template <>
+struct operations<32> : for_avx2::operations<32> {
+    template <typename T, typename From>
+    static constexpr bool converts = sizeof(From) == 8 && std::is_same_v<T, float>;
+
+    template <typename T, std::size_t lanes, typename From>
+    static __m256 converted(const From* const from) noexcept {
+        const __m512i numbers = _mm512_loadu_si512(from);
+        return std::is_signed_v<From> ? _mm512_cvtepi64_ps(numbers) : _mm512_cvtepu64_ps(numbers);
+    }
+};
+
+template <>
 struct operations<64> {
     using Bits = __m512i;
 
@@ -66,8 +78,9 @@ struct operations<64> {
             const __m512i numbers = _mm512_loadu_si512(from);
             return is_signed ? _mm512_cvtepi64_pd(numbers) : _mm512_cvtepu64_pd(numbers);
         } else {
-            return _mm512_insertf32x8(_mm512_castps256_ps512(eight_singles(from)),
-                                      eight_singles(from + 8), 1);
+            const __m256 lower = operations<32>::converted<T, 8>(from);
+            const __m256 upper = operations<32>::converted<T, 8>(from + 8);
+            return _mm512_insertf32x8(_mm512_castps256_ps512(lower), upper, 1);
         }
     }
 
@@ -112,12 +125,5 @@ struct operations<64> {
 
     static __mmask8 if_at_least(const __mmask8 mask, const __m512d x, const __m512d y) noexcept {
         return _mm512_mask_cmp_pd_mask(mask, x, y, _CMP_GE_OQ);
-    }
-
-  private:
-    template <typename From>
-    static __m256 eight_singles(const From* const from) noexcept {
-        const __m512i numbers = _mm512_loadu_si512(from);
-        return std::is_signed_v<From> ? _mm512_cvtepi64_ps(numbers) : _mm512_cvtepu64_ps(numbers);
     }
 };

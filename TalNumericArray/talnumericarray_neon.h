@@ -60,17 +60,6 @@ struct operations<16> {
                                        vector<double, 2>);
     }
 
-#if defined(__aarch64__)
-    // Two singles, zeros behind them; or four.
-    static float32x4_t singles(const float64x2_t doubles) noexcept {
-        return vcombine_f32(vcvt_f32_f64(doubles), vdup_n_f32(0));
-    }
-
-    static float32x4_t singles(const float64x2_t lower, const float64x2_t upper) noexcept {
-        return vcombine_f32(vcvt_f32_f64(lower), vcvt_f32_f64(upper));
-    }
-#endif
-
     // Integers that become reals by an instruction for just that.
     template <typename T, typename From>
 #if defined(__aarch64__)

@@ -61,37 +61,13 @@ inline vector<double, lanes> from_64_bits(const vector<std::uint64_t, lanes>& nu
     return (upper - both_bases) + lower;
 }
 
-// Integers of 64 bits that, where they have more than 53, are rounded to that many, the last one
-// set if any below it were. A double is exact for these, and the single that is made of it is the
-// one nearest to the integer, or the one in the direction of rounding: 29 bits are between.
-template <bool is_signed, typename Bits>
-inline Bits rounded_to_53_bits(const Bits& numbers) noexcept {
-    constexpr std::uint64_t dropped = 0x7ff;
-    constexpr std::uint64_t limit = std::uint64_t{1} << 53;
-    const Bits rounded = (numbers | ((numbers & dropped) + dropped)) & ~dropped;
-    const Bits excess = is_signed ? (numbers + limit) >> 54 : numbers >> 53;
-    const Bits fits = reinterpret_cast<Bits>(excess == 0);
-    return (numbers & fits) | (rounded & ~fits);
-}
-
-template <std::size_t lanes, typename From>
-inline vector<double, lanes> doubles_of_53_bits(const From* const from) noexcept {
-    constexpr bool is_signed = std::is_signed_v<From>;
-    const auto numbers = widened<std::uint64_t, lanes>(from);
-    return from_64_bits<is_signed, lanes>(rounded_to_53_bits<is_signed>(numbers));
-}
-
-template <std::size_t lanes, typename From>
-inline vector<float, lanes> singles_from_64_bits(const From* const from) noexcept {
-    using Operations = operations_on<float, lanes>;
-    if constexpr (lanes <= 2) {
-        return reinterpret_cast<vector<float, lanes>>(
-            Operations::singles(doubles_of_53_bits<lanes>(from)));
-    } else {
-        constexpr std::size_t half = lanes / 2;
-        return reinterpret_cast<vector<float, lanes>>(Operations::singles(
-            doubles_of_53_bits<half>(from), doubles_of_53_bits<half>(from + half)));
+template <typename T, std::size_t lanes, typename From>
+inline vector<T, lanes> one_by_one(const From* const from) noexcept {
+    vector<T, lanes> result = {};
+    for (std::size_t k = 0; k < lanes; ++k) {
+        result[k] = static_cast<T>(from[k]);
     }
+    return result;
 }
 
 // `lanes` numbers as those of type `T`.
@@ -105,7 +81,7 @@ inline vector<T, lanes> load(const From* const from) noexcept {
     } else if constexpr (Operations::template converts<T, From>) {
         return reinterpret_cast<vector<T, lanes>>(Operations::template converted<T, lanes>(from));
     } else if constexpr (sizeof(From) == 8 && std::is_same_v<T, float>) {
-        return singles_from_64_bits<lanes>(from);
+        return one_by_one<T, lanes>(from);
     } else if constexpr (sizeof(From) == 8) {
         return from_64_bits<std::is_signed_v<From>, lanes>(widened<std::uint64_t, lanes>(from));
     } else if constexpr (std::is_same_v<From, std::uint32_t>) {

@@ -54,13 +54,6 @@ struct operations<16> {
         return _mm_cvtps_pd(_mm_castsi128_ps(load<lanes * sizeof(float)>(from)));
     }
 
-    // Two singles, zeros behind them; or four.
-    static __m128 singles(const __m128d doubles) noexcept { return _mm_cvtpd_ps(doubles); }
-
-    static __m128 singles(const __m128d lower, const __m128d upper) noexcept {
-        return _mm_movelh_ps(singles(lower), singles(upper));
-    }
-
     // Integers that become reals by an instruction for just that.
     template <typename T, typename From>
     static constexpr bool converts = false;
