@@ -41,23 +41,23 @@ inline int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
     return 1;
 }
 
-// Those behind the first one, of types in the order of the list. The rule is asked about every pair
-// in doubt; the others are passed over.
+// The elements from one in doubt on. The rule is asked about that and about every pair in doubt
+// behind it; the others are passed over.
 template <typename Sets, typename T1, typename T2>
-[[gnu::noinline]] int others_sameQ(const talreal& tol, const T1* data1, const T2* data2,
-                                   const talint len) noexcept {
+[[gnu::noinline]] int doubtful_sameQ(const talreal& tol, const T1* data1, const T2* data2,
+                                     const talint len) noexcept {
     // As long as vectors pass none, the stretches that the rule is asked about grow, so that
     // looking in vain costs next to nothing.
     constexpr talint longest_stretch = 1024;
     talint stretch = 1;
-    for (talint i = 1; i < len;) {
-        const talint passed = passed_over<Sets>(tol, data1 + i, data2 + i, len - i);
-        i += passed;
+    for (talint i = 0; i < len;) {
         const talint judged = std::min(stretch, len - i);
         if (each_sameQ(tol, data1 + i, data2 + i, judged) == 0) {
             return 0;
         }
         i += judged;
+        const talint passed = passed_over<Sets>(tol, data1 + i, data2 + i, len - i);
+        i += passed;
         stretch = passed > 0 ? 1 : std::min(2 * stretch, longest_stretch);
     }
     return 1;
@@ -77,15 +77,16 @@ inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
         if (!sameQ_test(tol, data1[0], data2[0])) {
             return 0;
         }
-        if (len == 1) {
+        const talint sure = 1 + passed_over<Sets>(tol, data1 + 1, data2 + 1, len - 1);
+        if (sure == len) {
             return 1;
         }
         // The rule says the same in either order, so that a pair of types and its reverse share
-        // what is behind.
+        // what is left.
         if constexpr (element_type_id<T1> <= element_type_id<T2>) {
-            return others_sameQ<Sets>(tol, data1, data2, len);
+            return doubtful_sameQ<Sets>(tol, data1 + sure, data2 + sure, len - sure);
         } else {
-            return others_sameQ<Sets>(tol, data2, data1, len);
+            return doubtful_sameQ<Sets>(tol, data2 + sure, data1 + sure, len - sure);
         }
     } else if constexpr (std::is_floating_point_v<comparison_t<T1, T2>>) {
         for (talint i = 0; i < len; ++i) {
