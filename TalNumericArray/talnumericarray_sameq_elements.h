@@ -36,7 +36,7 @@ inline const T& imaginary_part(const std::complex<T>& number) noexcept {
 // Integer or real against integer or real.
 template <typename T1, typename T2,
           std::enable_if_t<!is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
-inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     return nesk::compare(tol, data1, data2) == 0;
 }
 
@@ -44,7 +44,7 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 // imaginary part is tested for zero outright.
 template <typename T1, typename T2,
           std::enable_if_t<!is_complex_v<T1> && is_complex_v<T2>, int> = 0>
-inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const T1& rdata1 = data1;
     const to_real_type_t<T2>& rdata2 = talnumericarray::real_part(data2);
     const to_real_type_t<T2>& idata2 = talnumericarray::imaginary_part(data2);
@@ -54,7 +54,7 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 // Complex against integer or real.
 template <typename T1, typename T2,
           std::enable_if_t<is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
-inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const to_real_type_t<T1>& rdata1 = talnumericarray::real_part(data1);
     const to_real_type_t<T1>& idata1 = talnumericarray::imaginary_part(data1);
     const T2& rdata2 = data2;
@@ -63,7 +63,7 @@ inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noe
 
 // Complex against complex.
 template <typename T1, typename T2, std::enable_if_t<is_complex_v<T1> && is_complex_v<T2>, int> = 0>
-inline bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const to_real_type_t<T1>& rdata1 = talnumericarray::real_part(data1);
     const to_real_type_t<T1>& idata1 = talnumericarray::imaginary_part(data1);
     const to_real_type_t<T2>& rdata2 = talnumericarray::real_part(data2);

@@ -10,14 +10,19 @@
 #include <limits>
 #include <type_traits>
 
-// Expanded into each element loop the comparison is fast. GCC finds it too large for some; Clang
-// has to be told only not to for small code, and told to would refuse to in code with NEON.
-#if defined(__OPTIMIZE_SIZE__)
-#    define NESK_EXPANDED [[gnu::noinline]] inline
-#elif defined(__OPTIMIZE__) && !defined(__clang__)
+// Expanded into each element loop the comparison is fast. GCC finds it too large for some; Clang,
+// which does not, would refuse to if it were told to in code with NEON.
+#if defined(__OPTIMIZE__) && !defined(__OPTIMIZE_SIZE__) && !defined(__clang__)
 #    define NESK_EXPANDED [[gnu::always_inline]] inline
 #else
 #    define NESK_EXPANDED inline
+#endif
+
+// Where size counts, its steps are one function.
+#if defined(__OPTIMIZE_SIZE__)
+#    define NESK_STEPS [[gnu::noinline]] inline
+#else
+#    define NESK_STEPS NESK_EXPANDED
 #endif
 
 #pragma GCC visibility push(hidden)
@@ -170,7 +175,7 @@ template <typename T>
 // larger magnitude. No tolerance makes zero the same as another number, nor a number the same as
 // one of the other sign.
 template <typename T, std::enable_if_t<std::is_floating_point_v<T>, int> = 0>
-NESK_EXPANDED int compare_impl(const T& tol, const T& x, const T y) noexcept {
+NESK_STEPS int compare_impl(const T& tol, const T& x, const T y) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
 
     if (x == y) {
@@ -248,7 +253,7 @@ inline int compare(const Ttol& /*tol*/, const T1& arg1, const T2& arg2) noexcept
 // Returns 0 when they are the same, else -1 or +1.
 template <typename Ttol, typename T1, typename T2,
           std::enable_if_t<detail::either_floating_v<T1, T2>, int> = 0>
-inline int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept {
+NESK_EXPANDED int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept {
     using common_type = type_common_t<T1, T2>;
     const auto tol = static_cast<common_type>(tol_);
     const auto arg1 = static_cast<common_type>(arg1_);
@@ -260,6 +265,6 @@ inline int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept 
 
 NESK_STRICT_SINGLES_END
 #pragma GCC visibility pop
-#undef NESK_EXPANDED
+#undef NESK_STEPS
 
 #endif
