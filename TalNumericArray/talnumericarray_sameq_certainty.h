@@ -123,7 +123,7 @@ inline T by_halves(const From number) noexcept {
     }
 }
 
-// A number in the type of comparison, rounded as the language rounds it.
+// A number in the type of comparison, the same as a cast gives.
 template <typename T, typename From>
 inline T converted(const From number) noexcept {
 #if defined(__arm__) && !defined(__OPTIMIZE_SIZE__)
