@@ -249,7 +249,8 @@ inline int compare(const Ttol& /*tol*/, const T1& arg1, const T2& arg2) noexcept
 
 // A real and a real, or a real and an integer: the tolerance, in binary digits, and both values are
 // converted to the common type of the two values, in the direction of rounding that is in force,
-// and compared there. An integer beside a single is compared as a single, whatever its width.
+// and compared there. (On 32-bit ARM the function that converts 64-bit integers knows no direction
+// but to the nearest.) An integer beside a single is compared as a single, whatever its width.
 // Returns 0 when they are the same, else -1 or +1.
 template <typename Ttol, typename T1, typename T2,
           std::enable_if_t<detail::either_floating_v<T1, T2>, int> = 0>
