@@ -232,7 +232,7 @@ class Bench(steps.Bench):
 
         def steps_of(parts):
             return (step(part) for part in parts
-                    if mutant.path in self.needs[part] or mutant.path == MODULE)
+                    if mutant.path in self.needs[part] or mutant.path in (MODULE, TABLE))
 
         if "avx512" in mutant.path:
             yield step(CERTAINTY_OF_AVX512)
@@ -257,8 +257,9 @@ class Bench(steps.Bench):
 
     def _same_code(self, tree):
         """No test of what is compiled can tell them apart."""
-        same = (tree.object(MODULE, "-O1").read_bytes()
-                == self.tree.object(MODULE, "-O1", tree.sets).read_bytes())
+        same = all(tree.object(source, "-O1").read_bytes()
+                   == self.tree.object(source, "-O1", tree.sets).read_bytes()
+                   for source in (MODULE, TABLE))
         return (SURVIVES, "same machine code") if same else None
 
     def _release(self, mutant, tree):
