@@ -39,6 +39,7 @@ class Program:
     link: tuple = ()
     run: tuple = field(default=(), repr=False)
     module_level: str = "-O0"
+    sets: str = field(default="", repr=False)  # of the module, if not those for the mutant's file
 
 
 def own(name, *fixed, **settings):
@@ -50,8 +51,12 @@ ARRAYS = Program("whole arrays", (),
                  (*(f"tests/{name}.cpp" for name in
                     ("complex_pairs_test", "golden_calls_test", "random_calls_test",
                      "threads_test")), *SUPPORT))
+ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
+BASELINE = "TALNUMERICARRAY_INSTRUCTION_SETS=baseline"
+ALL_SETS = "ALL_SETS"
+
 # Without vectors, as with the option to optimise for size.
-SMALL = replace(ARRAYS, name="whole arrays, built for size", module_level="-Os")
+SMALL = replace(ARRAYS, name="whole arrays without vectors", module_level="-Os", sets=ALL_SETS)
 SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
                           "tolerance_shift_factor_test")))
 PARTS = (
@@ -72,11 +77,6 @@ CERTAINTY_OF_SETS = own("certainty_test", *SUPPORT,
 # With plain code for the instructions, which takes its time without optimisation.
 CERTAINTY_OF_AVX512 = Program("certainty_of_avx512_test", ("tests/certainty_of_avx512_test.cpp",),
                               SUPPORT, level="-O1 -Wno-psabi -DTALNUMERICARRAY_EMULATED")
-
-# All sets have the same loops, so that one will do but where sets are chosen.
-ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
-BASELINE = "TALNUMERICARRAY_INSTRUCTION_SETS=baseline"
-ALL_SETS = "ALL_SETS"
 
 # What the release build makes of the module beside the test programs, and the tests of that.
 CHECKED_TARGETS = ["talnumericarray_compare", "small_runtime", "runtime_by_linking",
@@ -110,7 +110,8 @@ def chosen(found):
 # ---- A copy of the module, and what is built from it
 
 def sets_for(path):
-    """The sets that the module is built with for mutants of a file."""
+    """The sets that the module is built with for mutants of a file. All have the same loops, so
+    that one will do but where sets are chosen."""
     if "instruction_sets" in path or "avx512" in path:
         return ALL_SETS
     return BASELINE if "sse2" in path else ONE_SET
@@ -127,12 +128,12 @@ class Tree(steps.Tree):
         super().put(path, text)
         self.sets = sets_for(path)
 
-    def object(self, source, level):
+    def object(self, source, level, sets=""):
         """The file that `source` is compiled to, once."""
-        key = source, level, self.sets
+        key = source, level, sets or self.sets
         if key not in self.objects:
             target = self.folder / f"{digest(*key)[:16]}.o"
-            self._compile(source, [*level.split(), f"-D{self.sets}"], target)
+            self._compile(source, [*level.split(), f"-D{sets or self.sets}"], target)
             self.objects[key] = target
         return self.objects[key]
 
@@ -147,10 +148,9 @@ class UnharmedTree(Tree):
         super().__init__(folder)
         self.lock = threading.RLock()
 
-    def object(self, source, level, sets=ALL_SETS):
+    def object(self, source, level, sets=""):
         with self.lock:
-            self.sets = sets
-            return super().object(source, level)
+            return super().object(source, level, sets)
 
     def _compile(self, source, flags, target):
         stamp = Path(f"{target}.stamp")
@@ -215,7 +215,8 @@ class Bench(steps.Bench):
     def run(self, program, tree, seconds):
         """Builds and runs the program with the tree's module; raises Killed where a test fails."""
         objects = [tree.object(source, program.level) for source in program.mutated]
-        objects += [tree.object(MODULE, program.module_level), tree.object(TABLE, "-O0")]
+        objects += [tree.object(MODULE, program.module_level, program.sets),
+                    tree.object(TABLE, "-O0")]
         objects += [self.tree.object(source, "-O1") for source in program.fixed]
         target = tree.folder / "program"
         status, text = command(["g++", "-fuse-ld=gold", *map(str, objects), *program.link,
@@ -243,6 +244,7 @@ class Bench(steps.Bench):
         of_sets = "instruction_sets" in mutant.path
         if "TalNumericArray" in mutant.path and not of_sets:
             yield from steps_of([CERTAINTY])
+        if "TalNumericArray" in mutant.path:
             yield step(SMALL)
         yield "same code", "", lambda: self._same_code(tree)
         yield from steps_of(PARTS)
