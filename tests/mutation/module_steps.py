@@ -58,7 +58,7 @@ ALL_SETS = "ALL_SETS"
 # Without vectors, as with the option to optimise for size.
 SMALL = replace(ARRAYS, name="whole arrays without vectors", module_level="-Os", sets=ALL_SETS)
 SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
-                          "tolerance_shift_factor_test")))
+                          "tolerance_shift_factor_test", "conversion_by_halves_test")))
 PARTS = (
     own("array_record_test", level="-O0 -fsanitize=undefined -fno-sanitize-recover=undefined",
         link=("-fsanitize=undefined",)),
