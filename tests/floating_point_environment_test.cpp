@@ -97,7 +97,8 @@ int flags_of(const double tol, const T1 value1, const T2 value2, const std::size
     return flags;
 }
 
-// Clang compares by instructions that find nothing invalid in a NaN.
+// Clang compares by instructions that find nothing invalid in a NaN, unless it makes vectors of
+// them.
 #if defined(__clang__)
 constexpr int invalid_of_nan = 0;
 #else
@@ -284,7 +285,8 @@ TEST_F(Traps, FindANaNWhereItIsInvalid) {
     const Array<double> array1{nan};
     const Array<double> array2{1};
     const auto compare = [&] { return sameQ(10, array1, array2); };
-    EXPECT_EQ(with_traps(FE_INVALID, compare), invalid_of_nan != 0 ? killed_by(SIGFPE) : success);
+    const ChildEnd end = with_traps(FE_INVALID, compare);
+    EXPECT_TRUE(end == killed_by(SIGFPE) || (invalid_of_nan == 0 && end == success)) << end;
     EXPECT_EQ(with_traps(FE_DIVBYZERO, compare), success);
 }
 
