@@ -27,6 +27,11 @@ SUPPORT = [f"tests/support/{name}.cpp"
            for name in ("checked_calls", "golden_calls", "oracle", "random_arrays")]
 RANDOM_CALLS = 100000
 
+# What the module is built with.
+ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
+BASELINE = "TALNUMERICARRAY_INSTRUCTION_SETS=baseline"
+ALL_SETS = "ALL_SETS"
+
 
 @dataclass(frozen=True)
 class Program:
@@ -51,10 +56,6 @@ ARRAYS = Program("whole arrays", (),
                  (*(f"tests/{name}.cpp" for name in
                     ("complex_pairs_test", "golden_calls_test", "random_calls_test",
                      "threads_test")), *SUPPORT))
-ONE_SET = "TALNUMERICARRAY_INSTRUCTION_SETS=avx2"
-BASELINE = "TALNUMERICARRAY_INSTRUCTION_SETS=baseline"
-ALL_SETS = "ALL_SETS"
-
 # Without vectors, as with the option to optimise for size.
 SMALL = replace(ARRAYS, name="whole arrays without vectors", module_level="-Os", sets=ALL_SETS)
 SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
