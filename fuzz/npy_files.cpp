@@ -6,11 +6,11 @@
 
 #include "array_file.h"
 #include "comparison.h"
-#include "difference_text.h"
 #include "element_type.h"
 #include "npy_header.h"
 #include "support/memory_bytes.h"
 #include "trouble.h"
+#include "wording.h"
 
 #include <algorithm>
 #include <cmath>
@@ -89,7 +89,7 @@ void check_against_text(const NpyHeader& header, const std::string_view dictiona
         dimensions.push_back(std::to_string(dimension));
     }
     require(dimensions == written_dimensions(dictionary), "the shape is the one that is written");
-    const talcmp::ElementType& type = talcmp::element_type(header.element_type);
+    const talcmp::ElementType& type = *header.type;
     const std::size_t code = dictionary.find(type.kind + std::to_string(type.size));
     require(code != std::string_view::npos && code > 0, "the type is the one that is written");
     require(header.bytes_swapped == (dictionary[code - 1] == '>' && type.size > 1),
@@ -99,12 +99,12 @@ void check_against_text(const NpyHeader& header, const std::string_view dictiona
 }
 
 void check_header(const NpyHeader& header, const std::size_t file_size) {
-    require(header.element_type >= 1 && header.element_type <= 12, "the element type is known");
+    require(header.type != nullptr, "the element type is known");
     require(header.shape.size() <= 64, "there are at most 64 dimensions");
     require(is_product(header.element_count, header.shape), "the count is that of the shape");
     require(header.data_offset <= file_size, "the data begins in the file");
     const std::uint64_t bytes = file_size - header.data_offset;
-    const std::uint64_t size = oracle::element_size(header.element_type);
+    const std::uint64_t size = oracle::element_size(header.type->id);
     require(bytes % size == 0 && bytes / size == header.element_count,
             "the elements fill the file");
 }
@@ -162,13 +162,13 @@ struct OpenedArray {
 };
 
 const unsigned char* element(const OpenedArray& array, const std::uint64_t position) {
-    const std::size_t size = talcmp::element_type(array.source->element_type()).size;
+    const std::size_t size = array.source->type().size;
     return reinterpret_cast<const unsigned char*>(array.elements.data()) + position * size;
 }
 
 // One element, as an array.
 oracle::Array at(const OpenedArray& array, const std::uint64_t position) {
-    return {array.source->element_type(), {}, 1, element(array, position)};
+    return {array.source->type().id, {}, 1, element(array, position)};
 }
 
 // Where the element lies that comes at `order` in row-major order.
@@ -191,7 +191,7 @@ std::uint64_t position_of(const OpenedArray& array, const std::uint64_t order) {
 // The elements are those in the file, each part in the byte order of this machine.
 void check_elements(const OpenedArray& array, const NpyHeader& header,
                     const std::string_view bytes) {
-    const talcmp::ElementType& type = talcmp::element_type(header.element_type);
+    const talcmp::ElementType& type = *header.type;
     std::string expected(bytes.substr(static_cast<std::size_t>(header.data_offset)));
     if (header.bytes_swapped) {
         for (std::size_t i = 0; i < expected.size(); i += type.part_size) {
@@ -207,7 +207,7 @@ OpenedArray read_all(const MemoryFile& file) {
     OpenedArray array;
     array.source = talcmp::open_array_file(file.path())->open("");
     const std::uint64_t count = talcmp::element_count(*array.source);
-    const std::size_t size = talcmp::element_type(array.source->element_type()).size;
+    const std::size_t size = array.source->type().size;
     array.elements.resize(static_cast<std::size_t>(count) * size / sizeof(std::max_align_t) + 1);
     array.source->read(0, count, array.elements.data());
     return array;
@@ -219,7 +219,7 @@ void read_archive(const MemoryFile& file) {
         const auto archive = talcmp::open_array_file(file.path());
         for (const std::string& member : archive->members()) {
             const auto source = archive->open(member);
-            const std::size_t size = talcmp::element_type(source->element_type()).size;
+            const std::size_t size = source->type().size;
             std::vector<unsigned char> element(size);
             const std::uint64_t count = talcmp::element_count(*source);
             for (std::uint64_t i = 0; i < std::min<std::uint64_t>(count, 1000); ++i) {
@@ -242,7 +242,7 @@ std::optional<OpenedArray> opened(const MemoryFile& file, const std::string_view
     try {
         OpenedArray array = read_all(file);
         require(read.header.has_value(), "the file is refused as its bytes are");
-        require(array.source->element_type() == read.header->element_type
+        require(&array.source->type() == read.header->type
                     && array.source->shape() == read.header->shape
                     && array.source->fortran_order() == read.header->fortran_order,
                 "the file has the header of its bytes");
@@ -283,7 +283,7 @@ Expected expected_answer(const OpenedArray& first, const OpenedArray& second,
             expected = {Difference::elements, i, expected.differing + 1};
         }
     }
-    if (question.strict_type && first.source->element_type() != second.source->element_type()) {
+    if (question.strict_type && &first.source->type() != &second.source->type()) {
         expected.difference = Difference::type;
     }
     return expected;
@@ -346,7 +346,7 @@ void pass_part(const char*& text, const talcmp::ElementType& type, const unsigne
 }
 
 void pass_element(const char*& text, const OpenedArray& array, const std::uint64_t order) {
-    const talcmp::ElementType& type = talcmp::element_type(array.source->element_type());
+    const talcmp::ElementType& type = array.source->type();
     const unsigned char* const bytes = element(array, position_of(array, order));
     pass_part(text, type, bytes);
     if (type.kind == 'c') {
@@ -396,7 +396,7 @@ void check_question(const Operand& first, const Operand& second, const talcmp::Q
         check_text(talcmp::difference_text(comparison), expected, first.array, second.array);
     }
     if (comparison.report) {
-        require(comparison.report->differing == expected.differing,
+        require(comparison.report->totals.differing == expected.differing,
                 "as many pairs differ as is expected");
     }
 }

@@ -46,7 +46,7 @@ void expect_answer(const TemporaryFolder& folder, Options arguments, const std::
     const std::string path1 = folder.write("a.npy", first);
     const std::string path2 = folder.write("b.npy", second);
     arguments.insert(arguments.end(), {path1, path2});
-    const Outcome outcome = run_talcmp(arguments);
+    const ProcessResult outcome = run_talcmp(arguments);
     const bool same = difference.empty();
     EXPECT_EQ(outcome.status, same ? 0 : 1);
     EXPECT_EQ(outcome.output, same ? "" : path1 + " " + path2 + " differ: " + difference + "\n");
@@ -416,7 +416,7 @@ TEST(EveryType, IsComparedByValueWithEveryOther) {
 TEST(Files, MayBeOneAndTheSame) {
     const TemporaryFolder folder;
     const std::string path = folder.write("a.npy", f64({1, 2}));
-    const Outcome outcome = run_talcmp({path, path});
+    const ProcessResult outcome = run_talcmp({path, path});
     EXPECT_EQ(outcome.status, 0);
     EXPECT_EQ(outcome.output + outcome.errors, "");
 }
@@ -429,12 +429,12 @@ TEST(Files, HaveNamesThatAreToldInOneLine) {
         folder.write("a\nb\x1B[31m\xC2\x9B\x9B\xE2\x80\xAE\xE2\x80\xA8\xC3.npy", f64({1}));
     const std::string path2 = folder.write("gr\xC3\xBCn.npy", f64({1.5}));
     const std::string shown1 = folder.path_of("a?b?[31m?????.npy");
-    const Outcome outcome = run_talcmp({path1, path2});
+    const ProcessResult outcome = run_talcmp({path1, path2});
     EXPECT_EQ(outcome.status, 1);
     EXPECT_EQ(outcome.output,
               shown1 + " " + path2 + " differ: [0]: 1 and 1.5 (the same from --tol 52 on)\n");
     EXPECT_EQ(outcome.errors, "");
-    const Outcome trouble = run_talcmp({path1 + "x", path2});
+    const ProcessResult trouble = run_talcmp({path1 + "x", path2});
     EXPECT_EQ(trouble.status, 2);
     EXPECT_EQ(trouble.output, "");
     EXPECT_EQ(trouble.errors, "talcmp: " + shown1
@@ -509,7 +509,7 @@ TEST(CommandLine, AsksForHelpOrTheVersion) {
     const std::pair<const char*, const char*> questions[] = {
         {"--help", "--strict-type"}, {"-h", "Exit status: 0"}, {"--version", "talcmp "}};
     for (const auto& [option, answer] : questions) {
-        const Outcome outcome = run_talcmp({option});
+        const ProcessResult outcome = run_talcmp({option});
         EXPECT_EQ(outcome.status, 0) << option;
         EXPECT_NE(outcome.output.find(answer), std::string::npos) << outcome.output;
         EXPECT_EQ(outcome.errors, "");
@@ -546,7 +546,7 @@ TEST(CommandLine, MayAskForTheExitStatusAlone) {
     const TemporaryFolder folder;
     const std::string path1 = folder.write("a.npy", f64({1, 2}));
     const std::string path2 = folder.write("b.npy", f64({1, 3}));
-    const Outcome outcome = run_talcmp({"--quiet", path1, path2});
+    const ProcessResult outcome = run_talcmp({"--quiet", path1, path2});
     EXPECT_EQ(outcome.status, 1);
     EXPECT_EQ(outcome.output + outcome.errors, "");
     expect_trouble(run_talcmp({"-q", path1, path2 + "x"}), path2 + "x: ", "No such file");

@@ -129,16 +129,27 @@ TEST(Descriptors, AreClosedAtTheEnd) {
     EXPECT_FALSE(is_open(number));
 }
 
+talcmp::RegularFile opened(const std::string& path, const std::uint64_t size) {
+    return {path, talcmp::Descriptor(::open(path.c_str(), O_RDONLY | O_CLOEXEC)), size};
+}
+
+// The beginning, of 4096 bytes, is read once and kept.
 TEST(Files, AreReadAnywhere) {
     const TemporaryFolder folder;
-    const std::string bytes = text_of_length(1000);
-    talcmp::RegularFile file(folder.write("file", bytes));
-    EXPECT_TRUE(file.random_access());
-    EXPECT_EQ(file.size(), 1000U);
-    EXPECT_EQ(read(file, 990, 100), bytes.substr(990));
-    EXPECT_EQ(read(file, 10, 20), bytes.substr(10, 20));
-    EXPECT_EQ(read(file, 1000, 1), "");
-    EXPECT_EQ(read(file, 5000, 1), "");
+    for (const std::size_t size : {0U, 1000U, 4095U, 4096U, 4097U, 10000U}) {
+        const std::string bytes = text_of_length(size);
+        talcmp::RegularFile file = opened(folder.write("file", bytes), size);
+        EXPECT_TRUE(file.random_access());
+        EXPECT_EQ(file.size(), size);
+        EXPECT_EQ(file.beginning(), bytes.substr(0, 4096));
+        for (const std::size_t offset : {0U, 10U, 990U, 4095U, 4096U, 4097U, 9999U, 20000U}) {
+            for (const std::size_t count : {0U, 1U, 20U, 4096U, 20000U}) {
+                EXPECT_EQ(read(file, offset, count),
+                          offset < size ? bytes.substr(offset, count) : "")
+                    << count << " of " << size << " from " << offset << " on";
+            }
+        }
+    }
 }
 
 TEST(Files, OfOneArrayHaveOneMemberWithoutAName) {
@@ -152,7 +163,7 @@ TEST(Files, OfOneArrayHaveOneMemberWithoutAName) {
 TEST(Files, ThatAreNoneAreTrouble) {
     const TemporaryFolder folder;
     const auto trouble = [](const std::string& path) {
-        return trouble_of([&path] { talcmp::RegularFile file(path); });
+        return trouble_of([&path] { talcmp::open_array_file(path); });
     };
     const std::string missing = folder.path_of("missing");
     EXPECT_EQ(trouble(missing), missing + ": cannot be opened: No such file or directory");
@@ -169,14 +180,14 @@ TEST(Files, ThatCannotBeReadAreTrouble) {
     char byte = 0;
     EXPECT_EQ(trouble_of([&] { talcmp::read_at(descriptor.number(), "name", 0, &byte, 1); }),
               "name: cannot be read: Is a directory");
-    talcmp::Pipe pipe("pipe", ::dup(descriptor.number()));
+    talcmp::Pipe pipe("pipe", talcmp::Descriptor(::dup(descriptor.number())));
     EXPECT_EQ(trouble_of([&] { pipe.read(0, &byte, 1); }), "pipe: cannot be read: Is a directory");
 }
 
 TEST(Pipes, AreReadToTheirEnd) {
     int ends[2] = {};
     ASSERT_EQ(::pipe(ends), 0);
-    talcmp::Pipe pipe("pipe", ends[0]);
+    talcmp::Pipe pipe("pipe", talcmp::Descriptor(ends[0]));
     ASSERT_EQ(::write(ends[1], "abcdef", 6), 6);
     ::close(ends[1]);
     EXPECT_FALSE(pipe.size().has_value());
@@ -189,16 +200,12 @@ TEST(Pipes, MayBeNamed) {
     const std::string path = folder.path_of("pipe");
     ASSERT_EQ(::mkfifo(path.c_str(), 0600), 0);
     const talcmp::Descriptor writer(::open(path.c_str(), O_RDWR | O_CLOEXEC));
-    ASSERT_EQ(::write(writer.number(), "abc", 3), 3);
-    talcmp::Pipe pipe(path);
-    EXPECT_EQ(read(pipe, 0, 3), "abc");
-}
-
-TEST(Pipes, ThatCannotBeOpenedAreTrouble) {
-    const TemporaryFolder folder;
-    const std::string path = folder.path_of("missing");
-    EXPECT_EQ(trouble_of([&] { talcmp::Pipe pipe(path); }),
-              path + ": cannot be opened: No such file or directory");
+    const std::string bytes = npy::row<double>({1, 2});
+    ASSERT_EQ(::write(writer.number(), bytes.data(), bytes.size()),
+              static_cast<ssize_t>(bytes.size()));
+    const auto array = talcmp::open_array_file(path)->open("");
+    EXPECT_FALSE(array->random_access());
+    EXPECT_EQ(array->shape(), talcmp::Shape{2});
 }
 
 } // namespace

@@ -29,7 +29,7 @@ constexpr std::uint64_t length = 1000000;
 
 class Bytes : public talcmp::ArraySource {
   public:
-    type_t element_type() const override { return 1; }
+    const talcmp::ElementType& type() const override { return talcmp::element_type(BIT8_TYPE); }
     const talcmp::Shape& shape() const override { return shape_; }
     bool fortran_order() const override { return false; }
     bool random_access() const override { return true; }
@@ -88,12 +88,12 @@ class BrokenInOrder : public Bytes {
     std::atomic<bool> first_failed_ = false;
 };
 
-// Comes but once, by columns, and cannot be read.
+// Can be read only once, by columns, and fails.
 class BrokenPipe : public talcmp::ArraySource {
   public:
     explicit BrokenPipe(std::string name) : name_(std::move(name)) {}
 
-    type_t element_type() const override { return 1; }
+    const talcmp::ElementType& type() const override { return talcmp::element_type(BIT8_TYPE); }
     const talcmp::Shape& shape() const override { return shape_; }
     bool fortran_order() const override { return true; }
     bool random_access() const override { return false; }
@@ -163,7 +163,7 @@ TEST_P(BrokenFiles, DifferWhereTheyAreReadBeforeTheyFail) {
     const talcmp::Comparison result = compare(length / 2, 5);
     EXPECT_EQ(result.difference, talcmp::Difference::elements);
     ASSERT_EQ(result.places.size(), 1U);
-    EXPECT_EQ(result.places[0].position, 5U);
+    EXPECT_EQ(result.places[0].index, talcmp::Shape{5});
 }
 
 TEST_P(BrokenFiles, AreTroubleWhereTheyFailBeforeTheyDiffer) {
@@ -230,7 +230,7 @@ using Bytes8 = std::vector<std::int8_t>;
 using talcmp::Difference;
 using talcmp::Shape;
 
-// Adds up what it is told.
+// Adds up what it is called with.
 class Listener : public talcmp::ProgressListener {
   public:
     void begin(const std::uint64_t total_bytes) override {
@@ -257,29 +257,27 @@ Source array(Shape shape, std::vector<T> elements, const Order order = Order::c,
     return std::make_unique<MemoryArray<T>>(std::move(shape), std::move(elements), order, access);
 }
 
-// What is told of a place of bytes.
-struct Told {
-    std::uint64_t order;
-    std::uint64_t position;
+// What is listed of a place of bytes.
+struct Listed {
+    Shape index;
     int first;
     int second;
 
-    bool operator==(const Told& other) const {
-        return order == other.order && position == other.position && first == other.first
-               && second == other.second;
+    bool operator==(const Listed& other) const {
+        return index == other.index && first == other.first && second == other.second;
     }
 };
 
-std::ostream& operator<<(std::ostream& out, const Told& told) {
-    return out << told.order << " at " << told.position << ": " << told.first << " and "
-               << told.second;
+std::ostream& operator<<(std::ostream& out, const Listed& listed) {
+    return out << testing::PrintToString(listed.index) << ": " << listed.first << " and "
+               << listed.second;
 }
 
-std::vector<Told> told(const std::vector<talcmp::Place>& places) {
-    std::vector<Told> all;
+std::vector<Listed> listed(const std::vector<talcmp::Place>& places) {
+    std::vector<Listed> all;
     all.reserve(places.size());
     for (const talcmp::Place& place : places) {
-        all.push_back({place.order, place.position, static_cast<std::int8_t>(place.element1[0]),
+        all.push_back({place.index, static_cast<std::int8_t>(place.element1[0]),
                        static_cast<std::int8_t>(place.element2[0])});
     }
     return all;
@@ -299,10 +297,10 @@ class Comparisons : public testing::TestWithParam<unsigned> {
 TEST_P(Comparisons, TellTheFirstPlacesOfMany) {
     Bytes8 ones(length);
     const std::vector<std::uint64_t> positions = {5, 9, 300000, 300001, 600000, 999990, 999999};
-    std::vector<Told> expected;
+    std::vector<Listed> expected;
     for (const std::uint64_t position : positions) {
         ones[static_cast<std::size_t>(position)] = 1;
-        expected.push_back({position, position, 0, 1});
+        expected.push_back({{position}, 0, 1});
     }
     while (!expected.empty()) {
         SCOPED_TRACE(expected.size());
@@ -310,7 +308,7 @@ TEST_P(Comparisons, TellTheFirstPlacesOfMany) {
         const auto result = compare(array<std::int8_t>({length}, Bytes8(length)),
                                     array<std::int8_t>({length}, ones));
         EXPECT_EQ(result.difference, Difference::elements);
-        EXPECT_EQ(told(result.places), expected);
+        EXPECT_EQ(listed(result.places), expected);
         expected.pop_back();
     }
 }
@@ -323,7 +321,7 @@ void expect_first_places(const talcmp::Question& question, const std::uint64_t r
                          const Order order2) {
     Bytes8 first(static_cast<std::size_t>(rows * columns));
     Bytes8 second(first.size());
-    std::vector<Told> expected;
+    std::vector<Listed> expected;
     for (const auto& [row, column] : indices) {
         const std::uint64_t by_rows = row * columns + column;
         const std::uint64_t by_columns = column * rows + row;
@@ -332,20 +330,20 @@ void expect_first_places(const talcmp::Question& question, const std::uint64_t r
         const std::uint64_t position2 = order2 == Order::c ? by_rows : by_columns;
         first[static_cast<std::size_t>(position)] = value;
         second[static_cast<std::size_t>(position2)] = static_cast<std::int8_t>(-value);
-        expected.push_back({by_rows, position, value, -value});
+        expected.push_back({{row, column}, value, -value});
     }
     Listener listener;
     const auto result = talcmp::compare({"a", array<std::int8_t>({rows, columns}, first, order1)},
                                         {"b", array<std::int8_t>({rows, columns}, second, order2)},
                                         question, listener);
     expected.resize(std::min(expected.size(), question.differences));
-    EXPECT_EQ(told(result.places), expected);
+    EXPECT_EQ(listed(result.places), expected);
 }
 
 constexpr Order orders[] = {Order::c, Order::fortran};
 
 // Where boxes are cut off at the edges.
-TEST_P(Comparisons, TellPlacesInRowMajorOrderHoweverArraysAreStored) {
+TEST_P(Comparisons, ListPlacesInRowMajorOrderHoweverArraysAreStored) {
     const Indices indices = {{2, 1499},    {3, 3},    {1447, 1448}, {1448, 2},
                              {1448, 1447}, {1499, 0}, {1499, 1499}};
     question_.differences = 100;
@@ -374,10 +372,10 @@ TEST_P(Comparisons, CountAllPairsOfArraysOfTwoTypesInAStrictReport) {
     const auto result =
         compare(array<std::int8_t>({3}, {1, 2, 3}), array<double>({3}, {1, 2, 3.5}));
     EXPECT_EQ(result.difference, Difference::type);
-    EXPECT_EQ(told(result.places).size(), 1U);
+    EXPECT_EQ(listed(result.places).size(), 1U);
     ASSERT_TRUE(result.report.has_value());
-    EXPECT_EQ(result.report->pairs, 3U);
-    EXPECT_EQ(result.report->differing, 1U);
+    EXPECT_EQ(result.report->totals.pairs, 3U);
+    EXPECT_EQ(result.report->totals.differing, 1U);
 }
 
 TEST_P(Comparisons, ReadNothingWhereTheTypesDifferAlready) {
@@ -395,12 +393,12 @@ TEST_P(Comparisons, KnowTheArrays) {
                                 array<double>({4, 2}, std::vector<double>(8)));
     EXPECT_EQ(result.difference, Difference::shape);
     EXPECT_EQ(result.array1.name, "a");
-    EXPECT_EQ(result.array1.type, element_type_id<std::int8_t>);
+    EXPECT_EQ(result.array1.type->id, element_type_id<std::int8_t>);
     EXPECT_EQ(result.array1.shape, (Shape{3, 2}));
     EXPECT_EQ(result.array1.selected_shape, (Shape{2, 2}));
     EXPECT_TRUE(result.array1.fortran_order);
     EXPECT_EQ(result.array2.name, "b");
-    EXPECT_EQ(result.array2.type, element_type_id<double>);
+    EXPECT_EQ(result.array2.type->id, element_type_id<double>);
     EXPECT_EQ(result.array2.shape, (Shape{4, 2}));
     EXPECT_EQ(result.array2.selected_shape, (Shape{3, 2}));
     EXPECT_FALSE(result.array2.fortran_order);
@@ -423,7 +421,7 @@ TEST_P(Comparisons, NeedTheSelectedPart) {
     }
 }
 
-// Also where elements come but once, and have to be copied to be read in another order.
+// Also where elements can be read only once, and have to be copied to be read in another order.
 TEST_P(Comparisons, TellWhatTheyRead) {
     constexpr std::uint64_t rows = 500;
     constexpr std::uint64_t columns = 800;

@@ -57,7 +57,7 @@ class ExhaustiveLargeArrays : public testing::Test {
         return write(name, npy::dictionary(npy::descr<double>(), fortran_order, shape), bytes, 1);
     }
 
-    static void expect_same(const Outcome& outcome) {
+    static void expect_same(const ProcessResult& outcome) {
         EXPECT_EQ(outcome.status, 0);
         EXPECT_EQ(outcome.output + outcome.errors, "");
         EXPECT_LT(outcome.memory, most_memory);
@@ -75,7 +75,7 @@ TEST_F(ExhaustiveLargeArrays, AreTheSame) {
 TEST_F(ExhaustiveLargeArrays, DifferInTheLastElement) {
     const std::string first = write_bytes("a.npy", "(1, 2147483658)", 0);
     const std::string second = write_bytes("b.npy", "(1, 2147483658)", 1);
-    const Outcome outcome = run_talcmp({first, second});
+    const ProcessResult outcome = run_talcmp({first, second});
     EXPECT_EQ(outcome.status, 1);
     EXPECT_EQ(outcome.output,
               first + " " + second + " differ: [0, 2147483657]: 0 and 1 (different integers)\n");
@@ -114,7 +114,7 @@ TEST(ExhaustiveManyPlaces, TakeTheMemoryThatIsDocumented) {
         if (json) {
             all.emplace_back("--json");
         }
-        const Outcome outcome = run_talcmp(all);
+        const ProcessResult outcome = run_talcmp(all);
         EXPECT_EQ(outcome.status, 1);
         EXPECT_EQ(outcome.errors, "");
         EXPECT_EQ(lines_with(outcome.output, "different integers"), json ? count + 2 : count);

@@ -177,7 +177,7 @@ const BadUsage values[] = {
 class BadUsages : public testing::TestWithParam<BadUsage> {};
 
 TEST_P(BadUsages, AreRefusedWithAHint) {
-    const Outcome outcome = run_talcmp(GetParam().words);
+    const ProcessResult outcome = run_talcmp(GetParam().words);
     EXPECT_EQ(outcome.status, 2);
     EXPECT_EQ(outcome.output, "");
     EXPECT_EQ(outcome.errors, "talcmp: " + GetParam().message + "; see 'talcmp --help'\n");
@@ -249,7 +249,7 @@ class Usages : public testing::TestWithParam<Usage> {
 };
 
 TEST_P(Usages, AreUnderstood) {
-    const Outcome outcome = run_talcmp(GetParam().words);
+    const ProcessResult outcome = run_talcmp(GetParam().words);
     EXPECT_EQ(outcome.status, GetParam().status);
     EXPECT_EQ(outcome.output, GetParam().output);
     EXPECT_EQ(outcome.errors, "");

@@ -1,4 +1,4 @@
-// The search for pairs that differ, in elements behind which nothing can be read.
+// The search for pairs that differ, in elements after which nothing can be read.
 
 #include "pairs.h"
 
@@ -21,7 +21,7 @@ class PairSearch : public testing::Test {};
 using Types = testing::Types<std::int8_t, std::int64_t, float, double>;
 TYPED_TEST_SUITE(PairSearch, Types, TypeNames);
 
-TYPED_TEST(PairSearch, FindsTheFirstDifferenceAndReadsNothingBehindTheElements) {
+TYPED_TEST(PairSearch, FindsTheFirstDifferenceAndReadsNothingPastTheElements) {
     using T = TypeParam;
     constexpr std::size_t longest = 150;
     const ProtectedMemory memory1(longest * sizeof(T));
@@ -32,7 +32,8 @@ TYPED_TEST(PairSearch, FindsTheFirstDifferenceAndReadsNothingBehindTheElements) 
             auto* const second = static_cast<T*>(memory2.before_end(count * sizeof(T)));
             std::fill_n(first, count, T{1});
             std::fill_n(second, count, T{1});
-            const talcmp::Pairs pairs(element_type_id<T>, first, element_type_id<T>, second, count);
+            const talcmp::ElementType& type = talcmp::element_type(element_type_id<T>);
+            const talcmp::Pairs pairs(type, first, type, second, count);
             EXPECT_EQ(pairs.find_different(tolerance, 0), count);
             for (std::size_t place = 0; place < count; ++place) {
                 second[place] = second[count - 1] = 2;
@@ -54,7 +55,8 @@ void expect_factor_is_remembered() {
     const double tolerance = std::numeric_limits<Real>::digits - 0.5;
     const Real one = 1;
     const Real far = 2.5;
-    const talcmp::Pairs pair(element_type_id<Real>, &one, element_type_id<Real>, &far, 1);
+    const talcmp::ElementType& type = talcmp::element_type(element_type_id<Real>);
+    const talcmp::Pairs pair(type, &one, type, &far, 1);
     talcmp::remember_factor_of(1);
     EXPECT_FALSE(pair.same(1, 0));
     talcmp::remember_factor_of(tolerance);

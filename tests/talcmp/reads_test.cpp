@@ -38,7 +38,9 @@ class CountedArray : public talcmp::ArraySource {
         : shape_(std::move(shape)), fortran_order_(fortran_order), reads_(reads), one_(one),
           broken_(broken) {}
 
-    type_t element_type() const override { return COMPLEX_REAL64_TYPE; }
+    const talcmp::ElementType& type() const override {
+        return talcmp::element_type(COMPLEX_REAL64_TYPE);
+    }
     const talcmp::Shape& shape() const override { return shape_; }
     bool fortran_order() const override { return fortran_order_; }
     bool random_access() const override { return true; }

@@ -1,6 +1,6 @@
-// What is counted of pairs, and which of them are told.
+// What is counted of pairs, and which of them are listed.
 
-#include "report.h"
+#include "pair_counter.h"
 
 #include "taldata_array_element_types.h"
 
@@ -21,7 +21,8 @@
 
 namespace {
 
-using talcmp::Report;
+using talcmp::Findings;
+using talcmp::Totals;
 using Reals = std::vector<double>;
 
 constexpr double infinity = std::numeric_limits<double>::infinity();
@@ -94,36 +95,38 @@ TEST(SpecialValue, IsNoInteger) {
 
 // ---- Reports
 
-std::string text_of(const talcmp::Place& place) {
-    return std::to_string(place.order) + "@" + std::to_string(place.position);
+// Its number, and how many digits its elements differ in.
+std::string text_of(const talcmp::FoundPair& pair) {
+    const std::string digits = pair.sameness ? std::to_string(pair.sameness->digits()) : "?";
+    return std::to_string(pair.number) + ":" + digits;
 }
 
-// All that a report says.
-std::string text_of(const Report& report) {
-    std::string text = std::to_string(report.pairs) + " pairs, " + std::to_string(report.differing)
+// All that is counted.
+std::string text_of(const Totals& totals) {
+    std::string text = std::to_string(totals.pairs) + " pairs, " + std::to_string(totals.differing)
                        + " differ; digits";
-    for (std::size_t digits = 0; digits < report.digits.size(); ++digits) {
-        if (report.digits[digits] != 0) {
-            text += " " + std::to_string(report.digits[digits]) + "x" + std::to_string(digits);
+    for (std::size_t digits = 0; digits < totals.digits.size(); ++digits) {
+        if (totals.digits[digits] != 0) {
+            text += " " + std::to_string(totals.digits[digits]) + "x" + std::to_string(digits);
         }
     }
-    text += "; from " + std::to_string(report.needed_from_one) + ", worst "
-            + std::to_string(report.worst_digits);
-    text += report.worst_place ? " at " + text_of(*report.worst_place) : "";
-    return text + "; " + text_of(report.values1) + ", " + text_of(report.values2);
+    text += "; from " + std::to_string(totals.needed_from_one) + ", worst "
+            + std::to_string(totals.worst_digits);
+    text += totals.worst ? " at " + text_of(*totals.worst) : "";
+    return text + "; " + text_of(totals.values1) + ", " + text_of(totals.values2);
 }
 
-std::string text_of(const talcmp::FirstPlaces& places) {
+std::string text_of(const talcmp::FirstPairs& pairs) {
     std::string text;
-    for (const talcmp::Place& place : places.in_order()) {
-        text += (text.empty() ? "" : " ") + text_of(place);
+    for (const talcmp::FoundPair& pair : pairs.in_order()) {
+        text += (text.empty() ? "" : " ") + text_of(pair);
     }
     return text;
 }
 
 talcmp::Pairs pairs_of(const Reals& first, const Reals& second) {
-    return {element_type_id<double>, first.data(), element_type_id<double>, second.data(),
-            first.size()};
+    const talcmp::ElementType& type = talcmp::element_type(REAL64_TYPE);
+    return {type, first.data(), type, second.data(), first.size()};
 }
 
 // 1 and another number that differ in so many digits.
@@ -137,7 +140,7 @@ struct Counted {
     Reals second;
     double tolerance;
     std::string report;
-    std::string places; // the first three
+    std::string listed; // the first three of those that differ
 };
 
 void PrintTo(const Counted& counted, std::ostream* out) {
@@ -146,7 +149,7 @@ void PrintTo(const Counted& counted, std::ostream* out) {
 
 const Reals ones(6, 1.0);
 const Reals others = {1, with_digits(1), with_digits(3), with_digits(53), with_digits(3), -1};
-const std::string digits_of_others = "; digits 1x0 1x1 2x3 1x53 1x54; from 54, worst 54 at 5@15; "
+const std::string digits_of_others = "; digits 1x0 1x1 2x3 1x53 1x54; from 54, worst 54 at 5:54; "
                                      "0 0 0, 0 0 0";
 
 const Counted counted[] = {
@@ -157,34 +160,34 @@ const Counted counted[] = {
      0,
      "2 pairs, 0 differ; digits 2x0; from 1, worst 0; 0 0 0, 0 0 0",
      ""},
-    {"BitByBit", ones, others, 0, "6 pairs, 5 differ" + digits_of_others, "1@11 2@12 3@13"},
-    {"Negative", ones, others, -1, "6 pairs, 5 differ" + digits_of_others, "1@11 2@12 3@13"},
-    {"Half", ones, others, 0.5, "6 pairs, 4 differ" + digits_of_others, "2@12 3@13 4@14"},
-    {"One", ones, others, 1, "6 pairs, 4 differ" + digits_of_others, "2@12 3@13 4@14"},
-    {"Two", ones, others, 2, "6 pairs, 4 differ" + digits_of_others, "2@12 3@13 4@14"},
-    {"TwoAndALittle", ones, others, 2.25, "6 pairs, 4 differ" + digits_of_others, "2@12 3@13 4@14"},
-    {"AlmostThree", ones, others, 2.75, "6 pairs, 2 differ" + digits_of_others, "3@13 5@15"},
-    {"Three", ones, others, 3, "6 pairs, 2 differ" + digits_of_others, "3@13 5@15"},
-    {"AlmostAll", ones, others, 52.5, "6 pairs, 2 differ" + digits_of_others, "3@13 5@15"},
+    {"BitByBit", ones, others, 0, "6 pairs, 5 differ" + digits_of_others, "1:1 2:3 3:53"},
+    {"Negative", ones, others, -1, "6 pairs, 5 differ" + digits_of_others, "1:1 2:3 3:53"},
+    {"Half", ones, others, 0.5, "6 pairs, 4 differ" + digits_of_others, "2:3 3:53 4:3"},
+    {"One", ones, others, 1, "6 pairs, 4 differ" + digits_of_others, "2:3 3:53 4:3"},
+    {"Two", ones, others, 2, "6 pairs, 4 differ" + digits_of_others, "2:3 3:53 4:3"},
+    {"TwoAndALittle", ones, others, 2.25, "6 pairs, 4 differ" + digits_of_others, "2:3 3:53 4:3"},
+    {"AlmostThree", ones, others, 2.75, "6 pairs, 2 differ" + digits_of_others, "3:53 5:54"},
+    {"Three", ones, others, 3, "6 pairs, 2 differ" + digits_of_others, "3:53 5:54"},
+    {"AlmostAll", ones, others, 52.5, "6 pairs, 2 differ" + digits_of_others, "3:53 5:54"},
     {"FarAsTheFactorIsRemembered",
      {1},
      {2.5},
      52.5,
-     "1 pairs, 0 differ; digits 1x53; from 53, worst 53 at 0@10; 0 0 0, 0 0 0",
+     "1 pairs, 0 differ; digits 1x53; from 53, worst 53 at 0:53; 0 0 0, 0 0 0",
      ""},
-    {"All", ones, others, 53, "6 pairs, 1 differ" + digits_of_others, "5@15"},
-    {"MoreThanAll", ones, others, 1e300, "6 pairs, 1 differ" + digits_of_others, "5@15"},
+    {"All", ones, others, 53, "6 pairs, 1 differ" + digits_of_others, "5:54"},
+    {"MoreThanAll", ones, others, 1e300, "6 pairs, 1 differ" + digits_of_others, "5:54"},
     {"Zeros",
      {-0.0, 0},
      {0, 0},
      0,
-     "2 pairs, 1 differ; digits 1x0 1x1; from 1, worst 1 at 0@10; 0 0 1, 0 0 0",
-     "0@10"},
+     "2 pairs, 1 differ; digits 1x0 1x1; from 1, worst 1 at 0:1; 0 0 1, 0 0 0",
+     "0:1"},
     {"ZerosNegative",
      {-0.0, 0},
      {0, 0},
      -1,
-     "2 pairs, 0 differ; digits 1x0 1x1; from 1, worst 1 at 0@10; 0 0 1, 0 0 0",
+     "2 pairs, 0 differ; digits 1x0 1x1; from 1, worst 1 at 0:1; 0 0 1, 0 0 0",
      ""},
     {"EqualNaNs",
      {1, nan},
@@ -197,132 +200,129 @@ const Counted counted[] = {
      {1, nan},
      1,
      "2 pairs, 1 differ; digits 2x0; from 53, worst 0; 1 0 0, 1 0 0",
-     "1@11"},
+     "1:0"},
     {"Infinities",
      {infinity, 1},
      {-infinity, infinity},
      0,
-     "2 pairs, 2 differ; digits 1x53 1x54; from 54, worst 54 at 0@10; 0 1 0, 0 2 0",
-     "0@10 1@11"},
+     "2 pairs, 2 differ; digits 1x53 1x54; from 54, worst 54 at 0:54; 0 1 0, 0 2 0",
+     "0:54 1:53"},
 };
-
-talcmp::Place place_at(const std::size_t i, const std::uint64_t begin) {
-    talcmp::Place place;
-    place.order = begin + i;
-    place.position = begin + i + 10;
-    return place;
-}
 
 class Reports : public testing::TestWithParam<Counted> {};
 
-TEST_P(Reports, CountAllPairsAndTellTheFirst) {
+TEST_P(Reports, CountAllPairsAndListTheFirst) {
     for (const bool in_order : {true, false}) {
         SCOPED_TRACE(in_order);
-        talcmp::Reporter reporter(GetParam().tolerance);
-        talcmp::FirstPlaces first(3);
-        reporter.add(
-            pairs_of(GetParam().first, GetParam().second),
-            [](const std::size_t i) { return place_at(i, 0); }, in_order, first);
-        EXPECT_EQ(text_of(reporter.report()), GetParam().report);
-        EXPECT_EQ(text_of(first), GetParam().places);
+        Findings findings(3);
+        talcmp::PairCounter(GetParam().tolerance)
+            .add(
+                pairs_of(GetParam().first, GetParam().second),
+                [](const std::size_t i) { return i; }, in_order, findings);
+        EXPECT_EQ(text_of(findings.totals), GetParam().report);
+        EXPECT_EQ(text_of(findings.first), GetParam().listed);
     }
 }
 
 INSTANTIATE_TEST_SUITE_P(Tolerance, Reports, testing::ValuesIn(counted),
                          [](const auto& of) { return std::string(of.param.name); });
 
-// Stretches come in any order, and those of arrays in column-major order with any places in them.
-TEST(Report, TellsTheFirstOfTheWorstPlacesInWhateverOrderTheyCome) {
+// Stretches come in any order, and those of arrays in column-major order with any numbers in them.
+TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {
     const struct {
         const char* name;
         std::vector<std::uint64_t> begins;
         bool in_order;
         const char* worst;
         const char* first;
-    } cases[] = {{"Forwards", {0, 100, 200}, true, "2@12", "1@11 2@12 101@111"},
-                 {"Backwards", {200, 100, 0}, true, "2@12", "1@11 2@12 101@111"},
-                 {"Mixed", {100, 200, 0}, true, "2@12", "1@11 2@12 101@111"},
-                 {"Descending", {200, 0, 100}, false, "0@10", "0@10 1@11 100@110"}};
+    } cases[] = {{"Forwards", {0, 100, 200}, true, "2:30", "1:4 2:30 101:4"},
+                 {"Backwards", {200, 100, 0}, true, "2:30", "1:4 2:30 101:4"},
+                 {"Mixed", {100, 200, 0}, true, "2:30", "1:4 2:30 101:4"},
+                 {"Descending", {200, 0, 100}, false, "0:30", "0:30 1:4 100:30"}};
     const Reals first = {1, 1, 1};
     const Reals second = {1, with_digits(4), with_digits(30)};
-    const Reals reversed = {with_digits(30), with_digits(4), 1};
     for (const auto& each : cases) {
         SCOPED_TRACE(each.name);
-        talcmp::Reporter reporter(0);
-        talcmp::FirstPlaces places(3);
+        talcmp::PairCounter counter(0);
+        Findings findings(3);
         for (const std::uint64_t begin : each.begins) {
-            const auto place = [&](const std::size_t i) {
-                return place_at(each.in_order ? i : 2 - i, begin);
+            const auto number = [&](const std::size_t i) {
+                return begin + (each.in_order ? i : 2 - i);
             };
             // The worst pair is the last one either way.
-            reporter.add(pairs_of(first, second), place, each.in_order, places);
+            counter.add(pairs_of(first, second), number, each.in_order, findings);
         }
-        EXPECT_EQ(text_of(*reporter.report().worst_place), each.worst);
-        EXPECT_EQ(text_of(places), each.first);
-        EXPECT_EQ(reporter.report().differing, 6U);
+        EXPECT_EQ(text_of(*findings.totals.worst), each.worst);
+        EXPECT_EQ(text_of(findings.first), each.first);
+        EXPECT_EQ(findings.totals.differing, 6U);
     }
 }
 
-Report report_of(const Reals& second, const std::uint64_t begin) {
-    talcmp::Reporter reporter(0);
-    talcmp::FirstPlaces places(1);
+Totals totals_of(const Reals& second, const std::uint64_t begin) {
+    Findings findings(1);
     const Reals first(second.size(), 1.0);
-    reporter.add(
-        pairs_of(first, second), [begin](const std::size_t i) { return place_at(i, begin); }, true,
-        places);
-    return reporter.report();
+    talcmp::PairCounter(0).add(
+        pairs_of(first, second), [begin](const std::size_t i) { return begin + i; }, true,
+        findings);
+    return findings.totals;
 }
 
 TEST(Report, IsTheSameInWhateverOrderItIsAddedUp) {
-    const Report reports[] = {report_of({1, with_digits(5)}, 0), report_of({with_digits(9)}, 2),
-                              report_of({nan, -0.0, infinity, with_digits(9)}, 3),
-                              report_of({1, 1}, 7), report_of({}, 9)};
+    const Totals parts[] = {totals_of({1, with_digits(5)}, 0), totals_of({with_digits(9)}, 2),
+                            totals_of({nan, -0.0, infinity, with_digits(9)}, 3),
+                            totals_of({1, 1}, 7), totals_of({}, 9)};
     std::vector<std::size_t> order = {0, 1, 2, 3, 4};
     do {
-        Report sum;
+        Totals sum;
         for (const std::size_t i : order) {
-            add(sum, reports[i]);
+            add(sum, parts[i]);
         }
         EXPECT_EQ(text_of(sum), "9 pairs, 6 differ; digits 3x0 1x5 2x9 2x53 1x54; from 54, "
-                                "worst 54 at 4@14; 0 0 0, 1 1 1");
+                                "worst 54 at 4:54; 0 0 0, 1 1 1");
     } while (std::next_permutation(order.begin(), order.end()));
 }
 
-TEST(Report, TellsTheFirstOfEquallyBadPlaces) {
-    Report sum = report_of({with_digits(7)}, 5);
-    add(sum, report_of({with_digits(7)}, 3));
-    add(sum, report_of({with_digits(7)}, 4));
-    EXPECT_EQ(text_of(sum), "3 pairs, 3 differ; digits 3x7; from 7, worst 7 at 3@13; 0 0 0, 0 0 0");
+TEST(Report, HasTheFirstOfEquallyBadPairs) {
+    Totals sum = totals_of({with_digits(7)}, 5);
+    add(sum, totals_of({with_digits(7)}, 3));
+    add(sum, totals_of({with_digits(7)}, 4));
+    EXPECT_EQ(text_of(sum), "3 pairs, 3 differ; digits 3x7; from 7, worst 7 at 3:7; 0 0 0, 0 0 0");
 }
 
 TEST(Report, KnowsTheSmallestToleranceForAll) {
-    EXPECT_EQ(smallest_tolerance(report_of({}, 0), 53), 0);
-    EXPECT_EQ(smallest_tolerance(report_of({1, 1}, 0), 53), 0);
-    EXPECT_EQ(smallest_tolerance(report_of({1, with_digits(7)}, 0), 53), 7);
-    EXPECT_EQ(smallest_tolerance(report_of({with_digits(52), with_digits(7)}, 0), 53), 52);
-    EXPECT_EQ(smallest_tolerance(report_of({1, -1}, 0), 53), std::nullopt);
+    EXPECT_EQ(smallest_tolerance(totals_of({}, 0), 53), 0);
+    EXPECT_EQ(smallest_tolerance(totals_of({1, 1}, 0), 53), 0);
+    EXPECT_EQ(smallest_tolerance(totals_of({1, with_digits(7)}, 0), 53), 7);
+    EXPECT_EQ(smallest_tolerance(totals_of({with_digits(52), with_digits(7)}, 0), 53), 52);
+    EXPECT_EQ(smallest_tolerance(totals_of({1, -1}, 0), 53), std::nullopt);
 }
 
 // That of all digits is one that says nothing.
 TEST(Report, KnowsNoSmallestToleranceWhereNoDigitIsInCommon) {
-    EXPECT_EQ(smallest_tolerance(report_of({with_digits(53), with_digits(7)}, 0), 53),
+    EXPECT_EQ(smallest_tolerance(totals_of({with_digits(53), with_digits(7)}, 0), 53),
               std::nullopt);
-    EXPECT_EQ(smallest_tolerance(report_of({with_digits(24)}, 0), 24), std::nullopt);
-    EXPECT_EQ(smallest_tolerance(report_of({with_digits(23)}, 0), 24), 23);
+    EXPECT_EQ(smallest_tolerance(totals_of({with_digits(24)}, 0), 24), std::nullopt);
+    EXPECT_EQ(smallest_tolerance(totals_of({with_digits(23)}, 0), 24), 23);
 }
 
-// ---- First places
+// ---- First pairs
 
-TEST(FirstPlaces, AreTheFirstOfThoseThatAreShown) {
-    const std::vector<std::uint64_t> shown = {50, 20, 70, 10, 60, 30, 40};
-    const char* const expected[] = {"", "10@20", "10@20 20@30", "10@20 20@30 30@40"};
+talcmp::FoundPair pair_at(const std::uint64_t number) {
+    talcmp::FoundPair pair;
+    pair.number = number;
+    return pair;
+}
+
+TEST(FirstPairs, AreTheFirstOfThoseThatAreAdded) {
+    const std::vector<std::uint64_t> added = {50, 20, 70, 10, 60, 30, 40};
+    const char* const expected[] = {"", "10:?", "10:? 20:?", "10:? 20:? 30:?"};
     for (std::size_t limit = 0; limit < 4; ++limit) {
-        talcmp::FirstPlaces one(limit);
-        talcmp::FirstPlaces other(limit);
-        for (const std::uint64_t order : shown) {
+        talcmp::FirstPairs one(limit);
+        talcmp::FirstPairs other(limit);
+        for (const std::uint64_t number : added) {
             const std::uint64_t bound = one.bound();
-            EXPECT_EQ(one.add(place_at(0, order)), order < bound);
-            other.add(place_at(0, order + 5));
+            EXPECT_EQ(one.add(pair_at(number)), number < bound);
+            other.add(pair_at(number + 5));
         }
         other.add(one);
         EXPECT_EQ(text_of(one), expected[limit]);
@@ -330,16 +330,16 @@ TEST(FirstPlaces, AreTheFirstOfThoseThatAreShown) {
     }
 }
 
-TEST(FirstPlaces, OfTwoListsAreTheFirstOfBoth) {
-    talcmp::FirstPlaces one(3);
-    talcmp::FirstPlaces other(3);
+TEST(FirstPairs, OfTwoListsAreTheFirstOfBoth) {
+    talcmp::FirstPairs one(3);
+    talcmp::FirstPairs other(3);
     EXPECT_EQ(one.bound(), std::numeric_limits<std::uint64_t>::max());
-    for (const std::uint64_t order : {1U, 9U, 5U}) {
-        one.add(place_at(0, order));
-        other.add(place_at(0, order + 1));
+    for (const std::uint64_t number : {1U, 9U, 5U}) {
+        one.add(pair_at(number));
+        other.add(pair_at(number + 1));
     }
     one.add(other);
-    EXPECT_EQ(text_of(one), "1@11 2@12 5@15");
+    EXPECT_EQ(text_of(one), "1:? 2:? 5:?");
 }
 
 } // namespace

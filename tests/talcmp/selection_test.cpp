@@ -1,5 +1,6 @@
 // What --slice selects of an array, and where that lies.
 
+#include "layout.h"
 #include "selection.h"
 
 #include "support/memory_array.h"
@@ -137,7 +138,7 @@ const Part parts[] = {
     {"StepBeforeTheEnd", {6}, Order::c, "::3", 0, {2}, {3}},
     {"FromTheEnd", {9}, Order::c, "-4:-1", 5, {3}, {1}},
     {"CutOff", {9}, Order::c, "-100:100", 0, {9}, {1}},
-    {"BehindTheEnd", {9}, Order::c, "100:", 9, {0}, {0}},
+    {"PastTheEnd", {9}, Order::c, "100:", 9, {0}, {0}},
     {"Backwards", {9}, Order::c, "5:5", 5, {0}, {0}},
     {"FarthestStart", {9}, Order::c, "-9223372036854775808:", 0, {9}, {1}},
     {"OneElement", {9}, Order::c, "8:", 8, {1}, {0}},
@@ -198,8 +199,8 @@ std::vector<Shape> indices_of(const Shape& shape) {
 TEST(Positions, AreThoseOfIndices) {
     const Shape shape = {3, 1, 4, 2};
     const auto indices = indices_of(shape);
-    const talcmp::RowMajorOrder by_rows(array_of(shape, Order::c));
-    const talcmp::RowMajorOrder by_columns(array_of(shape, Order::fortran));
+    const talcmp::RowMajorNumbers by_rows(array_of(shape, Order::c));
+    const talcmp::RowMajorNumbers by_columns(array_of(shape, Order::fortran));
     for (std::size_t number = 0; number < indices.size(); ++number) {
         const Shape& index = indices[number];
         const std::uint64_t in_columns = index[0] + 3 * (index[2] + 4 * index[3]);

@@ -79,7 +79,7 @@ class Summaries : public testing::Test {
 
     static void expect(const Words& words, const int status, const std::string& output,
                        const std::string& errors = "") {
-        const Outcome outcome = run_talcmp(words);
+        const ProcessResult outcome = run_talcmp(words);
         EXPECT_EQ(outcome.status, status);
         EXPECT_EQ(outcome.output, output);
         EXPECT_EQ(outcome.errors, errors);
@@ -181,7 +181,7 @@ TEST_F(Summaries, KeepTheirOrderWithTrouble) {
     write_pairs("a", 1, one, one);
     write_pairs("b", 1, broken, one);
     write_pairs("c", 1, one, two);
-    const Outcome outcome = run_talcmp({"first", "second"}, Output::with_errors);
+    const ProcessResult outcome = run_talcmp({"first", "second"}, Output::with_errors);
     EXPECT_EQ(outcome.status, 2);
     EXPECT_EQ(outcome.output, "");
     EXPECT_EQ(outcome.errors,

@@ -30,7 +30,7 @@ class Bytes : public talcmp::ArraySource {
   public:
     explicit Bytes(std::uint64_t& checked) : checked_(checked) {}
 
-    type_t element_type() const override { return UBIT8_TYPE; }
+    const talcmp::ElementType& type() const override { return talcmp::element_type(UBIT8_TYPE); }
     const talcmp::Shape& shape() const override { return shape_; }
     bool fortran_order() const override { return false; }
     bool random_access() const override { return false; }

@@ -3,9 +3,9 @@
 #ifndef TALCMP_COMMAND_LINE_H
 #define TALCMP_COMMAND_LINE_H
 
-#include "comparison.h"
 #include "operands.h"
 #include "options.h"
+#include "question.h"
 
 #include <optional>
 #include <string>

@@ -5,26 +5,27 @@
 #include "status_line.h"
 #include "trouble.h"
 
+#include <cstdio>
 #include <new>
 
 namespace talcmp {
 namespace {
 
-class Run {
+class OperandComparison {
   public:
-    Run(const CommandLine& command_line, Answers& answers, ProgressBar& progress)
+    OperandComparison(const CommandLine& command_line, Answers& answers, ProgressBar& progress)
         : command_line_(command_line), answers_(answers), progress_(progress) {}
 
     Summary compare_all() {
         for (const NamedPair& pair : file_pairs()) {
             if (pair.trouble) {
-                tell_trouble(pair.first.value_or(command_line_.first),
-                             pair.second.value_or(command_line_.second), *pair.trouble);
+                report_trouble(pair.first.value_or(command_line_.first),
+                               pair.second.value_or(command_line_.second), *pair.trouble);
             } else if (pair.first && pair.second) {
                 guarded(*pair.first, *pair.second,
                         [&] { compare_files(*pair.first, *pair.second); });
             } else {
-                tell_single(pair, command_line_.first, command_line_.second);
+                report_single(pair, command_line_.first, command_line_.second);
             }
         }
         answers_.finish(summary_);
@@ -32,7 +33,7 @@ class Run {
     }
 
   private:
-    // None where there was trouble, which is told.
+    // None where there was trouble, which is reported.
     std::vector<NamedPair> file_pairs() {
         const std::string& first = command_line_.first;
         const std::string& second = command_line_.second;
@@ -42,7 +43,7 @@ class Run {
             return std::move(files.pairs);
         } catch (const Trouble& trouble) {
             answers_.begin(false);
-            tell_trouble(first, second, trouble.what());
+            report_trouble(first, second, trouble.what());
             return {};
         }
     }
@@ -53,22 +54,22 @@ class Run {
         try {
             action();
         } catch (const Trouble& trouble) {
-            tell_trouble(first, second, trouble.what());
+            report_trouble(first, second, trouble.what());
         } catch (const std::bad_alloc&) {
-            tell_trouble(
+            report_trouble(
                 first, second,
                 Trouble(first, "there is not enough memory to compare it with " + second).what());
         }
     }
 
-    void tell_trouble(const std::string& first, const std::string& second,
-                      const std::string& message) {
+    void report_trouble(const std::string& first, const std::string& second,
+                        const std::string& message) {
         Outcome outcome;
         outcome.kind = Outcome::Kind::trouble;
         outcome.first = first;
         outcome.second = second;
         outcome.message = message;
-        tell(outcome);
+        report(outcome);
     }
 
     void compare_files(const std::string& path1, const std::string& path2) {
@@ -94,7 +95,7 @@ class Run {
                 guarded(member_name(path1, pair.name), member_name(path2, pair.name),
                         [&] { compare_arrays(path1, file1, pair.name, path2, file2, pair.name); });
             } else {
-                tell_single(pair, path1, path2);
+                report_single(pair, path1, path2);
             }
         }
     }
@@ -130,22 +131,26 @@ class Run {
         if (outcome.comparison.difference != Difference::none) {
             outcome.kind = Outcome::Kind::different;
         }
-        tell(outcome);
+        report(outcome);
     }
 
-    void tell_single(const NamedPair& pair, const std::string& first, const std::string& second) {
+    void report_single(const NamedPair& pair, const std::string& first, const std::string& second) {
         Outcome outcome;
         outcome.kind = pair.first ? Outcome::Kind::only_in_first : Outcome::Kind::only_in_second;
         outcome.first = first;
         outcome.second = second;
         outcome.name = pair.name;
-        tell(outcome);
+        report(outcome);
     }
 
-    void tell(const Outcome& outcome) {
+    void report(const Outcome& outcome) {
         clear_status();
         count(summary_, outcome.kind);
-        answers_.tell(outcome);
+        if (outcome.kind == Outcome::Kind::trouble) {
+            std::fflush(stdout); // so that lines on one terminal stay in their order
+            std::fprintf(stderr, "talcmp: %s\n", outcome.message.c_str());
+        }
+        answers_.print(outcome);
     }
 
     const CommandLine& command_line_;
@@ -157,7 +162,7 @@ class Run {
 } // namespace
 
 Summary compare_operands(const CommandLine& command_line, Answers& answers, ProgressBar& progress) {
-    return Run(command_line, answers, progress).compare_all();
+    return OperandComparison(command_line, answers, progress).compare_all();
 }
 
 } // namespace talcmp

@@ -9,8 +9,8 @@
 
 namespace talcmp {
 
-// Compares what the operands stand for, array by array, and tells each outcome when it is known.
-// Trouble with the operands, or with two files of theirs, is an outcome too.
+// Compares what the operands stand for, array by array, and reports each outcome when it is known.
+// Trouble with the operands, or with two of their files, is an outcome too.
 Summary compare_operands(const CommandLine& command_line, Answers& answers, ProgressBar& progress);
 
 } // namespace talcmp

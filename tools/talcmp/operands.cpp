@@ -18,13 +18,13 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// Takes out of `pairs` what lies below a name with trouble: of that nothing can be said.
+// Takes out of `pairs` what is below a name with trouble: nothing is known of it.
 void leave_to_trouble(std::map<std::string, NamedPair>& pairs) {
     for (auto pair = pairs.begin(); pair != pairs.end(); ++pair) {
         if (pair->second.trouble) {
             const std::string below = pair->first + '/';
-            const std::string behind = pair->first + char('/' + 1);
-            pairs.erase(pairs.lower_bound(below), pairs.lower_bound(behind));
+            const std::string after = pair->first + char('/' + 1);
+            pairs.erase(pairs.lower_bound(below), pairs.lower_bound(after));
         }
     }
 }
@@ -55,7 +55,7 @@ std::vector<NamedPair> matched(const FilesByName& first, const FilesByName& seco
 
 bool is_folder(const std::string& path) {
     std::error_code error;
-    return path != standard_input_path && fs::is_directory(path, error);
+    return fs::is_directory(path, error);
 }
 
 bool exists(const std::string& path) {
@@ -95,12 +95,22 @@ FilesByName files_that_match(const std::string& pattern) {
     return files;
 }
 
-FilesByName files_of(const std::string& operand) {
-    return is_folder(operand) ? files_in(operand) : files_that_match(operand);
+// What an operand stands for, which is found out once.
+enum class OperandKind { file, standard_input, folder, pattern };
+
+OperandKind kind_of(const std::string& operand) {
+    return operand == standard_input_path ? OperandKind::standard_input
+           : is_folder(operand)           ? OperandKind::folder
+           : is_pattern(operand)          ? OperandKind::pattern
+                                          : OperandKind::file;
 }
 
-bool stands_for_many(const std::string& operand) {
-    return is_folder(operand) || is_pattern(operand);
+bool stands_for_many(const OperandKind kind) {
+    return kind == OperandKind::folder || kind == OperandKind::pattern;
+}
+
+FilesByName files_of(const std::string& operand, const OperandKind kind) {
+    return kind == OperandKind::folder ? files_in(operand) : files_that_match(operand);
 }
 
 // The file of the same name in the folder. Throws Trouble.
@@ -134,24 +144,26 @@ FilesByName without(FilesByName files, const std::vector<std::string>& exclude) 
 
 FilePairs match_files(const std::string& first, const std::string& second,
                       const std::vector<std::string>& exclude) {
-    if (stands_for_many(first) && stands_for_many(second)) {
-        FilePairs files{
-            true, matched(without(files_of(first), exclude), without(files_of(second), exclude))};
+    const OperandKind kind1 = kind_of(first);
+    const OperandKind kind2 = kind_of(second);
+    if (stands_for_many(kind1) && stands_for_many(kind2)) {
+        FilePairs files{true, matched(without(files_of(first, kind1), exclude),
+                                      without(files_of(second, kind2), exclude))};
         if (files.pairs.empty()) {
             throw Trouble(first, "holds no .npy or .npz file to compare, nor does " + second);
         }
         return files;
     }
-    if (first == standard_input_path || second == standard_input_path) {
+    if (kind1 == OperandKind::standard_input || kind2 == OperandKind::standard_input) {
         return {false, {{"", first, second}}};
     }
-    if (is_pattern(first) || is_pattern(second)) {
-        throw Trouble(is_pattern(first) ? first : second,
+    if (kind1 == OperandKind::pattern || kind2 == OperandKind::pattern) {
+        throw Trouble(kind1 == OperandKind::pattern ? first : second,
                       "there is no such file; a pattern can be compared with another one or with a "
                       "folder");
     }
-    const std::string path1 = is_folder(first) ? in_folder(first, second) : first;
-    const std::string path2 = is_folder(second) ? in_folder(second, first) : second;
+    const std::string path1 = kind1 == OperandKind::folder ? in_folder(first, second) : first;
+    const std::string path2 = kind2 == OperandKind::folder ? in_folder(second, first) : second;
     return {false, {{"", path1, path2}}};
 }
 

@@ -27,8 +27,8 @@ struct FilePairs {
 // Names that match a pattern of `exclude` are left out.
 //
 // Links to folders are followed. What may hide arrays and cannot be read is a pair with trouble: a
-// folder without permission, a link that leads nowhere or back to a folder that it is in, and a
-// pipe, a socket or a device with the name of a file.
+// folder without permission, a link that leads nowhere or to a folder that it is in, and a pipe, a
+// socket or a device with the name of a file.
 FilePairs match_files(const std::string& first, const std::string& second,
                       const std::vector<std::string>& exclude);
 

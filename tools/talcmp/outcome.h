@@ -1,4 +1,4 @@
-// What comes of the operands: of each two arrays that belong together, and in all.
+// What comes of the operands: of each two arrays that belong together, and altogether.
 
 #ifndef TALCMP_OUTCOME_H
 #define TALCMP_OUTCOME_H
@@ -36,7 +36,7 @@ std::uint64_t total(const Summary& summary);
 // The exit statuses of cmp and diff: 0 the same, 1 different, 2 trouble; the worst there was.
 int exit_status(const Summary& summary);
 
-// A way to tell the outcomes.
+// A way to report outcomes.
 class Answers {
   public:
     Answers() = default;
@@ -47,7 +47,8 @@ class Answers {
     // Before the first outcome. `many` says whether folders or patterns are compared.
     virtual void begin(bool many) = 0;
 
-    virtual void tell(const Outcome& outcome) = 0;
+    // Trouble is on standard error already.
+    virtual void print(const Outcome& outcome) = 0;
 
     // After the last outcome.
     virtual void finish(const Summary& summary) = 0;

@@ -27,14 +27,16 @@ class MemoryArray : public talcmp::ArraySource {
         : shape_(std::move(shape)), elements_(std::move(elements)), order_(order), access_(access) {
     }
 
-    type_t element_type() const override { return element_type_id<T>; }
+    const talcmp::ElementType& type() const override {
+        return talcmp::element_type(element_type_id<T>);
+    }
     const talcmp::Shape& shape() const override { return shape_; }
     bool fortran_order() const override { return order_ == Order::fortran; }
     bool random_access() const override { return access_ == Access::random; }
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         if (count > elements_.size() || first > elements_.size() - count) {
-            throw std::logic_error("elements are read that the array has not");
+            throw std::logic_error("elements are read that the array does not have");
         }
         if (access_ == Access::once) {
             read_once(first, count);
@@ -46,11 +48,11 @@ class MemoryArray : public talcmp::ArraySource {
     // Takes its time, so that another thread that reads meanwhile is noticed.
     void read_once(const std::uint64_t first, const std::uint64_t count) {
         if (reading_.exchange(true)) {
-            throw std::logic_error("elements that come but once are read by two threads");
+            throw std::logic_error("elements that can be read only once are read by two threads");
         }
         std::this_thread::sleep_for(std::chrono::milliseconds(1));
         if (first < read_) {
-            throw std::logic_error("elements that come but once are read twice");
+            throw std::logic_error("elements that can be read only once are read twice");
         }
         read_ = first + count;
         reading_ = false;
@@ -61,7 +63,7 @@ class MemoryArray : public talcmp::ArraySource {
     Order order_;
     Access access_;
     std::atomic<bool> reading_ = false;
-    std::uint64_t read_ = 0; // elements that come but once
+    std::uint64_t read_ = 0; // elements that can be read only once
 };
 
 #endif

@@ -83,7 +83,7 @@ bool is_one_printable_line(const std::string& text) {
 
 } // namespace
 
-Outcome run_talcmp(const std::vector<std::string>& arguments, const Output output) {
+ProcessResult run_talcmp(const std::vector<std::string>& arguments, const Output output) {
     const Capture captured;
     const Capture errors;
     const int full = output == Output::full ? ::open("/dev/full", O_WRONLY | O_CLOEXEC) : -1;
@@ -100,7 +100,7 @@ Outcome run_talcmp(const std::vector<std::string>& arguments, const Output outpu
             usage.ru_maxrss}; // NOLINT(cppcoreguidelines-pro-type-union-access)
 }
 
-void expect_trouble(const Outcome& outcome, const std::string& beginning,
+void expect_trouble(const ProcessResult& outcome, const std::string& beginning,
                     const std::string& fragment) {
     EXPECT_EQ(outcome.status, 2);
     EXPECT_EQ(outcome.output, "");

@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-struct Outcome {
+struct ProcessResult {
     int status = -1;    // the exit status
     std::string output; // on standard output
     std::string errors; // on standard error
@@ -17,11 +17,12 @@ struct Outcome {
 enum class Output { captured, closed, full, with_errors };
 
 // Fails the test when the child is ended by a signal, which it is too when it takes too long.
-Outcome run_talcmp(const std::vector<std::string>& arguments, Output output = Output::captured);
+ProcessResult run_talcmp(const std::vector<std::string>& arguments,
+                         Output output = Output::captured);
 
 // Expects exit status 2, nothing on standard output, and on standard error one line of printable
 // characters that begins with "talcmp: " and `beginning` and contains `fragment`.
-void expect_trouble(const Outcome& outcome, const std::string& beginning,
+void expect_trouble(const ProcessResult& outcome, const std::string& beginning,
                     const std::string& fragment);
 
 #endif

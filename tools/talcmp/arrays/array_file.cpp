@@ -5,58 +5,69 @@
 #include "pipe.h"
 #include "regular_file.h"
 
-#include <array>
-#include <filesystem>
 #include <string_view>
-#include <system_error>
 
-#include <unistd.h>
+#include <fcntl.h>
+#include <sys/stat.h>
 
 namespace talcmp {
 namespace {
 
 struct Format {
     std::string_view beginning; // of its files
-    std::unique_ptr<ArrayFile> (*open)(const std::string& path);
+    std::unique_ptr<ArrayFile> (*open)(std::unique_ptr<RegularFile> file);
 };
 
-template <typename File>
-std::unique_ptr<ArrayFile> open_as(const std::string& path) {
-    return std::make_unique<File>(path);
+std::unique_ptr<ArrayFile> open_npz(std::unique_ptr<RegularFile> file) {
+    return std::make_unique<NpzFile>(*file);
+}
+
+std::unique_ptr<ArrayFile> open_npy(std::unique_ptr<RegularFile> file) {
+    std::string path = file->path();
+    return std::make_unique<NpyFile>(std::move(path), std::move(file));
 }
 
 // What begins like none of them is read as an .npy file, which says what is wrong with it.
 constexpr Format formats[] = {
-    {"PK\x03\x04", open_as<NpzFile>},
-    {"PK\x05\x06", open_as<NpzFile>}, // without members
-    {"", open_as<NpyFile>},
+    {"PK\x03\x04", open_npz},
+    {"PK\x05\x06", open_npz}, // without members
+    {"", open_npy},
 };
 
-std::string beginning_of(const std::string& path) {
-    constexpr std::size_t longest = 8;
-    std::string bytes(longest, '\0');
-    RegularFile file(path);
-    bytes.resize(file.read(0, bytes.data(), bytes.size()));
-    return bytes;
+std::unique_ptr<ArrayFile> open_regular_file(std::unique_ptr<RegularFile> file) {
+    const Format* format = formats;
+    while (file->beginning().substr(0, format->beginning.size()) != format->beginning) {
+        ++format;
+    }
+    return format->open(std::move(file));
+}
+
+std::unique_ptr<ArrayFile> open_pipe(const std::string& name, Descriptor pipe) {
+    return std::make_unique<NpyFile>(name, std::make_unique<Pipe>(name, std::move(pipe)));
 }
 
 } // namespace
 
 std::unique_ptr<ArrayFile> open_array_file(const std::string& path) {
     if (path == standard_input_path) {
-        const std::string name = "standard input";
-        return std::make_unique<NpyFile>(name, std::make_unique<Pipe>(name, STDIN_FILENO));
+        return open_pipe("standard input", Descriptor(STDIN_FILENO));
     }
-    std::error_code ignored; // opening it tells what is wrong
-    if (std::filesystem::is_fifo(path, ignored)) {
-        return std::make_unique<NpyFile>(path, std::make_unique<Pipe>(path));
+    Descriptor file(::open(path.c_str(), O_RDONLY | O_CLOEXEC));
+    struct stat status = {};
+    if (file.number() < 0 || ::fstat(file.number(), &status) != 0) {
+        throw_system_trouble(path, "cannot be opened");
     }
-    const std::string bytes = beginning_of(path);
-    const Format* format = formats;
-    while (bytes.compare(0, format->beginning.size(), format->beginning) != 0) {
-        ++format;
+    if (S_ISFIFO(status.st_mode)) {
+        return open_pipe(path, std::move(file));
     }
-    return format->open(path);
+    if (S_ISDIR(status.st_mode)) {
+        throw Trouble(path, "is a folder; name a file in it, or two folders");
+    }
+    if (!S_ISREG(status.st_mode)) {
+        throw Trouble(path, "is neither a file nor a pipe; save the array to a file first");
+    }
+    const auto size = static_cast<std::uint64_t>(status.st_size);
+    return open_regular_file(std::make_unique<RegularFile>(path, std::move(file), size));
 }
 
 } // namespace talcmp

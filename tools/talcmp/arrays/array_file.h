@@ -33,7 +33,9 @@ class ArrayFile {
 // The path that stands for standard input.
 inline constexpr const char* standard_input_path = "-";
 
-// Throws Trouble when the file cannot be opened or is of no known format.
+// Opens a file, once, and recognises its format by its first bytes. A pipe, which is waited for
+// until somebody writes to it, and standard input are read as .npy files. Throws Trouble when the
+// file cannot be opened or is of no known format.
 std::unique_ptr<ArrayFile> open_array_file(const std::string& path);
 
 } // namespace talcmp

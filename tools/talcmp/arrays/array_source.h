@@ -4,7 +4,6 @@
 #define TALCMP_ARRAY_SOURCE_H
 
 #include "element_type.h"
-#include "type_properties.h"
 
 #include <algorithm>
 #include <cstddef>
@@ -18,6 +17,10 @@ namespace talcmp {
 // The dimensions of an array, outermost first; a file may have larger ones than a record holds.
 using Shape = std::vector<std::uint64_t>;
 
+inline bool has_elements(const Shape& shape) {
+    return std::find(shape.begin(), shape.end(), 0U) == shape.end();
+}
+
 // An array that is read piece by piece. Its elements have positions, 0 to the product of its shape
 // - 1, in the order in which they are stored.
 class ArraySource {
@@ -27,8 +30,7 @@ class ArraySource {
     ArraySource& operator=(const ArraySource&) = delete;
     virtual ~ArraySource() = default;
 
-    // The element type, an id of `TalNumericArrayTypeId` from 1 to 12.
-    virtual type_t element_type() const = 0;
+    virtual const ElementType& type() const = 0;
 
     virtual const Shape& shape() const = 0;
 
@@ -44,23 +46,18 @@ class ArraySource {
     // `elements`. Throws Trouble.
     virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
 
-    // Reads what is left, where only the end says whether what has been read was right. Before it
-    // has returned no answer is to be believed. Throws Trouble.
+    // Reads the rest, where only the end shows whether what was read is right. Until it has
+    // returned no answer can be trusted. Throws Trouble.
     virtual void check_to_end() {}
 };
 
-// The number of elements, which has been seen to be below 2^64: the product of the shape.
+// The number of elements: the product of the shape, which was checked to be below 2^64.
 inline std::uint64_t element_count(const ArraySource& source) {
     const Shape& shape = source.shape();
-    if (std::find(shape.begin(), shape.end(), 0U) != shape.end()) {
+    if (!has_elements(shape)) {
         return 0; // the product of the others may be larger
     }
     return std::accumulate(shape.begin(), shape.end(), std::uint64_t{1}, std::multiplies<>());
-}
-
-// In bytes.
-inline std::size_t element_size(const ArraySource& source) {
-    return element_type(source.element_type()).size;
 }
 
 } // namespace talcmp

@@ -20,7 +20,7 @@ class ByteSource {
     // never be below what has been read, and only one thread reads.
     virtual bool random_access() const = 0;
 
-    // In bytes; nothing where only the end will tell.
+    // In bytes; nothing where it is not known before the end.
     virtual std::optional<std::uint64_t> size() const = 0;
 
     // Reads up to `count` bytes from `offset` on to `bytes` and returns how many, fewer only at the

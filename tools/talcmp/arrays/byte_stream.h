@@ -1,4 +1,4 @@
-// Bytes that come but once.
+// Bytes that can be read only once.
 
 #ifndef TALCMP_BYTE_STREAM_H
 #define TALCMP_BYTE_STREAM_H
@@ -7,7 +7,7 @@
 
 namespace talcmp {
 
-// A class that derives from it only says how the next bytes are got.
+// A derived class provides the next bytes.
 class ByteStream : public ByteSource {
   public:
     bool random_access() const final { return false; }

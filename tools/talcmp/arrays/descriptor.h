@@ -1,4 +1,4 @@
-// File descriptors: closed at the end, read from, what is told when that fails.
+// File descriptors: closed at the end, read from, and the error when that fails.
 
 #ifndef TALCMP_DESCRIPTOR_H
 #define TALCMP_DESCRIPTOR_H
@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <string>
 #include <system_error>
+#include <utility>
 
 #include <unistd.h>
 
@@ -20,6 +21,8 @@ class Descriptor {
     explicit Descriptor(const int number) : number_(number) {}
     Descriptor(const Descriptor&) = delete;
     Descriptor& operator=(const Descriptor&) = delete;
+    Descriptor(Descriptor&& other) noexcept : number_(other.release()) {}
+    Descriptor& operator=(Descriptor&&) = delete;
     ~Descriptor() {
         if (number_ >= 0) {
             ::close(number_);
@@ -27,17 +30,20 @@ class Descriptor {
     }
     int number() const { return number_; }
 
+    // Leaves it to the caller to close it.
+    int release() { return std::exchange(number_, -1); }
+
   private:
     int number_;
 };
 
-// Says what the system's last error was.
+// With the text of the system's last error.
 [[noreturn]] inline void throw_system_trouble(const std::string& path, const char* what_failed) {
     throw Trouble(path, std::string(what_failed) + ": " + std::generic_category().message(errno));
 }
 
 // Reads up to `count` bytes of a file on disk from `offset` on and returns how many, fewer only at
-// the end. Throws Trouble, which tells `path`.
+// the end. Throws Trouble, which names `path`.
 inline std::size_t read_at(const int file, const std::string& path, const std::uint64_t offset,
                            void* const bytes, const std::size_t count) {
     std::size_t done = 0;

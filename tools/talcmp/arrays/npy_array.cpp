@@ -1,6 +1,5 @@
 #include "npy_array.h"
 
-#include "element_type.h"
 #include "trouble.h"
 
 #include <algorithm>
@@ -56,17 +55,17 @@ NpyArray::NpyArray(std::string name, std::unique_ptr<ByteSource> file)
     : name_(std::move(name)), file_(std::move(file)), header_(header_of(name_, *file_)) {}
 
 void NpyArray::read(const std::uint64_t first, const std::uint64_t count, void* const elements) {
-    const ElementType& type = talcmp::element_type(header_.element_type);
+    const std::size_t size = type().size;
     // As many elements as memory holds.
-    const std::size_t bytes = static_cast<std::size_t>(count) * type.size;
-    const std::size_t there = file_->read(header_.data_offset + first * type.size, elements, bytes);
+    const std::size_t bytes = static_cast<std::size_t>(count) * size;
+    const std::size_t there = file_->read(header_.data_offset + first * size, elements, bytes);
     if (there < bytes) {
-        throw Trouble(name_, "ends after " + std::to_string(first + there / type.size) + " of "
+        throw Trouble(name_, "ends after " + std::to_string(first + there / size) + " of "
                                  + std::to_string(header_.element_count)
                                  + " elements; is it complete, or is it still being written?");
     }
     if (header_.bytes_swapped) {
-        reverse_each(static_cast<unsigned char*>(elements), bytes, type.part_size);
+        reverse_each(static_cast<unsigned char*>(elements), bytes, type().part_size);
     }
     if (!file_->random_access()) {
         next_ = first + count;
@@ -77,20 +76,19 @@ void NpyArray::check_to_end() {
     if (file_->random_access()) {
         return; // its size was compared with its header
     }
-    const std::size_t size = talcmp::element_type(header_.element_type).size;
     std::vector<unsigned char> passed_over(std::size_t{64} * 1024);
     while (next_ < header_.element_count) {
         read(next_,
-             std::min<std::uint64_t>(passed_over.size() / size, header_.element_count - next_),
+             std::min<std::uint64_t>(passed_over.size() / type().size,
+                                     header_.element_count - next_),
              passed_over.data());
     }
     check_end();
 }
 
 void NpyArray::check_end() {
-    const std::size_t element_size = talcmp::element_type(header_.element_type).size;
     unsigned char surplus = 0;
-    if (file_->read(header_.data_offset + header_.element_count * element_size, &surplus, 1) != 0) {
+    if (file_->read(header_.data_offset + header_.element_count * type().size, &surplus, 1) != 0) {
         throw Trouble(name_, "has more data than its shape says; save one array per file");
     }
 }

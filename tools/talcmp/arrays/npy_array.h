@@ -17,7 +17,7 @@ class NpyArray : public ArraySource {
     // `name` is what messages call the file. Throws Trouble when it is broken or not supported.
     NpyArray(std::string name, std::unique_ptr<ByteSource> file);
 
-    type_t element_type() const override { return header_.element_type; }
+    const ElementType& type() const override { return *header_.type; }
     const Shape& shape() const override { return header_.shape; }
     bool fortran_order() const override { return header_.fortran_order; }
     bool random_access() const override { return file_->random_access(); }
@@ -25,13 +25,13 @@ class NpyArray : public ArraySource {
     void check_to_end() override;
 
   private:
-    // That nothing follows the elements; an archive checks its sum only when it is asked.
+    // Checks that nothing follows the elements; an archive checks its sum only when asked for more.
     void check_end();
 
     std::string name_;
     std::unique_ptr<ByteSource> file_;
     NpyHeader header_;
-    std::uint64_t next_ = 0; // the position after those that have been read, where they come once
+    std::uint64_t next_ = 0; // the position after those that have been read, if read only once
 };
 
 } // namespace talcmp

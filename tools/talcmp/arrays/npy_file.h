@@ -4,19 +4,21 @@
 #define TALCMP_NPY_FILE_H
 
 #include "array_file.h"
-#include "byte_source.h"
+#include "npy_array.h"
 
 namespace talcmp {
 
 class NpyFile : public ArrayFile {
   public:
-    explicit NpyFile(const std::string& path);
     // `name` is what messages call the file.
-    NpyFile(std::string name, std::unique_ptr<ByteSource> bytes);
+    NpyFile(std::string name, std::unique_ptr<ByteSource> bytes)
+        : name_(std::move(name)), bytes_(std::move(bytes)) {}
 
     bool is_archive() const override { return false; }
     std::vector<std::string> members() const override { return {""}; }
-    std::unique_ptr<ArraySource> open(const std::string& member) override;
+    std::unique_ptr<ArraySource> open(const std::string& /*member*/) override {
+        return std::make_unique<NpyArray>(name_, std::move(bytes_));
+    }
 
   private:
     std::string name_;

@@ -3,7 +3,6 @@
 #include "element_type.h"
 
 #include <algorithm>
-#include <array>
 #include <limits>
 #include <optional>
 #include <string>
@@ -12,7 +11,7 @@
 namespace talcmp {
 namespace {
 
-// What a file says is shown in a message only as far as it can be read there.
+// What a message quotes from a file: one line of plain characters.
 std::string printable(const std::string_view text) {
     constexpr std::size_t longest = 40;
     std::string shown(text.substr(0, longest));
@@ -47,7 +46,7 @@ class DictionaryReader {
         }
         skip_space();
         if (position_ != text_.size()) {
-            fail("nothing behind the dictionary");
+            fail("nothing after the dictionary");
         }
         return {required(descr_, "descr"), required(fortran_order_, "fortran_order"),
                 required(shape_, "shape")};
@@ -120,19 +119,19 @@ class DictionaryReader {
     Shape dimensions() {
         expect('(', "a shape in parentheses");
         Shape shape;
-        bool comma_behind = true;
+        bool ends_with_comma = true;
         while (!accept(')')) {
-            if (!comma_behind) {
+            if (!ends_with_comma) {
                 fail("',' or ')'");
             }
             if (shape.size() == highest_rank) {
                 throw NpyError("has a shape of more than 64 dimensions");
             }
             shape.push_back(dimension());
-            comma_behind = accept(',');
+            ends_with_comma = accept(',');
         }
-        if (shape.size() == 1 && !comma_behind) {
-            fail("a shape of one dimension with a ',' behind it");
+        if (shape.size() == 1 && !ends_with_comma) {
+            fail("a shape of one dimension with a ',' after it");
         }
         return shape;
     }
@@ -156,7 +155,7 @@ class DictionaryReader {
         return value;
     }
 
-    // Moves behind the next character if it is `character`.
+    // Moves past the next character if it is `character`.
     bool accept(const char character) {
         skip_space();
         const bool there = position_ < text_.size() && text_[position_] == character;
@@ -200,7 +199,7 @@ class DictionaryReader {
 
 // ---- What the dictionary means
 
-// What the kinds of elements are that NumPy has and talcmp has not.
+// What NumPy calls the element types that talcmp does not read.
 std::string kind_name(const std::string& code) {
     if (code == "f2") {
         return " (half precision)";
@@ -224,7 +223,7 @@ std::string kind_name(const std::string& code) {
     case 'm':
         return " (dates or times)";
     default:
-        return ""; // a width that talcmp has not, or nothing that NumPy has
+        return ""; // another width, or nothing that NumPy writes
     }
 }
 
@@ -236,9 +235,9 @@ struct Elements {
 };
 
 Elements elements_of(const std::string_view descr) {
-    const std::string has_elements = "has elements of type " + printable(descr);
+    const std::string what = "has elements of type " + printable(descr);
     if (descr.empty() || std::string_view("<>|").find(descr[0]) == std::string_view::npos) {
-        throw NpyError(has_elements + ", which tells no byte order; save the array with NumPy");
+        throw NpyError(what + " without a byte order; save the array with NumPy");
     }
     const char byte_order = descr[0];
     const std::string code(descr.substr(1));
@@ -247,19 +246,19 @@ Elements elements_of(const std::string_view descr) {
         return code == each.kind + std::to_string(each.size);
     });
     if (type == types.end()) {
-        throw NpyError(has_elements + kind_name(code)
+        throw NpyError(what + kind_name(code)
                        + ", which is not supported; save them as integers of 8 to 64 bits, "
                          "float32, float64, complex64 or complex128");
     }
     if (type->size != 1 && byte_order == '|') {
-        throw NpyError(has_elements + ", which tells no byte order; save the array with NumPy");
+        throw NpyError(what + " without a byte order; save the array with NumPy");
     }
     return {*type, type->size != 1 && byte_order != native_byte_order};
 }
 
 // The product of `shape`; nothing where it is 2^64 or more. One zero makes it zero.
 std::optional<std::uint64_t> product(const Shape& shape) {
-    if (std::find(shape.begin(), shape.end(), 0U) != shape.end()) {
+    if (!has_elements(shape)) {
         return 0;
     }
     std::uint64_t count = 1;
@@ -283,7 +282,7 @@ void check_data_size(const std::optional<std::uint64_t> count, const std::size_t
     }
     const std::uint64_t surplus = available - *count * element_size;
     if (surplus != 0) {
-        throw NpyError("has more data than its shape says (bytes behind the array: "
+        throw NpyError("has more data than its shape says (bytes after the array: "
                        + std::to_string(surplus) + "); save one array per file");
     }
 }
@@ -296,16 +295,16 @@ void check_countable(const std::optional<std::uint64_t> count) {
     }
 }
 
-// ---- The bytes in front of the dictionary
+// ---- The bytes up to the dictionary, and those of it
 
 constexpr std::string_view magic = "\x93NUMPY";
 
-// NumPy itself reads no longer ones unless told to.
+// NumPy itself reads longer ones only on request.
 constexpr std::size_t longest_dictionary = std::size_t{1} << 20U;
 
-class Beginning {
+class HeaderBytes {
   public:
-    explicit Beginning(ByteSource& file) : file_(file) {}
+    explicit HeaderBytes(ByteSource& file) : file_(file) {}
 
     std::uint64_t position() const { return position_; }
 
@@ -358,28 +357,28 @@ std::size_t little_endian(const std::string_view bytes) {
 } // namespace
 
 NpyHeader read_npy_header(ByteSource& file) {
-    Beginning beginning(file);
-    beginning.take_magic();
-    const std::string version = beginning.take(2, "version");
+    HeaderBytes bytes(file);
+    bytes.take_magic();
+    const std::string version = bytes.take(2, "version");
     const int major = static_cast<unsigned char>(version[0]);
     const int minor = static_cast<unsigned char>(version[1]);
     if (major < 1 || major > 3 || minor != 0) {
         throw NpyError("has format version " + std::to_string(major) + "." + std::to_string(minor)
                        + "; versions 1.0, 2.0 and 3.0 are supported");
     }
-    const std::size_t length = little_endian(beginning.take(major == 1 ? 2 : 4, "header length"));
-    const std::string text = beginning.take(length, "dictionary");
+    const std::size_t length = little_endian(bytes.take(major == 1 ? 2 : 4, "header length"));
+    const std::string text = bytes.take(length, "dictionary");
     const Dictionary dictionary = DictionaryReader(text).read();
 
     const auto [type, bytes_swapped] = elements_of(dictionary.descr);
     const std::optional<std::uint64_t> count = product(dictionary.shape);
     const std::optional<std::uint64_t> file_size = file.size();
     if (file_size.has_value()) {
-        check_data_size(count, type.size, *file_size - beginning.position());
+        check_data_size(count, type.size, *file_size - bytes.position());
     } else {
         check_countable(count);
     }
-    return {type.id,      dictionary.shape, *count, beginning.position(), dictionary.fortran_order,
+    return {&type,        dictionary.shape, *count, bytes.position(), dictionary.fortran_order,
             bytes_swapped};
 }
 

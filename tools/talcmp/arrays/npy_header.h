@@ -2,7 +2,7 @@
 //
 // The format: 6 bytes "\x93NUMPY", a byte each for the major and minor version, the length of a
 // dictionary (2 bytes in version 1, 4 in versions 2 and 3, little-endian), the dictionary as a
-// Python literal with the keys 'descr', 'fortran_order' and 'shape', and behind it the elements.
+// Python literal with the keys 'descr', 'fortran_order' and 'shape', and then the elements.
 
 #ifndef TALCMP_NPY_HEADER_H
 #define TALCMP_NPY_HEADER_H
@@ -16,7 +16,7 @@
 namespace talcmp {
 
 struct NpyHeader {
-    type_t element_type = 0;         // an id of `TalNumericArrayTypeId` from 1 to 12
+    const ElementType* type = nullptr;
     Shape shape;                     // outermost dimension first
     std::uint64_t element_count = 0; // the product of `shape`
     std::uint64_t data_offset = 0;   // bytes from the beginning of the file to the first element

@@ -15,16 +15,18 @@ bool ends_with(const std::string_view text, const std::string_view end) {
     return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
 }
 
-std::shared_ptr<zip_t> open_archive(const std::string& path) {
+std::shared_ptr<zip_t> open_archive(RegularFile& file) {
     int code = 0;
-    zip_t* const archive = ::zip_open(path.c_str(), ZIP_RDONLY, &code);
+    // From here on the archive closes the descriptor; it takes no flag but for a thorough check.
+    zip_t* const archive = ::zip_fdopen(file.descriptor().number(), 0, &code);
     if (archive == nullptr) {
         zip_error_t error;
         ::zip_error_init_with_code(&error, code);
         const std::string text = ::zip_error_strerror(&error);
         ::zip_error_fini(&error);
-        throw Trouble(path, "is a broken .npz archive: " + text + "; is the file complete?");
+        throw Trouble(file.path(), "is a broken .npz archive: " + text + "; is the file complete?");
     }
+    file.descriptor().release();
     return {archive, ::zip_discard};
 }
 
@@ -63,13 +65,13 @@ class Member : public ByteStream {
 
 } // namespace
 
-NpzFile::NpzFile(const std::string& path) : path_(path), archive_(open_archive(path)) {
+NpzFile::NpzFile(RegularFile& file) : path_(file.path()), archive_(open_archive(file)) {
     const zip_int64_t count = ::zip_get_num_entries(archive_.get(), 0);
     for (zip_int64_t i = 0; i < count; ++i) {
         const auto index = static_cast<zip_uint64_t>(i);
         const char* const name = ::zip_get_name(archive_.get(), index, ZIP_FL_ENC_GUESS);
         if (name == nullptr) {
-            throw Trouble(path, "has a member without a readable name");
+            throw Trouble(path_, "has a member without a readable name");
         }
         std::string member = name;
         if (ends_with(member, "/")) {
@@ -79,7 +81,7 @@ NpzFile::NpzFile(const std::string& path) : path_(path), archive_(open_archive(p
             member.resize(member.size() - suffix.size());
         }
         if (!index_.emplace(member, index).second) {
-            throw Trouble(path, "has two members of the name '" + member + "'");
+            throw Trouble(path_, "has two members of the name '" + member + "'");
         }
     }
 }

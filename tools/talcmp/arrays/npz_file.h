@@ -4,6 +4,7 @@
 #define TALCMP_NPZ_FILE_H
 
 #include "array_file.h"
+#include "regular_file.h"
 
 #include <map>
 
@@ -13,8 +14,8 @@ namespace talcmp {
 
 class NpzFile : public ArrayFile {
   public:
-    // Throws Trouble when the archive is broken.
-    explicit NpzFile(const std::string& path);
+    // Goes on reading the file by itself. Throws Trouble when the archive is broken.
+    explicit NpzFile(RegularFile& file);
 
     bool is_archive() const override { return true; }
     std::vector<std::string> members() const override;

@@ -12,10 +12,8 @@ namespace talcmp {
 
 class Pipe : public ByteStream {
   public:
-    // Opens a named pipe, and waits until somebody writes to it. Throws Trouble.
-    explicit Pipe(const std::string& path);
-    // `name` is what messages call the pipe, which is `descriptor`.
-    Pipe(std::string name, int descriptor);
+    // `name` is what messages call the pipe.
+    Pipe(std::string name, Descriptor pipe) : name_(std::move(name)), pipe_(std::move(pipe)) {}
 
     std::optional<std::uint64_t> size() const override { return std::nullopt; }
 

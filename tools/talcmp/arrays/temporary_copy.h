@@ -1,4 +1,4 @@
-// An array that comes but once, copied to where it can be read in any order.
+// A copy of an array that can be read only once, from which it is read in any order.
 
 #ifndef TALCMP_TEMPORARY_COPY_H
 #define TALCMP_TEMPORARY_COPY_H
@@ -11,15 +11,15 @@
 
 namespace talcmp {
 
-// In a file without a name, in the folder that the environment variable TMPDIR tells.
+// In a file without a name, in the folder that the environment variable TMPDIR names.
 class TemporaryCopy : public ArraySource {
   public:
-    // Reads all of `source`, to its end; `copied` is told of the bytes that have been since the
-    // last call. Throws Trouble.
+    // Reads all of `source`, to its end; `copied` is called with the bytes copied since its last
+    // call. Throws Trouble.
     TemporaryCopy(std::unique_ptr<ArraySource> source,
                   const std::function<void(std::uint64_t)>& copied);
 
-    type_t element_type() const override { return source_->element_type(); }
+    const ElementType& type() const override { return source_->type(); }
     const Shape& shape() const override { return source_->shape(); }
     bool fortran_order() const override { return source_->fortran_order(); }
     bool random_access() const override { return true; }
@@ -29,7 +29,7 @@ class TemporaryCopy : public ArraySource {
     void copy_all(const std::function<void(std::uint64_t)>& copied);
     void append(const char* bytes, std::size_t count);
 
-    std::unique_ptr<ArraySource> source_; // has been read
+    std::unique_ptr<ArraySource> source_; // which has been read
     std::string folder_;
     Descriptor file_;
 };

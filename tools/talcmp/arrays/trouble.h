@@ -1,4 +1,4 @@
-// What keeps talcmp from an answer, and how that is told.
+// What keeps talcmp from an answer.
 
 #ifndef TALCMP_TROUBLE_H
 #define TALCMP_TROUBLE_H

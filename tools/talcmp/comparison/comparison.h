@@ -1,14 +1,14 @@
-// The comparison of two arrays.
+// The comparison of two arrays, and all that it finds.
 
 #ifndef TALCMP_COMPARISON_H
 #define TALCMP_COMPARISON_H
 
 #include "array_source.h"
-#include "places.h"
-#include "report.h"
-#include "selection.h"
+#include "findings.h"
+#include "progress_listener.h"
+#include "question.h"
+#include "verdict.h"
 
-#include <cstdint>
 #include <memory>
 #include <optional>
 #include <string>
@@ -16,25 +16,33 @@
 
 namespace talcmp {
 
-struct Question {
-    talreal tolerance = 0;       // binary digits
-    bool strict_type = false;    // whether arrays of different element types differ
-    Selection selection;         // what is compared of each array
-    std::size_t differences = 1; // how many places are told at most
-    bool report = false;         // whether all pairs are looked at and counted
-    bool only_whether = false;   // whether any place will do, in whatever order they are met
-    unsigned threads = 0;        // at most; 0 for as many as are worth while
-};
-
 enum class Difference { none, shape, type, elements };
 
-// What is told of an array.
+// What is reported of an array.
 struct ArrayFacts {
     std::string name;
-    type_t type = 0;
+    const ElementType* type = nullptr;
     Shape shape;          // of the whole array
     Shape selected_shape; // of what is compared
     bool fortran_order = false;
+};
+
+// A place in both arrays, and what is to be said of the elements there.
+struct Place {
+    Shape index; // in the first array
+    Element element1, element2;
+    Verdict verdict;
+};
+
+// Of all pairs together.
+struct Report {
+    Totals totals;
+    std::optional<Place> worst_place; // the first that differs in the most digits, if any does
+    int all_digits = 0;               // of the reals as which elements are compared
+
+    // The smallest whole tolerance, from 0 on, under which the arrays are the same; nothing where
+    // that is none or one of all digits, which says nothing of them.
+    std::optional<int> smallest_tolerance = 0;
 };
 
 struct Comparison {
@@ -43,21 +51,6 @@ struct Comparison {
     Difference difference = Difference::none;
     std::vector<Place> places;    // the first that differ, in row-major order
     std::optional<Report> report; // where asked for and the shapes are the same
-};
-
-// Is told how far a comparison is.
-class ProgressListener {
-  public:
-    ProgressListener() = default;
-    ProgressListener(const ProgressListener&) = delete;
-    ProgressListener& operator=(const ProgressListener&) = delete;
-    virtual ~ProgressListener() = default;
-
-    // Before anything is read, with what will be read at most.
-    virtual void begin(std::uint64_t total_bytes) = 0;
-
-    // By any thread, with what has been read since the last call.
-    virtual void advance(std::uint64_t bytes) = 0;
 };
 
 // An array, and what messages call it.
@@ -69,8 +62,8 @@ struct NamedArray {
 // Compares what `question` selects of both arrays. The answer is what `TalNumericArray_sameQ` says
 // of them in a thread that remembers the factor of the tolerance; but under `strict_type` arrays of
 // different types differ even where they have no elements. The answer does not depend on how the
-// arrays are stored nor on the number of threads. What comes once is read to its end, whatever has
-// been found before, as only there a damaged archive shows. Throws Trouble.
+// arrays are stored nor on the number of threads. What can be read only once is read to its end,
+// whatever was found before, as only there a damaged archive shows. Throws Trouble.
 Comparison compare(NamedArray first, NamedArray second, const Question& question,
                    ProgressListener& progress);
 

@@ -1,26 +1,23 @@
 #include "digits.h"
 
 #include <algorithm>
-#include <array>
 #include <limits>
-#include <numeric>
 
 namespace talcmp {
 namespace {
 
-// Below it the pairs are asked about one by one.
+// Shorter ones are asked about pair by pair.
 constexpr std::size_t shortest_stretch = 32;
 
-// Kinds of pairs are those of their groups and, behind them, one for each sameness.
-using Kind = DigitSearch::Kind;
+// Classes of pairs are their groups and, after those, one for each sameness.
+using Class = DigitSearch::Class;
 
-constexpr Kind kind_of(const bool at_zero, const int from_one) {
-    return static_cast<Kind>(DigitGroups::count + (at_zero ? more_than_all_digits : 0) + from_one
-                             - 1);
+constexpr Class class_of(const Sameness sameness) {
+    return static_cast<Class>(DigitGroups::count + sameness.from_one() - 1
+                              + (sameness.at_zero() ? more_than_all_digits : 0));
 }
 
-constexpr Kind kind_of_same_under_all = kind_of(true, 1);
-static_assert(kind_of(true, more_than_all_digits) < DigitSearch::kind_count);
+static_assert(class_of({true, more_than_all_digits}) < DigitSearch::class_count);
 
 bool has_singles(const ElementType& type) {
     return !is_integer(type) && type.part_size == sizeof(float);
@@ -39,51 +36,59 @@ int all_digits(const ElementType& type1, const ElementType& type2) {
     return as_singles ? std::numeric_limits<float>::digits : most_digits;
 }
 
+// From one whole tolerance to the next no pair that is the same stops being so. Usual answers first:
+// equal, the same under no tolerance, or under all digits alone.
 Sameness sameness_of(const Pairs& pairs, const std::size_t i) {
+    const bool at_zero = pairs.same(0, i);
+    if (at_zero && pairs.same(1, i)) {
+        return same_under_all;
+    }
+    if (!pairs.same(most_digits, i)) {
+        return {at_zero, more_than_all_digits};
+    }
     int lowest = 1;
-    int highest = more_than_all_digits;
-    while (lowest < highest) {
-        const int middle = (lowest + highest) / 2;
-        if (pairs.same(middle, i)) {
-            highest = middle;
+    int highest = most_digits;
+    for (int tolerance = most_digits - 1; lowest < highest; tolerance = (lowest + highest) / 2) {
+        if (pairs.same(tolerance, i)) {
+            highest = tolerance;
         } else {
-            lowest = middle + 1;
+            lowest = tolerance + 1;
         }
     }
-    return {pairs.same(0, i), lowest};
+    return {at_zero, lowest};
 }
 
 DigitSearch::DigitSearch() {
     for (int from_one = 1; from_one <= more_than_all_digits; ++from_one) {
         for (const bool at_zero : {false, true}) {
-            result_.sameness_of[kind_of(at_zero, from_one)] = Sameness(at_zero, from_one);
+            const Sameness sameness(at_zero, from_one);
+            result_.sameness_of[talcmp::class_of(sameness)] = sameness;
         }
     }
 }
 
 const DigitSearch::Result& DigitSearch::search(const Pairs& pairs) {
-    open_.clear();
     result_.count.fill(0);
-    result_.kind_of.resize(pairs.count());
+    result_.class_of.resize(pairs.count());
     const bool same = all_same(pairs, 0, pairs.count());
-    if (!same && groups_.sort(pairs, result_.kind_of.data())) {
-        answer_groups(pairs);
-    } else {
-        std::fill(result_.kind_of.begin(), result_.kind_of.end(), kind_of_same_under_all);
-        result_.count[kind_of_same_under_all] = pairs.count();
-        if (!same) {
-            set_aside_same(pairs, 0, pairs.count());
-        }
+    if (!same && groups_.sort(pairs, result_.class_of.data())) {
+        ask_about_groups(pairs);
+        return result_;
     }
-    ask_about_open(pairs);
+    constexpr Class all = class_of(same_under_all);
+    std::fill(result_.class_of.begin(), result_.class_of.end(), all);
+    result_.count[all] = pairs.count();
+    if (!same) {
+        ask_about_stretch(pairs, 0, pairs.count());
+    }
     return result_;
 }
 
-// Asks about one pair of each group; those that are in doubt go to `open_`.
-void DigitSearch::answer_groups(const Pairs& pairs) {
-    std::array<std::size_t, kind_count> example = {};
+// Asks about one pair of each group, and about each that is in doubt.
+void DigitSearch::ask_about_groups(const Pairs& pairs) {
+    std::array<std::size_t, class_count> example = {};
     for (std::size_t i = 0; i < pairs.count(); ++i) {
-        const Kind group = result_.kind_of[i];
+        const Class group = result_.class_of[i];
         example[group] = i;
         ++result_.count[group];
     }
@@ -92,81 +97,34 @@ void DigitSearch::answer_groups(const Pairs& pairs) {
             result_.sameness_of[group] = talcmp::sameness_of(pairs, example[group]);
         }
     }
-    for (std::size_t i = 0; open_.size() < result_.count[DigitGroups::doubtful]; ++i) {
-        if (result_.kind_of[i] == DigitGroups::doubtful) {
-            open_.push_back(static_cast<std::uint32_t>(i));
+    for (std::size_t i = 0; result_.count[DigitGroups::doubtful] != 0; ++i) {
+        if (result_.class_of[i] == DigitGroups::doubtful) {
+            ask_about(pairs, i);
         }
     }
 }
 
-// Moves the pairs that are not the same, and few others, to `open_`.
-void DigitSearch::set_aside_same(const Pairs& pairs, const std::size_t begin,
-                                 const std::size_t count) {
+// Halves it until all of a part are the same.
+void DigitSearch::ask_about_stretch(const Pairs& pairs, const std::size_t begin,
+                                    const std::size_t count) {
     if (all_same(pairs, begin, count)) {
         return;
     }
     if (count > shortest_stretch) {
-        set_aside_same(pairs, begin, count / 2);
-        set_aside_same(pairs, begin + count / 2, count - count / 2);
+        ask_about_stretch(pairs, begin, count / 2);
+        ask_about_stretch(pairs, begin + count / 2, count - count / 2);
         return;
     }
     for (std::size_t i = begin; i < begin + count; ++i) {
-        open_.push_back(static_cast<std::uint32_t>(i));
+        ask_about(pairs, i);
     }
 }
 
-void DigitSearch::ask_about_open(const Pairs& pairs) {
-    rest_.resize(open_.size());
-    settle(pairs, open_.data(), open_.data() + open_.size(), 1, more_than_all_digits);
-}
-
-// Finds the smallest tolerance of each pair, which is known to be from `lowest` to `highest`. All
-// pairs are asked about under one tolerance before the next, so that its factor is made once. From
-// one whole tolerance to the next no pair that is the same stops being so.
-void DigitSearch::settle(const Pairs& pairs, std::uint32_t* const begin, std::uint32_t* const end,
-                         const int lowest, const int highest) {
-    if (begin == end || lowest == highest) {
-        seen_[static_cast<std::size_t>(lowest)] += static_cast<std::uint64_t>(end - begin);
-        std::for_each(begin, end, [&](const std::uint32_t i) {
-            const Kind kind = kind_of(pairs.same(0, i), lowest);
-            --result_.count[result_.kind_of[i]];
-            ++result_.count[kind];
-            result_.kind_of[i] = kind;
-        });
-        return;
-    }
-    const int tolerance = best_question(lowest, highest);
-    std::uint32_t* same = begin;
-    std::uint32_t* different = rest_.data();
-    for (const std::uint32_t* i = begin; i != end; ++i) {
-        const std::uint32_t index = *i;
-        const bool is_same = pairs.same(tolerance, index);
-        *same = index;
-        *different = index;
-        same += is_same ? 1 : 0;
-        different += is_same ? 0 : 1;
-    }
-    std::copy(rest_.data(), different, same);
-    settle(pairs, begin, same, lowest, tolerance);
-    settle(pairs, same, end, tolerance + 1, highest);
-}
-
-// The tolerance that halves the pairs, if they are like those seen before: then pairs that differ
-// in usual numbers of digits take few questions.
-int DigitSearch::best_question(const int lowest, const int highest) const {
-    const auto* const first = seen_.data() + lowest;
-    const auto* const last = seen_.data() + highest;
-    const std::uint64_t options = static_cast<std::uint64_t>(highest - lowest) + 1;
-    const std::uint64_t total = std::accumulate(first, last + 1, options);
-    std::uint64_t below = 0;
-    int tolerance = lowest;
-    for (const auto* seen = first; seen != last - 1; ++seen, ++tolerance) {
-        below += *seen + 1;
-        if (2 * below >= total) {
-            break;
-        }
-    }
-    return tolerance;
+void DigitSearch::ask_about(const Pairs& pairs, const std::size_t i) {
+    const Class found = talcmp::class_of(talcmp::sameness_of(pairs, i));
+    --result_.count[result_.class_of[i]];
+    ++result_.count[found];
+    result_.class_of[i] = found;
 }
 
 } // namespace talcmp

@@ -12,7 +12,7 @@
 
 namespace talcmp {
 
-// The whole tolerances that tell anything: from 53 on all answer alike.
+// The largest whole tolerance that differs from the next one: from 53 on all answer alike.
 inline constexpr int most_digits = 53;
 
 // Stands for the digits of a pair that is the same under no tolerance.
@@ -31,22 +31,22 @@ class Sameness {
   public:
     Sameness() = default;
     constexpr Sameness(const bool at_zero, const int from_one)
-        : at_zero_(at_zero), from_one_(from_one) {}
+        : at_zero_(at_zero), from_one_(static_cast<std::uint8_t>(from_one)) {}
 
-    bool at_zero() const { return at_zero_; }
+    constexpr bool at_zero() const { return at_zero_; }
 
     // The smallest whole tolerance from 1 on; `more_than_all_digits` where there is none.
-    int from_one() const { return from_one_; }
+    constexpr int from_one() const { return from_one_; }
 
-    int digits() const { return at_zero_ ? 0 : from_one_; }
+    constexpr int digits() const { return at_zero_ ? 0 : from_one_; }
 
-    bool operator==(const Sameness other) const {
+    constexpr bool operator==(const Sameness other) const {
         return at_zero_ == other.at_zero_ && from_one_ == other.from_one_;
     }
 
   private:
     bool at_zero_ = false;
-    int from_one_ = 0;
+    std::uint8_t from_one_ = 0;
 };
 
 // Of a pair that is the same under every tolerance.
@@ -59,13 +59,15 @@ Sameness sameness_of(const Pairs& pairs, std::size_t i);
 class DigitSearch {
   public:
     // Stands for pairs of one sameness.
-    using Kind = std::uint8_t;
-    static constexpr std::size_t kind_count = 256;
+    using Class = std::uint8_t;
+    static constexpr std::size_t class_count = 256;
 
     struct Result {
-        std::vector<Kind> kind_of;                        // each pair
-        std::array<Sameness, kind_count> sameness_of;     // the pairs of each kind
-        std::array<std::uint64_t, kind_count> count = {}; // of the pairs of each kind
+        std::vector<Class> class_of;                       // each pair
+        std::array<Sameness, class_count> sameness_of;     // the pairs of each class
+        std::array<std::uint64_t, class_count> count = {}; // of the pairs of each class
+
+        Sameness sameness(const std::size_t i) const { return sameness_of[class_of[i]]; }
     };
 
     DigitSearch();
@@ -74,20 +76,12 @@ class DigitSearch {
     const Result& search(const Pairs& pairs);
 
   private:
-    using Indices = std::vector<std::uint32_t>;
-
-    void answer_groups(const Pairs& pairs);
-    void set_aside_same(const Pairs& pairs, std::size_t begin, std::size_t count);
-    void ask_about_open(const Pairs& pairs);
-    void settle(const Pairs& pairs, std::uint32_t* begin, std::uint32_t* end, int lowest,
-                int highest);
-    int best_question(int lowest, int highest) const;
+    void ask_about_groups(const Pairs& pairs);
+    void ask_about_stretch(const Pairs& pairs, std::size_t begin, std::size_t count);
+    void ask_about(const Pairs& pairs, std::size_t i);
 
     Result result_;
     DigitGroups groups_;
-    Indices open_; // pairs that are to be asked about one by one
-    Indices rest_;
-    DigitCounts seen_ = {}; // the smallest tolerances from 1 on of all pairs that were in `open_`
 };
 
 } // namespace talcmp

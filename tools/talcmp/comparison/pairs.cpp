@@ -22,7 +22,8 @@ template <typename Real>
 void compare_neighbours(const talreal tolerance) {
     const Real one = 1;
     const Real next = one + std::numeric_limits<Real>::epsilon();
-    Pairs(element_type_id<Real>, &one, element_type_id<Real>, &next, 1).same(tolerance, 0);
+    const ElementType& type = element_type(element_type_id<Real>);
+    Pairs(type, &one, type, &next, 1).same(tolerance, 0);
 }
 
 } // namespace

@@ -4,7 +4,7 @@
 #define TALCMP_PAIRS_H
 
 #include "element_type.h"
-#include "taldata_array.h"
+#include "type_properties.h"
 
 #include <cstddef>
 
@@ -13,10 +13,9 @@ namespace talcmp {
 // A stretch of elements of two arrays, side by side, below 2^31 of them.
 class Pairs {
   public:
-    Pairs(const type_t type1, const void* data1, const type_t type2, const void* data2,
+    Pairs(const ElementType& type1, const void* data1, const ElementType& type2, const void* data2,
           const std::size_t count)
-        : type1_(element_type(type1)), type2_(element_type(type2)),
-          data1_(static_cast<const unsigned char*>(data1)),
+        : type1_(type1), type2_(type2), data1_(static_cast<const unsigned char*>(data1)),
           data2_(static_cast<const unsigned char*>(data2)), count_(count) {}
 
     std::size_t count() const { return count_; }

@@ -1,10 +1,10 @@
-// The way through two arrays of one shape, piece by piece.
+// Two arrays of one shape, taken apart into boxes.
 
 #ifndef TALCMP_TRAVERSAL_H
 #define TALCMP_TRAVERSAL_H
 
 #include "array_source.h"
-#include "selection.h"
+#include "layout.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -21,9 +21,9 @@ struct Box {
     std::size_t count = 0; // of the pairs in it
 };
 
-// All pairs of elements of two views, in boxes that take a few MiB at most. Where both arrays lie
-// in one order and without gaps, a box is a stretch of both; otherwise it is such that both are
-// read in stretches of some length.
+// All pairs of elements of two views, in boxes that take a few MiB at most. Where both arrays are
+// stored in one order and without gaps, a box is a stretch of both; otherwise its extents are such
+// that both are read in runs of some length.
 class Traversal {
   public:
     // `first` and `second` have one shape, which has elements. Boxes and the pairs in them are in

@@ -1,10 +1,8 @@
 #include "json_answers.h"
 
-#include "difference_text.h"
 #include "json_writer.h"
 #include "number_text.h"
-#include "report_text.h"
-#include "text_answers.h"
+#include "wording.h"
 
 #include <nlohmann/json.hpp>
 
@@ -55,21 +53,18 @@ Json digits(const int count) {
 
 Json array_json(const ArrayFacts& array) {
     return {{"name", array.name},
-            {"type", element_type(array.type).name},
+            {"type", array.type->name},
             {"shape", array.shape},
             {"selected_shape", array.selected_shape},
             {"order", array.fortran_order ? "Fortran" : "C"}};
 }
 
 Json place_json(const Comparison& comparison, const Place& place) {
-    const Pairs pair(comparison.array1.type, place.element1.data(), comparison.array2.type,
-                     place.element2.data(), 1);
-    return {{"index",
-             index_of(comparison.array1.shape, comparison.array1.fortran_order, place.position)},
+    return {{"index", place.index},
             {"first", first_value_text(comparison, place)},
             {"second", second_value_text(comparison, place)},
-            {"digits", digits(sameness_of(pair, 0).digits())},
-            {"reason", reason_text(comparison, place)}};
+            {"digits", digits(place.verdict.sameness.digits())},
+            {"reason", reason_text(place.verdict)}};
 }
 
 Json values_json(const ValueCounts& counts) {
@@ -78,11 +73,11 @@ Json values_json(const ValueCounts& counts) {
             {"negative_zeros", counts.negative_zeros}};
 }
 
-Json histogram_json(const Report& report) {
+Json histogram_json(const DigitCounts& counts) {
     Json bars = Json::array();
-    for (std::size_t i = 0; i < report.digits.size(); ++i) {
-        if (report.digits[i] != 0) {
-            bars.push_back({{"digits", digits(static_cast<int>(i))}, {"pairs", report.digits[i]}});
+    for (std::size_t i = 0; i < counts.size(); ++i) {
+        if (counts[i] != 0) {
+            bars.push_back({{"digits", digits(static_cast<int>(i))}, {"pairs", counts[i]}});
         }
     }
     return bars;
@@ -93,15 +88,16 @@ Json report_json(const Comparison& comparison) {
         return nullptr;
     }
     const Report& report = *comparison.report;
-    const auto smallest = smallest_tolerance(comparison);
-    return {{"pairs", report.pairs},
-            {"differing", report.differing},
+    const Totals& totals = report.totals;
+    const auto smallest = report.smallest_tolerance;
+    return {{"pairs", totals.pairs},
+            {"differing", totals.differing},
             {"worst", report.worst_place ? place_json(comparison, *report.worst_place) : Json()},
             {"smallest_tolerance", smallest ? Json(*smallest) : Json()},
             {"why_no_tolerance", smallest ? Json() : Json(reason_of_no_tolerance(comparison))},
-            {"first_values", values_json(report.values1)},
-            {"second_values", values_json(report.values2)},
-            {"histogram", histogram_json(report)}};
+            {"first_values", values_json(totals.values1)},
+            {"second_values", values_json(totals.values2)},
+            {"histogram", histogram_json(totals.digits)}};
 }
 
 void write_comparison(JsonWriter& writer, const Comparison& comparison) {
@@ -113,8 +109,7 @@ void write_comparison(JsonWriter& writer, const Comparison& comparison) {
         writer.add(place_json(comparison, place));
     }
     writer.end();
-    const bool has_report = comparison.difference != Difference::shape;
-    writer.add("report", has_report ? report_json(comparison) : Json());
+    writer.add("report", report_json(comparison));
 }
 
 } // namespace
@@ -134,7 +129,7 @@ void JsonAnswers::begin(const bool /*many*/) {
     writer_->begin_array("comparisons");
 }
 
-void JsonAnswers::tell(const Outcome& outcome) {
+void JsonAnswers::print(const Outcome& outcome) {
     writer_->begin_object();
     writer_->add("result", kind_text(outcome.kind));
     switch (outcome.kind) {
@@ -153,7 +148,6 @@ void JsonAnswers::tell(const Outcome& outcome) {
     case Outcome::Kind::trouble:
         writer_->add("names", {outcome.first, outcome.second});
         writer_->add("message", outcome.message);
-        complain(outcome.message);
         break;
     }
     writer_->end();

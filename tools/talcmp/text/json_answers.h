@@ -12,7 +12,7 @@ namespace talcmp {
 
 class JsonWriter;
 
-// Prints each outcome when it is told.
+// Prints each outcome at once.
 class JsonAnswers : public Answers {
   public:
     explicit JsonAnswers(const CommandLine& command_line);
@@ -21,7 +21,7 @@ class JsonAnswers : public Answers {
     ~JsonAnswers() override;
 
     void begin(bool many) override;
-    void tell(const Outcome& outcome) override;
+    void print(const Outcome& outcome) override;
     void finish(const Summary& summary) override;
 
   private:

@@ -3,7 +3,7 @@
 #ifndef TALCMP_PROGRESS_BAR_H
 #define TALCMP_PROGRESS_BAR_H
 
-#include "comparison.h"
+#include "progress_listener.h"
 
 #include <atomic>
 #include <chrono>
@@ -13,8 +13,8 @@
 
 namespace talcmp {
 
-// A bar and, behind it, what part of the bytes has been read, how fast, and how long the rest will
-// take; in fewer than `columns` characters, and without a bar where there is no room for it.
+// A bar, then what part of the bytes has been read, how fast, and how long the rest will take; in
+// fewer than `columns` characters, and without a bar where there is no room for it.
 std::string progress_text(std::uint64_t done, std::uint64_t total, double seconds, int columns);
 
 // Shows itself half a second after a comparison began, where standard error is a terminal that

@@ -1,7 +1,7 @@
 #include "report_text.h"
 
-#include "difference_text.h"
 #include "number_text.h"
+#include "wording.h"
 
 #include <algorithm>
 #include <array>
@@ -18,7 +18,7 @@ std::string line(const std::string& name, const std::string& value) {
 std::string array_text(const ArrayFacts& array) {
     const std::string part =
         array.selected_shape == array.shape ? "" : ", of it " + shape_text(array.selected_shape);
-    return element_type(array.type).name + " " + shape_text(array.shape) + part
+    return array.type->name + " " + shape_text(array.shape) + part
            + (array.fortran_order ? ", Fortran order" : "");
 }
 
@@ -37,28 +37,25 @@ std::string digits_text(const int digits) {
     return digits > most_digits ? "more than all" : std::to_string(digits);
 }
 
-int all_digits_of(const Comparison& comparison) {
-    return all_digits(element_type(comparison.array1.type), element_type(comparison.array2.type));
-}
-
 std::string smallest_tolerance_text(const Comparison& comparison) {
-    if (const auto smallest = smallest_tolerance(comparison)) {
-        return "--tol " + std::to_string(*smallest);
+    const Report& report = *comparison.report;
+    if (report.smallest_tolerance) {
+        return "--tol " + std::to_string(*report.smallest_tolerance);
     }
-    const bool none_at_all = comparison.report->needed_from_one > most_digits;
+    const bool none_at_all = report.totals.needed_from_one > most_digits;
     const std::string below =
-        none_at_all ? "" : " below all " + std::to_string(all_digits_of(comparison)) + " digits";
+        none_at_all ? "" : " below all " + std::to_string(report.all_digits) + " digits";
     return "none" + below + "; " + reason_of_no_tolerance(comparison);
 }
 
 // One bar for each number of digits up to the worst.
-std::string histogram(const Report& report, const Terminal& terminal) {
-    const auto most = *std::max_element(report.digits.begin(), report.digits.end());
+std::string histogram(const DigitCounts& counts, const Terminal& terminal) {
+    const auto most = *std::max_element(counts.begin(), counts.end());
     const std::size_t number_width = std::to_string(most).size();
     const int room = terminal.columns() - 18 - static_cast<int>(number_width);
     std::string text;
-    for (std::size_t digits = 0; digits < report.digits.size(); ++digits) {
-        const std::uint64_t count = report.digits[digits];
+    for (std::size_t digits = 0; digits < counts.size(); ++digits) {
+        const std::uint64_t count = counts[digits];
         if (count == 0) {
             continue;
         }
@@ -76,17 +73,6 @@ std::string histogram(const Report& report, const Terminal& terminal) {
 
 } // namespace
 
-std::optional<int> smallest_tolerance(const Comparison& comparison) {
-    return smallest_tolerance(*comparison.report, all_digits_of(comparison));
-}
-
-std::string reason_of_no_tolerance(const Comparison& comparison) {
-    const Report& report = *comparison.report;
-    return report.worst_digits >= all_digits_of(comparison)
-               ? place_text(comparison, *report.worst_place)
-               : "pairs of NaNs are the same under the tolerance 0 only";
-}
-
 std::string report_text(const Comparison& comparison, const Question& question,
                         const Terminal& terminal) {
     std::string text;
@@ -96,26 +82,26 @@ std::string report_text(const Comparison& comparison, const Question& question,
     if (!comparison.report) {
         return text;
     }
-    const Report& report = *comparison.report;
-    text += line("pairs", std::to_string(report.pairs));
-    if (report.pairs == 0) {
+    const Totals& totals = comparison.report->totals;
+    text += line("pairs", std::to_string(totals.pairs));
+    if (totals.pairs == 0) {
         return text;
     }
-    text += line("differing", share_text(report.differing, report.pairs));
+    text += line("differing", share_text(totals.differing, totals.pairs));
     if (!comparison.places.empty()) {
         text += line("first place", place_text(comparison, comparison.places.front()));
     }
-    if (report.worst_place) {
-        text += line("worst place", place_text(comparison, *report.worst_place));
+    if (const auto& worst = comparison.report->worst_place) {
+        text += line("worst place", place_text(comparison, *worst));
     }
-    text += line("largest difference", digits_text(report.worst_digits) + " binary digits");
+    text += line("largest difference", digits_text(totals.worst_digits) + " binary digits");
     text += line("smallest tolerance", smallest_tolerance_text(comparison));
-    text += line("NaNs", two(report.values1.nans, report.values2.nans));
-    text += line("infinities", two(report.values1.infinities, report.values2.infinities));
+    text += line("NaNs", two(totals.values1.nans, totals.values2.nans));
+    text += line("infinities", two(totals.values1.infinities, totals.values2.infinities));
     text +=
-        line("negative zeros", two(report.values1.negative_zeros, report.values2.negative_zeros));
+        line("negative zeros", two(totals.values1.negative_zeros, totals.values2.negative_zeros));
     text += "  digits that differ, number of pairs\n";
-    return text + histogram(report, terminal);
+    return text + histogram(totals.digits, terminal);
 }
 
 } // namespace talcmp

@@ -1,15 +1,15 @@
 #include "text_answers.h"
 
-#include "difference_text.h"
 #include "report_text.h"
 #include "shown.h"
+#include "wording.h"
 
 #include <cstdio>
 
 namespace talcmp {
 namespace {
 
-void print(const std::string& line) {
+void print_line(const std::string& line) {
     std::printf("%s\n", line.c_str());
 }
 
@@ -22,18 +22,16 @@ std::string summary_text(const Summary& summary) {
 
 } // namespace
 
-void TextAnswers::tell(const Outcome& outcome) {
-    if (outcome.kind == Outcome::Kind::trouble) {
-        std::fflush(stdout); // so that lines on one terminal stay in their order
-        complain(outcome.message);
-    } else if (command_line_.quiet) {
+void TextAnswers::print(const Outcome& outcome) {
+    if (command_line_.quiet || outcome.kind == Outcome::Kind::trouble) {
         return;
-    } else if (outcome.kind != Outcome::Kind::same) {
-        tell_difference(outcome);
+    }
+    if (outcome.kind != Outcome::Kind::same) {
+        print_difference(outcome);
     } else if (many_ || command_line_.verbose || command_line_.question.report) {
-        print(shown(outcome.first) + " " + shown(outcome.second) + " "
-              + terminal_.coloured("are the same", Colour::green)
-              + (outcome.comparison.has_elements ? "" : " (no elements)"));
+        print_line(shown(outcome.first) + " " + shown(outcome.second) + " "
+                   + terminal_.coloured("are the same", Colour::green)
+                   + (outcome.comparison.has_elements ? "" : " (no elements)"));
     }
     const bool compared =
         outcome.kind == Outcome::Kind::same || outcome.kind == Outcome::Kind::different;
@@ -43,19 +41,19 @@ void TextAnswers::tell(const Outcome& outcome) {
     }
 }
 
-void TextAnswers::tell_difference(const Outcome& outcome) const {
+void TextAnswers::print_difference(const Outcome& outcome) const {
     const std::string begin = shown(outcome.first) + " " + shown(outcome.second) + " "
                               + terminal_.coloured("differ", Colour::red) + ": ";
     const Comparison& comparison = outcome.comparison;
     if (outcome.kind != Outcome::Kind::different) {
         const bool first = outcome.kind == Outcome::Kind::only_in_first;
-        print(begin + "only in " + shown(first ? outcome.first : outcome.second) + ": "
-              + shown(outcome.name));
+        print_line(begin + "only in " + shown(first ? outcome.first : outcome.second) + ": "
+                   + shown(outcome.name));
     } else if (comparison.difference != Difference::elements) {
-        print(begin + difference_text(comparison));
+        print_line(begin + difference_text(comparison));
     } else {
         for (const Place& place : comparison.places) {
-            print(begin + place_text(comparison, place));
+            print_line(begin + place_text(comparison, place));
         }
     }
 }
@@ -64,12 +62,8 @@ void TextAnswers::finish(const Summary& summary) {
     // Of the members of two archives, of which there may be none, on demand.
     const bool one = total(summary) == 1;
     if ((many_ || (command_line_.verbose && !one)) && !command_line_.quiet) {
-        print(summary_text(summary));
+        print_line(summary_text(summary));
     }
-}
-
-void complain(const std::string& message) {
-    std::fprintf(stderr, "talcmp: %s\n", message.c_str());
 }
 
 } // namespace talcmp

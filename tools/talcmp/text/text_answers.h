@@ -1,4 +1,4 @@
-// Outcomes as lines of text: on standard output, and trouble on standard error.
+// Outcomes as lines of text on standard output.
 
 #ifndef TALCMP_TEXT_ANSWERS_H
 #define TALCMP_TEXT_ANSWERS_H
@@ -15,19 +15,16 @@ class TextAnswers : public Answers {
         : command_line_(command_line), terminal_(terminal) {}
 
     void begin(const bool many) override { many_ = many; }
-    void tell(const Outcome& outcome) override;
+    void print(const Outcome& outcome) override;
     void finish(const Summary& summary) override;
 
   private:
-    void tell_difference(const Outcome& outcome) const;
+    void print_difference(const Outcome& outcome) const;
 
     const CommandLine& command_line_;
     Terminal terminal_;
     bool many_ = false;
 };
-
-// Tells trouble on standard error.
-void complain(const std::string& message);
 
 } // namespace talcmp
 

@@ -1,7 +1,7 @@
-// Places and differences in words.
+// What a comparison found, in words.
 
-#ifndef TALCMP_DIFFERENCE_TEXT_H
-#define TALCMP_DIFFERENCE_TEXT_H
+#ifndef TALCMP_WORDING_H
+#define TALCMP_WORDING_H
 
 #include "comparison.h"
 
@@ -12,15 +12,13 @@ namespace talcmp {
 // As NumPy writes a shape: "()", "(3,)", "(2, 3)".
 std::string shape_text(const Shape& shape);
 
-// The index of a place in the first array, "[1, 2]".
-std::string index_text(const Comparison& comparison, const Place& place);
-
-// A value in digits that read back as the same value, a NaN as its bits.
+// A value in digits that read back as the same value, a NaN as its bits. Where the types differ a
+// single is written as a double, or 0.1 in singles and 0.1 in doubles would look alike.
 std::string first_value_text(const Comparison& comparison, const Place& place);
 std::string second_value_text(const Comparison& comparison, const Place& place);
 
 // Why the two are not the same: "the same from --tol 15 on", "no digit in common", "a NaN", ...
-std::string reason_text(const Comparison& comparison, const Place& place);
+std::string reason_text(const Verdict& verdict);
 
 // "[1, 2]: 0.5 and 0.75 (the same from --tol 52 on)"
 std::string place_text(const Comparison& comparison, const Place& place);
@@ -28,6 +26,9 @@ std::string place_text(const Comparison& comparison, const Place& place);
 // How two arrays that differ do: "shape (2, 3) and (3, 2)", "type int32 and float64", or the first
 // place that differs.
 std::string difference_text(const Comparison& comparison);
+
+// Why a report has no smallest tolerance.
+std::string reason_of_no_tolerance(const Comparison& comparison);
 
 } // namespace talcmp
 

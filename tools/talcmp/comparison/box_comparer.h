@@ -1,0 +1,83 @@
+// The comparison of two arrays box by box: what all boxes have in common, and what finds the pairs
+// that differ in one.
+
+#ifndef TALCMP_BOX_COMPARER_H
+#define TALCMP_BOX_COMPARER_H
+
+#include "array_source.h"
+#include "layout.h"
+#include "pair_counter.h"
+#include "question.h"
+#include "traversal.h"
+
+#include <cstdint>
+#include <memory>
+
+namespace talcmp {
+
+// Otherwise boxes, and the pairs in them, are in row-major order.
+bool column_major(const ArraySource& first, const ArraySource& second);
+
+// What all boxes of a comparison have in common. It refers to what it is made of.
+class BoxPlan {
+  public:
+    BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second,
+            const Question& question);
+
+    const Traversal& traversal() const { return traversal_; }
+    ArraySource& first() const { return first_; }
+    ArraySource& second() const { return second_; }
+    const Question& question() const { return question_; }
+
+    // Whether the numbers of pairs ascend from each to the next, in a box and from box to box.
+    bool in_order() const { return in_order_; }
+
+    // Of a pair of a box, for `FoundPair`. In the order of storage where any place will do.
+    std::uint64_t number_of(const Box& box, std::size_t i) const;
+
+    // The index of the first array's element of that number.
+    Shape index_of(std::uint64_t number) const;
+
+    // Whether all pairs of the box come after those wanted, whose numbers are below `bound`.
+    bool is_beyond(const Box& box, std::uint64_t bound) const;
+
+    std::size_t bytes_of_pair() const { return first_.type().size + second_.type().size; }
+
+    // Whether boxes may be compared in any order, several at a time.
+    bool random_access() const { return first_.random_access() && second_.random_access(); }
+
+  private:
+    const Traversal& traversal_;
+    ArraySource& first_;
+    ArraySource& second_;
+    const Question& question_;
+    bool as_stored_;
+    bool in_order_;
+    RowMajorNumbers numbers_;
+};
+
+// Compares boxes one after another. Each thread has its own.
+class BoxComparer {
+  public:
+    explicit BoxComparer(const BoxPlan& plan);
+
+    // Reads the box and adds what it finds. Returns the number from which on no pair of any box is
+    // wanted any more. Throws Trouble.
+    std::uint64_t compare(const Box& box);
+
+    const Findings& findings() const { return findings_; }
+
+  private:
+    void read(const Box& box);
+    void find_different(const Pairs& pairs, const Box& box);
+
+    const BoxPlan& plan_;
+    std::unique_ptr<unsigned char[]> buffer1_;
+    std::unique_ptr<unsigned char[]> buffer2_;
+    PairCounter counter_;
+    Findings findings_;
+};
+
+} // namespace talcmp
+
+#endif

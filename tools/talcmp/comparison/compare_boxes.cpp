@@ -1,0 +1,125 @@
+#include "compare_boxes.h"
+
+#include <algorithm>
+#include <atomic>
+#include <exception>
+#include <limits>
+#include <mutex>
+#include <optional>
+#include <system_error>
+#include <thread>
+#include <vector>
+
+namespace talcmp {
+namespace {
+
+// What the threads share: which box is next, from which number on no pair is wanted, what failed.
+class BoxQueue {
+  public:
+    explicit BoxQueue(const std::uint64_t box_count) : box_count_(box_count) {}
+
+    // The number of the next box; nothing when all are done or something failed.
+    std::optional<std::uint64_t> next_box() {
+        const std::uint64_t box = next_box_++;
+        return box < box_count_ && !stopped_ ? std::optional(box) : std::nullopt;
+    }
+
+    // All boxes before it have been given out, so that of several failures the first is known.
+    void fail(const std::uint64_t box, const std::exception_ptr& failure) {
+        const std::lock_guard<std::mutex> lock(mutex_);
+        if (!failure_ || box < failed_box_) {
+            failed_box_ = box;
+            failure_ = failure;
+        }
+        stopped_ = true;
+    }
+
+    void lower_bound(const std::uint64_t bound) {
+        std::uint64_t known = bound_;
+        while (bound < known && !bound_.compare_exchange_weak(known, bound)) {
+        }
+    }
+    std::uint64_t bound() const { return bound_; }
+
+    // When all threads have ended. One thread alone would not have come to a box beyond `bound`.
+    void rethrow_failure_before(const std::uint64_t bound, const BoxPlan& plan) const {
+        if (failure_ && !plan.is_beyond(plan.traversal().box(failed_box_), bound)) {
+            std::rethrow_exception(failure_);
+        }
+    }
+
+  private:
+    std::uint64_t box_count_;
+    std::atomic<std::uint64_t> next_box_ = 0;
+    std::atomic<std::uint64_t> bound_ = std::numeric_limits<std::uint64_t>::max();
+    std::atomic<bool> stopped_ = false;
+    std::mutex mutex_;
+    std::exception_ptr failure_;
+    std::uint64_t failed_box_ = 0;
+};
+
+// What each thread does.
+void take_boxes(const BoxPlan& plan, BoxQueue& queue, BoxComparer& comparer,
+                ProgressListener& progress) {
+    remember_factor_of(plan.question().tolerance);
+    while (const auto number = queue.next_box()) {
+        try {
+            const Box box = plan.traversal().box(*number);
+            if (!plan.is_beyond(box, queue.bound())) {
+                queue.lower_bound(comparer.compare(box));
+                progress.advance(box.count * plan.bytes_of_pair());
+            }
+        } catch (...) {
+            queue.fail(*number, std::current_exception());
+        }
+    }
+}
+
+// Runs `action` on each number below `count`, that is in a thread of its own where the system has
+// one more; 0 is the calling thread.
+template <typename Action>
+void in_threads(const std::size_t count, const Action& action) {
+    std::vector<std::thread> threads;
+    try {
+        for (std::size_t i = 1; i < count; ++i) {
+            threads.emplace_back([&action, i] { action(i); });
+        }
+    } catch (const std::system_error&) {
+        // The threads that exist do all of the work.
+    }
+    action(0);
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+}
+
+} // namespace
+
+unsigned thread_count(const BoxPlan& plan) {
+    if (!plan.random_access()) {
+        return 1;
+    }
+    constexpr unsigned most = 8; // a few MiB each; more hardly read faster
+    const unsigned allowed = plan.question().threads;
+    const unsigned wanted =
+        allowed != 0 ? allowed : std::clamp(std::thread::hardware_concurrency(), 1U, most);
+    return static_cast<unsigned>(std::min<std::uint64_t>(wanted, plan.traversal().box_count()));
+}
+
+Findings compare_boxes(const BoxPlan& plan, const unsigned threads, ProgressListener& progress) {
+    BoxQueue queue(plan.traversal().box_count());
+    std::vector<std::unique_ptr<BoxComparer>> comparers;
+    for (unsigned i = 0; i < threads; ++i) {
+        comparers.push_back(std::make_unique<BoxComparer>(plan));
+    }
+    in_threads(threads,
+               [&](const std::size_t i) { take_boxes(plan, queue, *comparers[i], progress); });
+    Findings sum(plan.question().differences);
+    for (const auto& comparer : comparers) {
+        add(sum, comparer->findings());
+    }
+    queue.rethrow_failure_before(sum.first.bound(), plan);
+    return sum;
+}
+
+} // namespace talcmp

@@ -1,0 +1,20 @@
+// The comparison of all boxes by several threads.
+
+#ifndef TALCMP_COMPARE_BOXES_H
+#define TALCMP_COMPARE_BOXES_H
+
+#include "box_comparer.h"
+#include "progress_listener.h"
+
+namespace talcmp {
+
+// How many threads are worthwhile, up to as many as the question allows.
+unsigned thread_count(const BoxPlan& plan);
+
+// The findings are those of one thread alone. Throws Trouble where one alone would have come to a
+// box that cannot be read, and std::bad_alloc.
+Findings compare_boxes(const BoxPlan& plan, unsigned threads, ProgressListener& progress);
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,48 @@
+// Where the elements of an array are, by their indices.
+
+#ifndef TALCMP_LAYOUT_H
+#define TALCMP_LAYOUT_H
+
+#include "array_source.h"
+#include "selection.h"
+
+#include <cstdint>
+#include <vector>
+
+namespace talcmp {
+
+// Where the selected elements of an array are stored.
+struct View {
+    std::uint64_t offset = 0;           // position of the first one
+    Shape shape;                        // of what is selected
+    std::vector<std::uint64_t> strides; // positions from index to index, for each axis of `shape`
+};
+
+// Throws std::invalid_argument, which says why the array has no such part.
+View select(const ArraySource& source, const Selection& selection);
+
+// The index of the element that is stored at `position`.
+Shape index_of(const Shape& shape, bool fortran_order, std::uint64_t position);
+
+// Numbers the elements of an array from 0 on in row-major order, whatever order they are stored in.
+class RowMajorNumbers {
+  public:
+    // Of an array that is stored in C order.
+    RowMajorNumbers() = default;
+    explicit RowMajorNumbers(const ArraySource& source);
+
+    // Of the element that is stored at `position`.
+    std::uint64_t of(std::uint64_t position) const;
+
+  private:
+    struct Axis {
+        std::uint64_t extent;
+        std::uint64_t stride; // in C order
+    };
+
+    std::vector<Axis> axes_; // as they vary in the file, the fastest first; none for C order
+};
+
+} // namespace talcmp
+
+#endif

@@ -1,0 +1,121 @@
+#include "pair_counter.h"
+
+#include <algorithm>
+#include <array>
+#include <cmath>
+
+namespace talcmp {
+namespace {
+
+FoundPair found_pair(const Pairs& pairs, const std::size_t i, const std::uint64_t number,
+                     const Sameness sameness) {
+    FoundPair pair = talcmp::found_pair(pairs, i, number);
+    pair.sameness = sameness;
+    return pair;
+}
+
+void add_counts(const DigitSearch::Result& found, Totals& totals) {
+    for (std::size_t each = 0; each < found.count.size(); ++each) {
+        if (found.count[each] != 0) {
+            const Sameness sameness = found.sameness_of[each];
+            totals.digits[static_cast<std::size_t>(sameness.digits())] += found.count[each];
+            totals.needed_from_one = std::max(totals.needed_from_one, sameness.from_one());
+        }
+    }
+}
+
+int worst_digits(const DigitSearch::Result& found) {
+    int worst = 0;
+    for (std::size_t each = 0; each < found.count.size(); ++each) {
+        if (found.count[each] != 0) {
+            worst = std::max(worst, found.sameness_of[each].digits());
+        }
+    }
+    return worst;
+}
+
+void add_worst(const Pairs& pairs, const DigitSearch::Result& found,
+               const PairCounter::Numbering& number, const bool in_order, Totals& totals) {
+    Totals worst;
+    worst.worst_digits = worst_digits(found);
+    if (worst.worst_digits == 0 || worst.worst_digits < totals.worst_digits) {
+        return;
+    }
+    if (in_order && worst.worst_digits == totals.worst_digits && totals.worst->number < number(0)) {
+        return;
+    }
+    for (std::size_t i = 0; i < pairs.count() && !(in_order && worst.worst); ++i) {
+        if (found.sameness(i).digits() == worst.worst_digits
+            && (!worst.worst || number(i) < worst.worst->number)) {
+            worst.worst = found_pair(pairs, i, number(i), found.sameness(i));
+        }
+    }
+    add(totals, worst);
+}
+
+} // namespace
+
+void PairCounter::add(const Pairs& pairs, const Numbering& number, const bool in_order,
+                      Findings& findings) {
+    Totals& totals = findings.totals;
+    totals.pairs += pairs.count();
+    talcmp::add(totals.values1, count_values(pairs.type1().id, pairs.element1(0), pairs.count()));
+    talcmp::add(totals.values2, count_values(pairs.type2().id, pairs.element2(0), pairs.count()));
+    const DigitSearch::Result& found = search_.search(pairs);
+    add_counts(found, totals);
+    add_differing(pairs, found, number, in_order, findings);
+    add_worst(pairs, found, number, in_order, totals);
+}
+
+// Whether pairs of such a sameness are the same under the tolerance. No tolerance from 1 on takes a
+// sameness away that a smaller one grants; what is the same under none of them is under no smaller
+// one but 0.
+PairCounter::Answer PairCounter::answer_on(const Sameness sameness) const {
+    if (tolerance_ == 0) {
+        return sameness.at_zero() ? Answer::same : Answer::different;
+    }
+    if (sameness == same_under_all) {
+        return Answer::same;
+    }
+    const talreal whole =
+        tolerance_ < 1 ? 0 : std::floor(std::min<talreal>(tolerance_, most_digits));
+    if (sameness.from_one() <= whole) {
+        return Answer::same;
+    }
+    const bool between = tolerance_ < most_digits && tolerance_ != whole;
+    return between && sameness.from_one() == whole + 1 ? Answer::to_be_asked : Answer::different;
+}
+
+void PairCounter::add_differing(const Pairs& pairs, const DigitSearch::Result& found,
+                                const Numbering& number, const bool in_order,
+                                Findings& findings) const {
+    std::array<Answer, DigitSearch::class_count> answers = {};
+    std::uint64_t to_be_asked = 0;
+    std::uint64_t different = 0;
+    for (std::size_t each = 0; each < answers.size(); ++each) {
+        if (found.count[each] != 0) {
+            answers[each] = answer_on(found.sameness_of[each]);
+            to_be_asked += answers[each] == Answer::to_be_asked ? found.count[each] : 0;
+            different += answers[each] == Answer::different ? found.count[each] : 0;
+        }
+    }
+    if (to_be_asked != 0) {
+        remember_factor_of(tolerance_);
+    }
+    findings.totals.differing += different;
+    bool wanted = true;
+    for (std::size_t i = 0; to_be_asked + (wanted ? different : 0) != 0; ++i) {
+        const Answer answer = answers[found.class_of[i]];
+        const bool asked = answer == Answer::to_be_asked;
+        const bool differs = asked ? !pairs.same(tolerance_, i) : answer == Answer::different;
+        to_be_asked -= asked ? 1 : 0;
+        different -= answer == Answer::different ? 1 : 0;
+        findings.totals.differing += asked && differs ? 1 : 0;
+        if (differs && wanted) {
+            wanted =
+                findings.first.add(found_pair(pairs, i, number(i), found.sameness(i))) || !in_order;
+        }
+    }
+}
+
+} // namespace talcmp

@@ -1,0 +1,37 @@
+// Finds and counts how pairs of elements differ.
+
+#ifndef TALCMP_PAIR_COUNTER_H
+#define TALCMP_PAIR_COUNTER_H
+
+#include "findings.h"
+
+#include <cstdint>
+#include <functional>
+
+namespace talcmp {
+
+class PairCounter {
+  public:
+    explicit PairCounter(const talreal tolerance) : tolerance_(tolerance) {}
+
+    // Finds the number, in row-major order, of a pair.
+    using Numbering = std::function<std::uint64_t(std::size_t)>;
+
+    // Adds what all pairs amount to. `in_order` says that their numbers ascend, and that those of
+    // pairs added later are higher still.
+    void add(const Pairs& pairs, const Numbering& number, bool in_order, Findings& findings);
+
+  private:
+    enum class Answer : std::uint8_t { same, different, to_be_asked };
+
+    void add_differing(const Pairs& pairs, const DigitSearch::Result& found,
+                       const Numbering& number, bool in_order, Findings& findings) const;
+    Answer answer_on(Sameness sameness) const;
+
+    talreal tolerance_;
+    DigitSearch search_;
+};
+
+} // namespace talcmp
+
+#endif
