@@ -5,24 +5,24 @@
 #include <cstdio>
 
 int main() {
+    BIT32 integers[] = {1, 2, 3};
+    double reals[] = {1.0, 2.0, 3.0000000001};
     talint dimensions[] = {3};
 
-    BIT32 integers[] = {1, 2, 3};
     st_TalDataArray counted = {};
     counted.rank = 1;
     counted.dims = dimensions;
-    counted.data_type = BIT32_TYPE;
     counted.nelems = 3;
+    counted.data_type = BIT32_TYPE;
     counted.data = integers;
 
-    double reals[] = {1.0, 2.0, 3.0000000001};
     st_TalDataArray measured = counted;
     measured.data_type = REAL64_TYPE;
     measured.data = reals;
 
     const int any_type = 1;
     std::printf("exactly the same: %d\n", TalNumericArray_sameQ(0, any_type, &counted, &measured));
-    std::printf("same but for 20 of 53 binary digits: %d\n",
+    std::printf("the same with a tolerance of 20 binary digits: %d\n",
                 TalNumericArray_sameQ(20, any_type, &counted, &measured));
     std::printf("same rank, type and shape: %d\n",
                 TalNumericArray_equivalentQ(&counted, &measured));

@@ -1,6 +1,6 @@
 #!/bin/sh
 # shellcheck disable=SC2016 # git expands what is in single quotes
-# Has git tell of a changed array, in this repository, how it differs.
+# Has git show how a changed array in this repository differs.
 echo '*.npy diff=npy' >>.gitattributes
 
 # git diff, git show, git log --patch: what a report says of each array alone, line by line, and a sum
