@@ -354,7 +354,12 @@ class Module:
     columns = {"arrays": "whole arrays", "parts": "tests of parts", "reading": "`reading_test`",
                "certainty": "`certainty_test`s", "release": "release build", TIME_OUT: "time-out",
                SURVIVES: "equivalent"}
+    row_title = "file"
     bench = Bench
+
+    @staticmethod
+    def row(path):
+        return path.rpartition("/")[2]
 
     @staticmethod
     def group(step):

@@ -157,15 +157,15 @@ def row(cells):
 
 
 def table(target, outcomes):
-    """By file, how many were killed and by what, and how many are equivalent."""
-    by_file, total = defaultdict(Counter), Counter()
+    """By file or folder, how many were killed and by what, and how many are equivalent."""
+    by_row, total = defaultdict(Counter), Counter()
     for mutant, outcome in outcomes.items():
-        by_file[f"`{mutant.path.split('/')[-1]}`"][column(target, outcome)] += 1
+        by_row[f"`{target.row(mutant.path)}`"][column(target, outcome)] += 1
         total[column(target, outcome)] += 1
-    by_file["all"] = total
-    text = row(["file", "mutants", *target.columns.values()])
+    by_row["all"] = total
+    text = row([target.row_title, "mutants", *target.columns.values()])
     text += "|---" * (2 + len(target.columns)) + "|\n"
-    for name, counts in by_file.items():
+    for name, counts in by_row.items():
         cells = [counts[key] for key in target.columns]
         text += row([name, sum(cells), *cells]) if sum(cells) else ""
     elsewhere = (f", and {total[ELSEWHERE]} lie in lines for other platforms or compilers"

@@ -243,7 +243,12 @@ class Talcmp:
     mark = "mutants of talcmp"  # of the table in the document
     columns = {"parts": "tests of parts", "command": "tests of the command",
                "python": "tests in Python", TIME_OUT: "time-out", SURVIVES: "equivalent"}
+    row_title = "folder"
     bench = Bench
+
+    @staticmethod
+    def row(path):
+        return path.rpartition("/")[0]
 
     @staticmethod
     def group(step):
