@@ -10,7 +10,7 @@
 
 int main() {
     constexpr std::uint64_t seed = 20;
-    constexpr std::uint64_t calls = 100000;
-    golden::record(std::cout, seed, calls);
+    constexpr std::uint64_t blocks = 391; // 100,096 calls
+    golden::record(std::cout, seed, blocks);
     return std::cout.flush() ? 0 : 1;
 }

@@ -1,14 +1,17 @@
 #include "golden_calls.h"
 
 #include "element_types.h"
+#include "oracle.h"
 #include "random_arrays.h"
+#include "rounded_factor.h"
 #include "talnumericarray_compare.h"
 #include "tolerance_shift_factor.h"
 
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <cstdlib>
+#include <cstring>
+#include <iomanip>
 #include <limits>
 #include <set>
 #include <sstream>
@@ -20,36 +23,24 @@
 namespace golden {
 namespace {
 
-// ---- Elements as text
+constexpr char title[] =
+    "Random calls and their answers; tests/support/golden_calls.h says how to read";
+
+// ---- Calls
 
 constexpr char digits[] = "0123456789abcdef";
 constexpr bool little_endian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
-
-// Where in a part of an element its byte of this significance lies, 0 being the most significant.
-std::size_t place(const std::size_t significance, const std::size_t part_size) {
-    return little_endian ? part_size - 1 - significance : significance;
-}
 
 class Elements {
   public:
     Elements(const ElementType& type, const std::size_t count)
         : type_(&type), count_(static_cast<talint>(count)), bytes_(count * type.size) {}
 
-    Elements(const ElementType& type, const std::string& text)
-        : Elements(type, text.size() / (2 * type.size)) {
-        if (text.size() != 2 * bytes_.size() || bytes_.empty()) {
-            throw std::runtime_error("no whole number of elements: " + text);
-        }
-        for (std::size_t i = 0; i < bytes_.size(); ++i) {
-            const std::string byte = text.substr(2 * i, 2);
-            bytes_[in_memory(i)] = static_cast<unsigned char>(std::stoi(byte, nullptr, 16));
-        }
-    }
-
+    // The bits of each part, the most significant first, without separators.
     std::string text() const {
         std::string result;
         for (std::size_t i = 0; i < bytes_.size(); ++i) {
-            const unsigned byte = bytes_[in_memory(i)];
+            const unsigned byte = bytes_[little_endian ? i ^ (type_->part_size - 1) : i];
             result += digits[byte >> 4U];
             result += digits[byte & 15U];
         }
@@ -69,23 +60,13 @@ class Elements {
         return result;
     }
 
-  private:
-    // The byte in memory of the byte in the text.
-    std::size_t in_memory(const std::size_t i) const {
-        const std::size_t in_part = i % type_->part_size;
-        return i - in_part + place(in_part, type_->part_size);
-    }
+    oracle::Array for_oracle() const { return {type_->id, {count_}, count_, bytes_.data()}; }
 
+  private:
     const ElementType* type_;
     talint count_;
     std::vector<unsigned char> bytes_;
 };
-
-const ElementType& type_of(const int id) {
-    return element_types.at(static_cast<std::size_t>(id) - 1);
-}
-
-// ---- Calls and factors
 
 struct Call {
     double tolerance;
@@ -94,79 +75,109 @@ struct Call {
     Elements second;
 };
 
+std::string text_of(const Call& call) {
+    std::uint64_t tolerance = 0;
+    std::memcpy(&tolerance, &call.tolerance, sizeof tolerance);
+    std::ostringstream text;
+    text << "bits of tolerance " << std::hex << tolerance << std::dec << ", any type "
+         << call.any_type << ", types " << call.first.type_id() << " and " << call.second.type_id()
+         << ", elements " << call.first.text() << " and " << call.second.text();
+    return text.str();
+}
+
 int answer_to(Call& call) {
     st_TalDataArray record1 = call.first.record();
     st_TalDataArray record2 = call.second.record();
     return TalNumericArray_sameQ(call.tolerance, call.any_type, &record1, &record2);
 }
 
-// Whether comparisons of this type ask for the factor of this tolerance.
-template <typename Real>
-bool has_factor(const double tolerance) {
-    const Real rounded = static_cast<Real>(tolerance);
-    return rounded > 0 && rounded < std::numeric_limits<Real>::digits;
+const ElementType& random_type(oracle::Random& random) {
+    return element_types.at(random.below(12));
 }
 
-template <typename Real>
-Real factor_of(const double tolerance) {
-    return nesk::ToleranceShiftFactor(static_cast<Real>(tolerance));
-}
+class Calls {
+  public:
+    explicit Calls(const std::uint64_t seed) : random_(seed) {}
 
-template <typename Real>
-void record_factor(std::ostream& records, const char* name, const double tolerance) {
-    if (has_factor<Real>(tolerance)) {
-        records << name << ' ' << tolerance << ' ' << factor_of<Real>(tolerance) << '\n';
+    std::vector<Call> next_block() {
+        std::vector<Call> block;
+        for (std::uint64_t i = 0; i < calls_per_block; ++i) {
+            block.push_back(next());
+        }
+        return block;
     }
-}
 
-Call random_call(oracle::Random& random, const double tolerance) {
-    static const std::size_t counts[] = {1, 1, 1, 1, 1, 1, 2, 3};
-    const std::size_t count = random.pick(counts);
-    const int any_type = random.one_in(32) ? 0 : 1;
-    const ElementType& type1 = type_of(random.between(1, 12));
-    const ElementType& type2 = type_of(random.between(1, 12));
-    Call call = {tolerance, any_type, {type1, count}, {type2, count}};
-    oracle::fill_arrays(random, tolerance, type1.id, type2.id, static_cast<std::int32_t>(count),
-                        call.first.data(), call.second.data());
-    return call;
-}
-
-double read_number(std::istream& line) {
-    std::string text;
-    line >> text;
-    char* end = nullptr;
-    const double number = std::strtod(text.c_str(), &end);
-    if (text.empty() || *end != '\0') {
-        throw std::runtime_error("no number: " + text);
+  private:
+    Call next() {
+        static const std::size_t counts[] = {1, 1, 1, 1, 1, 1, 2, 3};
+        const double tolerance = tolerances_.next(random_);
+        const std::size_t count = random_.pick(counts);
+        const int any_type = random_.one_in(32) ? 0 : 1;
+        const ElementType& type1 = random_type(random_);
+        const ElementType& type2 = random_type(random_);
+        Call call = {tolerance, any_type, {type1, count}, {type2, count}};
+        oracle::fill_arrays(random_, tolerance, type1.id, type2.id,
+                            static_cast<std::int32_t>(count), call.first.data(),
+                            call.second.data());
+        return call;
     }
-    return number;
+
+    oracle::Random random_;
+    oracle::RandomTolerances tolerances_;
+};
+
+// 64-bit FNV-1a, of what the calls are as text.
+std::string digest_of(const std::vector<Call>& calls) {
+    std::uint64_t digest = 0xcbf29ce484222325;
+    for (const Call& call : calls) {
+        for (const char character : text_of(call)) {
+            digest = (digest ^ static_cast<unsigned char>(character)) * 0x100000001b3;
+        }
+    }
+    std::ostringstream text;
+    text << std::hex << std::setfill('0') << std::setw(16) << digest;
+    return text.str();
 }
 
-Call read_call(std::istream& line) {
-    const double tolerance = read_number(line);
-    int any_type = 0;
-    int id1 = 0;
-    int id2 = 0;
-    std::string elements1;
-    std::string elements2;
-    line >> any_type >> id1 >> elements1 >> id2 >> elements2;
-    return {tolerance, any_type, {type_of(id1), elements1}, {type_of(id2), elements2}};
+// ---- Answers
+
+bool oracle_answer_to(oracle::State& state, const Call& call) {
+    return oracle::same(state, call.tolerance, call.any_type != 0, call.first.for_oracle(),
+                        call.second.for_oracle());
+}
+
+// Four answers a digit.
+std::string answers_to(std::vector<Call>& block, oracle::State& state) {
+    std::string answers;
+    std::size_t four_answers = 0;
+    for (std::size_t i = 0; i < block.size(); ++i) {
+        const int answer = answer_to(block[i]);
+        if (answer != (oracle_answer_to(state, block[i]) ? 1 : 0)) {
+            throw std::runtime_error("the oracle answers otherwise: " + text_of(block[i]));
+        }
+        four_answers = four_answers % 8 * 2 + static_cast<std::size_t>(answer);
+        if (i % 4 == 3) {
+            answers += digits[four_answers];
+        }
+    }
+    return answers;
 }
 
 class Checker {
   public:
-    void check(const std::string& text) {
-        std::istringstream line(text);
-        std::string kind;
-        line >> kind;
-        if (kind == "call") {
-            check_call(line);
-        } else if (kind == "double") {
-            check_factor<double>(line);
-        } else if (kind == "single") {
-            check_factor<float>(line);
-        } else {
-            ADD_FAILURE() << "no kind of record";
+    explicit Checker(const std::uint64_t seed) : calls_(seed) {}
+
+    void check_block(const std::string& digest, const std::string& answers) {
+        std::vector<Call> block = calls_.next_block();
+        if (digest_of(block) != digest) {
+            ADD_FAILURE() << "other calls are drawn than were recorded after the first "
+                          << tally_.calls;
+        } else if (4 * answers.size() != block.size()) {
+            ADD_FAILURE() << "not the answers of a block: " << answers;
+        }
+        for (std::size_t i = 0; i < block.size() && !testing::Test::HasFailure(); ++i) {
+            const int four_answers = std::stoi(answers.substr(i / 4, 1), nullptr, 16);
+            check_call(block[i], four_answers / (8 >> i % 4) % 2);
         }
     }
 
@@ -177,64 +188,67 @@ class Checker {
     }
 
   private:
-    template <typename Real>
-    void check_factor(std::istream& line) {
-        const double tolerance = read_number(line);
-        const Real recorded = static_cast<Real>(read_number(line));
-        const Real found = factor_of<Real>(tolerance);
-        ++tally_.factors;
-        if (found == recorded) {
-            return;
-        }
-        EXPECT_NE(tolerance, std::trunc(tolerance)) << "the factor needs no pow";
-        EXPECT_EQ(std::nextafter(found, recorded), recorded) << "differs beyond the last place";
-        ++tally_.factors_of_other_pow;
-    }
-
-    void check_call(std::istream& line) {
-        Call call = read_call(line);
-        int recorded = -1;
-        line >> recorded;
-        const int answer = answer_to(call);
+    void check_call(Call& call, const int recorded) {
         ++tally_.calls;
+        if (!std::isnan(call.tolerance) && tolerances_.insert(call.tolerance).second) {
+            check_factor<double>(call.tolerance);
+            check_factor<float>(call.tolerance);
+        }
+        const int answer = answer_to(call);
         tally_.same += answer == 1 ? 1U : 0U;
         pairs_.insert({call.first.type_id(), call.second.type_id()});
-        EXPECT_EQ(answer, recorded);
+        EXPECT_EQ(answer, recorded) << "call " << tally_.calls << ", tolerance " << std::hexfloat
+                                    << call.tolerance << ", " << text_of(call);
     }
 
-    Tally tally_;
+    template <typename Real>
+    void check_factor(const double wide_tolerance) {
+        const Real tolerance = static_cast<Real>(wide_tolerance);
+        if (!(tolerance > 0 && tolerance < std::numeric_limits<Real>::digits)) {
+            return; // comparisons do not ask for its factor
+        }
+        ++tally_.factors;
+        const Real found = nesk::ToleranceShiftFactor(tolerance);
+        const Real rounded = oracle::rounded_factor(tolerance);
+        if (found != rounded) {
+            const bool needs_pow = tolerance != std::trunc(tolerance);
+            EXPECT_TRUE(needs_pow && std::nextafter(found, rounded) == rounded)
+                << std::hexfloat << "the factor of " << tolerance << " is " << found
+                << ", the rounded one " << rounded;
+            ++tally_.factors_rounded_otherwise;
+        }
+    }
+
+    Calls calls_;
+    std::set<double> tolerances_;
     std::set<std::pair<int, int>> pairs_;
+    Tally tally_;
 };
 
 } // namespace
 
-void record(std::ostream& records, const std::uint64_t seed, const std::uint64_t calls) {
-    oracle::Random random(seed);
-    oracle::RandomTolerances tolerances;
-    std::set<double> with_factors;
-    records << std::hexfloat;
-    for (std::uint64_t i = 0; i < calls; ++i) {
-        const double tolerance = tolerances.next(random);
-        if (!std::isnan(tolerance) && with_factors.insert(tolerance).second) {
-            record_factor<double>(records, "double", tolerance);
-            record_factor<float>(records, "single", tolerance);
-        }
-        Call call = random_call(random, tolerance);
-        records << "call " << tolerance << ' ' << call.any_type << ' ' << call.first.type_id()
-                << ' ' << call.first.text() << ' ' << call.second.type_id() << ' '
-                << call.second.text() << ' ' << answer_to(call) << '\n';
+void record(std::ostream& records, const std::uint64_t seed, const std::uint64_t blocks) {
+    Calls calls(seed);
+    oracle::State state;
+    records << title << "\nseed " << seed << '\n';
+    for (std::uint64_t i = 0; i < blocks; ++i) {
+        std::vector<Call> block = calls.next_block();
+        records << digest_of(block) << ' ' << answers_to(block, state) << '\n';
     }
 }
 
 Tally check(std::istream& records) {
-    Checker checker;
-    std::string line;
-    while (std::getline(records, line)) {
-        SCOPED_TRACE(line);
-        checker.check(line);
-        if (testing::Test::HasFailure()) {
-            break; // the first of many says it all
-        }
+    std::string word;
+    std::uint64_t seed = 0;
+    std::getline(records, word); // the title
+    records >> word >> seed;
+    EXPECT_EQ(word, "seed");
+
+    Checker checker(seed);
+    std::string digest;
+    std::string answers;
+    while (!testing::Test::HasFailure() && records >> digest >> answers) {
+        checker.check_block(digest, answers);
     }
     return checker.tally();
 }

@@ -1,14 +1,13 @@
-// Calls that were recorded with their answers on one platform, to be answered alike on every other.
+// Random calls that were answered on one platform, to be answered alike on every other.
 //
-// One record a line, in the order in which a thread that had compared nothing before made them:
+// After a title and the seed, from which every platform draws the same calls, there is a line for
+// each block of calls:
 //
-//   double TOLERANCE FACTOR    the factor of a tolerance where doubles are compared
-//   single TOLERANCE FACTOR    and where singles are
-//   call TOLERANCE ANY_TYPE ID1 ELEMENTS1 ID2 ELEMENTS2 ANSWER
+//   DIGEST ANSWERS
 //
-// Tolerances and factors are hexadecimal floating-point numbers. The elements of an array are the
-// hexadecimal digits of their bits, the most significant first, a real part before its imaginary
-// part, without separators. A factor stands before the first call that may need it.
+// The digest is that of the calls, so that a platform that draws others is found. A digit of the
+// answers stands for four calls, its highest bit for the first; it is set if the arrays are the
+// same.
 
 #ifndef TALNUMERICARRAY_TESTS_GOLDEN_CALLS_H
 #define TALNUMERICARRAY_TESTS_GOLDEN_CALLS_H
@@ -19,9 +18,11 @@
 
 namespace golden {
 
-// Records random calls as this build answers them. Must run in a thread that has not compared
-// reals.
-void record(std::ostream& records, std::uint64_t seed, std::uint64_t calls);
+constexpr std::uint64_t calls_per_block = 256;
+
+// Records random calls as this build answers them; throws where the oracle answers otherwise. Must
+// run in a thread that has not compared reals.
+void record(std::ostream& records, std::uint64_t seed, std::uint64_t blocks);
 
 struct Tally {
     std::uint64_t factors = 0;
@@ -29,14 +30,14 @@ struct Tally {
     std::uint64_t same = 0;
     std::uint64_t pairs_of_types = 0;
 
-    // Factors that differ in their last place alone, as those of fractional tolerances may: they
-    // are made with the C library's pow.
-    std::uint64_t factors_of_other_pow = 0;
+    // Factors that are a unit of the last place off the rounded ones, as those of fractional
+    // tolerances may be: they are made with the C library's pow.
+    std::uint64_t factors_rounded_otherwise = 0;
 };
 
-// Makes the recorded calls again, and fails the test where an answer is not the recorded one, or a
-// factor differs from it otherwise than by another pow. Must run in a thread that has not compared
-// reals.
+// Makes the calls, and fails the test if others are drawn than were recorded, an answer is not the
+// recorded one, or a factor is further from the rounded one. Must run in a thread that has not
+// compared reals.
 Tally check(std::istream& records);
 
 } // namespace golden

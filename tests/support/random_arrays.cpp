@@ -1,5 +1,7 @@
 #include "random_arrays.h"
 
+#include "rounded_factor.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
@@ -36,12 +38,13 @@ Real random_subnormal(Random& random) {
     return from_bits<Real>(random_significand<Real>(random) >> shift);
 }
 
+// Bits, as a register may change those of a signalling NaN. Of random ones few are an infinity.
 template <typename Real>
-Real random_nan(Random& random) {
+BitsOf<Real> nan_bits(std::uint64_t pattern) {
     constexpr auto ones = std::numeric_limits<BitsOf<Real>>::max();
     constexpr auto exponent =
         static_cast<BitsOf<Real>>((ones >> 1) << stored_digits<Real>) & (ones >> 1);
-    return from_bits<Real>(exponent | std::max<BitsOf<Real>>(random_significand<Real>(random), 1));
+    return exponent | static_cast<BitsOf<Real>>(pattern >> (64 - 8 * sizeof(Real)));
 }
 
 template <typename Real>
@@ -82,7 +85,7 @@ Real random_magnitude(Random& random) {
     case 6:
         return Limits::infinity();
     case 7:
-        return random_nan<Real>(random);
+        return Limits::quiet_NaN();
     case 8:
         return from_bits<Real>(static_cast<BitsOf<Real>>(random.bits()));
     case 9:
@@ -230,7 +233,7 @@ Real allowed_share(double tolerance) {
     if (!(narrowed > 0)) {
         return 0;
     }
-    return narrowed >= digits ? Real{1} : std::exp2(narrowed - digits);
+    return narrowed >= digits ? Real{1} : rounded_factor(narrowed);
 }
 
 // Writes pairs of elements. An easy pair is meant to be the same, a hard one may be either.
@@ -240,7 +243,7 @@ class PairWriter {
         : random_(random), tolerance_(tolerance), single_share_(allowed_share<float>(tolerance)),
           double_share_(allowed_share<double>(tolerance)), first_(part_of(first_id)),
           second_(part_of(second_id)), first_is_complex_(is_complex(first_id)),
-          second_is_complex_(is_complex(second_id)) {}
+          second_is_complex_(is_complex(second_id)), nan_pattern_(random.bits()) {}
 
     void write_element(unsigned char* first, unsigned char* second, bool hard) {
         const bool any_complex = first_is_complex_ || second_is_complex_;
@@ -288,7 +291,7 @@ class PairWriter {
         const Real anchor = second_has_anchor ? write_anchor<Real>(second, second_, hard)
                                               : write_anchor<Real>(first, first_, hard);
         const Real partner = hard ? hard_partner(anchor) : easy_partner(anchor);
-        store(second_has_anchor ? first : second, partner);
+        store_real(second_has_anchor ? first : second, partner, hard);
     }
 
     template <typename Real>
@@ -310,8 +313,21 @@ class PairWriter {
         while (!hard && tolerance_ != 0 && std::isnan(value)) {
             value = random_real<Stored>(random_);
         }
-        store(at, value);
+        store_real(at, value, hard);
         return static_cast<Real>(value);
+    }
+
+    // What arithmetic makes of a NaN's bits differs between platforms, so they are drawn. NaNs of
+    // an easy pair have the same.
+    template <typename Real>
+    void store_real(void* at, Real value, bool hard) {
+        if (!std::isnan(value)) {
+            return store(at, value);
+        }
+        if (hard) {
+            nan_pattern_ ^= std::uint64_t{1} << random_.below(64);
+        }
+        store(at, nan_bits<Real>(nan_pattern_));
     }
 
     template <typename Real>
@@ -371,9 +387,9 @@ class PairWriter {
 
     void write_lone_imaginary(void* at, Part part, bool hard) {
         if (part.size == 4) {
-            store(at, lone_imaginary<float>(hard));
+            store_real(at, lone_imaginary<float>(hard), hard);
         } else {
-            store(at, lone_imaginary<double>(hard));
+            store_real(at, lone_imaginary<double>(hard), hard);
         }
     }
 
@@ -408,6 +424,7 @@ class PairWriter {
     Part second_;
     bool first_is_complex_;
     bool second_is_complex_;
+    std::uint64_t nan_pattern_;
 };
 
 } // namespace
