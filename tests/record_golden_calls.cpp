@@ -2,7 +2,7 @@
 //
 //   build/release/tests/record_golden_calls >tests/golden_calls.txt
 //
-// To be run only where a changed answer is meant, or more kinds of calls are to be recorded.
+// To be run only if an answer is meant to change, or if what random_arrays.h draws has changed.
 
 #include "support/golden_calls.h"
 

@@ -11,10 +11,8 @@
 
 #include <cmath>
 #include <cstring>
-#include <iomanip>
 #include <limits>
 #include <set>
-#include <sstream>
 #include <stdexcept>
 #include <string>
 #include <utility>
@@ -24,12 +22,20 @@ namespace golden {
 namespace {
 
 constexpr char title[] =
-    "Random calls and their answers; tests/support/golden_calls.h says how to read";
+    "Random calls and their answers; tests/support/golden_calls.h explains the lines";
 
 // ---- Calls
 
 constexpr char digits[] = "0123456789abcdef";
 constexpr bool little_endian = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__;
+
+std::string hexadecimal(const std::uint64_t value, const int length) {
+    std::string text;
+    for (int i = length - 1; i >= 0; --i) {
+        text += digits[value >> (4 * i) & 15U];
+    }
+    return text;
+}
 
 class Elements {
   public:
@@ -40,9 +46,8 @@ class Elements {
     std::string text() const {
         std::string result;
         for (std::size_t i = 0; i < bytes_.size(); ++i) {
-            const unsigned byte = bytes_[little_endian ? i ^ (type_->part_size - 1) : i];
-            result += digits[byte >> 4U];
-            result += digits[byte & 15U];
+            const std::size_t at = little_endian ? i ^ (type_->part_size - 1) : i;
+            result += hexadecimal(bytes_[at], 2);
         }
         return result;
     }
@@ -78,11 +83,10 @@ struct Call {
 std::string text_of(const Call& call) {
     std::uint64_t tolerance = 0;
     std::memcpy(&tolerance, &call.tolerance, sizeof tolerance);
-    std::ostringstream text;
-    text << "bits of tolerance " << std::hex << tolerance << std::dec << ", any type "
-         << call.any_type << ", types " << call.first.type_id() << " and " << call.second.type_id()
-         << ", elements " << call.first.text() << " and " << call.second.text();
-    return text.str();
+    return "bits of tolerance " + hexadecimal(tolerance, 16) + ", any type "
+           + std::to_string(call.any_type) + ", types " + std::to_string(call.first.type_id())
+           + " and " + std::to_string(call.second.type_id()) + ", elements " + call.first.text()
+           + " and " + call.second.text();
 }
 
 int answer_to(Call& call) {
@@ -134,16 +138,15 @@ std::string digest_of(const std::vector<Call>& calls) {
             digest = (digest ^ static_cast<unsigned char>(character)) * 0x100000001b3;
         }
     }
-    std::ostringstream text;
-    text << std::hex << std::setfill('0') << std::setw(16) << digest;
-    return text.str();
+    return hexadecimal(digest, 16);
 }
 
 // ---- Answers
 
-bool oracle_answer_to(oracle::State& state, const Call& call) {
-    return oracle::same(state, call.tolerance, call.any_type != 0, call.first.for_oracle(),
-                        call.second.for_oracle());
+int oracle_answer_to(const Call& call, oracle::State& state) {
+    const bool same = oracle::same(state, call.tolerance, call.any_type != 0,
+                                   call.first.for_oracle(), call.second.for_oracle());
+    return same ? 1 : 0;
 }
 
 // Four answers a digit.
@@ -152,7 +155,7 @@ std::string answers_to(std::vector<Call>& block, oracle::State& state) {
     std::size_t four_answers = 0;
     for (std::size_t i = 0; i < block.size(); ++i) {
         const int answer = answer_to(block[i]);
-        if (answer != (oracle_answer_to(state, block[i]) ? 1 : 0)) {
+        if (answer != oracle_answer_to(block[i], state)) {
             throw std::runtime_error("the oracle answers otherwise: " + text_of(block[i]));
         }
         four_answers = four_answers % 8 * 2 + static_cast<std::size_t>(answer);

@@ -5,9 +5,9 @@
 //
 //   DIGEST ANSWERS
 //
-// The digest is that of the calls, so that a platform that draws others is found. A digit of the
-// answers stands for four calls, its highest bit for the first; it is set if the arrays are the
-// same.
+// The digest is that of the calls: it differs if a platform draws others. Each hexadecimal digit of
+// the answers stands for four calls, its highest bit for the first; a bit is set if the arrays are
+// the same.
 
 #ifndef TALNUMERICARRAY_TESTS_GOLDEN_CALLS_H
 #define TALNUMERICARRAY_TESTS_GOLDEN_CALLS_H
@@ -20,7 +20,7 @@ namespace golden {
 
 constexpr std::uint64_t calls_per_block = 256;
 
-// Records random calls as this build answers them; throws where the oracle answers otherwise. Must
+// Records random calls as this build answers them; throws if the oracle answers otherwise. Must
 // run in a thread that has not compared reals.
 void record(std::ostream& records, std::uint64_t seed, std::uint64_t blocks);
 
