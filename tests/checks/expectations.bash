@@ -25,7 +25,7 @@ unexpected_calls() {
     grep -Evx "$calls|$compiler" || true
 }
 
-# The names on standard input but for functions of the standard library, which a build without
+# The names on standard input except functions of the standard library, which a build without
 # optimisation defines instead of inlining them.
 without_standard_library() {
     grep -Ev '^_Z(NK?)?St' || true

@@ -5,7 +5,7 @@
 
 A check looks at all that a source includes, so that nearly all its time goes to the standard
 library. Sources that are compiled alike are put together in one file. Where clang-tidy complains of
-that, its sources are linted one by one, which tells what is wrong and where.
+that, its sources are linted one by one, which shows what is wrong and where.
 """
 
 import json

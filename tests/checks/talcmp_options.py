@@ -1,9 +1,9 @@
 #!/usr/bin/python3
-"""Checks that the options of talcmp are the same wherever they are told.
+"""Checks that the options of talcmp are the same wherever they are listed.
 
     talcmp_options.py ROOT TALCMP...
 
-TALCMP is the command, behind its emulator if there is one. Every option of its help has to be in
+TALCMP is the command, after its emulator if there is one. Every option of its help has to be in
 the manual page and in the completions of all shells, and none that the help does not have.
 """
 

@@ -92,10 +92,10 @@ BOUNDS = {"<": "<=", "<=": "<", ">": ">=", ">=": ">"}
 
 def rank(mutant):
     """Bounds before other operators and numbers, names last; among equals, a choice that stays."""
-    before, _, behind = mutant.name[mutant.name.rindex("[") + 1 : -1].partition(" -> ")
+    before, _, after = mutant.name[mutant.name.rindex("[") + 1 : -1].partition(" -> ")
     by_name = before[0].isalpha() and before not in ("true", "false")
     chance = hashlib.sha256(mutant.name.encode()).hexdigest()
-    return by_name, BOUNDS.get(before, "") != behind.split(" (")[0], chance
+    return by_name, BOUNDS.get(before, "") != after.split(" (")[0], chance
 
 
 def chosen(found):
@@ -255,7 +255,7 @@ class Bench(steps.Bench):
         if of_sets:
             yield step(CERTAINTY_OF_SETS)
         if mutant.change.text == "":
-            # An attribute, say, of which nothing but the built files tells.
+            # An attribute, say, which only the built files show.
             yield "release build", checked_sources(), lambda: self._release(mutant, tree)
 
     def _same_code(self, tree):

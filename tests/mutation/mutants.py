@@ -237,7 +237,7 @@ class Source:
             yield from self._replaced(token, ["--"])
 
     def _word_changes(self, index, token):
-        before, behind = self._text_at(index - 1), self._text_at(index + 1)
+        before, after = self._text_at(index - 1), self._text_at(index + 1)
         if token.text in WORDS and not (token.text == "min" and before == "&"):
             yield from self._replaced(token, WORDS[token.text])
         if token.text in NARROWER and self._text_at(index + 2) == "=":
@@ -245,7 +245,7 @@ class Source:
         declared = self.tokens[index - 1].kind == "word" and before not in ("return", "else")
         glued = before in ("*", "&", ">") and self.text[token.begin - 2] != " "
         other = other_name(token.text, self.names)
-        if other and not declared and not (glued and behind in (",", ")", "=", ";", "(")):
+        if other and not declared and not (glued and after in (",", ")", "=", ";", "(")):
             yield Change(token.begin, token.end, other)
 
     def _condition_changes(self):

@@ -35,7 +35,7 @@ ELSEWHERE = "not compiled here"
 # ---- The lists
 
 def read_list(name):
-    """The names in a list, each with the indented lines behind it as one text."""
+    """The names in a list, each with the indented lines after it as one text."""
     reasons, current = {}, None
     for line in (LISTS / name).read_text(encoding="utf-8").splitlines():
         if line.startswith("    "):

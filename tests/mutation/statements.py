@@ -82,7 +82,7 @@ class Bodies:
         if text == "if":
             self.conditions.append((opening + 1, last - 1))
         end = self._statement(last + 1)
-        if text in ("for", "while") and end > last + 2:  # but for the end of a do loop
+        if text in ("for", "while") and end > last + 2:  # not the end of a do loop
             self.actions.append((begin, end - 1))
         return self._statement(end) if text == "if" and self._text(end) == "else" else end
 
@@ -155,8 +155,8 @@ class WholeSource(Source):
     def _argument_changes(self):
         """Two names that are arguments side by side change places."""
         for index in range(1, len(self.tokens) - 4):
-            before, one, comma, other, behind = self.tokens[index : index + 5]
-            if (before.text in ("(", ",") and comma.text == "," and behind.text in (",", ")")
+            before, one, comma, other, after = self.tokens[index : index + 5]
+            if (before.text in ("(", ",") and comma.text == "," and after.text in (",", ")")
                     and one.kind == other.kind == "word"):
                 yield Change(one.begin, other.end, f"{other.text}, {one.text}")
 

@@ -230,9 +230,9 @@ const Answer types_and_shapes[] = {
 };
 
 // The array [1. 2.] with a dictionary of its element type and what is around that.
-std::string spelled(const std::string& before, const std::string& behind) {
+std::string spelled(const std::string& before, const std::string& after) {
     const std::string descr = npy::native + std::string("f8");
-    return npy::header(before + descr + behind) + npy::elements<double>({1, 2});
+    return npy::header(before + descr + after) + npy::elements<double>({1, 2});
 }
 
 const std::string one_two = f64({1, 2});
@@ -345,7 +345,7 @@ const std::string& name_of_type(const type_t id) {
     return type_names[id - 1];
 }
 
-// The array [1, 100] of each type, with as many spaces behind the dictionary.
+// The array [1, 100] of each type, with as many spaces after the dictionary.
 template <typename... Types>
 std::vector<std::string> files_of(type_list<Types...> /*types*/, const int version,
                                   const std::size_t spaces, const char byte_order = npy::native) {

@@ -1,4 +1,4 @@
-// Where bytes come from: streams that hand out some at a time, files, pipes, and what is told when
+// Where bytes come from: streams that hand out some at a time, files, pipes, and the trouble when
 // they cannot be read.
 
 #include "array_file.h"

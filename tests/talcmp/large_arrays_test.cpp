@@ -35,7 +35,7 @@ std::size_t lines_with(const std::string& text, const std::string& words) {
 
 class ExhaustiveLargeArrays : public testing::Test {
   protected:
-    // Zeros, but for the last byte.
+    // Zeros, except the last byte.
     std::string write(const std::string& name, const std::string& dictionary,
                       const std::uint64_t bytes, const char last) const {
         const std::string header = npy::header(dictionary);

@@ -30,7 +30,7 @@ struct Reads {
     std::atomic<std::uint64_t> elements = 0;
 };
 
-// Complex zeros, but for a one at the position `one`; those from `broken` on cannot be read.
+// Complex zeros, except a one at the position `one`; those from `broken` on cannot be read.
 class CountedArray : public talcmp::ArraySource {
   public:
     CountedArray(talcmp::Shape shape, const bool fortran_order, Reads& reads,

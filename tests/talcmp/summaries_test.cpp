@@ -58,11 +58,11 @@ class Summaries : public testing::Test {
     }
 
     static std::string lines(const std::string& name, const int count, const std::string& before,
-                             const std::string& behind) {
+                             const std::string& after) {
         std::string text;
         for (int i = 0; i < count; ++i) {
             const std::string file = name + std::to_string(i) + ".npy";
-            text += before + "first/" + file + " second/" + file + behind + "\n";
+            text += before + "first/" + file + " second/" + file + after + "\n";
         }
         return text;
     }

@@ -1,6 +1,6 @@
 #!/usr/bin/env python3
 """What talcmp does on a terminal and, elsewhere, does not: colours, the width of bars, progress, and
-what signals leave behind."""
+what signals leave there."""
 
 import fcntl
 import os
@@ -54,7 +54,7 @@ class Terminal:
 def run_on_terminal(*arguments, columns=80, output=True, errors=True, stdin=None, notice=None,
                     before=None, started=None, folder=None, **variables):
     """Runs talcmp with a terminal as its standard output or error, or both; what goes elsewhere is
-    behind what is on the terminal. `started` is called with the process, `notice` with that and
+    after what is on the terminal. `started` is called with the process, `notice` with that and
     the text so far. A variable that is None is not set."""
     terminal = Terminal(columns)
     environment = {name: value for name, value in os.environ.items() if name != "NO_COLOR"}

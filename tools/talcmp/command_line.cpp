@@ -26,7 +26,7 @@ two folders, or two patterns in quotes ('run1/*.npy'), matched by name.
       --report            count and measure all differences
       --json              print a report in JSON
   -q, --quiet             print nothing but trouble, only exit
-  -v, --verbose           tell of arrays that are the same, too
+  -v, --verbose           report arrays that are the same, too
       --threads N         use at most N threads; answers are the same
   -h, --help; --version   print this; print the version
 
@@ -97,7 +97,7 @@ const std::vector<Option>& options() {
 
 // What the words mean.
 CommandLine command_line_of(const Words& words) {
-    constexpr std::size_t most_differences = 1000000; // that memory holds in every thread
+    constexpr std::size_t most_differences = 1000000; // each thread holds so many in memory
     constexpr unsigned most_threads = 64;
     CommandLine line;
     line.json = has(words, "--json");

@@ -68,7 +68,7 @@ std::string hint_for(const std::vector<Option>& options, const std::string& word
 constexpr int is_operand = 1;
 constexpr int is_unknown = '?';
 constexpr int lacks_value = ':';
-constexpr int first_long_option = 256; // behind all letters
+constexpr int first_long_option = 256; // after all letters
 
 class Sorter {
   public:

@@ -44,7 +44,7 @@ std::vector<std::string> values_of(const Words& words, const std::string& option
 // Its only value; `otherwise` where it was not given.
 std::string value_of(const Words& words, const std::string& option, const std::string& otherwise);
 
-// `--name value`, `--name=value`, `-nvalue`, `-n value`; several flags in one word, `-qv`. Behind
+// `--name value`, `--name=value`, `-nvalue`, `-n value`; several flags in one word, `-qv`. After
 // `--` all words are operands. Throws UsageError.
 Words sort_words(const std::vector<Option>& options, const std::vector<std::string>& words);
 

@@ -2,7 +2,7 @@
 
     SOMETHING_test.py TALCMP... [-- unittest options]
 
-TALCMP is the command, behind its emulator where there is one.
+TALCMP is the command, after its emulator if there is one.
 """
 
 import sys

@@ -17,7 +17,6 @@ bool ends_with(const std::string_view text, const std::string_view end) {
 
 std::shared_ptr<zip_t> open_archive(RegularFile& file) {
     int code = 0;
-    // From here on the archive closes the descriptor; it takes no flag but for a thorough check.
     zip_t* const archive = ::zip_fdopen(file.descriptor().number(), 0, &code);
     if (archive == nullptr) {
         zip_error_t error;

@@ -14,7 +14,7 @@ namespace talcmp {
 
 class NpzFile : public ArrayFile {
   public:
-    // Goes on reading the file by itself. Throws Trouble when the archive is broken.
+    // Takes over the open file. Throws Trouble when the archive is broken.
     explicit NpzFile(RegularFile& file);
 
     bool is_archive() const override { return true; }

@@ -52,7 +52,7 @@ template <typename Real>
     return x == y ? two_signs : group;
 }
 
-static_assert(DigitGroups::equal == 0 && DigitGroups::equal_but_signs_of_zeros == 1);
+static_assert(DigitGroups::equal == 0 && DigitGroups::equal_except_signs_of_zeros == 1);
 
 template <typename Real>
 [[gnu::always_inline]] inline void sort_parts_here(const Real* const x, const Real* const y,

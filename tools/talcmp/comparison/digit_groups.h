@@ -10,14 +10,14 @@
 
 namespace talcmp {
 
-// Sorts pairs by |x - y| / max(|x|, |y|), as computed, between which two powers of two it lies.
+// Sorts pairs by the two powers of two that |x - y| / max(|x|, |y|), as computed, is between.
 //
-// A whole tolerance compares that quotient with a power of two. The quotient as computed lies
-// strictly between two neighbouring powers of two only if the exact one does, as rounding takes no
-// number past a power of two. So all pairs of such a group are the same under the same whole
-// tolerances from 1 on. A quotient that is a power of two may be a rounded one: such pairs, NaNs
-// and infinities are left to be asked about one by one. The groups tell nothing but what is alike;
-// the answers are the module's.
+// A whole tolerance compares that quotient with a power of two. The computed quotient is strictly
+// between two neighbouring powers of two only if the exact one is, as rounding takes no number past
+// a power of two. So all pairs of such a group are the same under the same whole tolerances from 1
+// on. A quotient that is a power of two may be a rounded one: the module is asked about each such
+// pair, and about NaNs and infinities. The groups only say which pairs are alike; the answers are
+// the module's.
 class DigitGroups {
   public:
     using Group = std::uint8_t;
@@ -25,8 +25,8 @@ class DigitGroups {
     // Pairs of equal values, with the same signs.
     static constexpr Group equal = 0;
     // Pairs of equal values of which some are zeros of two signs.
-    static constexpr Group equal_but_signs_of_zeros = 1;
-    // Between, in ascending order, the pairs whose quotients lie between two powers of two.
+    static constexpr Group equal_except_signs_of_zeros = 1;
+    // Between, in ascending order, the pairs whose quotients are between two powers of two.
     static constexpr Group smallest_quotient = 2;
     static constexpr Group largest_quotient = smallest_quotient + 54;
     static constexpr Group doubtful = largest_quotient + 1;

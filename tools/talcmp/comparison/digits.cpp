@@ -36,8 +36,8 @@ int all_digits(const ElementType& type1, const ElementType& type2) {
     return as_singles ? std::numeric_limits<float>::digits : most_digits;
 }
 
-// From one whole tolerance to the next no pair that is the same stops being so. Usual answers first:
-// equal, the same under no tolerance, or under all digits alone.
+// From one whole tolerance to the next no pair that is the same stops being so. Usual answers
+// first: equal, the same under no tolerance, or under all digits alone.
 Sameness sameness_of(const Pairs& pairs, const std::size_t i) {
     const bool at_zero = pairs.same(0, i);
     if (at_zero && pairs.same(1, i)) {

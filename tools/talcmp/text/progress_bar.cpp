@@ -40,7 +40,7 @@ std::string progress_text(const std::uint64_t done, const std::uint64_t total, c
     std::snprintf(numbers.data(), numbers.size(), " %3.0f %%  %.2f %s  ", 100 * part,
                   rate / (fast ? 1e9 : 1e6), fast ? "GB/s" : "MB/s");
     const std::string text = numbers.data() + left_text(seconds * (1 / part - 1));
-    // One column stays free, as some terminals begin a new line behind the last.
+    // One column stays free, as some terminals begin a new line after the last.
     const auto most = static_cast<std::size_t>(std::max(columns - 1, 0));
     if (most < text.size() + 3) {
         return text.substr(0, most);
