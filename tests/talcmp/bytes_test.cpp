@@ -152,6 +152,15 @@ TEST(Files, AreReadAnywhere) {
     }
 }
 
+TEST(Files, KeepTheirBeginning) {
+    const TemporaryFolder folder;
+    const std::string path = folder.write("file", std::string(5000, 'a'));
+    talcmp::RegularFile file = opened(path, 5000);
+    folder.write("file", std::string(5000, 'b'));
+    EXPECT_EQ(read(file, 4090, 6), "aaaaaa");
+    EXPECT_EQ(read(file, 4090, 7), "bbbbbbb");
+}
+
 TEST(Files, OfOneArrayHaveOneMemberWithoutAName) {
     const TemporaryFolder folder;
     const auto file = talcmp::open_array_file(folder.write("a.npy", npy::row<double>({1, 2})));
