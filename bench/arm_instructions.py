@@ -16,7 +16,8 @@ from pathlib import Path
 ROOT = Path(__file__).resolve().parents[1]
 TRIPLE = "arm-linux-gnueabihf"
 INCLUDES = ["TalNumericArray", "Includes", "SystemConfiguration/Exports",
-            "compilerruntime/src/scalar_op/utils", "compilerruntime/src/types", "bench"]
+            "compilerruntime/src/scalar_op/utils", "compilerruntime/src/types", "bench",
+            "tests/support"]
 FLAGS = ["-std=c++17", "-O2", "-ffp-contract=off", "-fno-exceptions"]
 BUILDS = {"VFP": ["-mfpu=vfpv3-d16"], "NEON": ["-mfpu=neon"]}
 SHORT, LONG = 256, 512

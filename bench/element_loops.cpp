@@ -86,7 +86,7 @@ constexpr std::size_t length(const std::size_t bytes) {
 }
 
 template <typename T1, typename T2>
-void measure_pair(const Size& size, Block& arrays, Block& equal_bytes, RowMark& mark) {
+void measure_pair(const Size& size, Block& arrays, Block& equal_bytes, JsonRows& rows) {
     const std::size_t len = length<T1, T2>(size.bytes);
     unsigned char* const data1 = arrays.begin();
     unsigned char* const data2 = data1 + len * sizeof(T1);
@@ -113,22 +113,24 @@ void measure_pair(const Size& size, Block& arrays, Block& equal_bytes, RowMark& 
         });
         contenders.emplace_back([=] { return std::memcmp(bytes1, bytes2, half) == 0; });
         take_turns(contenders, size.effort);
-        std::printf(R"(%s{"size": "%s", "workload": "%s", "type1": "%s", "type2": "%s", )"
-                    R"("sameQ": %.2f, "memcmp": %.2f})",
-                    mark.next(), size.name, workload.name, type_name<T1>().c_str(),
-                    type_name<T2>().c_str(), contenders[0].nanoseconds(),
-                    contenders[1].nanoseconds());
+        rows.row()
+            .add("size", size.name)
+            .add("workload", workload.name)
+            .add("type1", type_name<T1>())
+            .add("type2", type_name<T2>())
+            .add("sameQ", contenders[0].nanoseconds())
+            .add("memcmp", contenders[1].nanoseconds());
     }
 }
 
 template <std::size_t count>
-void measure_all(const Size (&all_sizes)[count], RowMark& mark) {
+void measure_all(const Size (&all_sizes)[count], JsonRows& rows) {
     for (const Size& size : all_sizes) {
         Block arrays(size.bytes);
         Block equal_bytes(size.bytes); // for memcmp
         for_each_pair_with_loop([&](auto tag1, auto tag2) {
             measure_pair<typename decltype(tag1)::type, typename decltype(tag2)::type>(
-                size, arrays, equal_bytes, mark);
+                size, arrays, equal_bytes, rows);
         });
     }
 }
@@ -143,18 +145,14 @@ const char* best_set(type_list<Sets...> /*sets*/) {
 } // namespace
 
 int main(int count, char** arguments) {
-    const std::string option = count == 2 ? arguments[1] : "";
-    if (count > 2 || (count == 2 && option != "--quick")) {
-        std::fputs("usage: element_loops [--quick]\n", stderr);
-        return 2;
-    }
+    const bool quick = is_quick(count, arguments);
     std::printf(R"({"compiler": "%s", "instruction_set": "%s", "rows": )", COMPILER,
                 best_set(talnumericarray::instruction_sets{}));
-    RowMark mark;
-    if (option.empty()) {
-        measure_all(sizes, mark);
+    JsonRows rows;
+    if (quick) {
+        measure_all(quick_sizes, rows);
     } else {
-        measure_all(quick_sizes, mark);
+        measure_all(sizes, rows);
     }
     std::puts("\n]}");
     return EXIT_SUCCESS;

@@ -4,8 +4,8 @@
 #define TALNUMERICARRAY_BENCH_FILLED_ARRAYS_H
 
 #include "promotion_rules.h"
-#include "taldata_array_element_types.h"
 #include "to_type.h"
+#include "type_pairs.h"
 #include "type_properties.h"
 
 #include <algorithm>
@@ -30,30 +30,6 @@ std::string type_name() {
     } else {
         return (std::is_unsigned_v<T> ? "uint" : "int") + bits;
     }
-}
-
-template <typename Visit, typename... Types>
-void for_each_type(const Visit& visit, type_list<Types...> /*list*/) {
-    (visit(type_tag<Types>{}), ...);
-}
-
-// Calls `visit` with the two tags of every pair that has a loop over elements: all but two equal
-// integer types, which are compared as bytes.
-template <typename Visit>
-void for_each_pair_with_loop(const Visit& visit) {
-    for_each_type(
-        [&](auto tag1) {
-            for_each_type(
-                [&](auto tag2) {
-                    using T1 = typename decltype(tag1)::type;
-                    using T2 = typename decltype(tag2)::type;
-                    if constexpr (!(std::is_same_v<T1, T2> && std::is_integral_v<T1>)) {
-                        visit(tag1, tag2);
-                    }
-                },
-                element_type_list{});
-        },
-        element_type_list{});
 }
 
 template <typename T1, typename T2>

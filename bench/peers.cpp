@@ -21,8 +21,8 @@
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
+#include <initializer_list>
 #include <limits>
-#include <string>
 #include <vector>
 
 namespace {
@@ -93,62 +93,60 @@ class NearArrays {
     T tolerance_ = relative_tolerance<T>();
 };
 
-void print_row(RowMark& mark, const std::string& type, const std::size_t len,
-               const char* const name, const Contender& contender) {
-    std::printf(R"(%s{"type": "%s", "len": %zu, "name": "%s", "nanoseconds": %.3f})", mark.next(),
-                type.c_str(), len, name, contender.nanoseconds());
+template <typename T>
+void measure(const std::size_t len, std::vector<Contender> contenders,
+             const std::initializer_list<const char*> names, const Effort& effort, JsonRows& rows) {
+    take_turns(contenders, effort);
+    const Contender* contender = contenders.data();
+    for (const char* const name : names) {
+        rows.row()
+            .add("type", type_name<T>())
+            .add("len", len)
+            .add("name", name)
+            .add("nanoseconds", (contender++)->nanoseconds());
+    }
 }
 
 // All of them, over arrays that fit the cache.
 template <typename T>
-void measure_sizes(const Effort& effort, RowMark& mark) {
+void measure_sizes(const Effort& effort, JsonRows& rows) {
     for (const std::size_t size : sizes) {
         const std::size_t len = size / 2 / sizeof(T);
         NearArrays<T> arrays(len);
-        const char* const names[] = {"sameQ", "Eigen elementwise", "Eigen isApprox",
-                                     "xtensor allclose", "Armadillo approx_equal"};
-        std::vector<Contender> contenders;
-        contenders.emplace_back([&] { return arrays.by_sameQ(); });
-        contenders.emplace_back([&] { return arrays.by_eigen_elementwise(); });
-        contenders.emplace_back([&] { return arrays.by_eigen_isApprox(); });
-        contenders.emplace_back([&] { return arrays.by_xtensor(); });
-        contenders.emplace_back([&] { return arrays.by_armadillo(); });
-        take_turns(contenders, effort);
-        for (std::size_t i = 0; i < contenders.size(); ++i) {
-            print_row(mark, type_name<T>(), len, names[i], contenders[i]);
-        }
+        measure<T>(len,
+                   {Contender([&] { return arrays.by_sameQ(); }),
+                    Contender([&] { return arrays.by_eigen_elementwise(); }),
+                    Contender([&] { return arrays.by_eigen_isApprox(); }),
+                    Contender([&] { return arrays.by_xtensor(); }),
+                    Contender([&] { return arrays.by_armadillo(); })},
+                   {"sameQ", "Eigen elementwise", "Eigen isApprox", "xtensor allclose",
+                    "Armadillo approx_equal"},
+                   effort, rows);
     }
 }
 
 // The best of them, over short arrays.
 template <typename T>
-void measure_lengths(const Effort& effort, RowMark& mark) {
+void measure_lengths(const Effort& effort, JsonRows& rows) {
     for (const std::size_t len : lengths) {
         NearArrays<T> arrays(len);
-        std::vector<Contender> contenders;
-        contenders.emplace_back([&] { return arrays.by_sameQ(); });
-        contenders.emplace_back([&] { return arrays.by_eigen_elementwise(); });
-        take_turns(contenders, effort);
-        print_row(mark, type_name<T>(), len, "sameQ", contenders[0]);
-        print_row(mark, type_name<T>(), len, "Eigen elementwise", contenders[1]);
+        measure<T>(len, {Contender([&] { return arrays.by_sameQ(); }), Contender([&] {
+                             return arrays.by_eigen_elementwise();
+                         })},
+                   {"sameQ", "Eigen elementwise"}, effort, rows);
     }
 }
 
 } // namespace
 
 int main(int count, char** arguments) {
-    const std::string option = count == 2 ? arguments[1] : "";
-    if (count > 2 || (count == 2 && option != "--quick")) {
-        std::fputs("usage: peers [--quick]\n", stderr);
-        return 2;
-    }
-    const Efforts& efforts = option.empty() ? full : quick;
+    const Efforts& efforts = is_quick(count, arguments) ? quick : full;
     std::printf("{\"sizes\": ");
-    RowMark of_sizes;
+    JsonRows of_sizes;
     measure_sizes<double>(efforts.sizes, of_sizes);
     measure_sizes<float>(efforts.sizes, of_sizes);
     std::printf("\n], \"lengths\": ");
-    RowMark of_lengths;
+    JsonRows of_lengths;
     measure_lengths<double>(efforts.lengths, of_lengths);
     measure_lengths<float>(efforts.lengths, of_lengths);
     std::puts("\n]}");

@@ -18,14 +18,14 @@
 
 #include <algorithm>
 #include <cmath>
+#include <complex>
 #include <cstddef>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <deque>
+#include <initializer_list>
 #include <limits>
-#include <string>
-#include <type_traits>
 #include <vector>
 
 namespace {
@@ -116,89 +116,75 @@ class Question {
 // They stay where they are, as contenders refer to them.
 using Questions = std::deque<Question>;
 
-template <typename T1, typename T2>
-Question& add_question(Questions& questions, const talint len, const Contents contents) {
-    return questions.emplace_back(element_type_id<T1>, memory1.bytes, element_type_id<T2>,
-                                  memory2.bytes, len, contents);
-}
-
-// The same numbers begin arrays of every length.
-template <typename T1, typename T2>
-void fill_all(const Contents contents) {
-    fill<T1, T2>(contents, memory1.bytes, memory2.bytes, longest);
-}
-
 // ---- Measurements, a list of rows each
+
+// Over arrays of each length, which all begin with the same numbers. `contenders_of(question)`
+// makes the contenders, whose times get these names.
+template <typename T1, typename T2, typename Lengths, typename ContendersOf>
+void measure(const Lengths& all_lengths, const Contents contents, const char* const workload,
+             const Effort& effort, const std::initializer_list<const char*> names,
+             const ContendersOf& contenders_of, JsonRows& rows) {
+    fill<T1, T2>(contents, memory1.bytes, memory2.bytes, longest);
+    Questions questions;
+    std::vector<Contender> contenders;
+    for (const talint len : all_lengths) {
+        Question& question = questions.emplace_back(
+            element_type_id<T1>, memory1.bytes, element_type_id<T2>, memory2.bytes, len, contents);
+        for (const Contender& contender : contenders_of(question)) {
+            contenders.push_back(contender);
+        }
+    }
+    take_turns(contenders, effort);
+    const Contender* contender = contenders.data();
+    for (const talint len : all_lengths) {
+        auto row = rows.row();
+        row.add("type1", type_name<T1>()).add("type2", type_name<T2>());
+        if (workload != nullptr) {
+            row.add("workload", workload);
+        }
+        row.add("len", static_cast<std::size_t>(len));
+        for (const char* const name : names) {
+            row.add(name, (contender++)->nanoseconds());
+        }
+    }
+}
 
 // Next to the user's loop, in both builds.
 template <typename T1, typename T2>
 void measure_lengths(const Contents contents, const char* const workload, const Effort& effort,
-                     RowMark& mark) {
+                     JsonRows& rows) {
     constexpr int bits =
         std::numeric_limits<type_common_t<to_real_type_t<T1>, to_real_type_t<T2>>>::digits;
-    fill_all<T1, T2>(contents);
-    Questions questions;
-    std::vector<Contender> contenders;
-    for (const talint len : lengths) {
-        Question& question = add_question<T1, T2>(questions, len, contents);
-        contenders.push_back(question.library(whole_tolerance));
-        contenders.push_back(question.user(user_loop, bits));
-        contenders.push_back(question.user(user_loop_for_this_processor, bits));
-    }
-    take_turns(contenders, effort);
-    const Contender* contender = contenders.data();
-    for (const talint len : lengths) {
-        std::printf(R"(%s{"type1": "%s", "type2": "%s", "workload": "%s", "len": %d, )"
-                    R"("library": %.3f, "user": %.3f, "user_native": %.3f})",
-                    mark.next(), type_name<T1>().c_str(), type_name<T2>().c_str(), workload,
-                    static_cast<int>(len), contender[0].nanoseconds(), contender[1].nanoseconds(),
-                    contender[2].nanoseconds());
-        contender += 3;
-    }
+    measure<T1, T2>(
+        lengths, contents, workload, effort, {"library", "user", "user_native"},
+        [](Question& question) -> std::vector<Contender> {
+            return {question.library(whole_tolerance), question.user(user_loop, bits),
+                    question.user(user_loop_for_this_processor, bits)};
+        },
+        rows);
 }
 
 // A difference in the first element, next to the rule one by one.
 template <typename T1, typename T2>
-void measure_first_differs(const Effort& effort, RowMark& mark) {
-    fill_all<T1, T2>(Contents::first_differs);
-    Questions questions;
-    std::vector<Contender> contenders;
-    for (const talint len : lengths_that_differ) {
-        Question& question = add_question<T1, T2>(questions, len, Contents::first_differs);
-        contenders.push_back(question.library(whole_tolerance));
-        contenders.push_back(question.one_by_one());
-    }
-    take_turns(contenders, effort);
-    const Contender* contender = contenders.data();
-    for (const talint len : lengths_that_differ) {
-        std::printf(R"(%s{"type1": "%s", "type2": "%s", "len": %d, )"
-                    R"("library": %.3f, "one_by_one": %.3f})",
-                    mark.next(), type_name<T1>().c_str(), type_name<T2>().c_str(),
-                    static_cast<int>(len), contender[0].nanoseconds(), contender[1].nanoseconds());
-        contender += 2;
-    }
+void measure_first_differs(const Effort& effort, JsonRows& rows) {
+    measure<T1, T2>(
+        lengths_that_differ, Contents::first_differs, nullptr, effort, {"library", "one_by_one"},
+        [](Question& question) -> std::vector<Contender> {
+            return {question.library(whole_tolerance), question.one_by_one()};
+        },
+        rows);
 }
 
 // What is compared as bytes, next to memcmp.
 template <typename T>
-void measure_bytes(const Effort& effort, RowMark& mark) {
+void measure_bytes(const Effort& effort, JsonRows& rows) {
     constexpr talreal no_tolerance = 0;
-    fill_all<T, T>(Contents::identical);
-    Questions questions;
-    std::vector<Contender> contenders;
-    for (const talint len : lengths) {
-        Question& question = add_question<T, T>(questions, len, Contents::identical);
-        contenders.push_back(question.library(no_tolerance));
-        contenders.push_back(question.bytes(sizeof(T)));
-    }
-    take_turns(contenders, effort);
-    const Contender* contender = contenders.data();
-    for (const talint len : lengths) {
-        std::printf(R"(%s{"type": "%s", "len": %d, "library": %.3f, "memcmp": %.3f})", mark.next(),
-                    type_name<T>().c_str(), static_cast<int>(len), contender[0].nanoseconds(),
-                    contender[1].nanoseconds());
-        contender += 2;
-    }
+    measure<T, T>(
+        lengths, Contents::identical, nullptr, effort, {"library", "memcmp"},
+        [](Question& question) -> std::vector<Contender> {
+            return {question.library(no_tolerance), question.bytes(sizeof(T))};
+        },
+        rows);
 }
 
 // Somewhere in each line of a page, and at each place of a line that alignment allows.
@@ -210,7 +196,7 @@ std::size_t place_in_page(const std::size_t place) {
 
 // Both arrays at `places` places. Near reals, or identical integers.
 template <typename T1, typename T2>
-void measure_places(const talint len, const Effort& effort, RowMark& mark) {
+void measure_places(const talint len, const Effort& effort, JsonRows& rows) {
     constexpr Contents contents =
         compared_under_tolerance<T1, T2> ? Contents::near : Contents::identical;
     constexpr std::size_t far_apart = 37;
@@ -247,58 +233,55 @@ void measure_places(const talint len, const Effort& effort, RowMark& mark) {
         times.push_back(contender.nanoseconds());
     }
     std::sort(times.begin(), times.end());
-    std::printf(R"(%s{"type1": "%s", "type2": "%s", "len": %d, "median": %.3f, "slowest": %.3f})",
-                mark.next(), type_name<T1>().c_str(), type_name<T2>().c_str(),
-                static_cast<int>(len), times[places / 2], times.back());
+    rows.row()
+        .add("type1", type_name<T1>())
+        .add("type2", type_name<T2>())
+        .add("len", count)
+        .add("median", times[places / 2])
+        .add("slowest", times.back());
 }
 
 // ---- All of them
 
-// Calls `measure` with the tags of each pair, and the mark of a list called `name`.
+// Calls `measure` with the tags of each pair, and the rows of a list called `name`.
 template <typename Measure>
 void list_of_pairs(const char* const name, const Measure& measure) {
     std::printf("\"%s\": ", name);
-    RowMark mark;
-    for_each_pair_with_loop([&](auto tag1, auto tag2) { measure(tag1, tag2, mark); });
+    JsonRows rows;
+    for_each_pair_with_loop([&](auto tag1, auto tag2) { measure(tag1, tag2, rows); });
     std::puts("\n],");
 }
 
 void measure_all(const Efforts& efforts) {
     std::puts("{");
-    list_of_pairs("lengths", [&](auto tag1, auto tag2, RowMark& mark) {
+    list_of_pairs("lengths", [&](auto tag1, auto tag2, JsonRows& rows) {
         using T1 = typename decltype(tag1)::type;
         using T2 = typename decltype(tag2)::type;
-        measure_lengths<T1, T2>(Contents::identical, "identical", efforts.lengths, mark);
+        measure_lengths<T1, T2>(Contents::identical, "identical", efforts.lengths, rows);
         if constexpr (compared_under_tolerance<T1, T2>) {
-            measure_lengths<T1, T2>(Contents::near, "near", efforts.lengths, mark);
+            measure_lengths<T1, T2>(Contents::near, "near", efforts.lengths, rows);
         }
     });
-    list_of_pairs("first_differs", [&](auto tag1, auto tag2, RowMark& mark) {
+    list_of_pairs("first_differs", [&](auto tag1, auto tag2, JsonRows& rows) {
         measure_first_differs<typename decltype(tag1)::type, typename decltype(tag2)::type>(
-            efforts.first_differs, mark);
+            efforts.first_differs, rows);
     });
-    list_of_pairs("places", [&](auto tag1, auto tag2, RowMark& mark) {
+    list_of_pairs("places", [&](auto tag1, auto tag2, JsonRows& rows) {
         for (const talint len : lengths_at_places) {
             measure_places<typename decltype(tag1)::type, typename decltype(tag2)::type>(
-                len, efforts.places, mark);
+                len, efforts.places, rows);
         }
     });
     std::printf("\"bytes\": ");
-    RowMark mark;
+    JsonRows rows;
     for_each_type(
-        [&](auto tag) { measure_bytes<typename decltype(tag)::type>(efforts.lengths, mark); },
-        element_type_list{});
+        [&](auto tag) { measure_bytes<typename decltype(tag)::type>(efforts.lengths, rows); });
     std::puts("\n]}");
 }
 
 } // namespace
 
 int main(int count, char** arguments) {
-    const std::string option = count == 2 ? arguments[1] : "";
-    if (count > 2 || (count == 2 && option != "--quick")) {
-        std::fputs("usage: small_arrays [--quick]\n", stderr);
-        return 2;
-    }
-    measure_all(option.empty() ? full : quick);
+    measure_all(is_quick(count, arguments) ? quick : full);
     return EXIT_SUCCESS;
 }

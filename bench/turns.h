@@ -8,6 +8,7 @@
 #include <chrono>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <functional>
 #include <limits>
 #include <vector>
@@ -68,6 +69,16 @@ class Contender {
     int calls_ = 1;
     double best_ = std::numeric_limits<double>::infinity();
 };
+
+// Whether the program is called with --quick; ends it where it is called otherwise than that.
+inline bool is_quick(const int count, char** const arguments) {
+    const bool quick = count == 2 && std::strcmp(arguments[1], "--quick") == 0;
+    if (count > 1 && !quick) {
+        std::fprintf(stderr, "usage: %s [--quick]\n", arguments[0]);
+        std::exit(2);
+    }
+    return quick;
+}
 
 inline void take_turns(std::vector<Contender>& contenders, const Effort& effort) {
     for (Contender& contender : contenders) {

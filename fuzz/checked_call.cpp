@@ -1,5 +1,6 @@
 #include "checked_call.h"
 
+#include "array_record.h"
 #include "talnumericarray_compare.h"
 
 #include <algorithm>
@@ -55,12 +56,8 @@ Operand::Operand(const int type_id, std::vector<talint> dimensions, const talint
     ASAN_POISON_MEMORY_REGION(block_.get(), place_);
     std::memset(data(), 0, bytes_);
     array_.data = data();
+    record_ = record_of(type_id, data(), array_.dimensions, count);
     record_.prec = 0.5;
-    record_.dims = array_.dimensions.data();
-    record_.rank = static_cast<talint>(array_.dimensions.size());
-    record_.data_type = type_id;
-    record_.nelems = count;
-    record_.data = data();
     record_.refcount = 1;
 }
 

@@ -1,4 +1,4 @@
-// Arrays for the fuzzers, and calls whose answers are held against the oracle's.
+// Arrays for the fuzzers, and calls whose answers are compared with the oracle's.
 
 #ifndef TALNUMERICARRAY_FUZZ_CHECKED_CALL_H
 #define TALNUMERICARRAY_FUZZ_CHECKED_CALL_H
@@ -18,7 +18,7 @@ namespace fuzz {
 // Whether the module has the element type.
 bool is_known(int type_id);
 
-// An array whose elements end where their heap block does, so that a sanitizer sees a read behind
+// An array whose elements end where their heap block does, so that a sanitizer sees a read past
 // them, and begin at a chosen place in a page.
 class Operand {
   public:

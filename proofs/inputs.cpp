@@ -1,5 +1,5 @@
 // Prints the table of inputs on which the formulas of the proofs have to have the values of the
-// code: a line each, the instance of a family and, behind a tab, an equation with what the code
+// code: a line each, the instance of a family and, after a tab, an equation with what the code
 // answers.
 
 #include "compare.h"
@@ -7,6 +7,7 @@
 #include "talnumericarray_instruction_sets.h"
 #include "talnumericarray_sameq_certainty.h"
 #include "talnumericarray_sameq_impl.h"
+#include "type_pairs.h"
 #include "type_properties.h"
 
 #include <cfenv>
@@ -263,20 +264,14 @@ void print_pair_of_integers() {
     }
 }
 
-template <typename T1, typename... Types>
-void print_row_of_integers(type_list<Types...> /*types*/) {
-    const auto print = [](auto tag) {
-        using T2 = typename decltype(tag)::type;
+void print_integers() {
+    for_each_pair_of_types([](auto tag1, auto tag2) {
+        using T1 = typename decltype(tag1)::type;
+        using T2 = typename decltype(tag2)::type;
         if constexpr (std::is_integral_v<T1> && std::is_integral_v<T2>) {
             print_pair_of_integers<T1, T2>();
         }
-    };
-    (print(type_tag<Types>{}), ...);
-}
-
-template <typename... Types>
-void print_integers(type_list<Types...> types) {
-    (print_row_of_integers<Types>(types), ...);
+    });
 }
 
 // ---- Element type ids
@@ -301,6 +296,6 @@ int main() {
         print_reals<float>(direction);
         print_reals<double>(direction);
     }
-    print_integers(element_type_list{});
+    print_integers();
     print_ids();
 }

@@ -5,11 +5,12 @@
 
 #include "support/arrays.h"
 #include "support/element_types.h"
+#include "support/type_pairs.h"
 
 #include <gtest/gtest.h>
 
-#include <array>
 #include <complex>
+#include <initializer_list>
 #include <limits>
 #include <vector>
 
@@ -156,36 +157,26 @@ TEST(DifferentTypes, AreTheSameOnlyWhereTheCallerAllowsIt) {
 
 using Routine = int (*)(const talreal&, TalNumericArray, TalNumericArray) noexcept;
 
-template <typename T1, typename... Types>
-constexpr std::array<Routine, sizeof...(Types)> pair_routines_of(type_list<Types...> /*types*/) {
-    return {&TalNumericArray_sameQ_impl<T1, Types>...};
-}
-
-template <typename... Types>
-constexpr auto all_pair_routines(type_list<Types...> types) {
-    return std::array{pair_routines_of<Types>(types)...};
-}
-
-template <typename... Types>
-constexpr std::array<Routine, sizeof...(Types)> rows_of(type_list<Types...> /*types*/) {
-    return {&TalNumericArray_sameQ_impl<Types>...};
+void expect_answers(const ElementType& type1, const ElementType& type2,
+                    const std::initializer_list<Routine> routines) {
+    const AnyArray array1(type1, {5, 7});
+    const AnyArray array2(type2, {5, 7});
+    const AnyArray array3(type2, {5, 8});
+    const talreal tol = 10.5;
+    for (const Routine routine : routines) {
+        EXPECT_EQ(routine(tol, array1.handle(), array2.handle()), 1);
+        EXPECT_EQ(routine(tol, array1.handle(), array3.handle()), 0);
+    }
 }
 
 TEST(Dispatch, EachLevelAnswers) {
-    constexpr auto pair_routines = all_pair_routines(element_type_list{});
-    constexpr auto rows = rows_of(element_type_list{});
-    for_each_pair([&](const ElementType& type1, const ElementType& type2) {
-        const AnyArray array1(type1, {5, 7});
-        const AnyArray array2(type2, {5, 7});
-        const AnyArray array3(type2, {5, 8});
-        const auto row = static_cast<std::size_t>(type1.id - 1);
-        const auto column = static_cast<std::size_t>(type2.id - 1);
-        const Routine any_types = &TalNumericArray_sameQ_impl;
-        const talreal tol = 10.5;
-        for (const Routine routine : {any_types, rows[row], pair_routines[row][column]}) {
-            EXPECT_EQ(routine(tol, array1.handle(), array2.handle()), 1);
-            EXPECT_EQ(routine(tol, array1.handle(), array3.handle()), 0);
-        }
+    for_each_pair_of_types([](auto tag1, auto tag2) {
+        using T1 = typename decltype(tag1)::type;
+        using T2 = typename decltype(tag2)::type;
+        SCOPED_TRACE(testing::Message() << element_type_id<T1> << " and " << element_type_id<T2>);
+        expect_answers(element_type_of<T1>(), element_type_of<T2>(),
+                       {&TalNumericArray_sameQ_impl, &TalNumericArray_sameQ_impl<T1>,
+                        &TalNumericArray_sameQ_impl<T1, T2>});
     });
 }
 

@@ -12,7 +12,6 @@
 
 #include <cmath>
 #include <cstdint>
-#include <iostream>
 #include <limits>
 #include <utility>
 #include <vector>
@@ -197,12 +196,6 @@ constexpr Kind kinds[] = {Kind::none, Kind::whole, Kind::fractional, Kind::last_
 constexpr Factor factors[] = {Factor::remembered, Factor::forgotten};
 constexpr Place places[] = {Place::random, Place::at_limit};
 
-std::uint64_t printed_seed() {
-    const std::uint64_t seed = oracle::requested_seed();
-    std::cout << "TALNUMERICARRAY_SEED=" << seed << std::endl;
-    return seed;
-}
-
 void expect_explained(const Tally& tally) {
     EXPECT_GT(tally.pairs, 0U);
     EXPECT_EQ(tally.unexplained, 0U) << tally.first_unexplained;
@@ -223,13 +216,13 @@ void expect_agreement(oracle::Random& random, const Kind kind) {
 }
 
 TEST(StepsAndMeaning, AgreeUnderWholeTolerances) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     expect_agreement<double>(random, Kind::whole);
     expect_agreement<float>(random, Kind::whole);
 }
 
 TEST(StepsAndMeaning, AgreeWhereNoFactorIsNeeded) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     for (const Kind kind : {Kind::none, Kind::all}) {
         expect_agreement<double>(random, kind);
         expect_agreement<float>(random, kind);
@@ -250,7 +243,7 @@ void expect_small_differences(oracle::Random& random, const Kind kind, const Fac
 }
 
 TEST(StepsAndMeaning, DifferAtTheLimitOfAFractionalTolerance) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     for (const Factor factor : factors) {
         expect_small_differences<double>(random, Kind::fractional, factor);
         expect_small_differences<float>(random, Kind::fractional, factor);
@@ -258,7 +251,7 @@ TEST(StepsAndMeaning, DifferAtTheLimitOfAFractionalTolerance) {
 }
 
 TEST(StepsAndMeaning, DifferAtTheLimitOfTheLastDigitOnceItsFactorIsRemembered) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     expect_small_differences<double>(random, Kind::last_digit, Factor::remembered);
     expect_small_differences<float>(random, Kind::last_digit, Factor::remembered);
 }
@@ -277,7 +270,7 @@ void expect_early_exits(oracle::Random& random) {
 }
 
 TEST(StepsAndMeaning, DifferFromHalfTheLargerOnBeforeTheFactorOfTheLastDigitIsRemembered) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     expect_early_exits<double>(random);
     expect_early_exits<float>(random);
 }
@@ -331,7 +324,7 @@ void expect_agreement_over_arrays(oracle::Random& random) {
 }
 
 TEST(StepsAndMeaning, AgreeOverArraysUnderWholeTolerances) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     expect_agreement_over_arrays<double>(random);
     expect_agreement_over_arrays<float>(random);
 }
@@ -353,7 +346,7 @@ void expect_arrays_to_follow_the_steps(oracle::Random& random, const Kind kind) 
 }
 
 TEST(StepsAndMeaning, StepsAreThoseOfThePredicate) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     for (const Kind kind : {Kind::whole, Kind::fractional, Kind::last_digit}) {
         expect_arrays_to_follow_the_steps<double>(random, kind);
         expect_arrays_to_follow_the_steps<float>(random, kind);
@@ -363,7 +356,7 @@ TEST(StepsAndMeaning, StepsAreThoseOfThePredicate) {
 // ---- What is rounded before it is compared
 
 TEST(StepsAndMeaning, DifferAsFarAsTheToleranceOfSinglesIsRounded) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     constexpr double first_rounded_up = 24 - 0x1p-20;
     const auto examine = [&](const double low, const double high, const Place place) {
         Tally tally = exactness::survey_rounded_tolerances(random, low, high, place, {20000, 1});
@@ -407,7 +400,7 @@ void expect_the_rounding_of_integers(oracle::Random& random) {
 }
 
 TEST(StepsAndMeaning, DifferAsFarAsAnIntegerIsRounded) {
-    oracle::Random random(printed_seed());
+    oracle::Random random(oracle::printed_seed());
     expect_the_rounding_of_integers<std::int64_t, double>(random);
     expect_the_rounding_of_integers<std::uint64_t, double>(random);
     expect_the_rounding_of_integers<std::int64_t, float>(random);

@@ -232,10 +232,8 @@ double greatest_error_of_factors(oracle::Random& random, const std::uint64_t cou
     return greatest;
 }
 
-bool run(const std::uint64_t seed, const std::uint64_t pairs) {
-    oracle::Random random(seed);
-    std::cout << "TALNUMERICARRAY_SEED=" << seed << std::endl;
-
+bool run(const std::uint64_t pairs) {
+    oracle::Random random(oracle::printed_seed());
     RealRows reals;
     survey_reals<double>(random, pairs, reals);
     survey_reals<float>(random, pairs, reals);
@@ -268,7 +266,7 @@ bool run(const std::uint64_t seed, const std::uint64_t pairs) {
 
 int main() {
     try {
-        return run(oracle::requested_seed(), oracle::requested_calls()) ? 0 : 1;
+        return run(oracle::requested_calls()) ? 0 : 1;
     } catch (const std::exception& error) {
         std::cerr << "exactness: " << error.what() << "\n";
         return 2;

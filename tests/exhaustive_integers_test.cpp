@@ -4,6 +4,8 @@
 #include "talnumericarray_compare.h"
 #include "talnumericarray_sameq_impl.h"
 
+#include "support/array_record.h"
+
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -11,26 +13,13 @@
 
 namespace {
 
-// A record of one element.
-template <typename T>
-st_TalDataArray record_of(T* element) {
-    static talint one = 1;
-    st_TalDataArray record = {};
-    record.dims = &one;
-    record.rank = 1;
-    record.data_type = element_type_id<T>;
-    record.nelems = one;
-    record.data = element;
-    return record;
-}
-
 // Calls `answer` for every pair of values and returns how many answers are wrong.
 template <typename T1, typename T2, typename Answer>
 std::uint64_t wrong_answers(const Answer& answer) {
     T1 element1 = 0;
     T2 element2 = 0;
-    auto record1 = record_of(&element1);
-    auto record2 = record_of(&element2);
+    const ArrayRecord array1(element_type_id<T1>, &element1, 1);
+    const ArrayRecord array2(element_type_id<T2>, &element2, 1);
     std::uint64_t wrong = 0;
     std::uint64_t answers = 0;
     for (int value1 = std::numeric_limits<T1>::min(); value1 <= std::numeric_limits<T1>::max();
@@ -40,7 +29,7 @@ std::uint64_t wrong_answers(const Answer& answer) {
              ++value2) {
             element2 = static_cast<T2>(value2);
             const int expected = value1 == value2 ? 1 : 0;
-            wrong += answer(&record1, &record2) != expected ? 1U : 0U;
+            wrong += answer(array1.handle(), array2.handle()) != expected ? 1U : 0U;
             ++answers;
         }
     }

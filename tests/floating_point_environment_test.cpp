@@ -180,11 +180,7 @@ class RandomArrays {
         oracle::fill_arrays(random, tol, types[0]->id, types[1]->id, count_, bytes_[0], bytes_[1]);
         are_finite_ = true;
         for (const int side : {0, 1}) {
-            records_[side].dims = &count_;
-            records_[side].rank = 1;
-            records_[side].nelems = count_;
-            records_[side].data_type = types[side]->id;
-            records_[side].data = bytes_[side];
+            records_[side] = record_of(types[side]->id, bytes_[side], count_);
             are_finite_ = are_finite_ && is_finite(*types[side], bytes_[side]);
         }
     }

@@ -11,9 +11,7 @@
 namespace {
 
 TEST(RandomCalls, AnswerAsTheOracle) {
-    const std::uint64_t seed = oracle::requested_seed();
-    std::cout << "TALNUMERICARRAY_SEED=" << seed << std::endl;
-
+    const std::uint64_t seed = oracle::printed_seed();
     oracle::Tally tally;
     std::thread([&] { tally = oracle::run_checked_calls(seed, oracle::requested_calls()); }).join();
 

@@ -3,6 +3,7 @@
 
 #include "talnumericarray_compare.h"
 
+#include "support/array_record.h"
 #include "support/element_types.h"
 #include "support/emulation.h"
 #include "support/protected_memory.h"
@@ -35,16 +36,6 @@ unsigned char* fill_before_end(const ProtectedMemory& memory, const std::size_t 
     return data + count * type.size;
 }
 
-st_TalDataArray record_of(const ElementType& type, void* data, talint* dimensions) {
-    st_TalDataArray record = {};
-    record.dims = dimensions;
-    record.rank = 1;
-    record.data_type = type.id;
-    record.nelems = dimensions[0];
-    record.data = data;
-    return record;
-}
-
 // ---- Arrays of one value each
 
 struct Filling {
@@ -52,26 +43,16 @@ struct Filling {
     std::vector<double> same_under;
 };
 
-bool is_complex(const ElementType& type) {
-    return type.size != type.part_size;
-}
-
 // Threes, and threes beside numbers that are near three. Beside complex numbers zeros too, as many
 // of which as there are parts would be the same as these.
 std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2) {
     if (type1.is_integer && type2.is_integer) {
         return {{3, 3, {0.0, 10.0}}};
     }
-    const auto is_double = [](const ElementType& type) {
-        return !type.is_integer && type.part_size == sizeof(double);
-    };
-    const bool doubles = is_double(type1) || is_double(type2);
-    const double near_three = doubles ? 3 + 0x1p-44 : 3 + 0x1p-15;
-    const bool second_holds_it = doubles ? is_double(type2) : !type2.is_integer;
-    std::vector<Filling> chosen = {
-        {3, 3, {std::begin(tolerances), std::end(tolerances)}},
-        {second_holds_it ? 3 : near_three, second_holds_it ? near_three : 3, {10, 10.5, 53}}};
-    if (is_complex(type1) != is_complex(type2)) {
+    const auto [near1, near2] = near_threes(type1, type2);
+    std::vector<Filling> chosen = {{3, 3, {std::begin(tolerances), std::end(tolerances)}},
+                                   {near1, near2, {10, 10.5, 53}}};
+    if (type1.is_complex() != type2.is_complex()) {
         chosen.push_back({0, 0, {0.0, 10.0}});
     }
     return chosen;
@@ -80,8 +61,8 @@ std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2
 // How far behind its last element an array's page may end: one of complex numbers need only be
 // aligned as its parts are, so that an element may lie in two pages.
 std::vector<std::size_t> phases(const ElementType& type) {
-    return is_complex(type) ? std::vector<std::size_t>{0, type.part_size}
-                            : std::vector<std::size_t>{0};
+    return type.is_complex() ? std::vector<std::size_t>{0, type.part_size}
+                             : std::vector<std::size_t>{0};
 }
 
 // All up to behind two blocks, those around the ends of two pages, and some between.
@@ -155,11 +136,10 @@ TEST(Reading, EndsWithTheArrays) {
         const std::vector<std::size_t> counts = positions(type1, type2);
         const auto check = [&](const TwoMemories::Ends& ends, const Filling& filling) {
             for (const std::size_t count : counts) {
-                auto length = static_cast<talint>(count);
-                auto record1 = record_of(type1, ends.end1 - count * type1.size, &length);
-                auto record2 = record_of(type2, ends.end2 - count * type2.size, &length);
+                const ArrayRecord array1(type1.id, ends.end1 - count * type1.size, count);
+                const ArrayRecord array2(type2.id, ends.end2 - count * type2.size, count);
                 for (const double tol : tolerances_of_step(filling, count)) {
-                    EXPECT_EQ(TalNumericArray_sameQ(tol, 1, &record1, &record2), 1)
+                    EXPECT_EQ(TalNumericArray_sameQ(tol, 1, array1.handle(), array2.handle()), 1)
                         << count << " elements, tolerance " << tol;
                 }
             }
@@ -192,15 +172,15 @@ void expect_to_stop_at(const std::size_t position, const ElementType& type1,
                        const Filling& filling, const Behind& readable) {
     unsigned char* const last1 = ends.end1 - (readable.elements1 + 1) * type1.size;
     unsigned char* const last2 = ends.end2 - (readable.elements2 + 1) * type2.size;
-    auto count = static_cast<talint>(position + 4 * page);
-    auto record1 = record_of(type1, last1 - position * type1.size, &count);
-    auto record2 = record_of(type2, last2 - position * type2.size, &count);
+    const std::size_t count = position + 4 * page;
+    const ArrayRecord array1(type1.id, last1 - position * type1.size, count);
+    const ArrayRecord array2(type2.id, last2 - position * type2.size, count);
     type1.store(last1, filling.value1 == 0 ? 3 : 0);
     for (const double tol : tolerances_of_step(filling, position)) {
         if (type1.id == type2.id && tol == 0.0) {
             continue; // compared as bytes, of which memcmp may read all
         }
-        EXPECT_EQ(TalNumericArray_sameQ(tol, 1, &record1, &record2), 0)
+        EXPECT_EQ(TalNumericArray_sameQ(tol, 1, array1.handle(), array2.handle()), 0)
             << "position " << position << ", tolerance " << tol << ", behind it "
             << readable.elements1 << " and " << readable.elements2;
     }
@@ -243,11 +223,11 @@ TEST(Reading, WritesNothing) {
         auto* const data2 = fill_before_end(memory2, 0, type2, count, 3) - count * type2.size;
         type2.store(data2 + (count - 1) * type2.size, 0);
         auto* const records = static_cast<st_TalDataArray*>(records_memory.before_end(2048));
-        auto* const dimensions = static_cast<talint*>(records_memory.before_end(1024));
-        dimensions[0] = count;
-        dimensions[1] = count;
-        records[0] = record_of(type1, data1, dimensions);
-        records[1] = record_of(type2, data2, dimensions + 1);
+        auto* const lengths = static_cast<talint*>(records_memory.before_end(1024));
+        lengths[0] = count;
+        lengths[1] = count;
+        records[0] = record_of(type1.id, data1, lengths[0]);
+        records[1] = record_of(type2.id, data2, lengths[1]);
         for (const ProtectedMemory* memory : {&records_memory, &memory1, &memory2}) {
             memory->make_read_only();
         }
@@ -264,12 +244,12 @@ TEST(Reading, WritesNothing) {
 TEST(Reading, LooksAtNothingThatIsNotNeeded) {
     const ProtectedMemory memory(1);
     auto* const unreadable = static_cast<unsigned char*>(memory.before_end(0));
-    talint dimensions[] = {4};
-    talint other_dimensions[] = {5};
-    auto record1 = record_of(element_types[0], unreadable, dimensions);
-    auto record2 = record_of(element_types[0], unreadable, other_dimensions);
+    talint length = 4;
+    talint other_length = 5;
+    auto record1 = record_of(BIT8_TYPE, unreadable, length);
+    auto record2 = record_of(BIT8_TYPE, unreadable, other_length);
     EXPECT_EQ(TalNumericArray_sameQ(0, 1, &record1, &record2), 0);
-    record2.dims = dimensions;
+    record2.dims = &length;
     EXPECT_EQ(TalNumericArray_equivalentQ(&record1, &record2), 1);
     record2.data_type = REAL64_TYPE;
     EXPECT_EQ(TalNumericArray_sameQ(0, 0, &record1, &record2), 0);

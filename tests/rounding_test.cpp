@@ -1,11 +1,13 @@
 // The module against the oracle under every kind of arithmetic that a program can ask for: the
 // answer is that of the rule, worked out in that arithmetic.
 
+#include "promotion_rules.h"
+
 #include "support/arrays.h"
 #include "support/checked_calls.h"
 #include "support/floating_point_modes.h"
-#include "support/hard_pairs.h"
 #include "support/oracle.h"
+#include "support/random_arrays.h"
 
 #include <gtest/gtest.h>
 
@@ -13,7 +15,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <iostream>
-#include <limits>
 #include <vector>
 
 namespace {
@@ -21,10 +22,10 @@ namespace {
 // In a thread that has not compared yet.
 template <typename Scope>
 void expect_no_mismatch(const Scope& make_scope) {
-    const std::uint64_t seed = oracle::requested_seed();
+    const std::uint64_t seed = oracle::printed_seed();
     const std::uint64_t calls = oracle::requested_calls() / 10;
     ASSERT_GT(calls, 0U);
-    std::cout << "TALNUMERICARRAY_SEED=" << seed << ", " << calls << " calls" << std::endl;
+    std::cout << calls << " calls" << std::endl;
     in_new_thread([&] {
         const auto scope = make_scope();
         const oracle::Tally tally = oracle::run_checked_calls(seed, calls);
@@ -51,9 +52,9 @@ void expect_no_mismatch_in_blocks(oracle::Random& random) {
     std::vector<T2> elements2(count, T2(7));
     const std::uint64_t calls = oracle::requested_calls() / 200;
     for (const double tol : {4.0, 10.5, 20.25, 22.0}) {
-        const double share = std::exp2(tol - std::numeric_limits<T>::digits);
         for (std::uint64_t call = 0; call < calls; ++call) {
-            draw_elements<T1, T2>(random, share, &elements1[place], &elements2[place]);
+            oracle::draw_elements(random, tol, element_type_id<T1>, element_type_id<T2>, true,
+                                  &elements1[place], &elements2[place]);
             const Array<T1> array1({count}, elements1);
             const Array<T2> array2({count}, elements2);
             oracle::State state;
@@ -69,9 +70,7 @@ void expect_no_mismatch_in_blocks(oracle::Random& random) {
 }
 
 TEST(Rounded, AnswersInBlocksFollowTheRuleInEveryDirection) {
-    const std::uint64_t seed = oracle::requested_seed();
-    std::cout << "TALNUMERICARRAY_SEED=" << seed << std::endl;
-    oracle::Random random(seed);
+    oracle::Random random(oracle::printed_seed());
     for (const Rounding& rounding : roundings) {
         SCOPED_TRACE(rounding.name);
         const RoundingScope scope(rounding);

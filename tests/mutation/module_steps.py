@@ -70,14 +70,21 @@ PARTS = (
 )
 SIGNALS = Program("signals_test", (), ("tests/signals_test.cpp", *SUPPORT), link=("-Wl,-z,now",))
 READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O1")
-CERTAINTY = own("certainty_test", *SUPPORT)
+# What takes larger steps without optimisation is built like what sees the mutant.
+CERTAINTY = Program("certainty_test",
+                    tuple(f"tests/{name}.cpp" for name in
+                          ("certainty/certain_divisor", "certainty/certainty",
+                           "certainty/drawn_pairs", "certainty/planted_pairs", "support/loops")),
+                    (*(f"tests/certainty/{name}.cpp"
+                       for name in ("instruction_sets", "reading_without_vectors")), *SUPPORT))
 # Of all sets, and so without the longest of the tests, which says no more of them than of one.
-CERTAINTY_OF_SETS = own("certainty_test", *SUPPORT,
-                     run=("--gtest_filter=-Loops.AnswerAndRememberAsTheElementLoop",))
+CERTAINTY_OF_SETS = replace(CERTAINTY,
+                            run=("--gtest_filter=-Loops.AnswerAndRememberAsTheElementLoop",))
 
 # With plain code for the instructions, which takes its time without optimisation.
-CERTAINTY_OF_AVX512 = Program("certainty_of_avx512_test", ("tests/certainty_of_avx512_test.cpp",),
-                              SUPPORT, level="-O1 -Wno-psabi -DTALNUMERICARRAY_EMULATED")
+CERTAINTY_OF_AVX512 = replace(CERTAINTY, name="certainty_of_avx512_test",
+                              level="-O1 -Wno-psabi -DTALNUMERICARRAY_EMULATED"
+                                    " -DAVX512_IN_PLAIN_CODE")
 
 # What the release build makes of the module beside the test programs, and the tests of that.
 CHECKED_TARGETS = ["talnumericarray_compare", "small_runtime", "runtime_by_linking",

@@ -6,6 +6,7 @@
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
 
+#include "array_record.h"
 #include "element_types.h"
 #include "tolerances.h"
 
@@ -22,13 +23,9 @@ class Array {
         : Array({static_cast<talint>(elements.size())}, std::vector<T>(elements)) {}
 
     Array(std::vector<talint> dimensions, std::vector<T> elements)
-        : dimensions_(std::move(dimensions)), elements_(std::move(elements)) {
-        record_.dims = dimensions_.data();
-        record_.rank = static_cast<talint>(dimensions_.size());
-        record_.data_type = element_type_id<T>;
-        record_.nelems = static_cast<talint>(elements_.size());
-        record_.data = elements_.data();
-    }
+        : dimensions_(std::move(dimensions)), elements_(std::move(elements)),
+          record_(record_of(element_type_id<T>, elements_.data(), dimensions_,
+                            static_cast<talint>(elements_.size()))) {}
     Array(const Array&) = delete;
     Array& operator=(const Array&) = delete;
     ~Array() = default;
@@ -39,36 +36,27 @@ class Array {
     TalNumericArray handle() const { return const_cast<TalNumericArray>(&record_); }
 
   private:
-    st_TalDataArray record_ = {};
     std::vector<talint> dimensions_;
     std::vector<T> elements_;
+    st_TalDataArray record_;
 };
 
 // Rank 1, of a type that is chosen at run time.
 class AnyArray {
   public:
     AnyArray(const ElementType& type, const std::vector<int>& values)
-        : count_(static_cast<talint>(values.size())), bytes_(values.size() * type.size) {
+        : bytes_(values.size() * type.size), record_(type.id, bytes_.data(), values.size()) {
         for (std::size_t i = 0; i < values.size(); ++i) {
             type.store(bytes_.data() + i * type.size, values[i]);
         }
-        record_.dims = &count_;
-        record_.rank = 1;
-        record_.data_type = type.id;
-        record_.nelems = count_;
-        record_.data = bytes_.data();
     }
-    AnyArray(const AnyArray&) = delete;
-    AnyArray& operator=(const AnyArray&) = delete;
-    ~AnyArray() = default;
 
     unsigned char* bytes() { return bytes_.data(); }
-    TalNumericArray handle() const { return const_cast<TalNumericArray>(&record_); }
+    TalNumericArray handle() const { return record_.handle(); }
 
   private:
-    talint count_;
     std::vector<unsigned char> bytes_;
-    st_TalDataArray record_ = {};
+    ArrayRecord record_;
 };
 
 // The answer for arrays that may be of different types.

@@ -1,5 +1,6 @@
 #include "checked_calls.h"
 
+#include "array_record.h"
 #include "oracle.h"
 #include "random_arrays.h"
 #include "talnumericarray_compare.h"
@@ -8,6 +9,7 @@
 
 #include <cstdlib>
 #include <iomanip>
+#include <iostream>
 #include <random>
 #include <sstream>
 #include <string>
@@ -38,13 +40,7 @@ class Operand {
     const Array& array() const { return array_; }
 
     st_TalDataArray record() {
-        st_TalDataArray result{};
-        result.rank = static_cast<talint>(array_.dimensions.size());
-        result.dims = array_.dimensions.data();
-        result.data_type = array_.type_id;
-        result.nelems = array_.element_count;
-        result.data = data();
-        return result;
+        return record_of(array_.type_id, data(), array_.dimensions, array_.element_count);
     }
 
   private:
@@ -61,17 +57,17 @@ struct Call {
 };
 
 // Reals and complex numbers come twice as often as integers.
-int random_type_id(Random& random) {
-    const int id = random.between(1, 16);
+int random_type_id(Draws& draws) {
+    const int id = draws.between(1, 16);
     return id > 12 ? id - 4 : id;
 }
 
-void disturb(Random& random, Call& call) {
+void disturb(Draws& draws, Call& call) {
     static const int unknown_ids[] = {-1, 0, 13, 256 + 5};
-    Array& victim = random.one_in(2) ? call.first.array() : call.second.array();
-    switch (random.below(5)) {
+    Array& victim = draws.one_in(2) ? call.first.array() : call.second.array();
+    switch (draws.below(5)) {
     case 0:
-        victim.type_id = random.pick(unknown_ids);
+        victim.type_id = draws.pick(unknown_ids);
         break;
     case 1:
         victim.element_count = 0;
@@ -88,16 +84,16 @@ void disturb(Random& random, Call& call) {
     }
 }
 
-void draw(Random& random, double tolerance, Call& call) {
-    const std::int32_t count = random_count(random);
+void draw(Draws& draws, double tolerance, Call& call) {
+    const std::int32_t count = random_count(draws);
     call.tolerance = tolerance;
-    call.compare_different_types = random.one_in(32) ? 0 : random.pick({1, 1, 1, -1, 256});
-    call.first.reset(random_type_id(random), count);
-    call.second.reset(random_type_id(random), count);
-    fill_arrays(random, call.tolerance, call.first.array().type_id, call.second.array().type_id,
+    call.compare_different_types = draws.one_in(32) ? 0 : draws.pick({1, 1, 1, -1, 256});
+    call.first.reset(random_type_id(draws), count);
+    call.second.reset(random_type_id(draws), count);
+    fill_arrays(draws, call.tolerance, call.first.array().type_id, call.second.array().type_id,
                 count, call.first.data(), call.second.data());
-    if (random.one_in(64)) {
-        disturb(random, call);
+    if (draws.one_in(64)) {
+        disturb(draws, call);
     }
 }
 
@@ -172,6 +168,12 @@ std::uint64_t requested_calls() {
 
 std::uint64_t requested_seed() {
     return from_environment("TALNUMERICARRAY_SEED", std::random_device{}());
+}
+
+std::uint64_t printed_seed() {
+    const std::uint64_t seed = requested_seed();
+    std::cout << "TALNUMERICARRAY_SEED=" << seed << std::endl;
+    return seed;
 }
 
 Tally run_checked_calls(std::uint64_t seed, std::uint64_t calls,

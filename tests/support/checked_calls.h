@@ -9,9 +9,13 @@
 namespace oracle {
 
 // From the environment, TALNUMERICARRAY_RANDOM_CALLS and TALNUMERICARRAY_SEED; otherwise the number
-// that the build was configured with, and a new seed. Throws for what is no number.
+// that the build was configured with, and a new seed. They throw
+// where that is no number.
 std::uint64_t requested_calls();
 std::uint64_t requested_seed();
+
+// Prints the requested seed, and returns it.
+std::uint64_t printed_seed();
 
 struct Tally {
     std::uint64_t calls = 0;

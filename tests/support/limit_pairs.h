@@ -3,8 +3,7 @@
 #ifndef TALNUMERICARRAY_TESTS_LIMIT_PAIRS_H
 #define TALNUMERICARRAY_TESTS_LIMIT_PAIRS_H
 
-#include "hard_pairs.h"
-#include "random_arrays.h"
+#include "draws.h"
 
 #include <algorithm>
 #include <cmath>
@@ -91,25 +90,10 @@ T random_tolerance(oracle::Random& random, const Kind kind, const Place place) {
 
 // ---- Pairs
 
-template <typename T>
-T moved(T value, const int ulps) {
-    const T goal = std::copysign(std::numeric_limits<T>::infinity(), static_cast<T>(ulps));
-    for (int i = std::abs(ulps); i > 0; --i) {
-        value = std::nextafter(value, goal);
-    }
-    return value;
-}
-
-// To either side, by at most that many ulps.
-template <typename T>
-T moved_at_random(oracle::Random& random, const T value, const int most) {
-    return moved(value, random.between(-most, most));
-}
-
 // Finite and above zero: every magnitude from the smallest subnormal number to the largest finite
 // one, more often than not where the arithmetic changes.
 template <typename T>
-T random_magnitude(oracle::Random& random) {
+T random_finite_magnitude(oracle::Random& random) {
     using limits = std::numeric_limits<T>;
     const double fraction = random.unit();
     switch (random.below(8)) {
@@ -120,22 +104,22 @@ T random_magnitude(oracle::Random& random) {
     case 2:
         return std::ldexp(static_cast<T>(0.5 + fraction), random.between(-2, 2));
     default: {
-        const T magnitude = std::fabs(random_real<T>(random));
+        const T magnitude = std::fabs(oracle::random_real<T>(random));
         const bool usable = magnitude > 0 && magnitude <= limits::max();
         return usable ? magnitude : static_cast<T>(1 + fraction);
     }
     }
 }
 
-// The two differ by `share` of the larger but for some ulps. A difference of few digits is drawn
-// first and the larger number after it, as otherwise the ulps of a large difference would be too
-// coarse to come near to the limit.
+// The two differ by `share` of the larger, give or take some ulps. A difference of few digits is
+// drawn first and the larger number after it, as otherwise the ulps of a large difference would be
+// too coarse to come near to the limit.
 template <typename T>
 std::pair<T, T> pair_of_difference(oracle::Random& random, const T magnitude, const T share,
                                    const int most_ulps) {
     const T ulp = magnitude - std::nextafter(magnitude, T{0});
     const T difference = ulp * std::max(T{1}, std::floor(magnitude * share / ulp));
-    const T larger = moved_at_random(random, difference / share, most_ulps);
+    const T larger = oracle::nudged(random, difference / share, most_ulps);
     return {larger, larger - difference};
 }
 
@@ -145,9 +129,9 @@ std::pair<T, T> pair_at_limit(oracle::Random& random, const T magnitude, const T
                               const int most_ulps) {
     switch (random.below(4)) {
     case 0:
-        return {magnitude, moved_at_random(random, magnitude - magnitude * share, most_ulps)};
+        return {magnitude, oracle::nudged(random, magnitude - magnitude * share, most_ulps)};
     case 1:
-        return {magnitude, moved_at_random(random, magnitude / (1 - share), most_ulps)};
+        return {magnitude, oracle::nudged(random, magnitude / (1 - share), most_ulps)};
     default:
         return pair_of_difference(random, magnitude, share, most_ulps);
     }
@@ -157,7 +141,7 @@ std::pair<T, T> pair_at_limit(oracle::Random& random, const T magnitude, const T
 template <typename T>
 T random_partner(oracle::Random& random, const T magnitude, const T share) {
     if (random.one_in(8)) {
-        const T other = random_real<T>(random);
+        const T other = oracle::random_real<T>(random);
         return std::isnan(other) ? T{0} : other;
     }
     const T widest = std::min(T{1}, 2 * share);
@@ -175,7 +159,7 @@ std::pair<T, T> with_random_order_and_sign(oracle::Random& random, std::pair<T, 
 // Two reals, no NaN.
 template <typename T>
 std::pair<T, T> random_pair(oracle::Random& random, const Place place, const T share) {
-    const T magnitude = random_magnitude<T>(random);
+    const T magnitude = random_finite_magnitude<T>(random);
     const std::pair<T, T> pair =
         place == Place::at_limit
             ? pair_at_limit(random, magnitude, share, 3)

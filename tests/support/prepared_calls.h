@@ -28,7 +28,7 @@ inline int wrong_answers_to(const PreparedCall& call) noexcept {
 }
 
 // All pairs of element types, under tolerances that need no factor, a factor of either kind, one
-// that depends on what is remembered, and none again; short arrays and such as are looked at in
+// that depends on what is remembered, and none again; short arrays and those that are compared in
 // blocks, of equal pairs, of near pairs, and with one pair in the middle that is unlike the others.
 // No answer depends on what the thread has compared before.
 class PreparedCalls {
@@ -53,47 +53,21 @@ class PreparedCalls {
     const std::vector<PreparedCall>& calls() const { return calls_; }
 
   private:
-    struct Values {
-        double value1, value2;
-    };
-
     static constexpr std::size_t counts[] = {1, 5, 300};
     static constexpr double tolerances[] = {0, -1, 10, 10.5, 23.5, 52.5, 53, NAN};
-
-    static bool holds_doubles(const ElementType& type) {
-        return !type.is_integer && type.part_size == sizeof(double);
-    }
-
-    // 3 and another number, on a side that can hold it.
-    static Values near_three(const ElementType& type1, const ElementType& type2) {
-        if (type1.is_integer && type2.is_integer) {
-            return {3, 4};
-        }
-        const bool doubles = holds_doubles(type1) || holds_doubles(type2);
-        const double near = doubles ? 3 + 0x1p-44 : 3 + 0x1p-15;
-        const bool second_holds_it = doubles ? holds_doubles(type2) : !type2.is_integer;
-        return second_holds_it ? Values{3, near} : Values{near, 3};
-    }
 
     void prepare_fillings(const ElementType& type1, const ElementType& type2,
                           const std::size_t count) {
         const Values equal = {3, 3};
-        const Values near = near_three(type1, type2);
+        const bool integers = compared_digits(type1, type2) == 0;
+        const Values near = integers ? Values{3, 4} : near_threes(type1, type2);
         const Values apart = {3, 0};
         const Values fillings[][2] = {
             {equal, equal}, {equal, near}, {equal, apart}, {near, near}, {near, apart}};
         for (const auto& [usual, in_the_middle] : fillings) {
             AnyArray& array1 = filled(type1, count, usual.value1, in_the_middle.value1);
             AnyArray& array2 = filled(type2, count, usual.value2, in_the_middle.value2);
-            prepare_calls({type1.id,
-                           {static_cast<talint>(count)},
-                           static_cast<talint>(count),
-                           array1.bytes()},
-                          {type2.id,
-                           {static_cast<talint>(count)},
-                           static_cast<talint>(count),
-                           array2.bytes()},
-                          array1.handle(), array2.handle());
+            prepare_calls(array1.handle(), array2.handle());
         }
     }
 
@@ -106,8 +80,14 @@ class PreparedCalls {
         return array;
     }
 
-    void prepare_calls(const oracle::Array& array1, const oracle::Array& array2,
-                       TalNumericArray handle1, TalNumericArray handle2) {
+    static oracle::Array seen_by_oracle(const st_TalDataArray& record) {
+        return {
+            record.data_type, {record.dims, record.dims + record.rank}, record.nelems, record.data};
+    }
+
+    void prepare_calls(TalNumericArray handle1, TalNumericArray handle2) {
+        const oracle::Array array1 = seen_by_oracle(*handle1);
+        const oracle::Array array2 = seen_by_oracle(*handle2);
         for (const double tol : tolerances) {
             for (const bool any_type : {true, false}) {
                 oracle::State state;

@@ -4,9 +4,9 @@
 #ifndef TALNUMERICARRAY_TESTS_SURVEYS_H
 #define TALNUMERICARRAY_TESTS_SURVEYS_H
 
+#include "draws.h"
 #include "exactness.h"
 #include "limit_pairs.h"
-#include "random_arrays.h"
 
 #include <algorithm>
 #include <cmath>
@@ -143,7 +143,7 @@ T partner_of_integer(oracle::Random& random, const Place place, const T rounded,
     const T partner = place == Place::random ? random_partner(random, magnitude, share)
                       : random.one_in(2)     ? magnitude - magnitude * share
                                              : magnitude / (1 - share);
-    return std::copysign(place == Place::random ? partner : moved_at_random(random, partner, 1),
+    return std::copysign(place == Place::random ? partner : oracle::nudged(random, partner, 1),
                          rounded);
 }
 

@@ -3,14 +3,11 @@
 #include "digits.h"
 
 #include "support/element_types.h"
-#include "support/hard_pairs.h"
 #include "support/random_arrays.h"
-#include "taldata_array_element_types.h"
 
 #include <gtest/gtest.h>
 
 #include <array>
-#include <cmath>
 #include <cstddef>
 #include <vector>
 
@@ -18,24 +15,6 @@ namespace {
 
 using talcmp::DigitSearch;
 using talcmp::Sameness;
-
-using Draw = void (*)(oracle::Random&, double share, void*, void*);
-
-template <typename T1, typename... T2>
-constexpr std::array<Draw, sizeof...(T2)> draws_with(type_list<T2...> /*types*/) {
-    return {draw_elements<T1, T2>...};
-}
-
-template <typename... T1>
-constexpr auto all_draws(const type_list<T1...> types) {
-    return std::array{draws_with<T1>(types)...};
-}
-
-Draw draw_of(const ElementType& type1, const ElementType& type2) {
-    static constexpr auto draws = all_draws(element_type_list{});
-    return draws.at(static_cast<std::size_t>(type1.id - 1))
-        .at(static_cast<std::size_t>(type2.id - 1));
-}
 
 // Of which the limits of all whole tolerances are as likely.
 class DrawnPairs {
@@ -46,9 +25,9 @@ class DrawnPairs {
 
     void draw(oracle::Random& random) {
         for (std::size_t i = 0; i < count_; ++i) {
-            const double share = std::ldexp(1, random.between(-54, 0));
-            draw_of(type1_, type2_)(random, share, &elements1_[i * type1_.size],
-                                    &elements2_[i * type2_.size]);
+            const int digits = random.one_in(2) ? 24 : 53;
+            oracle::draw_elements(random, random.between(0, digits), type1_.id, type2_.id, true,
+                                  &elements1_[i * type1_.size], &elements2_[i * type2_.size]);
         }
     }
 

@@ -1,0 +1,48 @@
+// Records over dimensions and elements that are somewhere else, for tests, benchmarks and fuzzers.
+
+#ifndef TALNUMERICARRAY_TESTS_ARRAY_RECORD_H
+#define TALNUMERICARRAY_TESTS_ARRAY_RECORD_H
+
+#include "taldata_array.h"
+
+#include <cstddef>
+#include <vector>
+
+// Of rank 1, and of `length` elements.
+inline st_TalDataArray record_of(const type_t type, void* const data, talint& length) {
+    st_TalDataArray record = {};
+    record.dims = &length;
+    record.rank = 1;
+    record.data_type = type;
+    record.nelems = length;
+    record.data = data;
+    return record;
+}
+
+// Of any rank.
+inline st_TalDataArray record_of(const type_t type, void* const data,
+                                 std::vector<talint>& dimensions, const talint count) {
+    talint length = count;
+    st_TalDataArray record = record_of(type, data, length);
+    record.dims = dimensions.data();
+    record.rank = static_cast<talint>(dimensions.size());
+    return record;
+}
+
+// A record of rank 1, and its length.
+class ArrayRecord {
+  public:
+    ArrayRecord(const type_t type, void* const data, const std::size_t length)
+        : length_(static_cast<talint>(length)), record_(record_of(type, data, length_)) {}
+    ArrayRecord(const ArrayRecord&) = delete;
+    ArrayRecord& operator=(const ArrayRecord&) = delete;
+    ~ArrayRecord() = default;
+
+    TalNumericArray handle() const { return const_cast<TalNumericArray>(&record_); }
+
+  private:
+    talint length_;
+    st_TalDataArray record_;
+};
+
+#endif
