@@ -54,8 +54,8 @@ def own(name, *fixed, **settings):
 
 ARRAYS = Program("whole arrays", (),
                  (*(f"tests/{name}.cpp" for name in
-                    ("complex_pairs_test", "golden_calls_test", "random_calls_test",
-                     "threads_test")), *SUPPORT))
+                    ("golden_calls_test", "random_calls_test", "threads_test",
+                     "worked_examples_test")), *SUPPORT))
 # Without vectors, as with the option to optimise for size.
 SMALL = replace(ARRAYS, name="whole arrays without vectors", module_level="-Os", sets=ALL_SETS)
 SCALARS = tuple(map(own, ("tolerant_comparison_test", "scalar_comparison_test",
