@@ -57,7 +57,7 @@ constexpr Workload workloads[] = {
 
 // ---- Memory
 
-// One block for the two arrays of a comparison, one behind the other.
+// One block for the two arrays of a comparison, one after the other.
 class Block {
   public:
     explicit Block(const std::size_t bytes)

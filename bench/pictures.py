@@ -2,7 +2,7 @@
 
 import math
 
-# Of three lines: told apart by those who are colour-blind, too.
+# Of three lines, which colour-blind readers can distinguish too.
 LINE_COLOURS = ("#0072b2", "#d55e00", "#7f7f7f")
 
 
@@ -78,7 +78,7 @@ def chart(title, lines_of_chart, x_axis, y_axis):
 
 
 def charts(title, names_of_lines, all_charts, x_text, y_text):
-    """`all_charts` is a list of titles and lists of lines; two charts stand side by side."""
+    """`all_charts` is a list of titles and lists of lines; two charts are side by side."""
     chart_width, chart_height, left, top, gap = 340, 220, 62, 88, 64
     points = [point for _, lines in all_charts for line in lines for point in line]
     least_x, most_x = (pick(x for x, _ in points) for pick in (min, max))

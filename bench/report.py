@@ -2,7 +2,7 @@
 """Turns what the benchmarks wrote into tables and pictures: report.py [--arm] RESULTS DOCUMENTS.
 
 Reads the files of JSON in the folder RESULTS, writes pictures into the folder DOCUMENTS, renews what
-stands between marks in its performance.md, and prints each bar with what was measured. With --arm it
+is between marks in its performance.md, and prints each bar with what was measured. With --arm it
 does so with the instructions on 32-bit ARM, and without with all else.
 """
 
@@ -16,7 +16,14 @@ from pathlib import Path
 
 from pictures import charts, heat_map
 
-# ---- The bars: the most that a value may be, but where it says the least
+WORKLOADS = {
+    "identical": "identical",
+    "near": "near",
+    "near_fractional": "near, fractional tolerance",
+    "last_differs": "last element differs",
+}
+
+# ---- The bars: the most that a value may be, or the least where that is noted
 
 USER_BAR = 5.0  # nanoseconds
 USER_BARS_OF_REALS = {"AVX-512": {32: 1 / 2, 128: 1 / 4}, "AVX2": {128: 1 / 2}}
@@ -25,12 +32,9 @@ PLACES_BAR = 1.5
 GROWTH_BAR = 1.1
 # Of AVX-512.
 MEMCMP_BARS = {
-    ("256KiB", "near"): {"mean": 1.25, "worst": 2.5},
-    ("256KiB", "near_fractional"): {"mean": 1.25, "worst": 2.5},
-    ("256MiB", "identical"): {"mean": 1.1, "worst": 1.35},
-    ("256MiB", "near"): {"mean": 1.1, "worst": 1.35},
-    ("256MiB", "near_fractional"): {"mean": 1.1, "worst": 1.35},
-    ("256MiB", "last_differs"): {"mean": 1.1, "worst": 1.35},
+    **{("256KiB", workload): {"mean": 1.25, "worst": 2.5}
+       for workload in ("near", "near_fractional")},
+    **{("256MiB", workload): {"mean": 1.1, "worst": 1.35} for workload in WORKLOADS},
 }
 MEMCMP_BAR_OF_REALS = 1.6
 MEMCMP_BAR_OF_DOUBLES = 1.0  # 1.7 where units of 512 bits are two halves
@@ -47,13 +51,6 @@ ARM_IDENTICAL_BARS = {("VFP", "float64"): 8, ("VFP", "float32"): 8,
 # ---- Names
 
 REALS = ("float32", "float64", "complex64", "complex128")
-
-WORKLOADS = {
-    "identical": "identical",
-    "near": "near",
-    "near_fractional": "near, fractional tolerance",
-    "last_differs": "last element differs",
-}
 
 # These answer another question than element by element under a tolerance.
 NOT_ELEMENTWISE = {"Eigen isApprox", "NumPy array_equal"}
@@ -90,6 +87,12 @@ def pair_of(row):
     return row["type1"], row["type2"]
 
 
+def types_of(rows):
+    """All types, in the order of those that come first in a pair."""
+    types = dict.fromkeys(row["type2"] for row in rows)
+    return sorted(types, key=[row["type1"] for row in rows].index)
+
+
 def where(row):
     """A row of calls over short arrays."""
     words = [pair_text(pair_of(row)), row.get("workload"), f"n = {row['len']}"]
@@ -124,8 +127,7 @@ class Loops:
         }
         for (size, workload), ratios in self.ratios.items():
             check_pairs(ratios, workload, size)
-        self.types = list(dict.fromkeys(row["type2"] for row in results["rows"]))
-        self.types.sort(key=[row["type1"] for row in results["rows"]].index)
+        self.types = types_of(results["rows"])
 
     def worst_workload(self, size, pair):
         """The ratio and the workload."""
@@ -181,7 +183,7 @@ class ShortCalls:
 
 
 class Peers:
-    """Times of the same question to other libraries, by type and length, then by name."""
+    """Times of the same question put to other libraries, by type and length, then by name."""
 
     def __init__(self, results, numpy_results):
         self.sizes = defaultdict(dict)
@@ -340,32 +342,23 @@ def caches():
 
 def machine_table(loops, start):
     day, load = start.split()
-    rows = [
+    return table(("", "of this run"), [
         ("processor", processor()),
         ("instruction set of the loops", loops.instruction_set),
         *caches(),
         ("compiler", loops.compiler),
         ("load when it began", f"{load} processes"),
         ("day", day),
-    ]
-    return table(("", "of this run"), rows)
+    ])
 
 
 def loops_table(loops):
     rows = []
     for (size, workload), ratios in loops.ratios.items():
         worst = max(ratios, key=ratios.get)
-        rows.append(
-            (
-                spaced(size),
-                WORKLOADS[workload],
-                f"{mean(loops.all_pairs(size, workload).values()):.2f}",
-                len(ratios),
-                f"{mean(ratios.values()):.2f}",
-                f"{ratios[worst]:.2f}",
-                pair_text(worst),
-            )
-        )
+        rows.append((spaced(size), WORKLOADS[workload],
+                     f"{mean(loops.all_pairs(size, workload).values()):.2f}", len(ratios),
+                     f"{mean(ratios.values()):.2f}", f"{ratios[worst]:.2f}", pair_text(worst)))
     return table(("size", "workload", "mean", "measured", "their mean", "worst", "worst pair"), rows)
 
 
@@ -393,15 +386,8 @@ def peers_table(peers):
 
 def files_table(files):
     cmp_seconds = files["rows"][0]["seconds"]
-    rows = [
-        (
-            row["name"],
-            f"{row['seconds']:.2f}",
-            f"{row['seconds'] / cmp_seconds:.2f}",
-            f"{row['memory'] / 2**20:.0f}",
-        )
-        for row in files["rows"]
-    ]
+    rows = [(row["name"], f"{row['seconds']:.2f}", f"{row['seconds'] / cmp_seconds:.2f}",
+             f"{row['memory'] / 2**20:.0f}") for row in files["rows"]]
     return table(("command and files", "time, s", "of cmp", "memory, MiB"), rows)
 
 
@@ -434,8 +420,7 @@ class Arm:
             self.counts[row["build"], row["workload"]][pair_of(row)] = row["a_pair"]
         for build, workload in ARM_COLUMNS:
             check_pairs(self.counts[build, workload], workload, build)
-        self.types = list(dict.fromkeys(row["type2"] for row in results["rows"]))
-        self.types.sort(key=[row["type1"] for row in results["rows"]].index)
+        self.types = types_of(results["rows"])
 
     def worst_workload(self, build):
         return {pair: max(count, self.counts[build, "near"].get(pair, 0))

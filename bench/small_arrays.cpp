@@ -9,7 +9,6 @@
 #include "array_record.h"
 #include "filled_arrays.h"
 #include "json_rows.h"
-#include "one_by_one.h"
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
 #include "turns.h"
@@ -27,6 +26,11 @@
 #include <initializer_list>
 #include <limits>
 #include <vector>
+
+// Of the module built once more, with the rule one by one and no vectors; see
+// `TalNumericArray_sameQ`.
+extern "C" int one_by_one_sameQ(talreal tol, int compare_different_types, TalNumericArray na1,
+                                TalNumericArray na2) noexcept;
 
 namespace {
 

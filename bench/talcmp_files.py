@@ -12,7 +12,7 @@ import time
 
 import numpy as np
 
-# A process of its own, so that its memory can be told; prints the seconds of the comparison alone.
+# A process of its own, so that its memory is known; prints the seconds of the comparison alone.
 ALLCLOSE = """
 import sys, time
 import numpy as np

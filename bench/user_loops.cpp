@@ -1,4 +1,4 @@
-// Compiled twice: USER_LOOP names the function here, and stands for the flags in force.
+// Compiled twice: USER_LOOP is the name of the function, by the flags in force.
 
 #include "user_loops.h"
 

@@ -1,7 +1,7 @@
 #!/usr/bin/python3
 """Writes the named inputs of corpus/npy_files: make_npy_seeds.py [FOLDER].
 
-An input is an .npy file, two of them, one behind the other, or an .npz archive.
+An input is an .npy file, two of them, one after the other, or an .npz archive.
 """
 
 import io

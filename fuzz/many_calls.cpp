@@ -19,7 +19,7 @@ double next_tolerance(InputDraws& draws, oracle::RandomTolerances& tolerances) {
     return draws.rarely(8) ? tolerance + 0x1p-22 * draws.between(0, 15) : tolerance;
 }
 
-// One or more pairs to each call, mostly of reals; integers stand beside reals only.
+// One or more pairs to each call, mostly of reals; integers are compared with reals only.
 void make_call(InputDraws& draws, oracle::State& state, const double tolerance) {
     const int first_type = draws.pick({10, 9, 12, 11, 5, 8, 2});
     const int second_type = draws.pick({10, 9, 12, 11});

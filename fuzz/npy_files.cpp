@@ -63,7 +63,7 @@ bool is_product(std::uint64_t count, const talcmp::Shape& shape) {
     return count == 1;
 }
 
-// What stands in the dictionary of an accepted file, where "shape" and a '(' stand but once.
+// What the dictionary of an accepted file says, in which "shape" and a '(' occur only once.
 std::vector<std::string> written_dimensions(const std::string_view dictionary) {
     const std::size_t begin = dictionary.find('(');
     std::vector<std::string> dimensions;
@@ -289,7 +289,7 @@ Expected expected_answer(const OpenedArray& first, const OpenedArray& second,
     return expected;
 }
 
-// Moves behind `expected`.
+// Moves past `expected`.
 void pass(const char*& text, const std::string_view expected) {
     require(std::string_view(text).substr(0, expected.size()) == expected,
             "the difference is written as it should be");

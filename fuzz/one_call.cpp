@@ -21,7 +21,7 @@ constexpr std::size_t largest_element = 16;
 constexpr talint largest_int = std::numeric_limits<talint>::max();
 
 int drawn_type(InputDraws& draws) {
-    // Outside 1 to 12 stand neighbours of the range, and what one byte of an int would make a type.
+    // Neighbours of the range, and numbers whose lowest byte alone would be a type.
     constexpr int unknown[] = {0, 13, -1, 256 + 5, std::numeric_limits<int>::min()};
     return draws.rarely(32) ? draws.pick(unknown) : draws.between(1, 12);
 }

@@ -1,6 +1,6 @@
 ; Proves: what nearness.smt2 uses of the difference of two reals, and of the test where it is zero,
 ;   infinite or NaN.
-; Stands for: certainly_same_reals (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add for
+; Models: certainly_same_reals (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add for
 ;   nearness (talnumericarray_sameq_vectors.h).
 ; for: rounded single, rounded double
 ; with: real_type arithmetic certainty two_reals

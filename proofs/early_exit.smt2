@@ -1,6 +1,6 @@
 ; Proves: for tolerances up to `bits` - 1 the answer is the same whether the factor is remembered or
 ;   made anew.
-; Stands for: compare_impl (compare.h).
+; Models: compare_impl (compare.h).
 ; for: single, double
 ; with: real_type any_arithmetic rule two_reals
 ; fault: (far_apart d m)) s => (far_apart d m)) the_same

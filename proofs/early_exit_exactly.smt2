@@ -1,6 +1,6 @@
 ; Proves: a pair that is far apart is not within any factor up to 1/2, with exact results; as
 ;   rounding.smt2 says, rounding keeps the order.
-; Stands for: `far_apart` in compare_impl (compare.h).
+; Models: `far_apart` in compare_impl (compare.h).
 ; for: any
 ; with:
 ; fault: (<= f 0.5) => (< f 0.6)

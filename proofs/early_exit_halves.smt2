@@ -1,5 +1,5 @@
 ; Proves: half of a magnitude of 1 or more, and twice a difference below 1, are exact.
-; Stands for: `far_apart` in compare_impl (compare.h).
+; Models: `far_apart` in compare_impl (compare.h).
 ; for: rounded single, rounded double
 ; with: real_type arithmetic
 ; fault: (fp.geq m one) => (fp.gt m zero)

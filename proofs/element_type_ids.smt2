@@ -1,6 +1,6 @@
 ; Proves: one unsigned comparison of id - 1 with 11 finds the ids from 1 to 12, no negative one among
 ;   them, and so does a chain of equalities.
-; Stands for: with_element_type (talnumericarray_sameq_impl.h).
+; Models: with_element_type (talnumericarray_sameq_impl.h).
 ; for: any
 ; with: type_ids
 ; fault: (_ bv11 32)) => (_ bv12 32))

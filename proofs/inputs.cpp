@@ -132,32 +132,32 @@ void print_comparisons(const std::string& instance, const T tol, const T factor,
     }
 }
 
-// Of two reals, and of the second one as an imaginary part beside a real.
+// Calls `print(fused, x, y, answer)` for two reals, and for the second one as an imaginary part
+// beside a real.
+template <typename Bound, typename T, typename Print>
+void for_each_answer_of_reals(const Bound bound, const T x, const T y, const Print& print) {
+    print(false, x, y, talnumericarray::certainly_same(bound, x, y));
+    for_each_answer(bound, x, y,
+                    [&](const bool fused, const bool answer) { print(fused, x, y, answer); });
+    for_each_answer(bound, T{7}, std::complex<T>(7, y),
+                    [&](const bool fused, const bool answer) { print(fused, T{0}, y, answer); });
+}
+
 template <typename T>
 void print_certainty(const std::string& instance, const T divisor, const T x, const T y) {
-    const talnumericarray::nearness<T> near{divisor};
-    const auto print = [&](const bool fused, const bool answer) {
-        print_equation(instance, "certain", literal(answer), fused, divisor, x, y);
-    };
-    print(false, talnumericarray::certainly_same(near, x, y));
-    for_each_answer(near, x, y, print);
-    const auto print_part = [&](const bool fused, const bool answer) {
-        print_equation(instance, "certain", literal(answer), fused, divisor, T{0}, y);
-    };
-    for_each_answer(near, T{7}, std::complex<T>(7, y), print_part);
+    for_each_answer_of_reals(
+        talnumericarray::nearness<T>{divisor}, x, y,
+        [&](const bool fused, const T part1, const T part2, const bool answer) {
+            print_equation(instance, "certain", literal(answer), fused, divisor, part1, part2);
+        });
 }
 
 template <typename T>
 void print_equality(const std::string& instance, const T x, const T y) {
-    const auto print = [&](bool /*fused*/, const bool answer) {
-        print_equation(instance, "fp.eq", literal(answer), x, y);
-    };
-    print(false, talnumericarray::certainly_same(talnumericarray::equality{}, x, y));
-    for_each_answer(talnumericarray::equality{}, x, y, print);
-    const auto print_part = [&](bool /*fused*/, const bool answer) {
-        print_equation(instance, "fp.eq", literal(answer), T{0}, y);
-    };
-    for_each_answer(talnumericarray::equality{}, T{7}, std::complex<T>(7, y), print_part);
+    for_each_answer_of_reals(talnumericarray::equality{}, x, y,
+                             [&](bool /*fused*/, const T part1, const T part2, const bool answer) {
+                                 print_equation(instance, "fp.eq", literal(answer), part1, part2);
+                             });
 }
 
 // Each number with each, and with those at the limit of the tolerance below and above it.

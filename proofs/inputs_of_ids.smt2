@@ -1,5 +1,5 @@
 ; Proves: on the table of inputs the chain of equalities has the values that the dispatch has.
-; Stands for: with_element_type (talnumericarray_sameq_impl.h).
+; Models: with_element_type (talnumericarray_sameq_impl.h).
 ; for: any
 ; with: type_ids
 ; fault: (= id (_ bv7 32)) => (= id (_ bv13 32))

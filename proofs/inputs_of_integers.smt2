@@ -1,5 +1,5 @@
 ; Proves: on the table of inputs the formulas for integers have the values that the code has.
-; Stands for: the integer overloads of compare_impl (compare.h), and DoubtsAboutIntegers::add
+; Models: the integer overloads of compare_impl (compare.h), and DoubtsAboutIntegers::add
 ;   (talnumericarray_sameq_vectors.h).
 ; for: integers
 ; with: integer_tests

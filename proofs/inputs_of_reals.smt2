@@ -1,5 +1,5 @@
 ; Proves: on the table of inputs the formulas for reals have the values that the code has.
-; Stands for: compare_impl (compare.h), certain_divisor and certainly_same_reals
+; Models: compare_impl (compare.h), certain_divisor and certainly_same_reals
 ;   (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add (talnumericarray_sameq_vectors.h).
 ; for: rounded single, rounded double
 ; with: real_type arithmetic rule certainty

@@ -1,6 +1,6 @@
 ; Proves: the three-way comparison of two integers is that of the numbers, and the test is certain
 ;   exactly of equal numbers, for every two widths and signednesses.
-; Stands for: the integer overloads of compare_impl (compare.h), and DoubtsAboutIntegers::add
+; Models: the integer overloads of compare_impl (compare.h), and DoubtsAboutIntegers::add
 ;   (talnumericarray_sameq_vectors.h).
 ; for: integers
 ; with: integer_tests

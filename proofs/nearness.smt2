@@ -1,7 +1,7 @@
 ; Proves: under a tolerance above zero with a remembered factor, and under one of all digits, the
 ;   test is certain only of pairs that are the same; equal numbers are the same under any tolerance;
 ;   and beside a real an imaginary part passes exactly if it is a zero.
-; Stands for: compare_impl (compare.h), certainly_same_reals (talnumericarray_sameq_certainty.h),
+; Models: compare_impl (compare.h), certainly_same_reals (talnumericarray_sameq_certainty.h),
 ;   and DoubtsAboutReals::add and the zeros beside imaginary parts (talnumericarray_sameq_vectors.h).
 ; for: single, double
 ; with: real_type any_arithmetic rule certainty two_reals

@@ -1,6 +1,6 @@
 ; Proves: a number is never the same as one of the other sign, nor zero as anything but zero, under
 ;   any tolerance, factor and arithmetic.
-; Stands for: the steps of compare_impl (compare.h) before the tolerance is looked at.
+; Models: the steps of compare_impl (compare.h) before the tolerance matters.
 ; for: single, double
 ; with: real_type any_arithmetic rule two_reals
 ; fault: (ite (fp.isZero x) => (ite (fp.isNaN x)

@@ -3,10 +3,10 @@
     prove.py INPUTS [NAME...]
 
 INPUTS is the program that is built from inputs.cpp. A proof is a file that begins with what it
-proves and which code it stands for. The lines behind that say
+proves and which code it models. The lines after that say
 
-    ; for: the families it is proved for, each of them a set of values for the names behind "$"
-    ; with: the files that stand in front of it
+    ; for: the families it is proved for, each of them a set of values for the names after "$"
+    ; with: the files that come before it
     ; fault: TEXT => OTHER, a change somewhere in all this after which a claim must not hold
 
 Every function whose name begins with "claim" is proved: cvc5 has to find nothing that contradicts

@@ -1,6 +1,6 @@
 ; Proves: what the other proofs use of rounding, in any direction: it keeps the order, it does not
 ;   bring an exact result past a number, and it is off by less than the numbers there are apart.
-; Stands for: every operation of compare.h and talnumericarray_sameq_certainty.h, as IEEE 754
+; Models: every operation of compare.h and talnumericarray_sameq_certainty.h, as IEEE 754
 ;   defines them: of the numbers of the type on the side that is asked for, the result is one nearest
 ;   to the exact one.
 ; for: directions
@@ -15,7 +15,7 @@
   (ite (= $direction RTN) (<= z w)
   (ite (= $direction RTZ) (ite (< w 0.0) (>= z w) (<= z w))
     true))))
-; `rounded` is what `w` is rounded to, as far as the number `z` can tell.
+; `rounded` is what `w` is rounded to, as far as the number `z` shows.
 (define-fun rounds ((w Real) (rounded Real) (z Real)) Bool
   (and (on_side rounded w)
        (=> (on_side z w) (<= (distance rounded w) (distance z w)))))

@@ -14,7 +14,7 @@
 (define-fun within ((factor T) (d T) (m T)) Bool
   (ite (fp.geq m one) (fp.lt d (times m factor)) (fp.lt (over d factor) m)))
 
-; The steps with a tolerance above zero and below `bits`. `remembered` tells whether the factor is.
+; The steps with a tolerance above zero and below `bits`. `remembered` is whether the factor is.
 (define-fun by_factor ((factor T) (remembered Bool) (x T) (y T)) Verdict
   (let ((s (ite (fp.lt y x) above below)) (d (diff x y)) (m (larger x y)))
     (ite (fp.eq d m) s

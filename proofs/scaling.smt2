@@ -1,6 +1,6 @@
 ; Proves: for any factor, if the difference times the divisor is below the magnitude, the pair is
 ;   within the factor.
-; Stands for: certain_divisor (talnumericarray_sameq_certainty.h), and the scaling in compare_impl
+; Models: certain_divisor (talnumericarray_sameq_certainty.h), and the scaling in compare_impl
 ;   (compare.h).
 ; for: single, double
 ; with:

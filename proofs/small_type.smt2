@@ -1,5 +1,5 @@
 ; Proves: what nearness.smt2 does, at one go and without its lemmas, for reals of six digits.
-; Stands for: compare_impl (compare.h), certain_divisor and certainly_same_reals
+; Models: compare_impl (compare.h), certain_divisor and certainly_same_reals
 ;   (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add (talnumericarray_sameq_vectors.h).
 ; for: rounded small
 ; with: real_type arithmetic rule certainty two_reals

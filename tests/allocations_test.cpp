@@ -37,7 +37,7 @@ extern "C" int __sanitizer_install_malloc_and_free_hooks(
 
 namespace {
 
-// The sanitizers have replaced the functions already, and tell of each call.
+// The sanitizers have replaced the functions already, and report each call.
 const int hooks_installed = __sanitizer_install_malloc_and_free_hooks(
     [](const volatile void* /*block*/, std::size_t /*size*/) {
         allocator_calls = allocator_calls + 1;
@@ -121,7 +121,7 @@ TEST(Allocations, AreCounted) {
 
 TEST(Allocations, ThatAreAlignedAreCounted) {
     if (thread_sanitizer) {
-        GTEST_SKIP() << "NOT TESTED: ThreadSanitizer does not tell of them";
+        GTEST_SKIP() << "NOT TESTED: ThreadSanitizer does not report them";
     }
     EXPECT_EQ(allocator_calls_of([] { kept = std::aligned_alloc(64, 64); }), 1);
     std::free(kept);

@@ -49,7 +49,7 @@ TEST(Shape, EqualShapesAndTypesAreEquivalentWhateverTheElements) {
     EXPECT_EQ(sameQ(0, array1, array2), 0);
 }
 
-// No array has such dimensions, but records of them are told apart by every bit all the same.
+// No array has such dimensions, but records of them differ by every bit all the same.
 TEST(Shape, DimensionsThatDifferInTheSignAloneAreNeitherSameNorEquivalent) {
     constexpr talint sign = std::numeric_limits<talint>::min();
     for (const std::size_t place : {0U, 1U}) {
@@ -188,30 +188,6 @@ TEST(Dispatch, LoopTakesANegativeCountForNoElements) {
 }
 
 // ---- Bytes
-
-TEST(Bytes, IntegersOfOneTypeIgnoreTheTolerance) {
-    const Array<BIT32> array1 = {1, 2, 3};
-    const Array<BIT32> array2 = {1, 2, 3};
-    const Array<BIT32> array3 = {1, 2, 4};
-    for (const double tol : {0.0, 1e300, nan, -5.0, 60.0}) {
-        EXPECT_EQ(sameQ(tol, array1, array2), 1) << tol;
-        EXPECT_EQ(sameQ(tol, array1, array3), 0) << tol;
-    }
-}
-
-TEST(Bytes, ZerosOfBothSignsDifferUnderToleranceZero) {
-    EXPECT_EQ(sameQ_of(0.0, 0.0, -0.0), 0);
-    EXPECT_EQ(sameQ_of(-0.0, 0.0, -0.0), 0);
-    EXPECT_EQ(sameQ_of(1e-10, 0.0, -0.0), 1);
-    EXPECT_EQ(sameQ_of(nan, 0.0, -0.0), 1);
-}
-
-TEST(Bytes, NaNsOfEqualBitsAreTheSameUnderToleranceZero) {
-    const float quiet = std::numeric_limits<float>::quiet_NaN();
-    EXPECT_EQ(sameQ_of(0.0, quiet, quiet), 1);
-    EXPECT_EQ(sameQ_of(0.0, quiet, -quiet), 0);
-    EXPECT_EQ(sameQ_of(10.0, quiet, quiet), 0);
-}
 
 // One differing byte at each place.
 TEST(Bytes, EveryByteOfEveryElementIsCompared) {

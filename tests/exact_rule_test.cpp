@@ -21,8 +21,13 @@ namespace {
 using exact_rule::Number;
 using exactness::Extent;
 using exactness::Factor;
+using exactness::factors;
+using exactness::first_rounded_up;
 using exactness::Kind;
+using exactness::kinds;
 using exactness::Place;
+using exactness::places;
+using exactness::Tallies;
 using exactness::Tally;
 
 constexpr double infinity = std::numeric_limits<double>::infinity();
@@ -56,7 +61,7 @@ const Case cases[] = {
     {"less than none", -3, 53, 1.0, 1 - 0x1p-53, false},
     {"not a number", nan, 53, 1.0, 1 - 0x1p-53, false},
     {"equal under none", -infinity, 53, 1.5, 1.5, true},
-    // 1 - 2^-(2^-47) is ln 2 * 2^-47 but for 2^-95, and ln 2 is between 1/2 and 1.
+    // 1 - 2^-(2^-47) is ln 2 * 2^-47, give or take 2^-95, and ln 2 is between 1/2 and 1.
     {"nearly all digits", 53 - 0x1p-47, 53, 1.0, 0x1p-47, true},
     {"nearly all digits, too small", 53 - 0x1p-47, 53, 1.0, 0x1p-48, false},
     {"all digits", 53, 53, 1.0, 1e300, true},
@@ -145,28 +150,22 @@ const Parting<float> partings_of_singles[] = {
     {"half the larger or more", 23.5F, 2.5F, 1, true, true, false},
 };
 
-template <typename T>
-bool same_by_steps(const Factor factor, const Parting<T>& parting) {
-    exactness::prepare(factor, parting.tolerance);
-    return nesk::compare(parting.tolerance, parting.x, parting.y) == 0;
-}
-
-template <typename T>
-void expect(const Parting<T>& parting) {
-    constexpr int digits = std::numeric_limits<T>::digits;
-    EXPECT_EQ(exact_rule::same(parting.tolerance, digits, parting.x, parting.y), parting.meant)
-        << parting.name;
-    EXPECT_EQ(same_by_steps(Factor::remembered, parting), parting.while_remembered) << parting.name;
-    EXPECT_EQ(same_by_steps(Factor::forgotten, parting), parting.while_forgotten) << parting.name;
+template <typename T, std::size_t count>
+void expect_to_part(const Parting<T> (&partings)[count]) {
+    for (const Parting<T>& parting : partings) {
+        const auto& [name, tolerance, x, y, meant, while_remembered, while_forgotten] = parting;
+        constexpr int digits = std::numeric_limits<T>::digits;
+        EXPECT_EQ(exact_rule::same(tolerance, digits, x, y), meant) << name;
+        exactness::prepare(Factor::remembered, tolerance);
+        EXPECT_EQ(nesk::compare(tolerance, x, y) == 0, while_remembered) << name;
+        exactness::prepare(Factor::forgotten, tolerance);
+        EXPECT_EQ(nesk::compare(tolerance, x, y) == 0, while_forgotten) << name;
+    }
 }
 
 TEST(StepsAndMeaning, PartInTheseExamples) {
-    for (const auto& parting : partings_of_doubles) {
-        expect(parting);
-    }
-    for (const auto& parting : partings_of_singles) {
-        expect(parting);
-    }
+    expect_to_part(partings_of_doubles);
+    expect_to_part(partings_of_singles);
 }
 
 // What is rounded before it is compared.
@@ -192,90 +191,81 @@ constexpr Extent extent(const Place place) {
     return {place == Place::random ? random_pairs : pairs_at_limit, 1};
 }
 
-constexpr Kind kinds[] = {Kind::none, Kind::whole, Kind::fractional, Kind::last_digit, Kind::all};
-constexpr Factor factors[] = {Factor::remembered, Factor::forgotten};
-constexpr Place places[] = {Place::random, Place::at_limit};
-
 void expect_explained(const Tally& tally) {
     EXPECT_GT(tally.pairs, 0U);
     EXPECT_EQ(tally.unexplained, 0U) << tally.first_unexplained;
 }
 
-template <typename T>
-void expect_agreement(oracle::Random& random, const Kind kind) {
-    for (const Factor factor : factors) {
-        for (const Place place : places) {
-            const auto tallies =
-                exactness::survey_reals<T>(random, kind, factor, place, extent(place));
-            for (const Tally& tally : {tallies.normal, tallies.subnormal}) {
-                expect_explained(tally);
-                EXPECT_EQ(tally.stricter + tally.laxer, 0U);
-            }
+// Calls `check(tallies, place)` for doubles and for singles, at random and at the limit.
+template <typename Check>
+void survey_reals(oracle::Random& random, const Kind kind, const Factor factor,
+                  const Check& check) {
+    for (const Place place : places) {
+        const Extent all = extent(place);
+        for (const Tallies& tallies :
+             {exactness::survey_reals<double>(random, kind, factor, place, all),
+              exactness::survey_reals<float>(random, kind, factor, place, all)}) {
+            expect_explained(tallies.normal);
+            expect_explained(tallies.subnormal);
+            check(tallies, place);
         }
+    }
+}
+
+void expect_agreement(const Tallies& tallies, const Place /*place*/) {
+    for (const Tally& tally : {tallies.normal, tallies.subnormal}) {
+        EXPECT_EQ(tally.stricter + tally.laxer, 0U);
     }
 }
 
 TEST(StepsAndMeaning, AgreeUnderWholeTolerances) {
     oracle::Random random(oracle::printed_seed());
-    expect_agreement<double>(random, Kind::whole);
-    expect_agreement<float>(random, Kind::whole);
+    for (const Factor factor : factors) {
+        survey_reals(random, Kind::whole, factor, expect_agreement);
+    }
 }
 
 TEST(StepsAndMeaning, AgreeWhereNoFactorIsNeeded) {
     oracle::Random random(oracle::printed_seed());
     for (const Kind kind : {Kind::none, Kind::all}) {
-        expect_agreement<double>(random, kind);
-        expect_agreement<float>(random, kind);
+        for (const Factor factor : factors) {
+            survey_reals(random, kind, factor, expect_agreement);
+        }
     }
 }
 
-template <typename T>
-void expect_small_differences(oracle::Random& random, const Kind kind, const Factor factor) {
-    for (const Place place : places) {
-        const auto tallies = exactness::survey_reals<T>(random, kind, factor, place, extent(place));
-        expect_explained(tallies.normal);
-        expect_explained(tallies.subnormal);
-        if (place == Place::at_limit) {
-            EXPECT_GT(tallies.normal.stricter, 0U);
-            EXPECT_GT(tallies.subnormal.stricter, 0U);
-        }
+void expect_differences_at_limit(const Tallies& tallies, const Place place) {
+    if (place == Place::at_limit) {
+        EXPECT_GT(tallies.normal.stricter, 0U);
+        EXPECT_GT(tallies.subnormal.stricter, 0U);
     }
 }
 
 TEST(StepsAndMeaning, DifferAtTheLimitOfAFractionalTolerance) {
     oracle::Random random(oracle::printed_seed());
     for (const Factor factor : factors) {
-        expect_small_differences<double>(random, Kind::fractional, factor);
-        expect_small_differences<float>(random, Kind::fractional, factor);
+        survey_reals(random, Kind::fractional, factor, expect_differences_at_limit);
     }
 }
 
 TEST(StepsAndMeaning, DifferAtTheLimitOfTheLastDigitOnceItsFactorIsRemembered) {
     oracle::Random random(oracle::printed_seed());
-    expect_small_differences<double>(random, Kind::last_digit, Factor::remembered);
-    expect_small_differences<float>(random, Kind::last_digit, Factor::remembered);
+    survey_reals(random, Kind::last_digit, Factor::remembered, expect_differences_at_limit);
 }
 
-template <typename T>
-void expect_early_exits(oracle::Random& random) {
-    for (const Place place : places) {
-        const auto tallies = exactness::survey_reals<T>(random, Kind::last_digit, Factor::forgotten,
-                                                        place, extent(place));
-        for (const Tally& tally : {tallies.normal, tallies.subnormal}) {
-            expect_explained(tally);
-            EXPECT_GT(tally.stricter, 0U);
-            EXPECT_EQ(tally.laxer, 0U);
-        }
+void expect_early_exits(const Tallies& tallies, const Place /*place*/) {
+    for (const Tally& tally : {tallies.normal, tallies.subnormal}) {
+        EXPECT_GT(tally.stricter, 0U);
+        EXPECT_EQ(tally.laxer, 0U);
     }
 }
 
 TEST(StepsAndMeaning, DifferFromHalfTheLargerOnBeforeTheFactorOfTheLastDigitIsRemembered) {
     oracle::Random random(oracle::printed_seed());
-    expect_early_exits<double>(random);
-    expect_early_exits<float>(random);
+    survey_reals(random, Kind::last_digit, Factor::forgotten, expect_early_exits);
 }
 
-// ---- Whole arrays, some of them long enough to be looked at in blocks
+// ---- Whole arrays, some of them long enough for blocks
 
 template <typename T>
 struct Columns {
@@ -357,7 +347,6 @@ TEST(StepsAndMeaning, StepsAreThoseOfThePredicate) {
 
 TEST(StepsAndMeaning, DifferAsFarAsTheToleranceOfSinglesIsRounded) {
     oracle::Random random(oracle::printed_seed());
-    constexpr double first_rounded_up = 24 - 0x1p-20;
     const auto examine = [&](const double low, const double high, const Place place) {
         Tally tally = exactness::survey_rounded_tolerances(random, low, high, place, {20000, 1});
         expect_explained(tally);

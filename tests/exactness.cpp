@@ -24,12 +24,13 @@ namespace {
 
 using exactness::Extent;
 using exactness::Factor;
+using exactness::factors;
+using exactness::first_rounded_up;
 using exactness::Kind;
+using exactness::kinds;
 using exactness::Place;
+using exactness::places;
 using exactness::Tally;
-
-constexpr Kind kinds[] = {Kind::none, Kind::whole, Kind::fractional, Kind::last_digit, Kind::all};
-constexpr Factor factors[] = {Factor::remembered, Factor::forgotten};
 
 // ---- The extent of the run
 
@@ -42,8 +43,6 @@ struct Range {
     double high;
 };
 
-// From half a unit in the last place of 24 below it, a tolerance is rounded to 24.
-constexpr double first_rounded_up = 24 - 0x1p-20;
 constexpr Range ranges[] = {{"0 to 1", 0, 1},
                             {"1 to 2", 1, 2},
                             {"2 to 4", 2, 4},
@@ -174,7 +173,7 @@ void survey_reals(oracle::Random& random, const std::uint64_t pairs, RealRows& r
         for (const Factor factor : factors) {
             rows.normal.push_back(row_of<T>(kind, factor));
             rows.subnormal.push_back(row_of<T>(kind, factor));
-            for (const Place place : {Place::random, Place::at_limit}) {
+            for (const Place place : places) {
                 const auto tallies =
                     exactness::survey_reals<T>(random, kind, factor, place, part_of(pairs, place));
                 tally_of(rows.normal.back(), place) = tallies.normal;
@@ -189,7 +188,7 @@ void survey_integers(oracle::Random& random, const std::uint64_t pairs, std::vec
     for (const Kind kind : kinds) {
         for (const Factor factor : factors) {
             rows.push_back(row_of<T>(kind, factor));
-            for (const Place place : {Place::random, Place::at_limit}) {
+            for (const Place place : places) {
                 const Extent extent = part_of(pairs, place);
                 Tally& tally = tally_of(rows.back(), place);
                 add(tally, exactness::survey_integers<std::int64_t, T>(random, kind, factor, place,
@@ -205,7 +204,7 @@ std::vector<Row> survey_rounded_tolerances(oracle::Random& random, const std::ui
     std::vector<Row> rows;
     for (const Range& range : ranges) {
         rows.push_back({range.name, 24, {}, {}});
-        for (const Place place : {Place::random, Place::at_limit}) {
+        for (const Place place : places) {
             tally_of(rows.back(), place) = exactness::survey_rounded_tolerances(
                 random, range.low, range.high, place, part_of(pairs, place));
         }

@@ -5,6 +5,7 @@
 #include "talnumericarray_sameq_impl.h"
 
 #include "support/array_record.h"
+#include "support/type_pairs.h"
 
 #include <gtest/gtest.h>
 
@@ -37,11 +38,38 @@ std::uint64_t wrong_answers(const Answer& answer) {
     return wrong;
 }
 
-template <typename T1, typename T2>
-std::uint64_t wrong_answers_of_predicate() {
-    return wrong_answers<T1, T2>([](TalNumericArray na1, TalNumericArray na2) {
-        return TalNumericArray_sameQ(10, 1, na1, na2);
-    });
+using IntegersOf8Bits = type_list<BIT8, UBIT8>;
+using IntegersOf16Bits = type_list<BIT16, UBIT16>;
+
+template <typename Types1, typename Types2>
+void expect_right_answers(const Types1 types1, const Types2 types2) {
+    for_each_type_of(
+        [&](auto tag1) {
+            for_each_type_of(
+                [&](auto tag2) {
+                    using T1 = typename decltype(tag1)::type;
+                    using T2 = typename decltype(tag2)::type;
+                    const auto answer = [](TalNumericArray na1, TalNumericArray na2) {
+                        return TalNumericArray_sameQ(10, 1, na1, na2);
+                    };
+                    EXPECT_EQ((wrong_answers<T1, T2>(answer)), 0U)
+                        << element_type_id<T1> << " and " << element_type_id<T2>;
+                },
+                types2);
+        },
+        types1);
+}
+
+TEST(AllValues, Of8BitsAgainst8Bits) {
+    expect_right_answers(IntegersOf8Bits{}, IntegersOf8Bits{});
+}
+
+TEST(AllValues, Of8BitsAgainst16Bits) {
+    expect_right_answers(IntegersOf8Bits{}, IntegersOf16Bits{});
+}
+
+TEST(AllValues, Of16BitsAgainst8Bits) {
+    expect_right_answers(IntegersOf16Bits{}, IntegersOf8Bits{});
 }
 
 // Below the checks of shape and type, which have no values to try.
@@ -51,27 +79,6 @@ std::uint64_t wrong_answers_of_pair_routine() {
         const talreal tol = 10;
         return TalNumericArray_sameQ_impl<T1, T2>(tol, na1, na2);
     });
-}
-
-TEST(AllValues, Of8BitsAgainst8Bits) {
-    EXPECT_EQ((wrong_answers_of_predicate<BIT8, BIT8>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<BIT8, UBIT8>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, BIT8>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, UBIT8>()), 0U);
-}
-
-TEST(AllValues, Of8BitsAgainst16Bits) {
-    EXPECT_EQ((wrong_answers_of_predicate<BIT8, BIT16>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<BIT8, UBIT16>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, BIT16>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<UBIT8, UBIT16>()), 0U);
-}
-
-TEST(AllValues, Of16BitsAgainst8Bits) {
-    EXPECT_EQ((wrong_answers_of_predicate<BIT16, BIT8>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<BIT16, UBIT8>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<UBIT16, BIT8>()), 0U);
-    EXPECT_EQ((wrong_answers_of_predicate<UBIT16, UBIT8>()), 0U);
 }
 
 TEST(ExhaustiveAllValuesOf16Bits, SignedAgainstSigned) {

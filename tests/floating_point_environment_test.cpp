@@ -1,5 +1,5 @@
-// What a comparison leaves behind in the floating-point environment: status flags that it has
-// raised, and nothing else; nor does it touch errno.
+// What a comparison changes in the floating-point environment: it may raise status flags, and
+// changes nothing else. Nor does it touch errno.
 
 #include "support/arrays.h"
 #include "support/child_process.h"
@@ -16,6 +16,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <functional>
 #include <limits>
 #include <vector>
 
@@ -83,18 +84,23 @@ TEST(StatusFlags, AreNeverCleared) {
     }
 }
 
-// The flags that a new thread's first comparison raises, of two arrays of one value each.
+// Of so many elements in both arrays, the flags that a new thread's first comparison raises.
+using FlagsOf = std::function<int(std::size_t count)>;
+
+// Of two arrays of one value each.
 template <typename T1, typename T2>
-int flags_of(const double tol, const T1 value1, const T2 value2, const std::size_t count) {
-    const Array<T1> array1({static_cast<talint>(count)}, std::vector<T1>(count, value1));
-    const Array<T2> array2({static_cast<talint>(count)}, std::vector<T2>(count, value2));
-    int flags = 0;
-    in_new_thread([&] {
-        std::feclearexcept(FE_ALL_EXCEPT);
-        sameQ(tol, array1, array2);
-        flags = std::fetestexcept(FE_ALL_EXCEPT);
-    });
-    return flags;
+FlagsOf flags_of(const double tol, const T1 value1, const T2 value2) {
+    return [=](const std::size_t count) {
+        const Array<T1> array1({static_cast<talint>(count)}, std::vector<T1>(count, value1));
+        const Array<T2> array2({static_cast<talint>(count)}, std::vector<T2>(count, value2));
+        int flags = 0;
+        in_new_thread([&] {
+            std::feclearexcept(FE_ALL_EXCEPT);
+            sameQ(tol, array1, array2);
+            flags = std::fetestexcept(FE_ALL_EXCEPT);
+        });
+        return flags;
+    };
 }
 
 // Clang compares by instructions that find nothing invalid in a NaN, unless it makes vectors of
@@ -107,10 +113,10 @@ constexpr int invalid_of_nan = FE_INVALID;
 
 struct FlagCase {
     const char* name;
-    int (*flags_of)(std::size_t count);
+    FlagsOf flags_of;
     int always;
     int at_most;         // by a single element
-    int at_most_in_many; // and by many, which are looked at in blocks
+    int at_most_in_many; // and by many, which are compared in blocks
 };
 
 constexpr int inexact = FE_INEXACT;
@@ -119,40 +125,23 @@ constexpr int too_large = FE_OVERFLOW | FE_INEXACT;
 constexpr int too_small = FE_UNDERFLOW | FE_INEXACT;
 
 const FlagCase flag_cases[] = {
-    {"integers", [](std::size_t count) { return flags_of(10, 5, std::int64_t{6}, count); }, 0, 0,
-     0},
-    {"bits", [](std::size_t count) { return flags_of(0, nan, nan, count); }, 0, 0, 0},
-    {"equal", [](std::size_t count) { return flags_of(10, 1.0, 1.0, count); }, 0, 0, inexact},
-    {"zero", [](std::size_t count) { return flags_of(10, 0.0, 1.0, count); }, 0, 0, inexact},
-    {"near", [](std::size_t count) { return flags_of(10, 1.0, 1 + 0x1p-44, count); }, 0, 0,
-     inexact},
-    {"near, fractional tolerance",
-     [](std::size_t count) { return flags_of(10.5, 1.0, 1 + 0x1p-44, count); }, inexact, inexact,
-     inexact},
-    {"vanishing beside the other",
-     [](std::size_t count) { return flags_of(10, 1.0, 1e-17, count); }, inexact, inexact, inexact},
-    {"integer beside a single",
-     [](std::size_t count) { return flags_of(10, 16777217, 16777216.0F, count); }, inexact, inexact,
-     inexact},
-    {"largest, of both signs",
-     [](std::size_t count) { return flags_of(10, largest, -largest, count); }, 0, 0, too_large},
-    {"subnormal", [](std::size_t count) { return flags_of(10, subnormal, subnormal, count); }, 0, 0,
-     inexact},
+    {"integers", flags_of(10, 5, std::int64_t{6}), 0, 0, 0},
+    {"bits", flags_of(0, nan, nan), 0, 0, 0},
+    {"equal", flags_of(10, 1.0, 1.0), 0, 0, inexact},
+    {"zero", flags_of(10, 0.0, 1.0), 0, 0, inexact},
+    {"near", flags_of(10, 1.0, 1 + 0x1p-44), 0, 0, inexact},
+    {"near, fractional tolerance", flags_of(10.5, 1.0, 1 + 0x1p-44), inexact, inexact, inexact},
+    {"vanishing beside the other", flags_of(10, 1.0, 1e-17), inexact, inexact, inexact},
+    {"integer beside a single", flags_of(10, 16777217, 16777216.0F), inexact, inexact, inexact},
+    {"largest, of both signs", flags_of(10, largest, -largest), 0, 0, too_large},
+    {"subnormal", flags_of(10, subnormal, subnormal), 0, 0, inexact},
     {"subnormal difference, fractional tolerance",
-     [](std::size_t count) { return flags_of(10.5, 0x1p-1022, 0x1.0000000000003p-1022, count); }, 0,
-     too_small, too_small},
-    {"tolerance beyond singles",
-     [](std::size_t count) { return flags_of(1e300, 1.0F, 2.0F, count); }, too_large, too_large,
-     too_large},
-    {"tolerance below singles",
-     [](std::size_t count) { return flags_of(1e-300, 1.0F, 2.0F, count); }, too_small, too_small,
-     too_small},
-    {"infinities", [](std::size_t count) { return flags_of(53, infinity, infinity, count); }, 0, 0,
-     invalid},
-    {"NaN", [](std::size_t count) { return flags_of(10, nan, 1.0, count); }, invalid_of_nan,
-     invalid, invalid},
-    {"NaN as tolerance", [](std::size_t count) { return flags_of(nan, 1.0, 1.25, count); },
-     invalid_of_nan, invalid, invalid},
+     flags_of(10.5, 0x1p-1022, 0x1.0000000000003p-1022), 0, too_small, too_small},
+    {"tolerance beyond singles", flags_of(1e300, 1.0F, 2.0F), too_large, too_large, too_large},
+    {"tolerance below singles", flags_of(1e-300, 1.0F, 2.0F), too_small, too_small, too_small},
+    {"infinities", flags_of(53, infinity, infinity), 0, 0, invalid},
+    {"NaN", flags_of(10, nan, 1.0), invalid_of_nan, invalid, invalid},
+    {"NaN as tolerance", flags_of(nan, 1.0, 1.25), invalid_of_nan, invalid, invalid},
 };
 
 TEST(StatusFlags, AreRaisedAsDocumented) {
@@ -168,71 +157,49 @@ TEST(StatusFlags, AreRaisedAsDocumented) {
     }
 }
 
-// Random arrays of any two types.
-class RandomArrays {
-  public:
-    void draw(oracle::Random& random, const double tol) {
-        const ElementType* types[2] = {};
-        for (const ElementType*& type : types) {
-            type = &element_types[random.below(static_cast<std::uint32_t>(element_types.size()))];
-        }
-        count_ = random.one_in(8) ? oracle::largest_count : random.between(1, 5);
-        oracle::fill_arrays(random, tol, types[0]->id, types[1]->id, count_, bytes_[0], bytes_[1]);
-        are_finite_ = true;
-        for (const int side : {0, 1}) {
-            records_[side] = record_of(types[side]->id, bytes_[side], count_);
-            are_finite_ = are_finite_ && is_finite(*types[side], bytes_[side]);
+template <typename T>
+bool are_finite_parts(const unsigned char* bytes, const std::size_t size) {
+    T part = 0;
+    for (std::size_t offset = 0; offset < size; offset += sizeof part) {
+        std::memcpy(&part, bytes + offset, sizeof part);
+        if (!std::isfinite(part)) {
+            return false;
         }
     }
+    return true;
+}
 
-    bool are_finite() const { return are_finite_; }
+bool are_finite(const ElementType& type, AnyArray& array, const talint count) {
+    const std::size_t size = static_cast<std::size_t>(count) * type.size;
+    return type.is_integer
+           || (type.holds_doubles() ? are_finite_parts<double>(array.bytes(), size)
+                                    : are_finite_parts<float>(array.bytes(), size));
+}
 
-    int flags_of_comparison(const double tol) {
-        std::feclearexcept(FE_ALL_EXCEPT);
-        TalNumericArray_sameQ(tol, 1, &records_[0], &records_[1]);
-        return std::fetestexcept(FE_ALL_EXCEPT);
-    }
-
-  private:
-    bool is_finite(const ElementType& type, const unsigned char* bytes) const {
-        const std::size_t size = static_cast<std::size_t>(count_) * type.size;
-        return type.is_integer
-               || (type.part_size == sizeof(float) ? are_finite_parts<float>(bytes, size)
-                                                   : are_finite_parts<double>(bytes, size));
-    }
-
-    template <typename T>
-    static bool are_finite_parts(const unsigned char* bytes, const std::size_t size) {
-        T part = 0;
-        for (std::size_t offset = 0; offset < size; offset += sizeof part) {
-            std::memcpy(&part, bytes + offset, sizeof part);
-            if (!std::isfinite(part)) {
-                return false;
-            }
-        }
-        return true;
-    }
-
-    static constexpr std::size_t room = std::size_t{16} * oracle::largest_count;
-
-    alignas(16) unsigned char bytes_[2][room] = {};
-    talint count_ = 0;
-    st_TalDataArray records_[2] = {};
-    bool are_finite_ = false;
-};
+const ElementType& random_type(oracle::Random& random) {
+    return element_types[random.below(static_cast<std::uint32_t>(element_types.size()))];
+}
 
 TEST(StatusFlags, NeverSayDivisionByZeroNorInvalidOfFiniteNumbers) {
     constexpr int calls = 100000;
     constexpr std::uint64_t seed = 1;
     oracle::Random random(seed);
-    RandomArrays arrays;
     int raised_of_finite = 0;
     int raised_of_others = 0;
     for (int call = 0; call < calls; ++call) {
         const double tol = oracle::random_tolerance(random);
-        arrays.draw(random, tol);
-        const int flags = arrays.flags_of_comparison(tol);
-        (arrays.are_finite() && !std::isnan(tol) ? raised_of_finite : raised_of_others) |= flags;
+        const ElementType& type1 = random_type(random);
+        const ElementType& type2 = random_type(random);
+        const talint count = random.one_in(8) ? oracle::largest_count : random.between(1, 5);
+        AnyArray array1(type1, std::vector<int>(static_cast<std::size_t>(count)));
+        AnyArray array2(type2, std::vector<int>(static_cast<std::size_t>(count)));
+        oracle::fill_arrays(random, tol, type1.id, type2.id, count, array1.bytes(), array2.bytes());
+        std::feclearexcept(FE_ALL_EXCEPT);
+        TalNumericArray_sameQ(tol, 1, array1.handle(), array2.handle());
+        const int flags = std::fetestexcept(FE_ALL_EXCEPT);
+        const bool all_finite = !std::isnan(tol) && are_finite(type1, array1, count)
+                                && are_finite(type2, array2, count);
+        (all_finite ? raised_of_finite : raised_of_others) |= flags;
     }
     EXPECT_EQ(raised_of_finite, FE_OVERFLOW | FE_UNDERFLOW | FE_INEXACT);
     EXPECT_EQ(raised_of_others, FE_INVALID | FE_OVERFLOW | FE_UNDERFLOW | FE_INEXACT);

@@ -56,7 +56,7 @@ TEST(Fork, LeavesAChildThatCompares) {
     }
 }
 
-// Of numbers that differ by more than half the larger the answer tells what is remembered.
+// Of numbers that differ by more than half the larger the answer shows what is remembered.
 class WhatIsRemembered {
   public:
     bool is_the_factor() const noexcept { return answer(one_, far_) == 1; }

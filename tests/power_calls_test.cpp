@@ -23,7 +23,7 @@ void forget_calls() {
 
 } // namespace
 
-// The names that the linker's --wrap option gives to a function and to what stands before it.
+// The names that the linker's --wrap option gives to a function and to what replaces it.
 // NOLINTBEGIN(clang-diagnostic-reserved-identifier)
 extern "C" double __real_pow(double base, double exponent);
 extern "C" float __real_powf(float base, float exponent);

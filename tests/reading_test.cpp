@@ -1,4 +1,4 @@
-// What the predicates read: nothing behind the arrays, nothing behind the first pair that is not
+// What the predicates read: nothing after the arrays, nothing after the first pair that is not
 // the same, and never with a write.
 
 #include "talnumericarray_compare.h"
@@ -58,14 +58,15 @@ std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2
     return chosen;
 }
 
-// How far behind its last element an array's page may end: one of complex numbers need only be
+// How far after its last element an array's page may end: one of complex numbers need only be
 // aligned as its parts are, so that an element may lie in two pages.
 std::vector<std::size_t> phases(const ElementType& type) {
     return type.is_complex() ? std::vector<std::size_t>{0, type.part_size}
                              : std::vector<std::size_t>{0};
 }
 
-// All up to behind two blocks, those around the ends of two pages, and some between.
+// All up to the end of two blocks and a little more, those around the ends of two pages, and some
+// between.
 std::vector<std::size_t> positions(const ElementType& type1, const ElementType& type2) {
     std::set<std::size_t> chosen;
     const auto choose = [&chosen](const std::size_t first, const std::size_t last,
@@ -84,7 +85,7 @@ std::vector<std::size_t> positions(const ElementType& type1, const ElementType& 
     return {chosen.begin(), chosen.end()};
 }
 
-// Room for the longest arrays of the widest type, and for as much behind them.
+// Room for the longest arrays of the widest type, and for as much after them.
 class TwoMemories {
   public:
     // The ends of the arrays' last elements.
@@ -148,15 +149,15 @@ TEST(Reading, EndsWithTheArrays) {
     });
 }
 
-// How many elements of each array can be read behind the first pair that is not the same.
-struct Behind {
+// How many elements of each array can be read after the first pair that is not the same.
+struct After {
     std::size_t elements1, elements2;
 };
 
 // All but the last few end in one of the arrays within the page in which that pair is. In the
 // course of the runs it gets to every place in a page.
-std::vector<Behind> behind(const ElementType& type1, const ElementType& type2,
-                           const std::size_t run) {
+std::vector<After> readable_after(const ElementType& type1, const ElementType& type2,
+                                  const std::size_t run) {
     const std::size_t in_page1 = page / type1.size;
     const std::size_t in_page2 = page / type2.size;
     const std::size_t some1 = run * 5 % in_page1;
@@ -166,10 +167,10 @@ std::vector<Behind> behind(const ElementType& type1, const ElementType& type2,
     return {{0, 0}, {0, more2}, {more1, 0}, {some1, some2}, {some1, more2}, {more1, some2}};
 }
 
-// The arrays go on behind the readable memory.
+// The arrays go on after the readable memory.
 void expect_to_stop_at(const std::size_t position, const ElementType& type1,
                        const ElementType& type2, const TwoMemories::Ends& ends,
-                       const Filling& filling, const Behind& readable) {
+                       const Filling& filling, const After& readable) {
     unsigned char* const last1 = ends.end1 - (readable.elements1 + 1) * type1.size;
     unsigned char* const last2 = ends.end2 - (readable.elements2 + 1) * type2.size;
     const std::size_t count = position + 4 * page;
@@ -181,7 +182,7 @@ void expect_to_stop_at(const std::size_t position, const ElementType& type1,
             continue; // compared as bytes, of which memcmp may read all
         }
         EXPECT_EQ(TalNumericArray_sameQ(tol, 1, array1.handle(), array2.handle()), 0)
-            << "position " << position << ", tolerance " << tol << ", behind it "
+            << "position " << position << ", tolerance " << tol << ", after it "
             << readable.elements1 << " and " << readable.elements2;
     }
     type1.store(last1, filling.value1);
@@ -198,7 +199,7 @@ TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
         const std::vector<std::size_t> places = positions(type1, type2);
         const auto check = [&](const TwoMemories::Ends& ends, const Filling& filling) {
             for (const std::size_t position : places) {
-                const std::vector<Behind> all = behind(type1, type2, runs);
+                const std::vector<After> all = readable_after(type1, type2, runs);
                 const std::size_t stride = std::min(emulated_stride, all.size());
                 for (std::size_t i = runs % stride; i < all.size(); i += stride) {
                     expect_to_stop_at(position, type1, type2, ends, filling, all[i]);

@@ -42,7 +42,7 @@ TEST(Rounded, AnswersFollowTheRuleInEveryDirection) {
     }
 }
 
-// Arrays long enough for blocks, of sevens but for one hard pair behind the middle.
+// Arrays long enough for blocks, of sevens with one hard pair after the middle.
 template <typename T1, typename T2>
 void expect_no_mismatch_in_blocks(oracle::Random& random) {
     using T = type_common_t<T1, T2>;

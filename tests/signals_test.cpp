@@ -90,20 +90,6 @@ class Questions {
     std::vector<Question> questions_;
 };
 
-// Calls `check(interrupted, other)` for each of the first, and for one of the second under each
-// other tolerance, whose two take turns.
-template <typename Interrupted, typename Other, typename Check>
-void for_each_two_questions(const Questions<Interrupted>& questions, const Questions<Other>& others,
-                            const Check& check) {
-    for (std::size_t i = 0; i < questions.size(); ++i) {
-        for (std::size_t other = i % 2; other < others.size(); other += 2) {
-            if (others[other].tol != questions[i].tol) {
-                check(questions[i], others[other]);
-            }
-        }
-    }
-}
-
 // ---- The handler
 
 // What it asks, from one interruption to the next and then over again: nothing where it is null.
@@ -222,22 +208,29 @@ void expect_all_right(const Tally& tally) {
     EXPECT_EQ(tally.wrong_answers_afterwards, 0);
 }
 
-// `ask` may be interrupted.
+// Each question is interrupted by one of the others under each other tolerance, whose two take
+// turns. `ask` may be interrupted.
 template <typename Interrupted, typename Other>
 void ask_all(Tally& tally, const Questions<Interrupted>& questions, const Questions<Other>& others,
              const Ask ask) {
-    for_each_two_questions(questions, others,
-                           [&](const Question& interrupted, const Question& other) {
-                               for (const Script& script : scripts(interrupted, other)) {
-                                   for (const Question* remembered : {&interrupted, &other}) {
-                                       is_answered_right(*remembered);
-                                       const ScriptScope scope(script);
-                                       ++tally.comparisons;
-                                       tally.wrong_answers += ask(interrupted) ? 0 : 1;
-                                       ask_afterwards(tally, other, interrupted);
-                                   }
-                               }
-                           });
+    const auto ask_two = [&](const Question& interrupted, const Question& other) {
+        for (const Script& script : scripts(interrupted, other)) {
+            for (const Question* remembered : {&interrupted, &other}) {
+                is_answered_right(*remembered);
+                const ScriptScope scope(script);
+                ++tally.comparisons;
+                tally.wrong_answers += ask(interrupted) ? 0 : 1;
+                ask_afterwards(tally, other, interrupted);
+            }
+        }
+    };
+    for (std::size_t i = 0; i < questions.size(); ++i) {
+        for (std::size_t other = i % 2; other < others.size(); other += 2) {
+            if (others[other].tol != questions[i].tol) {
+                ask_two(questions[i], others[other]);
+            }
+        }
+    }
 }
 
 // ---- Interrupted after each instruction

@@ -1,5 +1,5 @@
 // How much stack a comparison takes: the stack of a thread is painted, all kinds of comparisons are
-// made on it, and the paint that is left tells how deep they went. What the program itself calls is
+// made on it, and the paint that is left shows how deep they went. What the program itself calls is
 // bound before, as the dynamic linker would need more than the comparisons do.
 
 #include "support/prepared_calls.h"
@@ -39,7 +39,7 @@ class PaintedStack {
         ASSERT_EQ(::pthread_attr_destroy(&attributes), 0);
     }
 
-    // All below the caller but for what this function takes, which calls nothing: on 32-bit ARM all
+    // All below the caller except what this function takes, which calls nothing: on 32-bit ARM all
     // comparisons take but little more.
     [[gnu::noinline]] void paint_below_caller() {
         constexpr std::ptrdiff_t own_frame = 128;

@@ -1,5 +1,5 @@
 // A comparison makes no system call, and so neither blocks nor waits: in the kernel's strict mode a
-// process that makes one is killed, but for the call that ends its only thread.
+// process that makes one is killed, except for the call that ends its only thread.
 
 #include "support/child_process.h"
 #include "support/prepared_calls.h"

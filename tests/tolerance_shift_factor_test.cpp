@@ -107,7 +107,7 @@ TEST(ToleranceShiftFactor, IsMadeWithPow) {
     }
     RecordProperty("where_exp2_differs", where_exp2_differs);
 #if defined(__GLIBC__) && defined(__x86_64__)
-    EXPECT_GT(where_exp2_differs, 0) << "the samples cannot tell pow from exp2";
+    EXPECT_GT(where_exp2_differs, 0) << "the samples cannot distinguish pow from exp2";
 #endif
 }
 

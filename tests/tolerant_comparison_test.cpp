@@ -149,7 +149,7 @@ T recalled_in_a_new_thread(const T tol) {
     return factor;
 }
 
-// No comparison can tell which it is, as none looks it up.
+// No comparison can show which it is, as none looks it up.
 template <typename T>
 void expect_a_true_factor_at_first() {
     constexpr int bits = std::numeric_limits<T>::digits;

@@ -49,7 +49,7 @@ class Sevens {
     alignas(2048) T2 data2_[most] = {};
 };
 
-// What the element rule says of a pair, and whether one that is the same may not be in doubt.
+// Whether a pair is the same by the element rule, and whether it may not be in doubt if it is.
 struct Ruling {
     bool same;
     bool beyond_doubt;

@@ -107,6 +107,16 @@ inline Result converted(const Vector& vector) noexcept {
     return vector_of<Result, To>(results);
 }
 
+// Of integers, which are in half of a vector or in the least one.
+template <typename To, typename From>
+constexpr auto widened() noexcept {
+    if constexpr (sizeof(To) == 2 * sizeof(From)) {
+        return converted<To, From, __m512i, __m256i>;
+    } else {
+        return converted<To, From, __m512i, __m128i>;
+    }
+}
+
 template <typename T, typename Mask, typename Vector>
 inline Vector permuted(const Mask mask, const Vector& places, const Vector& vector) noexcept {
     const auto from = lanes_of<T>(places);
@@ -172,30 +182,18 @@ namespace for_avx512_in_plain_code {
 
 // ---- The intrinsics
 
-inline constexpr auto _mm512_cvtepi8_epi16 =
-    plain::converted<std::int16_t, std::int8_t, __m512i, __m256i>;
-inline constexpr auto _mm512_cvtepi8_epi32 =
-    plain::converted<std::int32_t, std::int8_t, __m512i, __m128i>;
-inline constexpr auto _mm512_cvtepi8_epi64 =
-    plain::converted<std::int64_t, std::int8_t, __m512i, __m128i>;
-inline constexpr auto _mm512_cvtepi16_epi32 =
-    plain::converted<std::int32_t, std::int16_t, __m512i, __m256i>;
-inline constexpr auto _mm512_cvtepi16_epi64 =
-    plain::converted<std::int64_t, std::int16_t, __m512i, __m128i>;
-inline constexpr auto _mm512_cvtepi32_epi64 =
-    plain::converted<std::int64_t, std::int32_t, __m512i, __m256i>;
-inline constexpr auto _mm512_cvtepu8_epi16 =
-    plain::converted<std::uint16_t, std::uint8_t, __m512i, __m256i>;
-inline constexpr auto _mm512_cvtepu8_epi32 =
-    plain::converted<std::uint32_t, std::uint8_t, __m512i, __m128i>;
-inline constexpr auto _mm512_cvtepu8_epi64 =
-    plain::converted<std::uint64_t, std::uint8_t, __m512i, __m128i>;
-inline constexpr auto _mm512_cvtepu16_epi32 =
-    plain::converted<std::uint32_t, std::uint16_t, __m512i, __m256i>;
-inline constexpr auto _mm512_cvtepu16_epi64 =
-    plain::converted<std::uint64_t, std::uint16_t, __m512i, __m128i>;
-inline constexpr auto _mm512_cvtepu32_epi64 =
-    plain::converted<std::uint64_t, std::uint32_t, __m512i, __m256i>;
+inline constexpr auto _mm512_cvtepi8_epi16 = plain::widened<std::int16_t, std::int8_t>();
+inline constexpr auto _mm512_cvtepi8_epi32 = plain::widened<std::int32_t, std::int8_t>();
+inline constexpr auto _mm512_cvtepi8_epi64 = plain::widened<std::int64_t, std::int8_t>();
+inline constexpr auto _mm512_cvtepi16_epi32 = plain::widened<std::int32_t, std::int16_t>();
+inline constexpr auto _mm512_cvtepi16_epi64 = plain::widened<std::int64_t, std::int16_t>();
+inline constexpr auto _mm512_cvtepi32_epi64 = plain::widened<std::int64_t, std::int32_t>();
+inline constexpr auto _mm512_cvtepu8_epi16 = plain::widened<std::uint16_t, std::uint8_t>();
+inline constexpr auto _mm512_cvtepu8_epi32 = plain::widened<std::uint32_t, std::uint8_t>();
+inline constexpr auto _mm512_cvtepu8_epi64 = plain::widened<std::uint64_t, std::uint8_t>();
+inline constexpr auto _mm512_cvtepu16_epi32 = plain::widened<std::uint32_t, std::uint16_t>();
+inline constexpr auto _mm512_cvtepu16_epi64 = plain::widened<std::uint64_t, std::uint16_t>();
+inline constexpr auto _mm512_cvtepu32_epi64 = plain::widened<std::uint64_t, std::uint32_t>();
 
 inline constexpr auto _mm512_cvtepi32_ps = plain::converted<float, std::int32_t, __m512, __m512i>;
 inline constexpr auto _mm512_cvtepu32_ps = plain::converted<float, std::uint32_t, __m512, __m512i>;

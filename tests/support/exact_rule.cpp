@@ -68,7 +68,8 @@ bool within_whole(long shift, Pair& pair) {
 }
 
 // 2^exponent is irrational, as the exponent is no whole number, and the quotient of the difference
-// and the larger magnitude is rational: they are never equal, and enough digits tell them apart.
+// and the larger magnitude is rational: they are never equal, and enough digits show which is
+// greater.
 bool within_fractional(const Real& exponent, const Pair& pair) {
     for (mpfr_prec_t precision = 128;; precision *= 2) {
         Real low(precision);

@@ -70,7 +70,7 @@ class QuickRule {
 // ---- The steps
 
 // Whether the comparing thread remembers the factor of the tolerance. Only a pair that differs in
-// its leading digit can tell.
+// its leading digit can show it.
 enum class Factor { remembered, forgotten };
 
 // Compares a near pair, which needs the factor, under the tolerance or under another.
@@ -94,7 +94,7 @@ Kind kind_of(const T tolerance) {
 }
 
 // Shares of the larger magnitude. The steps are stricter than the meaning where they call different
-// what it calls the same, and laxer the other way round.
+// what it calls the same, and laxer where they do the reverse.
 struct Bounds {
     double stricter;
     double laxer;

@@ -79,31 +79,24 @@ T load(const unsigned char* at) {
     return value;
 }
 
-std::int64_t load_signed(const unsigned char* at, std::size_t size) {
+// One of the four integers, by its size.
+template <typename I8, typename I16, typename I32, typename I64>
+I64 load_integer(const unsigned char* at, std::size_t size) {
     switch (size) {
     case 1:
-        return load<std::int8_t>(at);
+        return load<I8>(at);
     case 2:
-        return load<std::int16_t>(at);
+        return load<I16>(at);
     case 4:
-        return load<std::int32_t>(at);
+        return load<I32>(at);
     default:
-        return load<std::int64_t>(at);
+        return load<I64>(at);
     }
 }
 
-std::uint64_t load_unsigned(const unsigned char* at, std::size_t size) {
-    switch (size) {
-    case 1:
-        return load<std::uint8_t>(at);
-    case 2:
-        return load<std::uint16_t>(at);
-    case 4:
-        return load<std::uint32_t>(at);
-    default:
-        return load<std::uint64_t>(at);
-    }
-}
+constexpr auto load_signed = load_integer<std::int8_t, std::int16_t, std::int32_t, std::int64_t>;
+constexpr auto load_unsigned =
+    load_integer<std::uint8_t, std::uint16_t, std::uint32_t, std::uint64_t>;
 
 double load_real(const unsigned char* at, std::size_t size) {
     return size == 4 ? static_cast<double>(load<float>(at)) : load<double>(at);

@@ -11,7 +11,7 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
-// Readable pages with an unreadable page behind them. They end at an odd number of pages, which is
+// Readable pages with an unreadable page after them. They end at an odd number of pages, which is
 // the end of nothing that is larger than a page.
 class ProtectedMemory {
   public:

@@ -25,6 +25,14 @@ struct Extent {
 
 constexpr std::uint64_t pairs_under_one_tolerance = 64;
 
+inline constexpr Kind kinds[] = {Kind::none, Kind::whole, Kind::fractional, Kind::last_digit,
+                                 Kind::all};
+inline constexpr Factor factors[] = {Factor::remembered, Factor::forgotten};
+inline constexpr Place places[] = {Place::random, Place::at_limit};
+
+// From half a unit in the last place of 24 below it, a tolerance is rounded to 24.
+inline constexpr double first_rounded_up = 24 - 0x1p-20;
+
 // The share of the larger number by which pairs differ at the limit, or at some number where there
 // is none.
 template <typename T>
@@ -35,54 +43,43 @@ T share_at_limit(const double tolerance, const double limit) {
                            : std::numeric_limits<T>::epsilon() / 2;
 }
 
-// Calls `judge_next(survey, share)` for each pair.
-template <typename X, typename T, typename NextTolerance, typename JudgeNext>
-void survey(const std::uint64_t pairs, const Factor factor, const NextTolerance& next_tolerance,
-            const JudgeNext& judge_next) {
-    for (std::uint64_t judged = 0; judged < pairs;) {
-        const double tolerance = next_tolerance();
-        const Survey<X, T> under_tolerance(tolerance, factor);
-        const T share = share_at_limit<T>(tolerance, under_tolerance.limit());
-        const std::uint64_t last = std::min(pairs, judged + pairs_under_one_tolerance);
-        for (; judged < last; ++judged) {
-            judge_next(under_tolerance, share);
-        }
-    }
-}
-
-// ---- Reals
-
 // Where the larger magnitude is subnormal, the steps are further from the meaning.
-struct RealTallies {
+struct Tallies {
     Tally normal;
     Tally subnormal;
 };
 
-template <typename T>
-bool is_subnormal_pair(const T x, const T y) {
-    return std::max(std::fabs(x), std::fabs(y)) < std::numeric_limits<T>::min();
-}
-
-template <typename T, typename NextTolerance, typename NextPair>
-RealTallies survey_pairs(oracle::Random& random, const Factor factor, const Extent extent,
-                         const NextTolerance& next_tolerance, const NextPair& next_pair) {
-    RealTallies tallies;
-    survey<T, T>(extent.pairs, factor, next_tolerance,
-                 [&](const Survey<T, T>& survey, const T share) {
-                     const auto [x, y] = next_pair(share);
-                     Tally& tally = is_subnormal_pair(x, y) ? tallies.subnormal : tallies.normal;
-                     survey.judge(x, y, tally);
-                     if (random.one_in(extent.verify_one_in)) {
-                         survey.verify(x, y, tally);
-                     }
-                 });
+// Judges the pairs that `next_pair(share)` returns.
+template <typename X, typename T, typename NextTolerance, typename NextPair>
+Tallies survey_pairs(oracle::Random& random, const Factor factor, const Extent extent,
+                     const NextTolerance& next_tolerance, const NextPair& next_pair) {
+    Tallies tallies;
+    for (std::uint64_t judged = 0; judged < extent.pairs;) {
+        const double tolerance = next_tolerance();
+        const Survey<X, T> survey(tolerance, factor);
+        const T share = share_at_limit<T>(tolerance, survey.limit());
+        const std::uint64_t last = std::min(extent.pairs, judged + pairs_under_one_tolerance);
+        for (; judged < last; ++judged) {
+            const std::pair<X, T> pair = next_pair(share);
+            const T larger =
+                std::max(std::fabs(static_cast<T>(pair.first)), std::fabs(pair.second));
+            const bool is_subnormal = larger < std::numeric_limits<T>::min();
+            Tally& tally = is_subnormal ? tallies.subnormal : tallies.normal;
+            survey.judge(pair.first, pair.second, tally);
+            if (random.one_in(extent.verify_one_in)) {
+                survey.verify(pair.first, pair.second, tally);
+            }
+        }
+    }
     return tallies;
 }
 
+// ---- Reals
+
 template <typename T>
-RealTallies survey_reals(oracle::Random& random, const Kind kind, const Factor factor,
-                         const Place place, const Extent extent) {
-    return survey_pairs<T>(
+Tallies survey_reals(oracle::Random& random, const Kind kind, const Factor factor,
+                     const Place place, const Extent extent) {
+    return survey_pairs<T, T>(
         random, factor, extent,
         [&] { return static_cast<double>(random_tolerance<T>(random, kind, place)); },
         [&](const T share) { return random_pair(random, place, share); });
@@ -105,7 +102,7 @@ inline std::pair<float, float> pair_under_rounded_tolerance(oracle::Random& rand
 
 inline Tally survey_rounded_tolerances(oracle::Random& random, const double low, const double high,
                                        const Place place, const Extent extent) {
-    return survey_pairs<float>(
+    return survey_pairs<float, float>(
                random, Factor::remembered, extent,
                [&] { return random_between(random, low, high); },
                [&](const float share) {
@@ -150,19 +147,15 @@ T partner_of_integer(oracle::Random& random, const Place place, const T rounded,
 template <typename X, typename T>
 Tally survey_integers(oracle::Random& random, const Kind kind, const Factor factor,
                       const Place place, const Extent extent) {
-    Tally tally;
-    survey<X, T>(
-        extent.pairs, factor,
-        [&] { return static_cast<double>(random_tolerance<T>(random, kind, place)); },
-        [&](const Survey<X, T>& survey, const T share) {
-            const X integer = random_integer_of<X>(random, std::numeric_limits<T>::digits);
-            const T real = partner_of_integer(random, place, static_cast<T>(integer), share);
-            survey.judge(integer, real, tally);
-            if (random.one_in(extent.verify_one_in)) {
-                survey.verify(integer, real, tally);
-            }
-        });
-    return tally;
+    return survey_pairs<X, T>(
+               random, factor, extent,
+               [&] { return static_cast<double>(random_tolerance<T>(random, kind, place)); },
+               [&](const T share) {
+                   const X integer = random_integer_of<X>(random, std::numeric_limits<T>::digits);
+                   return std::pair(
+                       integer, partner_of_integer(random, place, static_cast<T>(integer), share));
+               })
+        .normal;
 }
 
 } // namespace exactness

@@ -159,6 +159,8 @@ inline std::vector<ExampleOfElements> examples_of_elements() {
         {{53}, nan, -1.0, false},
         {{53}, nan, 0.0, false},
         {{0}, single_nan, single_nan, true},
+        {{0}, single_nan, -single_nan, false},
+        {{10}, single_nan, single_nan, false},
 
         // A tolerance that is zero only as a single.
         {{1e-300}, 0.0F, -0.0F, true},
