@@ -8,6 +8,7 @@
 #define TALNUMERICARRAY_SAMEQ_CERTAINTY_H
 
 #include "compare.h"
+#include "factor_cache.h"
 #include "promotion_rules.h"
 #include "talnumericarray_sameq_elements.h"
 #include "to_type.h"
@@ -86,7 +87,7 @@ inline T certain_divisor(const T tol) noexcept {
         return 1;
     }
     T tolfactor = 0;
-    if (!nesk::detail::recall_factor(tol, tolfactor)) {
+    if (!nesk::recall_factor(tol, tolfactor)) {
         return 0;
     }
     return 1 / tolfactor * (1 + 8 * std::numeric_limits<T>::epsilon()) + 1;

@@ -3,6 +3,7 @@
 // answers.
 
 #include "compare.h"
+#include "factor_cache.h"
 #include "taldata_array_element_types.h"
 #include "talnumericarray_instruction_sets.h"
 #include "talnumericarray_sameq_certainty.h"
@@ -125,7 +126,7 @@ void print_comparisons(const std::string& instance, const T tol, const T factor,
     const T other_tol = 0.25;
     for (const bool remembered : {false, true}) {
         // The factor is made from the tolerance where it is not remembered.
-        nesk::detail::remember_factor<T>({remembered ? tol : other_tol, factor});
+        nesk::remember_factor<T>({remembered ? tol : other_tol, factor});
         print_equation(instance, "compare_impl",
                        verdict_literal(nesk::detail::compare_impl(tol, x, y)), tol, factor,
                        remembered && tol > 0 && tol < bits, x, y);
@@ -194,7 +195,7 @@ void print_reals(const std::string& instance, const std::vector<T>& tolerances) 
     for (const T tol : tolerances) {
         const bool has_factor = tol > 0 && tol < bits;
         const T factor = has_factor ? nesk::ToleranceShiftFactor(tol) : T{1};
-        nesk::detail::remember_factor<T>({tol, factor});
+        nesk::remember_factor<T>({tol, factor});
         const T divisor = talnumericarray::certain_divisor(tol);
         if (has_factor) {
             print_equation(instance, "certain_divisor", literal(divisor), factor);

@@ -1,6 +1,7 @@
 // The three-way comparison of two reals of one type.
 
 #include "compare.h"
+#include "factor_cache.h"
 
 #include "support/arrays.h"
 #include "support/tolerances.h"
@@ -142,7 +143,7 @@ T recalled_in_a_new_thread(const T tol) {
     T factor = -1;
     in_new_thread([&] {
         T recalled = 0;
-        if (nesk::detail::recall_factor(tol, recalled)) {
+        if (nesk::recall_factor(tol, recalled)) {
             factor = recalled;
         }
     });

@@ -256,7 +256,7 @@ class Bench(steps.Bench):
             yield step(SMALL)
         yield "same code", "", lambda: self._same_code(tree)
         yield from steps_of(PARTS)
-        if "/compare.h" in mutant.path:
+        if mutant.path.endswith(("/compare.h", "/factor_cache.h")):
             yield step(SIGNALS)
         yield step(READING)
         if of_sets:

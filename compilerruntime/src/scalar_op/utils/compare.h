@@ -3,6 +3,7 @@
 #ifndef NESK_COMPARE_H
 #define NESK_COMPARE_H
 
+#include "factor_cache.h"
 #include "promotion_rules.h"
 #include "strict_floating_point.h"
 #include "tolerance_shift_factor.h"
@@ -81,84 +82,6 @@ inline int compare_impl(const T1& arg1, const T2& arg2) noexcept {
 }
 
 // ---- Reals: the tolerant comparison.
-
-// A tolerance and its factor 2^(lasttol - bits).
-template <typename T>
-struct remembered_factor {
-    T lasttol;
-    T tolfactor;
-};
-
-// Where the last factor that was needed is kept. The initial one is a true one (2^0 is 1) that the
-// comparison never looks up, as it answers for tolerances of `bits` or more before.
-//
-// A signal handler that compares may come between any two instructions of a comparison in its
-// thread, and may leave it for good. So that two halves of different factors are never taken for
-// one, `changes` says what is valid: bit 0 is set while a factor is being written, the next two
-// bits say in which place the factor is or is going to be, and the rest counts, so that `changes`
-// is another number whenever the factor is another one. Volatile keeps the order of reads and
-// writes.
-template <typename T>
-struct factor_cache {
-    static constexpr unsigned being_written = 1;
-    static constexpr unsigned next_place = 2;
-    static constexpr unsigned places = 4;
-    static constexpr unsigned next_count = 8;
-
-    static constexpr unsigned place(const unsigned changes) noexcept {
-        return changes / next_place % places;
-    }
-
-    volatile unsigned changes = 0;
-    struct {
-        volatile T lasttol, tolfactor;
-    } factors[places] = {{std::numeric_limits<T>::digits, 1}, {}, {}, {}};
-};
-
-// Each thread has its own: nothing is shared, nothing is locked.
-template <typename T>
-inline factor_cache<T>& factor_cache_of_thread() noexcept {
-    // Initial-exec: in a shared object the general model would allocate on a thread's first use.
-    [[gnu::tls_model("initial-exec")]] static thread_local factor_cache<T> cache;
-    return cache;
-}
-
-// All elements of an array are compared under one tolerance, so that one remembered factor keeps
-// pow and ldexp out of the element loops. Returns whether `tol` has it, and then puts it in
-// `factor`.
-template <typename T>
-inline bool recall_factor(const T tol, T& factor) noexcept {
-    const factor_cache<T>& cache = factor_cache_of_thread<T>();
-    const unsigned changes = cache.changes;
-    const auto& kept = cache.factors[cache.place(changes)];
-    const T lasttol = kept.lasttol;
-    factor = kept.tolfactor;
-    // That is not equal to `changes` while a factor is being written.
-    const unsigned unchanged = changes & ~cache.being_written;
-    return tol == lasttol && cache.changes == unchanged;
-}
-
-// Where a factor is being written already, this is in a handler that has interrupted that, or after
-// one that has left it for good. Its place is left alone, as it may go on being written later; then
-// what has been remembered meanwhile stays. Four handlers would have to interrupt each other here,
-// in these few instructions, for one of them to come to a place that is still in use.
-template <typename T>
-inline void remember_factor(const remembered_factor<T> remembered) noexcept {
-    using cache_t = factor_cache<T>;
-    cache_t& cache = factor_cache_of_thread<T>();
-    const unsigned before = cache.changes;
-    const unsigned interrupted = before & cache_t::being_written;
-    const unsigned place = (cache_t::place(before) + interrupted) % cache_t::places;
-    const unsigned count = before / cache_t::next_count + 1;
-    const unsigned changes =
-        count * cache_t::next_count + place * cache_t::next_place + cache_t::being_written;
-    cache.changes = changes;
-    cache.factors[place].lasttol = remembered.lasttol;
-    cache.factors[place].tolfactor = remembered.tolfactor;
-    if (cache.changes == changes) {
-        cache.changes = changes & ~cache_t::being_written;
-    }
-}
 
 // Out of the loops, which need it once.
 template <typename T>
