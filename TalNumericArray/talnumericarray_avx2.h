@@ -1,6 +1,6 @@
-// What is done with vectors of 32 bytes, by AVX2 and FMA; and what AVX2 brings for shorter ones.
+// The operations on vectors of 32 bytes, by AVX2 and FMA, and what AVX2 adds for shorter ones.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and under the target of its
+// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
 // set.
 
 template <std::size_t bytes>
@@ -9,7 +9,7 @@ struct operations;
 template <>
 struct operations<16> : for_baseline::operations<16> {
     template <std::size_t size, std::size_t lanes, typename From>
-    static __m128i widened(const From* const from) noexcept {
+    static __m128i load_widened(const From* const from) noexcept {
         using SSE2 = for_baseline::operations<16>;
         constexpr bool is_signed = std::is_signed_v<From>;
         if constexpr (size == 4 && sizeof(From) == 1) {
@@ -19,7 +19,7 @@ struct operations<16> : for_baseline::operations<16> {
             const __m128i numbers = load<lanes * sizeof(From)>(from);
             return is_signed ? _mm_cvtepi16_epi32(numbers) : _mm_cvtepu16_epi32(numbers);
         } else {
-            return SSE2::widened<size, lanes>(from);
+            return SSE2::load_widened<size, lanes>(from);
         }
     }
 };
@@ -29,7 +29,7 @@ struct operations<32> {
     using Bits = __m256i;
 
     template <std::size_t size, std::size_t lanes, typename From>
-    static __m256i widened(const From* const from) noexcept {
+    static __m256i load_widened(const From* const from) noexcept {
         static_assert(size * lanes == 32);
         constexpr bool is_signed = std::is_signed_v<From>;
         if constexpr (sizeof(From) == size) {
@@ -53,25 +53,25 @@ struct operations<32> {
     }
 
     template <typename T>
-    static __m256 reals(const __m256i numbers) noexcept {
+    static __m256 int32_to_real(const __m256i numbers) noexcept {
         return _mm256_cvtepi32_ps(numbers);
     }
 
     template <typename T>
-    static __m256d reals(const __m128i numbers) noexcept {
+    static __m256d int32_to_real(const __m128i numbers) noexcept {
         return _mm256_cvtepi32_pd(numbers);
     }
 
     template <std::size_t lanes>
-    static __m256d doubles(const float* const from) noexcept {
+    static __m256d load_floats_as_doubles(const float* const from) noexcept {
         return _mm256_cvtps_pd(_mm_loadu_ps(from));
     }
 
     template <typename T, typename From>
-    static constexpr bool converts = false;
+    static constexpr bool can_load_converted = false;
 
     template <typename T>
-    static __m256i with_zeros_between(const vector_of_bytes<T, 16> reals) noexcept {
+    static __m256i interleaved_with_zeros(const vector_of_bytes<T, 16> reals) noexcept {
         const auto half = reinterpret_cast<__m128i>(reals);
         if constexpr (std::is_same_v<T, float>) {
             return _mm256_cvtepu32_epi64(half);

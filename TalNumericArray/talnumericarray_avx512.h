@@ -1,6 +1,6 @@
-// What is done with vectors of 64 bytes, by AVX-512.
+// The operations on vectors of 64 bytes, by AVX-512.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and under the target of its
+// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
 // set.
 
 template <std::size_t bytes>
@@ -9,10 +9,10 @@ struct operations : for_avx2::operations<bytes> {};
 template <>
 struct operations<32> : for_avx2::operations<32> {
     template <typename T, typename From>
-    static constexpr bool converts = sizeof(From) == 8 && std::is_same_v<T, float>;
+    static constexpr bool can_load_converted = sizeof(From) == 8 && std::is_same_v<T, float>;
 
     template <typename T, std::size_t lanes, typename From>
-    static __m256 converted(const From* const from) noexcept {
+    static __m256 load_converted(const From* const from) noexcept {
         const __m512i numbers = _mm512_loadu_si512(from);
         return std::is_signed_v<From> ? _mm512_cvtepi64_ps(numbers) : _mm512_cvtepu64_ps(numbers);
     }
@@ -23,7 +23,7 @@ struct operations<64> {
     using Bits = __m512i;
 
     template <std::size_t size, std::size_t lanes, typename From>
-    static __m512i widened(const From* const from) noexcept {
+    static __m512i load_widened(const From* const from) noexcept {
         static_assert(size * lanes == 64);
         constexpr bool is_signed = std::is_signed_v<From>;
         if constexpr (sizeof(From) == size) {
@@ -50,25 +50,26 @@ struct operations<64> {
     }
 
     template <typename T>
-    static __m512 reals(const __m512i numbers) noexcept {
+    static __m512 int32_to_real(const __m512i numbers) noexcept {
         return _mm512_cvtepi32_ps(numbers);
     }
 
     template <typename T>
-    static __m512d reals(const __m256i numbers) noexcept {
+    static __m512d int32_to_real(const __m256i numbers) noexcept {
         return _mm512_cvtepi32_pd(numbers);
     }
 
     template <std::size_t lanes>
-    static __m512d doubles(const float* const from) noexcept {
+    static __m512d load_floats_as_doubles(const float* const from) noexcept {
         return _mm512_cvtps_pd(_mm256_loadu_ps(from));
     }
 
     template <typename T, typename From>
-    static constexpr bool converts = sizeof(From) == 8 || std::is_same_v<From, std::uint32_t>;
+    static constexpr bool can_load_converted = sizeof(From) == 8
+                                               || std::is_same_v<From, std::uint32_t>;
 
     template <typename T, std::size_t lanes, typename From>
-    static auto converted(const From* const from) noexcept {
+    static auto load_converted(const From* const from) noexcept {
         constexpr bool is_signed = std::is_signed_v<From>;
         if constexpr (sizeof(From) == 4 && std::is_same_v<T, float>) {
             return _mm512_cvtepu32_ps(_mm512_loadu_si512(from));
@@ -78,14 +79,14 @@ struct operations<64> {
             const __m512i numbers = _mm512_loadu_si512(from);
             return is_signed ? _mm512_cvtepi64_pd(numbers) : _mm512_cvtepu64_pd(numbers);
         } else {
-            const __m256 lower = operations<32>::converted<T, 8>(from);
-            const __m256 upper = operations<32>::converted<T, 8>(from + 8);
+            const __m256 lower = operations<32>::load_converted<T, 8>(from);
+            const __m256 upper = operations<32>::load_converted<T, 8>(from + 8);
             return _mm512_insertf32x8(_mm512_castps256_ps512(lower), upper, 1);
         }
     }
 
     template <typename T>
-    static __m512i with_zeros_between(const vector_of_bytes<T, 32> reals) noexcept {
+    static __m512i interleaved_with_zeros(const vector_of_bytes<T, 32> reals) noexcept {
         const auto half = reinterpret_cast<__m256i>(reals);
         if constexpr (std::is_same_v<T, float>) {
             return _mm512_cvtepu32_epi64(half);
@@ -107,8 +108,7 @@ struct operations<64> {
         return _mm512_test_epi64_mask(bits, bits) == 0;
     }
 
-    // Comparisons of reals have masks for answers: of the lanes in a mask, those for which it
-    // holds.
+    // Reals are compared into masks: of the lanes in a mask, those for which the comparison holds.
     static constexpr bool has_masks = true;
 
     static __mmask16 if_equal(const __mmask16 mask, const __m512 x, const __m512 y) noexcept {

@@ -1,7 +1,7 @@
-// What is done with vectors of 16 bytes, by NEON: in the compilers' own terms, which stand for its
-// instructions one by one.
+// The operations on vectors of 16 bytes, by NEON: mostly written with the compilers' vector
+// extensions, each of which becomes one instruction.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and under the target of its
+// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
 // set.
 
 template <std::size_t bytes>
@@ -11,7 +11,7 @@ template <>
 struct operations<16> {
     using Bits = vector<std::uint64_t, 2>;
 
-    // The first `bytes` of a vector, zeros behind them.
+    // The first `bytes` of a vector; the rest is zero.
     template <std::size_t bytes>
     static Bits load(const void* const from) noexcept {
         if constexpr (bytes == 16) {
@@ -25,25 +25,15 @@ struct operations<16> {
         }
     }
 
-    // `lanes` numbers, integers widened to `size` bytes with their signs.
+    // `lanes` numbers; integers are widened to `size` bytes with their signs.
     template <std::size_t size, std::size_t lanes, typename From>
-    static Bits widened(const From* const from) noexcept {
-        Bits numbers = load<lanes * sizeof(From)>(from);
-        if constexpr (sizeof(From) < size) {
-            numbers = twice_as_wide<From>(numbers);
-        }
-        if constexpr (2 * sizeof(From) < size) {
-            numbers = twice_as_wide<wider<From, 2>>(numbers);
-        }
-        if constexpr (4 * sizeof(From) < size) {
-            numbers = twice_as_wide<wider<From, 4>>(numbers);
-        }
-        return numbers;
+    static Bits load_widened(const From* const from) noexcept {
+        return widened<operations, size, From>(load<lanes * sizeof(From)>(from));
     }
 
-    // 32-bit integers as reals; of doubles, there are two.
+    // All 32-bit integers as floats, or the first two as doubles.
     template <typename T>
-    static vector_of_bytes<T, 16> reals(const Bits numbers) noexcept {
+    static vector_of_bytes<T, 16> int32_to_real(const Bits numbers) noexcept {
         if constexpr (std::is_same_v<T, float>) {
             return __builtin_convertvector(reinterpret_cast<vector<std::int32_t, 4>>(numbers),
                                            vector<float, 4>);
@@ -55,29 +45,29 @@ struct operations<16> {
     }
 
     template <std::size_t lanes>
-    static vector<double, 2> doubles(const float* const from) noexcept {
+    static vector<double, 2> load_floats_as_doubles(const float* const from) noexcept {
         return __builtin_convertvector(first_half<float>(load<lanes * sizeof(float)>(from)),
                                        vector<double, 2>);
     }
 
-    // Integers that become reals by an instruction for just that.
+    // Whether there is one instruction that converts integers `From`.
     template <typename T, typename From>
 #if defined(__aarch64__)
-    static constexpr bool converts = sizeof(From) == sizeof(T);
+    static constexpr bool can_load_converted = sizeof(From) == sizeof(T);
 #else
-    static constexpr bool converts = false;
+    static constexpr bool can_load_converted = false;
 #endif
 
     template <typename T, std::size_t lanes, typename From>
-    static vector_of_bytes<T, 16> converted(const From* const from) noexcept {
+    static vector_of_bytes<T, 16> load_converted(const From* const from) noexcept {
         const auto numbers =
             reinterpret_cast<vector_of_bytes<From, 16>>(load<lanes * sizeof(From)>(from));
         return __builtin_convertvector(numbers, vector_of_bytes<T, 16>);
     }
 
-    // Reals, the first half of a vector, with a zero behind each.
+    // The first half of a vector of reals, with a zero after each.
     template <typename T>
-    static Bits with_zeros_between(const vector_of_bytes<T, 16> reals) noexcept {
+    static Bits interleaved_with_zeros(const vector_of_bytes<T, 16> reals) noexcept {
         const auto bits = reinterpret_cast<Bits>(reals);
         return std::is_same_v<T, float> ? twice_as_wide<std::uint32_t>(bits) : Bits{bits[0], 0};
     }
@@ -93,7 +83,7 @@ struct operations<16> {
 
     static bool all_zeros(const Bits bits) noexcept {
 #if defined(__arm__)
-        // GCC would move each half to the core on its own.
+        // GCC would move each half to the core separately.
         const auto words = reinterpret_cast<uint32x4_t>(bits);
         const uint32x2_t both = vorr_u32(vget_low_u32(words), vget_high_u32(words));
         return vget_lane_u64(vreinterpret_u64_u32(both), 0) == 0;
@@ -104,6 +94,13 @@ struct operations<16> {
 
     static bool all_ones(const Bits bits) noexcept {
         return (bits[0] & bits[1]) == std::numeric_limits<std::uint64_t>::max();
+    }
+
+    // The first half of the `From` in a vector, widened to twice their size.
+    template <typename From>
+    static Bits twice_as_wide(const Bits numbers) noexcept {
+        using Wide = vector<twice_as_wide_t<From>, 8 / sizeof(From)>;
+        return reinterpret_cast<Bits>(__builtin_convertvector(first_half<From>(numbers), Wide));
     }
 
   private:
@@ -117,18 +114,12 @@ struct operations<16> {
     static typename half_of<T>::type first_half(const Bits numbers) noexcept {
         return reinterpret_cast<typename half_of<T>::type>(numbers[0]);
     }
-
-    // The first half of the `From` in a vector, widened to twice their size.
-    template <typename From>
-    static Bits twice_as_wide(const Bits numbers) noexcept {
-        using Wide = vector<wider<From, 2>, 8 / sizeof(From)>;
-        return reinterpret_cast<Bits>(__builtin_convertvector(first_half<From>(numbers), Wide));
-    }
 };
 
 #if defined(__arm__)
 
-// Doubts about reals by their bits: the same, and none of them a NaN or an infinity.
+// Doubts about reals by their bits: there are none if the bits are equal and no number is a NaN or
+// an infinity.
 template <typename T>
 class DoubtsAboutBits {
   public:
@@ -149,7 +140,7 @@ class DoubtsAboutBits {
 
   private:
     uint32x4_t bits_ = {};
-    uint32x4_t largest_ = {}; // twice their bits, whose upper word says whether all are finite
+    uint32x4_t largest_ = {}; // of the words, shifted left by one bit to drop the sign
 };
 
 #endif

@@ -1,8 +1,7 @@
-// What can be said of a pair of elements at little cost: are they certainly the same?
+// Fast tests whether two elements are certainly the same.
 //
-// It is never the last word. Where it is sure, judging the pair by the rule would find it the same
-// and would leave the remembered factor as it is, so that the pair can be passed over. Where it is
-// in doubt it says nothing, and the rule decides.
+// If such a test passes, the rule would find the pair the same and leave the remembered factor as
+// it is, so the pair can be passed over. If it fails, the pair is in doubt, and the rule decides.
 
 #ifndef TALNUMERICARRAY_SAMEQ_CERTAINTY_H
 #define TALNUMERICARRAY_SAMEQ_CERTAINTY_H
@@ -23,32 +22,32 @@ NESK_STRICT_SINGLES_BEGIN
 
 namespace talnumericarray {
 
-// The type in which two elements, or the parts of them, are compared.
+// The type in which two elements, or their parts, are compared.
 template <typename T1, typename T2>
 using comparison_t = type_common_t<to_real_type_t<T1>, to_real_type_t<T2>>;
 
 // ---- Bounds: what makes two reals certainly the same
 //
-// A bound is made at the beginning of a call, and again whenever the rule may have changed what is
-// remembered.
+// A bound is made at the beginning of a call, and again whenever the rule may have changed the
+// remembered factor.
 
 // They are equal.
 struct equality {};
 
-// They are equal and finite, or differ by clearly less than the second one's magnitude divided by
-// `divisor`: see `certain_divisor`.
+// They are equal and finite, or differ by clearly less than the magnitude of the second one divided
+// by `divisor`; see `certain_divisor`.
 template <typename T>
 struct nearness {
     T divisor;
 };
 
-// Whether the processor takes results that are subnormal for zero, but not operands, which only
-// that of x86 can be told to do. Trying it out would raise flags.
-inline bool flushes_results_alone() noexcept {
+// Whether subnormal results are flushed to zero while subnormal operands are not taken for zero.
+// Only x86 has this mode. The mode is read, as trying it out would raise flags.
+inline bool ftz_without_daz() noexcept {
 #if defined(__SSE2__)
-    constexpr unsigned results = 0x8000;
-    constexpr unsigned operands = 0x0040;
-    return (__builtin_ia32_stmxcsr() & (results | operands)) == results;
+    constexpr unsigned ftz = 0x8000;
+    constexpr unsigned daz = 0x0040;
+    return (__builtin_ia32_stmxcsr() & (ftz | daz)) == ftz;
 #else
     return false;
 #endif
@@ -56,31 +55,40 @@ inline bool flushes_results_alone() noexcept {
 
 // The divisor under which pairs are certainly the same, or 0 if there is none (yet).
 //
-// Let d be |x - y| and m be |y| as the test has them, max the larger of |x| and |y|, and D the
-// divisor. The test is m - D * d >= d, with D * d rounded to a number before it is subtracted or
-// not. A NaN and an infinity in either place make the left side NaN or an infinity below zero, and
-// the answer doubt. If d is 0, x and y are equal numbers; or, where subnormal numbers are taken for
-// zero, of one sign and so near that the rule finds the same. But where only results are, subnormal
-// numbers of different signs would pass, and no divisor is given. Let d be above 0 now. What is
-// above zero when it has been rounded was so before, and what is below a number was below it: hence
-// D * d < m exactly, in either form and in any direction of rounding. As D >= 1, so is d, which is
-// never so with signs that differ or beside a zero.
+// Let d be |x - y| and m be |y|, as the test computes them, max the larger of |x| and |y|, and D
+// the divisor. The test is m - D * d >= d, where D * d is rounded before it is subtracted or not.
+// If x or y is a NaN or an infinity, the left side is a NaN or minus infinity, and the pair is in
+// doubt.
 //
-// A `tol` of `bits` or more: that is all, and 1 is divisor enough.
+// If d is 0, x and y are equal numbers. Where subnormal numbers are taken for zero, they may also
+// be of one sign and so near that the rule finds them the same. Where only subnormal results are
+// flushed to zero, two subnormal numbers of different signs would pass, so there is no divisor.
 //
-// f remembered: with e = epsilon, D is at least ((1/f)(1 + 8e)(1 - e)^2 + 1)(1 - e) however its
-// operations are rounded, and so at least (1/f)(1 + 4e) and, as 1/f is 1 or more, at least 1/f + 1.
-// A rounded result is off by less than the share e, or less than the least number s above zero if
-// it is subnormal; a subnormal difference is exact. The rule's difference, which upward and
-// downward may be rounded the other way, is at most d (1 + e)/(1 - e). For max >= 1 it has to be
-// below max * f, rounded, which is at least max * f (1 - e) > d (1 + 4e)(1 - e). For max < 1 it is
-// divided by f: if the quotient is not subnormal, it is at most (d / f)(1 + e)^2/(1 - e) <= D * d <
-// max; else it is below d / f + s <= d / f + d <= D * d < max. Either way the difference is below
-// max too.
+// Otherwise d is above 0. A result that is above zero when rounded was above zero before, and a
+// product that is below a number when rounded was below it before. Hence D * d < m exactly, whether
+// the product is rounded or not and in any rounding direction. As D >= 1, also d < m, which never
+// holds for numbers of different signs or beside a zero.
+//
+// If `tol` is `bits` or more, that is all the rule asks, and 1 is a sufficient divisor.
+//
+// If a factor f is remembered, let e be epsilon. However its operations are rounded, D is at least
+// ((1/f)(1 + 8e)(1 - e)^2 + 1)(1 - e). So D is at least (1/f)(1 + 4e) and, as 1/f is 1 or more, at
+// least 1/f + 1. Rounding changes a result by less than the share e of it, or by less than the
+// least positive number s if the result is subnormal; a subnormal difference is exact. The rule's
+// difference may be taken in the other order, and so rounded the opposite way. It is at most
+// d (1 + e)/(1 - e).
+//
+// - For max >= 1 it has to be below max * f, rounded. That is at least max * f (1 - e), which is
+//   above d (1 + 4e)(1 - e).
+// - For max < 1 it is divided by f, and the quotient has to be below max. If the quotient is not
+//   subnormal, it is at most (d / f)(1 + e)^2/(1 - e) <= D * d < max. Otherwise it is below
+//   d / f + s <= d / f + d <= D * d < max.
+//
+// In both cases the difference is below max too.
 template <typename T>
 inline T certain_divisor(const T tol) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
-    if (!(tol > 0) || flushes_results_alone()) {
+    if (!(tol > 0) || ftz_without_daz()) {
         return 0;
     }
     if (tol >= bits) {
@@ -95,7 +103,7 @@ inline T certain_divisor(const T tol) noexcept {
 
 // ---- One pair
 
-// Not by std::fabs, which Clang would call on 32-bit ARM: see `real_part`.
+// Not std::fabs: on 32-bit ARM Clang would not inline it, see `real_part`.
 inline float magnitude(const float x) noexcept {
     return __builtin_fabsf(x);
 }
@@ -104,9 +112,9 @@ inline double magnitude(const double x) noexcept {
     return __builtin_fabs(x);
 }
 
-// 32-bit ARM has no instruction that converts integers of 64 bits; compilers call a function of 25
-// instructions, which knows one direction of rounding alone. What is exact is the same in all: the
-// double of 53 bits whose halves are exact doubles, and the single of 24 bits.
+// 32-bit ARM has no instruction that converts 64-bit integers. Compilers call a function of 25
+// instructions, which always rounds to nearest. Small numbers need no rounding: those of 53 bits
+// are the exact sum of two halves in doubles, and those of 24 bits are exact singles.
 template <typename T, typename From>
 inline T by_halves(const From number) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
@@ -124,7 +132,7 @@ inline T by_halves(const From number) noexcept {
     }
 }
 
-// A number in the type of comparison, the same as a cast gives.
+// The number as a cast to the type of comparison gives it.
 template <typename T, typename From>
 inline T converted(const From number) noexcept {
 #if defined(__arm__) && !defined(__OPTIMIZE_SIZE__)
@@ -151,8 +159,8 @@ inline bool certainly_same_reals(const nearness<T> bound, const T x, const T y) 
     return magnitude(y) - bound.divisor * difference >= difference;
 }
 
-// An integer or a real beside a real, or beside a complex number, whose imaginary part has to be a
-// zero then.
+// An integer or a real beside an integer or a real, or beside a complex number, whose imaginary
+// part then has to be zero.
 template <typename Bound, typename T1, typename T2>
 inline bool certainly_same(const Bound bound, const T1& data1, const T2& data2) noexcept {
     using T = comparison_t<T1, T2>;
@@ -163,11 +171,12 @@ inline bool certainly_same(const Bound bound, const T1& data1, const T2& data2) 
     }
 }
 
-// The number of leading elements of two arrays of `len` that are found to be certainly the same,
-// without vectors. None is read behind the first pair in doubt.
+// The number of leading elements of two arrays of `len` that are certainly the same. Nothing after
+// the first pair in doubt is read.
 template <typename Bound, typename T1, typename T2>
-inline std::size_t leading_one_by_one(const Bound bound, const T1* const data1,
-                                      const T2* const data2, const std::size_t len) noexcept {
+inline std::size_t certain_prefix_one_by_one(const Bound bound, const T1* const data1,
+                                             const T2* const data2,
+                                             const std::size_t len) noexcept {
     std::size_t i = 0;
     while (i < len && certainly_same(bound, data1[i], data2[i])) {
         ++i;

@@ -1,55 +1,53 @@
-// Certainty by vectors: how many leading elements of two arrays are certainly the same.
+// The loops that find, by vectors, the certain prefix of two arrays: the leading elements that are
+// certainly the same.
 //
-// Each set of instructions includes this once, in a namespace and under the target of its own, so
-// that a template of one set is no template of another. It has defined `vector_bytes`, the length
-// of its longest vectors, and `operations` on those and on what is half as long.
+// Each instruction set includes this once, in a namespace and for a target of its own, so the sets
+// share no templates. Before that it defines `vector_bytes`, the length of its longest vectors, and
+// `operations` on those and on vectors of half that length.
 
-// What is done with vectors for `lanes` of `T`.
+// The operations on a vector for `lanes` of `T`.
 template <typename T, std::size_t lanes>
 using operations_on = operations<vector_of<T, lanes>::bytes>;
 
-// `lanes` integers, widened to the size of a `T` with their signs.
+// `lanes` numbers; integers are widened to the size of a `T` with their signs.
 template <typename T, std::size_t lanes, typename From>
-inline vector<T, lanes> widened(const From* const from) noexcept {
+inline vector<T, lanes> load_widened(const From* const from) noexcept {
     return reinterpret_cast<vector<T, lanes>>(
-        operations_on<T, lanes>::template widened<sizeof(T), lanes>(from));
+        operations_on<T, lanes>::template load_widened<sizeof(T), lanes>(from));
 }
 
 // ---- Conversion to the type of comparison
 
-// 32-bit integers as reals.
 template <typename T, std::size_t lanes>
-inline vector<T, lanes> reals(const vector<std::int32_t, lanes>& numbers) noexcept {
+inline vector<T, lanes> int32_to_real(const vector<std::int32_t, lanes>& numbers) noexcept {
     using Bits = typename operations_on<std::int32_t, lanes>::Bits;
     return reinterpret_cast<vector<T, lanes>>(
-        operations_on<T, lanes>::template reals<T>(reinterpret_cast<Bits>(numbers)));
+        operations_on<T, lanes>::template int32_to_real<T>(reinterpret_cast<Bits>(numbers)));
 }
 
-// Where there is no instruction for it. Each of these rounds once, in its last addition, so that it
-// gives what the conversion of one number does in any direction of rounding, but for the sign of a
+// For conversions that no instruction does. Each of these rounds once, in its last addition. So it
+// gives the result of a scalar conversion in any direction of rounding, except for the sign of
 // zero.
 
 template <std::size_t lanes>
-inline vector<double, lanes>
-from_32_unsigned_bits(const vector<std::uint64_t, lanes>& numbers) noexcept {
-    // In the lowest bits of 2^52.
+inline vector<double, lanes> uint32_to_real(const vector<std::uint64_t, lanes>& numbers) noexcept {
+    // The number goes into the lowest bits of 2^52.
     constexpr std::uint64_t base = 0x4330000000000000;
     return reinterpret_cast<vector<double, lanes>>(numbers | base) - 0x1p52;
 }
 
 template <std::size_t lanes>
-inline vector<float, lanes>
-from_32_unsigned_bits(const vector<std::uint32_t, lanes>& numbers) noexcept {
+inline vector<float, lanes> uint32_to_real(const vector<std::uint32_t, lanes>& numbers) noexcept {
     using Integers = vector<std::int32_t, lanes>;
-    const auto high = reals<float, lanes>(reinterpret_cast<Integers>(numbers >> 16));
-    const auto low = reals<float, lanes>(reinterpret_cast<Integers>(numbers & 0xffffU));
+    const auto high = int32_to_real<float, lanes>(reinterpret_cast<Integers>(numbers >> 16));
+    const auto low = int32_to_real<float, lanes>(reinterpret_cast<Integers>(numbers & 0xffffU));
     return high * 0x1p16F + low;
 }
 
 template <bool is_signed, std::size_t lanes>
-inline vector<double, lanes> from_64_bits(const vector<std::uint64_t, lanes>& numbers) noexcept {
-    // The upper half in the lowest bits of 2^84, by 2^31 too large if it has a sign; the lower one
-    // in those of 2^52.
+inline vector<double, lanes> int64_to_double(const vector<std::uint64_t, lanes>& numbers) noexcept {
+    // The upper half goes into the lowest bits of 2^84, too large by 2^31 if it is signed; the
+    // lower half into those of 2^52.
     constexpr std::uint64_t upper_base = 0x4530000000000000;
     constexpr std::uint64_t lower_base = 0x4330000000000000;
     constexpr std::uint64_t sign = is_signed ? 0x80000000 : 0;
@@ -62,7 +60,7 @@ inline vector<double, lanes> from_64_bits(const vector<std::uint64_t, lanes>& nu
 }
 
 template <typename T, std::size_t lanes, typename From>
-inline vector<T, lanes> one_by_one(const From* const from) noexcept {
+inline vector<T, lanes> load_one_by_one(const From* const from) noexcept {
     vector<T, lanes> result = {};
     for (std::size_t k = 0; k < lanes; ++k) {
         result[k] = static_cast<T>(from[k]);
@@ -70,43 +68,46 @@ inline vector<T, lanes> one_by_one(const From* const from) noexcept {
     return result;
 }
 
-// `lanes` numbers as those of type `T`.
+// `lanes` numbers, converted to `T`.
 template <typename T, std::size_t lanes, typename From>
 inline vector<T, lanes> load(const From* const from) noexcept {
     using Operations = operations_on<T, lanes>;
     if constexpr (std::is_integral_v<T> || std::is_same_v<T, From>) {
-        return widened<T, lanes>(from);
+        return load_widened<T, lanes>(from);
     } else if constexpr (std::is_floating_point_v<From>) {
-        return reinterpret_cast<vector<T, lanes>>(Operations::template doubles<lanes>(from));
-    } else if constexpr (Operations::template converts<T, From>) {
-        return reinterpret_cast<vector<T, lanes>>(Operations::template converted<T, lanes>(from));
+        return reinterpret_cast<vector<T, lanes>>(
+            Operations::template load_floats_as_doubles<lanes>(from));
+    } else if constexpr (Operations::template can_load_converted<T, From>) {
+        return reinterpret_cast<vector<T, lanes>>(
+            Operations::template load_converted<T, lanes>(from));
     } else if constexpr (sizeof(From) == 8 && std::is_same_v<T, float>) {
-        return one_by_one<T, lanes>(from);
+        return load_one_by_one<T, lanes>(from);
     } else if constexpr (sizeof(From) == 8) {
-        return from_64_bits<std::is_signed_v<From>, lanes>(widened<std::uint64_t, lanes>(from));
+        return int64_to_double<std::is_signed_v<From>, lanes>(
+            load_widened<std::uint64_t, lanes>(from));
     } else if constexpr (std::is_same_v<From, std::uint32_t>) {
-        return from_32_unsigned_bits<lanes>(widened<unsigned_of_size<sizeof(T)>, lanes>(from));
+        return uint32_to_real<lanes>(load_widened<unsigned_of_size<sizeof(T)>, lanes>(from));
     } else {
-        return reals<T, lanes>(widened<std::int32_t, lanes>(from));
+        return int32_to_real<T, lanes>(load_widened<std::int32_t, lanes>(from));
     }
 }
 
-// Reals laid out as complex numbers are: with a zero behind each.
+// Reals as complex numbers: each is followed by a zero.
 template <typename T, std::size_t lanes, typename From>
 inline vector<T, lanes> load_as_complex(const From* const from) noexcept {
     return reinterpret_cast<vector<T, lanes>>(
-        operations_on<T, lanes>::template with_zeros_between<T>(load<T, lanes / 2>(from)));
+        operations_on<T, lanes>::template interleaved_with_zeros<T>(load<T, lanes / 2>(from)));
 }
 
-// ---- Doubts about the lanes of vectors, gathered over several
+// ---- Doubts: whether any lane of several vectors is not certainly the same
 
-// Two integers of types `T1` and `T2`, widened: the bits that differ.
+// Integers of types `T1` and `T2`, widened: the bits that differ.
 template <typename T, std::size_t lanes, typename T1, typename T2>
 class DoubtsAboutIntegers {
   public:
     void add(equality /*bound*/, const vector<T, lanes>& x, const vector<T, lanes>& y) noexcept {
         bits_ |= reinterpret_cast<Bits>(x) ^ reinterpret_cast<Bits>(y);
-        // Equal bits are different numbers where a negative one meets an unsigned one as wide.
+        // Equal bits are different numbers if one is negative and the other unsigned and as wide.
         if constexpr (std::is_signed_v<
                           T1> != std::is_signed_v<T2> && sizeof(Unsigned) == sizeof(T)) {
             constexpr Lane sign = static_cast<Lane>(Lane{1} << (8 * sizeof(Lane) - 1));
@@ -183,15 +184,15 @@ class DoubtsAboutReals {
 
 #endif
 
-// ---- The walk
+// ---- The loops
 
 template <typename T1, typename T2, std::size_t lanes>
 using Doubts = std::conditional_t<std::is_integral_v<comparison_t<T1, T2>>,
                                   DoubtsAboutIntegers<comparison_t<T1, T2>, lanes, T1, T2>,
                                   DoubtsAboutReals<comparison_t<T1, T2>, lanes>>;
 
-// One vector of each array's elements. A real stands for a complex number whose imaginary part is
-// zero, and is laid out as one beside complex numbers.
+// Adds one vector of each array. Beside complex numbers, a real is one whose imaginary part is
+// zero.
 template <std::size_t lanes, typename Bound, typename T1, typename T2>
 inline void add_doubts(Doubts<T1, T2, lanes>& doubts, const Bound bound, const T1* const data1,
                        const T2* const data2) noexcept {
@@ -205,7 +206,8 @@ inline void add_doubts(Doubts<T1, T2, lanes>& doubts, const Bound bound, const T
 }
 
 template <std::size_t lanes, std::size_t vectors, typename Bound, typename T1, typename T2>
-inline bool certain_of(const Bound bound, const T1* const data1, const T2* const data2) noexcept {
+inline bool certainly_same_block(const Bound bound, const T1* const data1,
+                                 const T2* const data2) noexcept {
     constexpr std::size_t elements = is_complex_v<T2> ? lanes / 2 : lanes;
     Doubts<T1, T2, lanes> doubts;
     for (std::size_t k = 0; k < vectors; ++k) {
@@ -214,47 +216,75 @@ inline bool certain_of(const Bound bound, const T1* const data1, const T2* const
     return doubts.none();
 }
 
-// What a set is to have besides a name and a way to know whether the processor has it.
+// The certain prefix by two vectors of `lanes` that may overlap, or by shorter ones.
+template <std::size_t lanes, typename Bound, typename T1, typename T2>
+inline std::size_t certain_prefix_by_two(const Bound bound, const T1* const data1,
+                                         const T2* const data2, const std::size_t len) noexcept {
+    constexpr std::size_t elements = is_complex_v<T2> ? lanes / 2 : lanes;
+    if constexpr (lanes < 2) {
+        return 0;
+    } else {
+        if (len < elements) {
+            return certain_prefix_by_two<lanes / 2>(bound, data1, data2, len);
+        }
+        const std::size_t count = std::min(len, 2 * elements);
+        Doubts<T1, T2, lanes> doubts;
+        add_doubts<lanes>(doubts, bound, data1, data2);
+        add_doubts<lanes>(doubts, bound, data1 + (count - elements), data2 + (count - elements));
+        return doubts.none() ? count : 0;
+    }
+}
+
+// The base class of the set.
 struct loops {
     template <typename Bound, typename T1, typename T2>
     static constexpr bool has_loop = true;
 
-    // The elements that a vector takes of two arrays.
+    // The number of elements that fill a full vector.
     template <typename T1, typename T2>
     static constexpr std::size_t elements = vector_bytes / sizeof(comparison_t<T1, T2>)
                                             / (is_complex_v<T2> ? 2 : 1);
 
-    // The number of leading elements of two arrays of `len` that are found to be certainly the
-    // same. `end` is the number of those before the first end of a page, and enough for a vector.
+    // The certain prefix of two arrays of `len`, of which `end` elements lie before the first end
+    // of a page: enough for a full vector.
     //
-    // Nothing is read in another page than that of the first element that has not been passed yet,
-    // so that no page is touched that a program could tell is behind the first pair that differs.
-    // The last vector in front of a page's end begins, if need be, among elements that have been
-    // passed already.
+    // A block never extends past the page of its first unjudged element, so nothing on a page
+    // beyond the first differing pair is read. The last vector before the end of a page may begin
+    // with elements that have been judged already.
     template <typename Bound, typename T1, typename T2>
-    [[gnu::noinline]] static std::size_t
-    leading_certainly_same(const Bound bound, const T1* const data1, const T2* const data2,
-                           std::size_t end, const std::size_t len) noexcept {
+    [[gnu::noinline]] static std::size_t certain_prefix(const Bound bound, const T1* const data1,
+                                                        const T2* const data2, std::size_t end,
+                                                        const std::size_t len) noexcept {
         constexpr std::size_t step = elements<T1, T2>;
         constexpr std::size_t lanes = is_complex_v<T2> ? 2 * step : step;
-        constexpr std::size_t step_of_group = vectors_together * step;
+        constexpr std::size_t block = vectors_per_block * step;
         for (std::size_t passed = 0;;) {
-            while (end - passed >= step_of_group
-                   && certain_of<lanes, vectors_together>(bound, data1 + passed, data2 + passed)) {
-                passed += step_of_group;
+            while (end - passed >= block
+                   && certainly_same_block<lanes, vectors_per_block>(bound, data1 + passed,
+                                                                     data2 + passed)) {
+                passed += block;
             }
             while (passed < end) {
                 const std::size_t begin = std::min(passed, end - step);
-                if (!certain_of<lanes, 1>(bound, data1 + begin, data2 + begin)) {
+                if (!certainly_same_block<lanes, 1>(bound, data1 + begin, data2 + begin)) {
                     return passed;
                 }
                 passed = begin + step;
             }
             end += elements_before_page_end(data1 + passed, data2 + passed, len - passed);
-            // Here are both ends; and a complex number may lie in two pages.
+            // The arrays end here, or a complex number straddles two pages.
             if (end == passed) {
                 return passed;
             }
         }
+    }
+
+    // The same for elements that do not fill a full vector.
+    template <typename Bound, typename T1, typename T2>
+    [[gnu::noinline]] static std::size_t
+    short_certain_prefix(const Bound bound, const T1* const data1, const T2* const data2,
+                         const std::size_t len) noexcept {
+        constexpr std::size_t lanes = vector_bytes / sizeof(comparison_t<T1, T2>);
+        return certain_prefix_by_two<lanes / 2>(bound, data1, data2, len);
     }
 };

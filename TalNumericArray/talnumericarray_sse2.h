@@ -1,6 +1,6 @@
-// What is done with vectors of 16 bytes, by SSE2.
+// The operations on vectors of 16 bytes, by SSE2.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and under the target of its
+// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
 // set.
 
 template <std::size_t bytes>
@@ -10,7 +10,7 @@ template <>
 struct operations<16> {
     using Bits = __m128i;
 
-    // The first `bytes` of a vector, zeros behind them.
+    // The first `bytes` of a vector; the rest is zero.
     template <std::size_t bytes>
     static __m128i load(const void* const from) noexcept {
         if constexpr (bytes == 16) {
@@ -23,25 +23,15 @@ struct operations<16> {
         }
     }
 
-    // `lanes` numbers, integers widened to `size` bytes with their signs.
+    // `lanes` numbers; integers are widened to `size` bytes with their signs.
     template <std::size_t size, std::size_t lanes, typename From>
-    static __m128i widened(const From* const from) noexcept {
-        __m128i numbers = load<lanes * sizeof(From)>(from);
-        if constexpr (sizeof(From) < size) {
-            numbers = twice_as_wide<From>(numbers);
-        }
-        if constexpr (2 * sizeof(From) < size) {
-            numbers = twice_as_wide<wider<From, 2>>(numbers);
-        }
-        if constexpr (4 * sizeof(From) < size) {
-            numbers = twice_as_wide<wider<From, 4>>(numbers);
-        }
-        return numbers;
+    static __m128i load_widened(const From* const from) noexcept {
+        return widened<operations, size, From>(load<lanes * sizeof(From)>(from));
     }
 
-    // 32-bit integers as reals; of doubles, there are two.
+    // All 32-bit integers as floats, or the first two as doubles.
     template <typename T>
-    static auto reals(const __m128i numbers) noexcept {
+    static auto int32_to_real(const __m128i numbers) noexcept {
         if constexpr (std::is_same_v<T, float>) {
             return _mm_cvtepi32_ps(numbers);
         } else {
@@ -50,17 +40,17 @@ struct operations<16> {
     }
 
     template <std::size_t lanes>
-    static __m128d doubles(const float* const from) noexcept {
+    static __m128d load_floats_as_doubles(const float* const from) noexcept {
         return _mm_cvtps_pd(_mm_castsi128_ps(load<lanes * sizeof(float)>(from)));
     }
 
-    // Integers that become reals by an instruction for just that.
+    // Whether there is one instruction that converts integers `From`.
     template <typename T, typename From>
-    static constexpr bool converts = false;
+    static constexpr bool can_load_converted = false;
 
-    // Reals, the first half of a vector, with a zero behind each.
+    // The first half of a vector of reals, with a zero after each.
     template <typename T>
-    static __m128i with_zeros_between(const vector_of_bytes<T, 16> reals) noexcept {
+    static __m128i interleaved_with_zeros(const vector_of_bytes<T, 16> reals) noexcept {
         const auto bits = reinterpret_cast<__m128i>(reals);
         return std::is_same_v<T, float> ? twice_as_wide<std::uint32_t>(bits)
                                         : _mm_unpacklo_epi64(bits, _mm_setzero_si128());
@@ -81,7 +71,6 @@ struct operations<16> {
 
     static bool all_ones(const __m128i bits) noexcept { return _mm_movemask_epi8(bits) == 0xffff; }
 
-  private:
     // The first half of the `From` in a vector, widened to twice their size.
     template <typename From>
     static __m128i twice_as_wide(const __m128i numbers) noexcept {

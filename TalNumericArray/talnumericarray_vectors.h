@@ -1,5 +1,5 @@
-// The types of vectors, and how far they may read. What is done with vectors stands in a file for
-// each instruction set.
+// The types of vectors, and how far they may read. The operations on vectors are in a file for each
+// instruction set.
 
 #ifndef TALNUMERICARRAY_VECTORS_H
 #define TALNUMERICARRAY_VECTORS_H
@@ -9,7 +9,7 @@
 #include <cstdint>
 #include <type_traits>
 
-// The order of bytes matters where numbers are widened.
+// Widening depends on the byte order.
 #if (defined(__SSE2__) || defined(__ARM_NEON)) && __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__
 #    define TALNUMERICARRAY_HAS_VECTORS 1
 #else
@@ -20,24 +20,24 @@
 
 namespace talnumericarray {
 
-// The smallest page of any platform's memory; the larger ones are multiples of it.
+// The smallest page of any platform; larger ones are multiples of it.
 inline constexpr std::size_t page_bytes = 4096;
 
-// The number of whole elements from `data` on to the end of its page.
+// How many whole elements there are from `data` to the end of its page.
 template <typename T>
 inline std::size_t elements_before_page_end(const T* const data) noexcept {
-    const std::size_t behind = reinterpret_cast<std::uintptr_t>(data) % page_bytes;
-    return (page_bytes - behind) / sizeof(T);
+    const std::size_t offset = reinterpret_cast<std::uintptr_t>(data) % page_bytes;
+    return (page_bytes - offset) / sizeof(T);
 }
 
-// The same of both arrays, or `len` if that is less.
+// The least of that for two arrays and `len`.
 template <typename T1, typename T2>
 inline std::size_t elements_before_page_end(const T1* const data1, const T2* const data2,
                                             const std::size_t len) noexcept {
     return std::min({len, elements_before_page_end(data1), elements_before_page_end(data2)});
 }
 
-// ---- Integers of some size, and what becomes of them when they are widened
+// ---- Integers by size
 
 template <std::size_t size>
 using unsigned_of_size = std::conditional_t<
@@ -48,14 +48,14 @@ using unsigned_of_size = std::conditional_t<
 template <std::size_t size>
 using signed_of_size = std::make_signed_t<unsigned_of_size<size>>;
 
-template <typename T, std::size_t times>
-using wider = std::conditional_t<std::is_signed_v<T>, signed_of_size<times * sizeof(T)>,
-                                 unsigned_of_size<times * sizeof(T)>>;
+template <typename T>
+using twice_as_wide_t = std::conditional_t<std::is_signed_v<T>, signed_of_size<2 * sizeof(T)>,
+                                           unsigned_of_size<2 * sizeof(T)>>;
 
 // ---- Vectors
 
-// A vector for `lanes` of `T`. No vector is shorter than 16 bytes, of which the first 2, 4 or 8 may
-// be all that is in use; the other lanes are zeros on both sides, and as such the same.
+// A vector for `lanes` of `T`. No vector is shorter than 16 bytes. If only the first 2, 4 or 8
+// bytes are in use, the other lanes are zero on both sides, and so the same.
 template <typename T, std::size_t lanes>
 struct vector_of {
     static constexpr std::size_t bytes = std::max<std::size_t>(16, lanes * sizeof(T));
@@ -68,6 +68,25 @@ using vector = typename vector_of<T, lanes>::type;
 // A vector of `bytes` for whole `T`.
 template <typename T, std::size_t bytes>
 using vector_of_bytes = vector<T, bytes / sizeof(T)>;
+
+// The vectors of a block, which has one test for all of them. On 32-bit ARM a test takes as long as
+// comparing two vectors.
+#if defined(__arm__)
+inline constexpr std::size_t vectors_per_block = 8;
+#else
+inline constexpr std::size_t vectors_per_block = 4;
+#endif
+
+// The leading integers of a vector, widened to `size` bytes with their signs, by doubling.
+template <typename Operations, std::size_t size, typename From>
+inline typename Operations::Bits widened(const typename Operations::Bits numbers) noexcept {
+    if constexpr (sizeof(From) < size) {
+        return widened<Operations, size, twice_as_wide_t<From>>(
+            Operations::template twice_as_wide<From>(numbers));
+    } else {
+        return numbers;
+    }
+}
 
 } // namespace talnumericarray
 

@@ -73,7 +73,7 @@ bool certain_by(const Bound bound, const T1& x, const T2& y) {
     constexpr std::size_t count = Set::template elements<T1, T2>;
     const std::vector<T1> xs(count, x);
     const std::vector<T2> ys(count, y);
-    return Set::leading_certainly_same(bound, xs.data(), ys.data(), count, count) == count;
+    return Set::certain_prefix(bound, xs.data(), ys.data(), count, count) == count;
 }
 
 // Calls `print` with every answer, and whether it is one of fused operations.

@@ -1,7 +1,7 @@
 ; Proves: two reals in either order are the same, and a factor is made for them in either order; and
 ;   where both are numbers, what is above in one order is below in the other.
 ; Models: compare_impl (compare.h); that a pair of element types and its reverse share a loop
-;   (elements_sameQ in talnumericarray_sameq_impl.h).
+;   (elements_sameQ in talnumericarray_sameq_walk.h).
 ; for: single, double
 ; with: real_type any_arithmetic rule two_reals
 ; fault: (minus y x)) => (minus x y))

@@ -119,8 +119,8 @@ def chosen(found):
 
 def sets_for(path):
     """The sets that the module is built with for mutants of a file. All have the same loops, so
-    that one will do but where sets are chosen."""
-    if "instruction_sets" in path or "avx512" in path:
+    one will do, except where sets are defined and chosen."""
+    if any(name in path for name in ("instruction_sets", "sameq_walk", "avx512")):
         return ALL_SETS
     return BASELINE if "sse2" in path else ONE_SET
 
