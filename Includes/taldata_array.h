@@ -8,8 +8,8 @@
 
 #include <cstddef>
 
-// A dense n-dimensional array. Whoever makes a record keeps these invariants; nothing that reads
-// it checks them:
+// A dense n-dimensional array. Whoever makes a record keeps these invariants; no reader checks
+// them:
 //   rank >= 0, and `dims` points to `rank` dimensions;
 //   nelems >= 0 is the product of the dimensions (1 for rank 0);
 //   `data` points to `nelems` elements of the type that `data_type` names, without gaps and aligned
@@ -31,7 +31,7 @@ using TalTensor = st_TalDataArray*;
 using TalNumericArray = st_TalDataArray*;
 
 // Separately built parts of the runtime pass records to each other, so the layout is fixed. The
-// first seven fields lie alike everywhere but for the width of a pointer.
+// offsets of the first seven fields depend only on the width of a pointer.
 static_assert(offsetof(st_TalDataArray, prec) == 0);
 static_assert(offsetof(st_TalDataArray, dims) == 8);
 static_assert(offsetof(st_TalDataArray, rank) == 8 + sizeof(void*));

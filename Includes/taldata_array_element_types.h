@@ -1,7 +1,6 @@
 // The list of the element types, in the order of their ids.
 //
-// Whatever has to be done once per element type (the dispatch, a table, a test) is generated from
-// this list.
+// Whatever is needed once per element type (dispatch, tables, tests) is generated from this list.
 
 #ifndef TALDATA_ARRAY_ELEMENT_TYPES_H
 #define TALDATA_ARRAY_ELEMENT_TYPES_H
@@ -27,7 +26,7 @@ struct type_tag {
 using element_type_list = type_list<BIT8, UBIT8, BIT16, UBIT16, BIT32, UBIT32, BIT64, UBIT64, float,
                                     double, std::complex<float>, std::complex<double>>;
 
-// The number of types in front of `T` in the list.
+// The number of types before `T` in the list.
 template <typename T, typename... Types>
 constexpr int position_in_list(type_list<Types...> /*types*/) noexcept {
     int position = 0;
@@ -48,6 +47,6 @@ static_assert(element_type_id<float> == REAL32_TYPE && element_type_id<double> =
 static_assert(element_type_id<std::complex<float>> == COMPLEX_REAL32_TYPE);
 static_assert(element_type_id<std::complex<double>> == COMPLEX_REAL64_TYPE);
 static_assert(sizeof(std::complex<float>) == 8 && sizeof(std::complex<double>) == 16,
-              "a complex element is its real part and its imaginary part, without a gap");
+              "a complex element is its real part and its imaginary part, without padding");
 
 #endif

@@ -1,4 +1,4 @@
-// What tensors and numeric arrays share: the equality of shapes.
+// What tensors and numeric arrays share: the comparison of shapes.
 
 #ifndef TALTENSOR_H
 #define TALTENSOR_H
@@ -18,7 +18,7 @@ extern const std::size_t TalTensor_typeSizeTable[];
 inline int EquivalentDimensions(const talint rank, const talint* dims1,
                                 const talint* dims2) noexcept {
     const std::size_t bytes = static_cast<std::size_t>(rank) * sizeof(talint);
-    // No bytes are equal bytes; memcmp itself must not be given a null pointer even then.
+    // memcmp must not be given a null pointer, even for no bytes.
     return bytes == 0 || std::memcmp(dims1, dims2, bytes) == 0 ? 1 : 0;
 }
 

@@ -1,10 +1,11 @@
-// The table of element sizes for programs without a runtime that defines one. It is an archive
-// member of its own, so that the linker leaves it out where the runtime's table is there, and weak,
-// so that it gives way even where the linker is told to take all members.
+// The table of element sizes, for programs whose runtime does not define it. It is an archive
+// member of its own, so the linker leaves it out if the runtime's table is there. It is weak, so it
+// gives way even if the linker has to take all members.
 
 #include "taldata_array_element_types.h"
 
-// Hidden in this definition alone: how the runtime's own table is exported is the runtime's affair.
+// Only this definition is hidden. Whether the runtime exports its own table is the runtime's
+// choice.
 #pragma GCC visibility push(hidden)
 #include "talnumericarray.h"
 #pragma GCC visibility pop

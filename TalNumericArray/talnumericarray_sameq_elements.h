@@ -1,7 +1,7 @@
-// The element tests: are one element of each array the same?
+// The element tests: whether one element of each array are the same.
 //
-// A complex number is a pair of reals, each judged on its own against the full tolerance; an
-// integer or a real stands for a complex number whose imaginary part is zero.
+// The two parts of a complex number are compared separately, each under the full tolerance. An
+// integer or a real counts as a complex number whose imaginary part is zero.
 
 #ifndef TALNUMERICARRAY_SAMEQ_ELEMENTS_H
 #define TALNUMERICARRAY_SAMEQ_ELEMENTS_H
@@ -18,9 +18,8 @@ NESK_STRICT_SINGLES_BEGIN
 
 namespace talnumericarray {
 
-// The parts of a complex number, where they lie: one that is not looked at is not read. Not by its
-// own functions: those of the standard library are compiled with other features than these on
-// 32-bit ARM, and so would not be inlined.
+// The parts of a complex number, by reference, so that only a part that is tested is read. Members
+// of std::complex would not be inlined on 32-bit ARM: they are compiled for other features.
 template <typename T>
 inline const T& real_part(const std::complex<T>& number) noexcept {
     return reinterpret_cast<const T(&)[2]>(number)[0];
@@ -36,15 +35,15 @@ inline const T& imaginary_part(const std::complex<T>& number) noexcept {
 // Integer or real against integer or real.
 template <typename T1, typename T2,
           std::enable_if_t<!is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
-NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_FORCE_INLINE bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     return nesk::compare(tol, data1, data2) == 0;
 }
 
-// Integer or real against complex. No tolerance makes a nonzero value the same as zero, so that the
-// imaginary part is tested for zero outright.
+// Integer or real against complex. No tolerance makes a nonzero value the same as zero, so the
+// imaginary part is simply tested for zero.
 template <typename T1, typename T2,
           std::enable_if_t<!is_complex_v<T1> && is_complex_v<T2>, int> = 0>
-NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_FORCE_INLINE bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const T1& rdata1 = data1;
     const to_real_type_t<T2>& rdata2 = talnumericarray::real_part(data2);
     const to_real_type_t<T2>& idata2 = talnumericarray::imaginary_part(data2);
@@ -54,7 +53,7 @@ NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& dat
 // Complex against integer or real.
 template <typename T1, typename T2,
           std::enable_if_t<is_complex_v<T1> && !is_complex_v<T2>, int> = 0>
-NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_FORCE_INLINE bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const to_real_type_t<T1>& rdata1 = talnumericarray::real_part(data1);
     const to_real_type_t<T1>& idata1 = talnumericarray::imaginary_part(data1);
     const T2& rdata2 = data2;
@@ -63,7 +62,7 @@ NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& dat
 
 // Complex against complex.
 template <typename T1, typename T2, std::enable_if_t<is_complex_v<T1> && is_complex_v<T2>, int> = 0>
-NESK_EXPANDED bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
+NESK_FORCE_INLINE bool sameQ_test(const talreal& tol, const T1& data1, const T2& data2) noexcept {
     const to_real_type_t<T1>& rdata1 = talnumericarray::real_part(data1);
     const to_real_type_t<T1>& idata1 = talnumericarray::imaginary_part(data1);
     const to_real_type_t<T2>& rdata2 = talnumericarray::real_part(data2);

@@ -11,19 +11,19 @@
 #include <limits>
 #include <type_traits>
 
-// Expanded into each element loop the comparison is fast. GCC finds it too large for some; Clang,
-// which does not, would refuse to if it were told to in code with NEON.
+// The comparison is fast when it is inlined into the element loops. GCC does not always do so by
+// itself. Clang does, and would reject the attribute in code with NEON.
 #if defined(__OPTIMIZE__) && !defined(__OPTIMIZE_SIZE__) && !defined(__clang__)
-#    define NESK_EXPANDED [[gnu::always_inline]] inline
+#    define NESK_FORCE_INLINE [[gnu::always_inline]] inline
 #else
-#    define NESK_EXPANDED inline
+#    define NESK_FORCE_INLINE inline
 #endif
 
-// Where size counts, its steps are one function.
+// In a build for size, the comparison of reals is one function.
 #if defined(__OPTIMIZE_SIZE__)
-#    define NESK_STEPS [[gnu::noinline]] inline
+#    define NESK_INLINE_UNLESS_SMALL [[gnu::noinline]] inline
 #else
-#    define NESK_STEPS NESK_EXPANDED
+#    define NESK_INLINE_UNLESS_SMALL NESK_FORCE_INLINE
 #endif
 
 #pragma GCC visibility push(hidden)
@@ -40,8 +40,7 @@ template <typename T1, typename T2>
 inline constexpr bool either_floating_v =
     std::disjunction_v<std::is_floating_point<T1>, std::is_floating_point<T2>>;
 
-// ---- Integers: -1, 0 or +1 as `arg1` is below, equal to or above `arg2` as a mathematical
-// integer.
+// ---- Integers: -1, 0 or +1 if `arg1` is below, equal to or above `arg2` as a mathematical integer
 
 template <typename T>
 inline int compare_equal_types(const T arg1, const T arg2) noexcept {
@@ -81,9 +80,9 @@ inline int compare_impl(const T1& arg1, const T2& arg2) noexcept {
     return compare_equal_types<type_common_t<T1, T2>>(arg1, arg2);
 }
 
-// ---- Reals: the tolerant comparison.
+// ---- Reals: the tolerant comparison
 
-// Out of the loops, which need it once.
+// Computes the factor and remembers it. Not inlined, as a loop needs it once.
 template <typename T>
 [[gnu::noinline]] T new_factor(const T tol) noexcept {
     const T tolfactor = ToleranceShiftFactor(tol);
@@ -91,14 +90,14 @@ template <typename T>
     return tolfactor;
 }
 
-// Returns 0 when `x` and `y` are the same under `tol`, else +1 when `x` is the greater and -1 when
-// `y` is. A NaN is ordered as the steps happen to leave it, to either side.
+// Returns 0 when `x` and `y` are the same under `tol`; else +1 when `x` is the greater and -1 when
+// `y` is. With a NaN, a nonzero result may have either sign.
 //
 // Two nonzero reals of one sign are the same when they differ by less than 2^(tol - bits) times the
-// larger magnitude. No tolerance makes zero the same as another number, nor a number the same as
-// one of the other sign.
+// larger magnitude. No tolerance makes zero the same as another number, or two numbers of opposite
+// signs the same.
 template <typename T, std::enable_if_t<std::is_floating_point_v<T>, int> = 0>
-NESK_STEPS int compare_impl(const T& tol, const T& x, const T y) noexcept {
+NESK_INLINE_UNLESS_SMALL int compare_impl(const T& tol, const T& x, const T y) noexcept {
     constexpr int bits = std::numeric_limits<T>::digits;
 
     if (x == y) {
@@ -141,8 +140,8 @@ NESK_STEPS int compare_impl(const T& tol, const T& x, const T y) noexcept {
     T tolfactor = 0;
     if (!recall_factor(tol, tolfactor)) {
         // A pair that differs in its leading binary digit needs no factor. For tolerances up to
-        // `bits` - 1 the factor is at most 1/2 and this changes no answer; above, it is part of the
-        // rule that such a pair is the same only when the factor is remembered already.
+        // `bits` - 1 the factor is at most 1/2, and this changes no answer. Above that, it is part
+        // of the rule: such a pair is the same only if the factor is remembered already.
         const bool far_apart = max >= 1 ? diff >= max * T(0.5) : max <= diff + diff;
         if (far_apart) {
             return s;
@@ -150,8 +149,8 @@ NESK_STEPS int compare_impl(const T& tol, const T& x, const T y) noexcept {
         tolfactor = new_factor(tol);
     }
 
-    // A magnitude of at least 1 times the factor, like a difference below 1 divided by it, neither
-    // falls to zero nor overflows.
+    // A magnitude of at least 1 is multiplied by the factor, or a difference below 1 is divided by
+    // it: neither becomes zero or overflows.
     if (max >= 1) {
         max = max * tolfactor;
     } else {
@@ -162,22 +161,22 @@ NESK_STEPS int compare_impl(const T& tol, const T& x, const T y) noexcept {
 
 } // namespace detail
 
-// Two integers, of any widths and signedness: compared exactly; the tolerance plays no part.
-// Returns 0 when they are equal, -1 when `arg1` is the smaller, +1 when it is the greater.
+// Two integers of any widths and signedness are compared exactly, without the tolerance. Returns 0
+// when they are equal, -1 when `arg1` is the smaller, +1 when it is the greater.
 template <typename Ttol, typename T1, typename T2,
           std::enable_if_t<detail::both_integral_v<T1, T2>, int> = 0>
 inline int compare(const Ttol& /*tol*/, const T1& arg1, const T2& arg2) noexcept {
     return detail::compare_impl(arg1, arg2);
 }
 
-// A real and a real, or a real and an integer: the tolerance, in binary digits, and both values are
-// converted to the common type of the two values, in the direction of rounding that is in force,
-// and compared there. (On 32-bit ARM the function that converts 64-bit integers knows no direction
-// but to the nearest.) An integer beside a single is compared as a single, whatever its width.
-// Returns 0 when they are the same, else -1 or +1.
+// Two reals, or a real and an integer: both values, and the tolerance in binary digits, are
+// converted to the common type of the two values in the current rounding direction, and compared
+// there. (On 32-bit ARM, the function that converts 64-bit integers always rounds to nearest.) An
+// integer beside a single is compared as a single, whatever its width. Returns 0 when they are the
+// same, else -1 or +1.
 template <typename Ttol, typename T1, typename T2,
           std::enable_if_t<detail::either_floating_v<T1, T2>, int> = 0>
-NESK_EXPANDED int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept {
+NESK_FORCE_INLINE int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept {
     using common_type = type_common_t<T1, T2>;
     const auto tol = static_cast<common_type>(tol_);
     const auto arg1 = static_cast<common_type>(arg1_);
@@ -189,6 +188,6 @@ NESK_EXPANDED int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) no
 
 NESK_STRICT_SINGLES_END
 #pragma GCC visibility pop
-#undef NESK_STEPS
+#undef NESK_INLINE_UNLESS_SMALL
 
 #endif

@@ -1,10 +1,9 @@
-// Stops a build in which floating-point arithmetic does not mean what is written, and keeps NEON
-// from taking part where it does not.
+// Stops builds without IEEE arithmetic, and keeps NEON out of the comparison of singles.
 //
-// The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width. A
-// compiler that may assume that there are no NaNs, reassociate, take reciprocals or keep excess
-// precision can give other answers, silently. GCC tells of each of these from version 12 on;
-// earlier ones and Clang only of -ffast-math and -ffinite-math-only.
+// The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width.
+// Compilers that may assume that there are no NaNs, reassociate, use reciprocals or keep excess
+// precision can silently change answers. GCC has a macro for each of these from version 12 on;
+// earlier versions and Clang only for -ffast-math and -ffinite-math-only.
 
 #ifndef NESK_STRICT_FLOATING_POINT_H
 #define NESK_STRICT_FLOATING_POINT_H
@@ -22,17 +21,16 @@
         "array comparison needs arithmetic without excess precision (FLT_EVAL_METHOD 0): on x86 build with -msse2 -mfpmath=sse"
 #endif
 
-// Between NESK_STRICT_SINGLES_BEGIN and its end, functions compare singles as IEEE says on 32-bit
-// ARM too.
+// Functions between NESK_STRICT_SINGLES_BEGIN and NESK_STRICT_SINGLES_END compare singles by IEEE
+// arithmetic on 32-bit ARM too.
 //
-// There NEON takes subnormal numbers for zero. GCC leaves floating point to VFP for that reason,
-// whereas Clang vectorises loops of comparisons, in whose answers 1e-40 is then the same as 0. So
-// these functions are compiled without NEON, and are not inlined into code that has it: LLVM
-// inlines a function only where all features outside a list of its own agree with the caller's. One
-// that is not in the list, and changes no result, says how registers of VFP are handed out; here it
-// is set against the default, which is off but for one processor. The same goes for files compiled
-// without NEON, as a program that is optimised when it is linked may have others with it. Only a
-// caller marked [[gnu::flatten]] takes these functions in all the same.
+// There NEON takes subnormal numbers for zero. GCC leaves floating point to VFP for that reason.
+// Clang vectorises loops of comparisons, and 1e-40 becomes the same as 0. So under Clang these
+// functions are compiled without NEON, and are not inlined into code that has it. LLVM inlines
+// across feature differences only for allow-listed features; wide-stride-vfp isn't listed and
+// affects only register allocation, so flipping it blocks inlining. It is off by default, except on
+// the Swift processor. Files compiled without NEON flip it too, as link-time optimisation may
+// combine them with others. Only a caller marked [[gnu::flatten]] still inlines these functions.
 #if defined(__clang__) && defined(__arm__)
 // clang-format off
 #    if defined(__ARM_ARCH_7S__)
