@@ -75,7 +75,7 @@ bool as_ruled_by(const Ruling& ruling, const Bound bound, const Sevens<T1, T2>& 
     if constexpr (std::is_floating_point_v<talnumericarray::comparison_t<
                       T1, T2>> || Set::template has_loop<Bound, T1, T2>) {
         if (Set::supported()) {
-            const std::size_t passed = talnumericarray::by_best_set(
+            const std::size_t passed = talnumericarray::certain_prefix_by_best_set(
                 type_list<Set>{}, bound, sevens.data1(), sevens.data2(), place.count);
             EXPECT_LE(passed, place.count);
             return follows_rule(ruling, Set::name, passed > place.index);

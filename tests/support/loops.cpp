@@ -18,8 +18,8 @@ std::vector<InstructionSet> listed(type_list<Sets...> /*sets*/) {
 
 template <typename T>
 RememberedFactor<T> remembered_of() {
-    const nesk::detail::factor_cache<T>& cache = nesk::detail::factor_cache_of_thread<T>();
-    const auto& kept = cache.factors[cache.place(cache.changes)];
+    const nesk::factor_cache<T>& cache = nesk::factor_cache_of_thread<T>();
+    const auto& kept = cache.factors[cache.slot(cache.state)];
     return {kept.lasttol, kept.tolfactor};
 }
 
@@ -91,9 +91,8 @@ Remembered remembered() {
 }
 
 void remember(const Remembered& factors) {
-    nesk::detail::remember_factor<float>({factors.of_singles.tolerance, factors.of_singles.factor});
-    nesk::detail::remember_factor<double>(
-        {factors.of_doubles.tolerance, factors.of_doubles.factor});
+    nesk::remember_factor<float>({factors.of_singles.tolerance, factors.of_singles.factor});
+    nesk::remember_factor<double>({factors.of_doubles.tolerance, factors.of_doubles.factor});
 }
 
 Remembered factors_of(const double tol) {
