@@ -31,7 +31,7 @@ class InputDraws final : public oracle::Draws {
     // Of bytes of zero this is false, unlike `one_in`.
     bool rarely(const std::uint32_t bound) { return below(bound) == bound - 1; }
 
-    bool used_up() const { return bytes_.remaining_bytes() == 0; }
+    bool used_up() { return bytes_.remaining_bytes() == 0; }
 
   private:
     FuzzedDataProvider bytes_;
