@@ -302,7 +302,7 @@ INSTANTIATE_TEST_SUITE_P(Elements, BrokenFiles, testing::ValuesIn(unsupported),
 
 struct BrokenArchive {
     const char* name;
-    std::vector<zip::Member> members;
+    std::vector<zipped::Member> members;
     std::string message; // after the name of the file
 };
 
@@ -326,7 +326,7 @@ class BrokenArchives : public testing::TestWithParam<BrokenArchive> {};
 
 TEST_P(BrokenArchives, AreRefused) {
     const TemporaryFolder folder;
-    const std::string broken = folder.write("broken.npz", zip::archive(GetParam().members));
+    const std::string broken = folder.write("broken.npz", zipped::archive(GetParam().members));
     expect_refused(folder, broken, GetParam().message);
 }
 

@@ -9,7 +9,7 @@
 #include <string>
 #include <vector>
 
-namespace zip {
+namespace zipped {
 
 using npy::little_endian;
 
@@ -43,6 +43,6 @@ inline std::string archive(const std::vector<Member>& members) {
            + std::string(2, '\0');
 }
 
-} // namespace zip
+} // namespace zipped
 
 #endif
