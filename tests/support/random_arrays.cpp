@@ -133,22 +133,10 @@ auto with_real_type(const Part part, const Action& action) {
     return part.size == sizeof(float) ? action(float{}) : action(double{});
 }
 
-// The share of the larger magnitude that two numbers may differ by: 0 asks for equality.
-template <typename Real>
-Real allowed_share(const double tolerance) {
-    constexpr int digits = std::numeric_limits<Real>::digits;
-    const auto narrowed = static_cast<Real>(tolerance);
-    if (!(narrowed > 0)) {
-        return 0;
-    }
-    return narrowed >= digits ? Real{1} : rounded_factor(narrowed);
-}
-
 class PairWriter {
   public:
     PairWriter(Draws& draws, const double tolerance, const int first_id, const int second_id)
-        : draws_(draws), tolerance_(tolerance), single_share_(allowed_share<float>(tolerance)),
-          double_share_(allowed_share<double>(tolerance)), first_(part_of(first_id)),
+        : draws_(draws), tolerance_(tolerance), first_(part_of(first_id)),
           second_(part_of(second_id)), first_is_complex_(is_complex(first_id)),
           second_is_complex_(is_complex(second_id)), nan_pattern_(draws.bits()) {}
 
@@ -299,10 +287,15 @@ class PairWriter {
         });
     }
 
+    // The share of the larger magnitude that two numbers may differ by: 0 asks for equality.
     template <typename Real>
     Real share() const {
-        return sizeof(Real) == 4 ? static_cast<Real>(single_share_)
-                                 : static_cast<Real>(double_share_);
+        constexpr int digits = std::numeric_limits<Real>::digits;
+        const auto narrowed = static_cast<Real>(tolerance_);
+        if (!(narrowed > 0)) {
+            return 0;
+        }
+        return narrowed >= digits ? Real{1} : rounded_factor(narrowed);
     }
 
     template <typename Real>
@@ -312,8 +305,6 @@ class PairWriter {
 
     Draws& draws_;
     double tolerance_;
-    float single_share_;
-    double double_share_;
     Part first_;
     Part second_;
     bool first_is_complex_;
