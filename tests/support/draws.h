@@ -25,9 +25,7 @@ class Draws {
     virtual ~Draws() = default;
 
     virtual std::uint64_t bits() = 0;
-    virtual std::uint32_t below(const std::uint32_t bound) {
-        return static_cast<std::uint32_t>(bits() >> 32) % bound;
-    }
+    virtual std::uint32_t below(std::uint32_t bound) = 0;
 
     bool one_in(const std::uint32_t bound) { return below(bound) == 0; }
     int between(const int low, const int high) {
@@ -46,6 +44,9 @@ class Random final : public Draws {
     explicit Random(const std::uint64_t seed) : engine_(seed) {}
 
     std::uint64_t bits() override { return engine_(); }
+    std::uint32_t below(const std::uint32_t bound) override {
+        return static_cast<std::uint32_t>(bits() >> 32) % bound;
+    }
 
   private:
     std::mt19937_64 engine_;
