@@ -28,9 +28,9 @@ def run_program(*words, **options):
     return done.returncode, done.stdout.decode(), done.stderr.decode()
 
 
-def run(*arguments, **options):
-    """Runs talcmp."""
-    return run_program(*COMMAND, *arguments, **options)
+def run(*arguments, prefix=(), **options):
+    """Runs talcmp, by the program in `prefix` if there is one."""
+    return run_program(*prefix, *COMMAND, *arguments, **options)
 
 
 def document_of(output):
