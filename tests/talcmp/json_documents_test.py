@@ -57,8 +57,8 @@ class Documents(Folder):
 
     def test_trouble(self):
         self.save("a.npy", [1])
-        os.mkdir(self.path("one"))
-        os.mkdir(self.path("two"))
+        self.make_folder("one")
+        self.make_folder("two")
         self.check_trouble("a.npy", "b.npy", "b.npy: cannot be opened: No such file or directory")
         self.check_trouble("one", "two",
                            "one: holds no .npy or .npz file to compare, nor does two")

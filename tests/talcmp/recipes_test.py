@@ -3,48 +3,32 @@
 
 import json
 import os
-import pathlib
 import re
 import shlex
 import shutil
-import subprocess
-import tempfile
 import unittest
 
 import numpy as np
 
-from support.talcmp_command import COMMAND, run_tests
+from support.talcmp_command import COMMAND, ROOT, Folder, read_bytes, run_program, run_tests
 
-RECIPES = pathlib.Path(__file__).resolve().parents[2] / "examples" / "recipes"
+RECIPES = ROOT / "examples" / "recipes"
 
 
-class Recipe(unittest.TestCase):
+class Recipe(Folder):
     def setUp(self):
-        folder = tempfile.TemporaryDirectory()
-        self.addCleanup(folder.cleanup)
-        self.folder = pathlib.Path(folder.name, "work")
-        self.programs = pathlib.Path(folder.name, "programs")
-        self.folder.mkdir()
-        self.programs.mkdir()
-        self.add_program("talcmp", f'exec {shlex.join(COMMAND)} "$@"')
-        self.environment = {**os.environ, "HOME": folder.name,
+        super().setUp()
+        self.programs = self.make_folder("programs")
+        self.environment = {**os.environ, "HOME": self.folder,
                             "PATH": f"{self.programs}:{os.environ['PATH']}"}
+        self.folder = self.make_folder("work")
+        self.add_program("talcmp", f'exec {shlex.join(COMMAND)} "$@"')
 
     def add_program(self, name, script):
-        path = self.programs / name
-        path.write_text(f"#!/bin/sh\n{script}\n", encoding="utf-8")
-        path.chmod(0o755)
-
-    def save(self, name, array):
-        path = self.folder / name
-        path.parent.mkdir(exist_ok=True)
-        np.save(path, array)
+        os.chmod(self.write(f"{self.programs}/{name}", f"#!/bin/sh\n{script}\n".encode()), 0o755)
 
     def run_in_folder(self, *command):
-        """Returns the exit status, and what is on standard output and on standard error."""
-        done = subprocess.run([str(word) for word in command], cwd=self.folder, text=True,
-                              env=self.environment, capture_output=True, check=False, timeout=120)
-        return done.returncode, done.stdout, done.stderr
+        return run_program(*command, cwd=self.folder, env=self.environment)
 
 
 class CTest(Recipe):
@@ -52,7 +36,7 @@ class CTest(Recipe):
         shutil.copy(RECIPES / "CMakeLists.txt", self.folder)
         self.save("expected.npy", np.arange(5.0))
         self.save("computed.npy", result)
-        self.add_program("simulate", f"cp {self.folder}/computed.npy \"$1\"")
+        self.add_program("simulate", f'cp {self.folder}/computed.npy "$1"')
         status, output, errors = self.run_in_folder("cmake", "-B", "build")
         self.assertEqual(status, 0, output + errors)
         return self.run_in_folder("ctest", "--test-dir", "build", "--output-on-failure")
@@ -73,9 +57,7 @@ class ShellScript(Recipe):
         return self.run_in_folder(RECIPES / "check_results.sh")
 
     def test_as_expected(self):
-        status, output, errors = self.compare(np.arange(5.0))
-        self.assertEqual((status, errors), (0, ""))
-        self.assertEqual(output, "all results are as expected\n")
+        self.assertEqual(self.compare(np.arange(5.0)), (0, "all results are as expected\n", ""))
 
     def test_not_as_expected(self):
         status, output, _ = self.compare(np.arange(5.0) * (1 + 2.0**-35))
@@ -83,10 +65,8 @@ class ShellScript(Recipe):
         self.assertIn("smallest tolerance    --tol 18", output)
 
     def test_trouble(self):
-        (self.folder / "results").mkdir()
-        (self.folder / "results" / "run.npy").write_text("broken", encoding="utf-8")
-        (self.folder / "expected").mkdir()
-        shutil.copy(self.folder / "results" / "run.npy", self.folder / "expected")
+        self.write("results/run.npy", b"broken")
+        self.write("expected/run.npy", b"broken")
         status, _, errors = self.run_in_folder(RECIPES / "check_results.sh")
         self.assertEqual(status, 2)
         self.assertIn("could not be compared", errors)
@@ -105,7 +85,7 @@ class Workflow(Recipe):
             status, _, errors = self.run_in_folder("bash", "-e", "-o", "pipefail", "-c",
                                                    self.step())
             self.assertEqual((status, errors), (expected_status, ""))
-            report = json.loads((self.folder / "report" / "talcmp.json").read_text("utf-8"))
+            report = json.loads(read_bytes(self.path("report/talcmp.json")))
             self.assertEqual(report["exit_status"], expected_status)
 
 

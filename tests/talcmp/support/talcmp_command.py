@@ -66,6 +66,10 @@ class Folder(unittest.TestCase):
         os.makedirs(os.path.dirname(path), exist_ok=True)
         return path
 
+    def make_folder(self, name):
+        os.mkdir(self.path(name))
+        return self.path(name)
+
     def write(self, name, contents):
         path = self.path(name)
         pathlib.Path(path).write_bytes(contents)
