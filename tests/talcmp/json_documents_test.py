@@ -17,7 +17,7 @@ def nan(bits):
 
 class Documents(Folder):
     def check(self, name, arguments, status, errors="", **texts):
-        """In the document stand names for `texts` and for the version."""
+        """Each name of `texts`, and VERSION, stands for its text in the document."""
         texts["VERSION"] = run("--version")[1].split()[1]
         expected = read_bytes(DOCUMENTS / f"{name}.json").decode()
         for placeholder, text in texts.items():
