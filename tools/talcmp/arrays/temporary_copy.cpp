@@ -43,7 +43,7 @@ TemporaryCopy::TemporaryCopy(std::unique_ptr<ArraySource> source,
 
 void TemporaryCopy::copy_all(const std::function<void(std::uint64_t)>& copied) {
     constexpr std::uint64_t elements_at_once = std::uint64_t{1} << 14U;
-    const std::size_t size = type().size;
+    const std::size_t size = source_->type().size;
     const std::uint64_t total = element_count(*source_);
     std::vector<char> buffer(static_cast<std::size_t>(std::min(elements_at_once, total)) * size);
     for (std::uint64_t first = 0; first < total; first += elements_at_once) {
@@ -72,7 +72,7 @@ void TemporaryCopy::append(const char* bytes, std::size_t count) {
 
 void TemporaryCopy::read(const std::uint64_t first, const std::uint64_t count,
                          void* const elements) {
-    const std::size_t size = type().size;
+    const std::size_t size = source_->type().size;
     const std::size_t bytes = static_cast<std::size_t>(count) * size;
     if (read_at(file_.number(), folder_, first * size, elements, bytes) < bytes) {
         throw Trouble(folder_, "the temporary copy of the array there was cut short");
