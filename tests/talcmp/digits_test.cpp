@@ -55,7 +55,7 @@ void expect_samenesses(const DigitSearch::Result& result, const talcmp::Pairs& p
     std::array<std::uint64_t, DigitSearch::class_count> count = {};
     for (std::size_t i = 0; i < pairs.count(); ++i) {
         ++count.at(result.class_of[i]);
-        const Sameness found = result.sameness(i);
+        const Sameness found = talcmp::sameness_of(result, i);
         ASSERT_TRUE(is_sameness_of(pairs, i, found))
             << "pair " << i << ": " << pairs.type1().text(pairs.element1(i), false) << " and "
             << pairs.type2().text(pairs.element2(i), false) << " not from " << found.from_one()

@@ -214,7 +214,7 @@ class Reports : public testing::TestWithParam<Counted> {};
 TEST_P(Reports, CountAllPairsAndListTheFirst) {
     for (const bool in_order : {true, false}) {
         SCOPED_TRACE(in_order);
-        Findings findings(3);
+        Findings findings = {talcmp::FirstPairs(3), {}};
         talcmp::PairCounter(GetParam().tolerance)
             .add(
                 pairs_of(GetParam().first, GetParam().second),
@@ -244,7 +244,7 @@ TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {
     for (const auto& each : cases) {
         SCOPED_TRACE(each.name);
         talcmp::PairCounter counter(0);
-        Findings findings(3);
+        Findings findings = {talcmp::FirstPairs(3), {}};
         for (const std::uint64_t begin : each.begins) {
             const auto number = [&](const std::size_t i) {
                 return begin + (each.in_order ? i : 2 - i);
@@ -259,7 +259,7 @@ TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {
 }
 
 Totals totals_of(const Reals& second, const std::uint64_t begin) {
-    Findings findings(1);
+    Findings findings = {talcmp::FirstPairs(1), {}};
     const Reals first(second.size(), 1.0);
     talcmp::PairCounter(0).add(
         pairs_of(first, second), [begin](const std::size_t i) { return begin + i; }, true,

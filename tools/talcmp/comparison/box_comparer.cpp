@@ -39,7 +39,7 @@ BoxComparer::BoxComparer(const BoxPlan& plan)
     : plan_(plan),
       buffer1_(new unsigned char[plan.traversal().largest_box() * plan.first().type().size]),
       buffer2_(new unsigned char[plan.traversal().largest_box() * plan.second().type().size]),
-      counter_(plan.question().tolerance), findings_(plan.question().differences) {}
+      counter_(plan.question().tolerance), findings_{FirstPairs(plan.question().differences), {}} {}
 
 std::uint64_t BoxComparer::compare(const Box& box) {
     read(box);

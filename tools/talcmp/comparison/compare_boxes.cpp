@@ -114,7 +114,7 @@ Findings compare_boxes(const BoxPlan& plan, const unsigned threads, ProgressList
     }
     in_threads(threads,
                [&](const std::size_t i) { take_boxes(plan, queue, *comparers[i], progress); });
-    Findings sum(plan.question().differences);
+    Findings sum = {FirstPairs(plan.question().differences), {}};
     for (const auto& comparer : comparers) {
         add(sum, comparer->findings());
     }

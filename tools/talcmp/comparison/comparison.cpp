@@ -46,7 +46,7 @@ void find_samenesses(const BoxPlan& plan, std::vector<FoundPair>& pairs) {
         const auto& found =
             search.search(Pairs(type1, elements1.data(), type2, elements2.data(), count));
         for (std::size_t i = 0; i < count; ++i) {
-            first[i].sameness = found.sameness(i);
+            first[i].sameness = sameness_of(found, i);
         }
     }
 }

@@ -66,8 +66,6 @@ class DigitSearch {
         std::vector<Class> class_of;                       // each pair
         std::array<Sameness, class_count> sameness_of;     // the pairs of each class
         std::array<std::uint64_t, class_count> count = {}; // of the pairs of each class
-
-        Sameness sameness(const std::size_t i) const { return sameness_of[class_of[i]]; }
     };
 
     DigitSearch();
@@ -83,6 +81,11 @@ class DigitSearch {
     Result result_;
     DigitGroups groups_;
 };
+
+// Of the pair `i` of those that were searched.
+inline Sameness sameness_of(const DigitSearch::Result& found, const std::size_t i) {
+    return found.sameness_of[found.class_of[i]];
+}
 
 } // namespace talcmp
 

@@ -31,8 +31,6 @@ std::optional<int> smallest_tolerance(const Totals& totals, int all_digits);
 
 // What was found in some of the pairs.
 struct Findings {
-    explicit Findings(const std::size_t most_pairs) : first(most_pairs) {}
-
     FirstPairs first; // of those that differ
     Totals totals;    // where a report is asked for
 };

@@ -45,9 +45,9 @@ void add_worst(const Pairs& pairs, const DigitSearch::Result& found,
         return;
     }
     for (std::size_t i = 0; i < pairs.count() && !(in_order && worst.worst); ++i) {
-        if (found.sameness(i).digits() == worst.worst_digits
+        if (sameness_of(found, i).digits() == worst.worst_digits
             && (!worst.worst || number(i) < worst.worst->number)) {
-            worst.worst = found_pair(pairs, i, number(i), found.sameness(i));
+            worst.worst = found_pair(pairs, i, number(i), sameness_of(found, i));
         }
     }
     add(totals, worst);
@@ -112,8 +112,8 @@ void PairCounter::add_differing(const Pairs& pairs, const DigitSearch::Result& f
         different -= answer == Answer::different ? 1 : 0;
         findings.totals.differing += asked && differs ? 1 : 0;
         if (differs && wanted) {
-            wanted =
-                findings.first.add(found_pair(pairs, i, number(i), found.sameness(i))) || !in_order;
+            wanted = findings.first.add(found_pair(pairs, i, number(i), sameness_of(found, i)))
+                     || !in_order;
         }
     }
 }
