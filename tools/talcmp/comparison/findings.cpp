@@ -14,20 +14,20 @@ std::optional<int> smallest_tolerance(const Totals& totals, const int all_digits
     return totals.needed_from_one;
 }
 
-void add(Totals& sum, const Totals& totals) {
-    sum.pairs += totals.pairs;
-    sum.differing += totals.differing;
+void add(Totals& sum, const Totals& part) {
+    sum.pairs += part.pairs;
+    sum.differing += part.differing;
     for (std::size_t i = 0; i < sum.digits.size(); ++i) {
-        sum.digits[i] += totals.digits[i];
+        sum.digits[i] += part.digits[i];
     }
-    sum.needed_from_one = std::max(sum.needed_from_one, totals.needed_from_one);
-    add(sum.values1, totals.values1);
-    add(sum.values2, totals.values2);
-    const bool worse = totals.worst_digits > sum.worst_digits;
-    const bool as_bad = totals.worst_digits == sum.worst_digits && totals.worst.has_value();
-    if (worse || (as_bad && totals.worst->number < sum.worst->number)) {
-        sum.worst_digits = totals.worst_digits;
-        sum.worst = totals.worst;
+    sum.needed_from_one = std::max(sum.needed_from_one, part.needed_from_one);
+    add(sum.values1, part.values1);
+    add(sum.values2, part.values2);
+    const bool worse = part.worst_digits > sum.worst_digits;
+    const bool as_bad = part.worst_digits == sum.worst_digits && part.worst.has_value();
+    if (worse || (as_bad && part.worst->number < sum.worst->number)) {
+        sum.worst_digits = part.worst_digits;
+        sum.worst = part.worst;
     }
 }
 

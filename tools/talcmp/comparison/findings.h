@@ -23,7 +23,7 @@ struct Totals {
     ValueCounts values1, values2;
 };
 
-void add(Totals& sum, const Totals& totals);
+void add(Totals& sum, const Totals& part);
 
 // The smallest whole tolerance, from 0 on, under which the arrays are the same; nothing where they
 // are under none below `all_digits`.
