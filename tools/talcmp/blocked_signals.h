@@ -1,7 +1,6 @@
 // Signals that wait until a few steps are done.
 
-#ifndef TALCMP_BLOCKED_SIGNALS_H
-#define TALCMP_BLOCKED_SIGNALS_H
+#pragma once
 
 #include <csignal>
 
@@ -32,5 +31,3 @@ class BlockedSignals {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // The command line of talcmp.
 
-#ifndef TALCMP_COMMAND_LINE_H
-#define TALCMP_COMMAND_LINE_H
+#pragma once
 
 #include "operands.h"
 #include "options.h"
@@ -28,5 +27,3 @@ struct CommandLine {
 std::optional<CommandLine> read_command_line(int argc, const char* const* argv);
 
 } // namespace talcmp
-
-#endif

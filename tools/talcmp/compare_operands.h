@@ -1,7 +1,6 @@
 // From the operands to their outcomes.
 
-#ifndef TALCMP_COMPARE_OPERANDS_H
-#define TALCMP_COMPARE_OPERANDS_H
+#pragma once
 
 #include "command_line.h"
 #include "outcome.h"
@@ -14,5 +13,3 @@ namespace talcmp {
 Summary compare_operands(const CommandLine& command_line, Answers& answers, ProgressBar& progress);
 
 } // namespace talcmp
-
-#endif

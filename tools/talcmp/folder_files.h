@@ -1,7 +1,6 @@
 // The files of arrays in a folder.
 
-#ifndef TALCMP_FOLDER_FILES_H
-#define TALCMP_FOLDER_FILES_H
+#pragma once
 
 #include <map>
 #include <optional>
@@ -28,5 +27,3 @@ FilesByName files_in(const std::string& folder);
 std::optional<std::string> reason_not_to_open(const std::string& path);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What the two operands of the command line stand for.
 
-#ifndef TALCMP_OPERANDS_H
-#define TALCMP_OPERANDS_H
+#pragma once
 
 #include <optional>
 #include <string>
@@ -44,5 +43,3 @@ std::vector<NamedPair> match_names(const std::vector<std::string>& first,
                                    const NameFilter& filter);
 
 } // namespace talcmp
-
-#endif

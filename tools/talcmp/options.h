@@ -1,7 +1,6 @@
 // The words of a command line, as options and operands: what they are, not what they mean.
 
-#ifndef TALCMP_OPTIONS_H
-#define TALCMP_OPTIONS_H
+#pragma once
 
 #include "shown.h"
 
@@ -49,5 +48,3 @@ std::string value_of(const Words& words, const std::string& option, const std::s
 Words sort_words(const std::vector<Option>& options, const std::vector<std::string>& words);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What comes of the operands: of each two arrays that belong together, and altogether.
 
-#ifndef TALCMP_OUTCOME_H
-#define TALCMP_OUTCOME_H
+#pragma once
 
 #include "comparison.h"
 
@@ -55,5 +54,3 @@ class Answers {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What a process has to be before talcmp opens a file.
 
-#ifndef TALCMP_PROCESS_SETUP_H
-#define TALCMP_PROCESS_SETUP_H
+#pragma once
 
 namespace talcmp {
 
@@ -12,5 +11,3 @@ namespace talcmp {
 void set_up_process();
 
 } // namespace talcmp
-
-#endif

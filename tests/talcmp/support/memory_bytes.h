@@ -1,7 +1,6 @@
 // A file in memory.
 
-#ifndef TALNUMERICARRAY_TESTS_MEMORY_BYTES_H
-#define TALNUMERICARRAY_TESTS_MEMORY_BYTES_H
+#pragma once
 
 #include "byte_source.h"
 
@@ -30,5 +29,3 @@ class MemoryBytes : public talcmp::ByteSource {
   private:
     std::string_view bytes_;
 };
-
-#endif

@@ -1,7 +1,6 @@
 // The bytes of .npy files, well-formed or not.
 
-#ifndef TALNUMERICARRAY_TESTS_NPY_BYTES_H
-#define TALNUMERICARRAY_TESTS_NPY_BYTES_H
+#pragma once
 
 #include "to_type.h"
 
@@ -104,5 +103,3 @@ std::string row(const std::vector<T>& values) {
 }
 
 } // namespace npy
-
-#endif

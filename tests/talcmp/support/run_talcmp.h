@@ -1,7 +1,6 @@
 // Runs talcmp as a child process, without a shell.
 
-#ifndef TALNUMERICARRAY_TESTS_RUN_TALCMP_H
-#define TALNUMERICARRAY_TESTS_RUN_TALCMP_H
+#pragma once
 
 #include <string>
 #include <vector>
@@ -24,5 +23,3 @@ ProcessResult run_talcmp(const std::vector<std::string>& arguments,
 // characters that begins with "talcmp: " and `beginning` and contains `fragment`.
 void expect_trouble(const ProcessResult& outcome, const std::string& beginning,
                     const std::string& fragment);
-
-#endif

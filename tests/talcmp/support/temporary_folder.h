@@ -1,7 +1,6 @@
 // A folder for the files of one test, removed with all that is in it at the end.
 
-#ifndef TALNUMERICARRAY_TESTS_TEMPORARY_FOLDER_H
-#define TALNUMERICARRAY_TESTS_TEMPORARY_FOLDER_H
+#pragma once
 
 #include <cstdlib>
 #include <filesystem>
@@ -40,5 +39,3 @@ class TemporaryFolder {
   private:
     std::string path_;
 };
-
-#endif

@@ -1,7 +1,6 @@
 // Tests of several element types, named after these.
 
-#ifndef TALNUMERICARRAY_TESTS_TYPE_NAMES_H
-#define TALNUMERICARRAY_TESTS_TYPE_NAMES_H
+#pragma once
 
 #include "element_type.h"
 
@@ -13,5 +12,3 @@ struct TypeNames {
         return talcmp::element_type(element_type_id<T>).name;
     }
 };
-
-#endif

@@ -1,7 +1,6 @@
 // The bytes of zip archives, well-formed or not.
 
-#ifndef TALNUMERICARRAY_TESTS_ZIP_BYTES_H
-#define TALNUMERICARRAY_TESTS_ZIP_BYTES_H
+#pragma once
 
 #include "npy_bytes.h"
 
@@ -44,5 +43,3 @@ inline std::string archive(const std::vector<Member>& members) {
 }
 
 } // namespace zipped
-
-#endif

@@ -1,7 +1,6 @@
 // The formats of files that talcmp reads.
 
-#ifndef TALCMP_ARRAY_FILE_H
-#define TALCMP_ARRAY_FILE_H
+#pragma once
 
 #include "array_source.h"
 
@@ -39,5 +38,3 @@ inline constexpr const char* standard_input_path = "-";
 std::unique_ptr<ArrayFile> open_array_file(const std::string& path);
 
 } // namespace talcmp
-
-#endif

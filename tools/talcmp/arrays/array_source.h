@@ -1,7 +1,6 @@
 // Where talcmp gets the elements of an array from.
 
-#ifndef TALCMP_ARRAY_SOURCE_H
-#define TALCMP_ARRAY_SOURCE_H
+#pragma once
 
 #include "element_type.h"
 
@@ -61,5 +60,3 @@ inline std::uint64_t element_count(const ArraySource& source) {
 }
 
 } // namespace talcmp
-
-#endif

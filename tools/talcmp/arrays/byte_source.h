@@ -1,7 +1,6 @@
 // Where the bytes of a file come from.
 
-#ifndef TALCMP_BYTE_SOURCE_H
-#define TALCMP_BYTE_SOURCE_H
+#pragma once
 
 #include <cstddef>
 #include <cstdint>
@@ -29,5 +28,3 @@ class ByteSource {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // Bytes that can be read only once.
 
-#ifndef TALCMP_BYTE_STREAM_H
-#define TALCMP_BYTE_STREAM_H
+#pragma once
 
 #include "byte_source.h"
 
@@ -24,5 +23,3 @@ class ByteStream : public ByteSource {
 };
 
 } // namespace talcmp
-
-#endif

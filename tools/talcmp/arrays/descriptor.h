@@ -1,7 +1,6 @@
 // File descriptors: closed at the end, read from, and the error when that fails.
 
-#ifndef TALCMP_DESCRIPTOR_H
-#define TALCMP_DESCRIPTOR_H
+#pragma once
 
 #include "trouble.h"
 
@@ -62,5 +61,3 @@ inline std::size_t read_at(const int file, const std::string& path, const std::u
 }
 
 } // namespace talcmp
-
-#endif

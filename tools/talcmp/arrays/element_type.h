@@ -1,7 +1,6 @@
 // What talcmp knows about an element type: its size, its name and how a value of it is written.
 
-#ifndef TALCMP_ELEMENT_TYPE_H
-#define TALCMP_ELEMENT_TYPE_H
+#pragma once
 
 #include "taldata_array_element_types.h"
 
@@ -43,5 +42,3 @@ const std::array<ElementType, element_type_list::size>& element_types();
 const ElementType& element_type(type_t id);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // An .npy file as a source of elements.
 
-#ifndef TALCMP_NPY_ARRAY_H
-#define TALCMP_NPY_ARRAY_H
+#pragma once
 
 #include "array_source.h"
 #include "byte_source.h"
@@ -35,5 +34,3 @@ class NpyArray : public ArraySource {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // A file that is one .npy array.
 
-#ifndef TALCMP_NPY_FILE_H
-#define TALCMP_NPY_FILE_H
+#pragma once
 
 #include "array_file.h"
 #include "npy_array.h"
@@ -26,5 +25,3 @@ class NpyFile : public ArrayFile {
 };
 
 } // namespace talcmp
-
-#endif

@@ -4,8 +4,7 @@
 // dictionary (2 bytes in version 1, 4 in versions 2 and 3, little-endian), the dictionary as a
 // Python literal with the keys 'descr', 'fortran_order' and 'shape', and then the elements.
 
-#ifndef TALCMP_NPY_HEADER_H
-#define TALCMP_NPY_HEADER_H
+#pragma once
 
 #include "array_source.h"
 #include "byte_source.h"
@@ -34,5 +33,3 @@ struct NpyError : std::runtime_error {
 NpyHeader read_npy_header(ByteSource& file);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // A file that is a zip archive of .npy arrays, as numpy.savez and numpy.savez_compressed write it.
 
-#ifndef TALCMP_NPZ_FILE_H
-#define TALCMP_NPZ_FILE_H
+#pragma once
 
 #include "array_file.h"
 #include "regular_file.h"
@@ -28,5 +27,3 @@ class NpzFile : public ArrayFile {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // A number in the fewest digits that read back as the same number.
 
-#ifndef TALCMP_NUMBER_TEXT_H
-#define TALCMP_NUMBER_TEXT_H
+#pragma once
 
 #include <array>
 #include <charconv>
@@ -17,5 +16,3 @@ std::string number_text(const Number number, const Base... base) {
 }
 
 } // namespace talcmp
-
-#endif

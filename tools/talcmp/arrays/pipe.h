@@ -1,7 +1,6 @@
 // A pipe, such as standard input, as a source of bytes.
 
-#ifndef TALCMP_PIPE_H
-#define TALCMP_PIPE_H
+#pragma once
 
 #include "byte_stream.h"
 #include "descriptor.h"
@@ -25,5 +24,3 @@ class Pipe : public ByteStream {
 };
 
 } // namespace talcmp
-
-#endif

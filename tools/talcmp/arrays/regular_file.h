@@ -1,7 +1,6 @@
 // A file on disk.
 
-#ifndef TALCMP_REGULAR_FILE_H
-#define TALCMP_REGULAR_FILE_H
+#pragma once
 
 #include "byte_source.h"
 #include "descriptor.h"
@@ -38,5 +37,3 @@ class RegularFile : public ByteSource {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // Others' words in messages: in one line, and without what a terminal might take for a command.
 
-#ifndef TALCMP_SHOWN_H
-#define TALCMP_SHOWN_H
+#pragma once
 
 #include <functional>
 #include <string>
@@ -22,5 +21,3 @@ std::string without_controls(std::string_view text, const StandIn& stand_in);
 std::string shown(std::string_view text);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // A copy of an array that can be read only once, from which it is read in any order.
 
-#ifndef TALCMP_TEMPORARY_COPY_H
-#define TALCMP_TEMPORARY_COPY_H
+#pragma once
 
 #include "array_source.h"
 #include "descriptor.h"
@@ -35,5 +34,3 @@ class TemporaryCopy : public ArraySource {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What keeps talcmp from an answer.
 
-#ifndef TALCMP_TROUBLE_H
-#define TALCMP_TROUBLE_H
+#pragma once
 
 #include "shown.h"
 
@@ -19,5 +18,3 @@ class Trouble : public std::runtime_error {
 };
 
 } // namespace talcmp
-
-#endif

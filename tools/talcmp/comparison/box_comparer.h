@@ -1,8 +1,7 @@
 // The comparison of two arrays box by box: what all boxes have in common, and what finds the pairs
 // that differ in one.
 
-#ifndef TALCMP_BOX_COMPARER_H
-#define TALCMP_BOX_COMPARER_H
+#pragma once
 
 #include "array_source.h"
 #include "layout.h"
@@ -79,5 +78,3 @@ class BoxComparer {
 };
 
 } // namespace talcmp
-
-#endif

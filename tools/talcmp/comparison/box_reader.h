@@ -1,7 +1,6 @@
 // Reads a box of elements that are stored in another order than they are wanted, or with gaps.
 
-#ifndef TALCMP_BOX_READER_H
-#define TALCMP_BOX_READER_H
+#pragma once
 
 #include "array_source.h"
 
@@ -22,5 +21,3 @@ struct BoxAxis {
 void read_box(ArraySource& source, std::uint64_t first, std::vector<BoxAxis> axes, void* buffer);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // The comparison of all boxes by several threads.
 
-#ifndef TALCMP_COMPARE_BOXES_H
-#define TALCMP_COMPARE_BOXES_H
+#pragma once
 
 #include "box_comparer.h"
 #include "progress_listener.h"
@@ -16,5 +15,3 @@ unsigned thread_count(const BoxPlan& plan);
 Findings compare_boxes(const BoxPlan& plan, unsigned threads, ProgressListener& progress);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // The comparison of two arrays, and all that it finds.
 
-#ifndef TALCMP_COMPARISON_H
-#define TALCMP_COMPARISON_H
+#pragma once
 
 #include "array_source.h"
 #include "findings.h"
@@ -68,5 +67,3 @@ Comparison compare(NamedArray first, NamedArray second, const Question& question
                    ProgressListener& progress);
 
 } // namespace talcmp
-
-#endif

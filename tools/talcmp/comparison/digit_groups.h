@@ -1,7 +1,6 @@
 // Pairs of elements in groups of which the module has to be asked about one pair only.
 
-#ifndef TALCMP_DIGIT_GROUPS_H
-#define TALCMP_DIGIT_GROUPS_H
+#pragma once
 
 #include "pairs.h"
 
@@ -48,5 +47,3 @@ class DigitGroups {
 };
 
 } // namespace talcmp
-
-#endif

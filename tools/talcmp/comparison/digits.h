@@ -1,7 +1,6 @@
 // In how many binary digits the elements of pairs differ.
 
-#ifndef TALCMP_DIGITS_H
-#define TALCMP_DIGITS_H
+#pragma once
 
 #include "digit_groups.h"
 #include "pairs.h"
@@ -88,5 +87,3 @@ inline Sameness sameness_of(const DigitSearch::Result& found, const std::size_t 
 }
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What is found in pairs of elements, so that the findings of parts can be added up.
 
-#ifndef TALCMP_FINDINGS_H
-#define TALCMP_FINDINGS_H
+#pragma once
 
 #include "digits.h"
 #include "found_pairs.h"
@@ -39,5 +38,3 @@ struct Findings {
 void add(Findings& sum, const Findings& findings);
 
 } // namespace talcmp
-
-#endif

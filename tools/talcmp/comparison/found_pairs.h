@@ -1,7 +1,6 @@
 // Pairs of elements that were found, by where they are.
 
-#ifndef TALCMP_FOUND_PAIRS_H
-#define TALCMP_FOUND_PAIRS_H
+#pragma once
 
 #include "digits.h"
 
@@ -82,5 +81,3 @@ class FirstPairs {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // Where the elements of an array are, by their indices.
 
-#ifndef TALCMP_LAYOUT_H
-#define TALCMP_LAYOUT_H
+#pragma once
 
 #include "array_source.h"
 #include "selection.h"
@@ -44,5 +43,3 @@ class RowMajorNumbers {
 };
 
 } // namespace talcmp
-
-#endif

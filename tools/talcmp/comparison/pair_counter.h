@@ -1,7 +1,6 @@
 // Finds and counts how pairs of elements differ.
 
-#ifndef TALCMP_PAIR_COUNTER_H
-#define TALCMP_PAIR_COUNTER_H
+#pragma once
 
 #include "findings.h"
 
@@ -33,5 +32,3 @@ class PairCounter {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // Pairs of elements, as the module is asked about them.
 
-#ifndef TALCMP_PAIRS_H
-#define TALCMP_PAIRS_H
+#pragma once
 
 #include "element_type.h"
 #include "type_properties.h"
@@ -49,5 +48,3 @@ class Pairs {
 void remember_factor_of(talreal tolerance);
 
 } // namespace talcmp
-
-#endif

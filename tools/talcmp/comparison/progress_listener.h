@@ -1,7 +1,6 @@
 // Who wants to know how far a comparison is.
 
-#ifndef TALCMP_PROGRESS_LISTENER_H
-#define TALCMP_PROGRESS_LISTENER_H
+#pragma once
 
 #include <cstdint>
 
@@ -22,5 +21,3 @@ class ProgressListener {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What is asked about two arrays.
 
-#ifndef TALCMP_QUESTION_H
-#define TALCMP_QUESTION_H
+#pragma once
 
 #include "selection.h"
 #include "type_properties.h"
@@ -21,5 +20,3 @@ struct Question {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // The part of an array that is compared, as the command line gives it.
 
-#ifndef TALCMP_SELECTION_H
-#define TALCMP_SELECTION_H
+#pragma once
 
 #include <cstdint>
 #include <optional>
@@ -26,5 +25,3 @@ using Selection = std::vector<AxisRange>;
 Selection read_selection(const std::string& text);
 
 } // namespace talcmp
-
-#endif

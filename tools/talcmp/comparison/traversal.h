@@ -1,7 +1,6 @@
 // Two arrays of one shape, taken apart into boxes.
 
-#ifndef TALCMP_TRAVERSAL_H
-#define TALCMP_TRAVERSAL_H
+#pragma once
 
 #include "array_source.h"
 #include "layout.h"
@@ -69,5 +68,3 @@ class Traversal {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // How many values of an array are special.
 
-#ifndef TALCMP_VALUE_COUNTS_H
-#define TALCMP_VALUE_COUNTS_H
+#pragma once
 
 #include "type_properties.h"
 
@@ -27,5 +26,3 @@ inline void add(ValueCounts& sum, const ValueCounts& counts) {
 ValueCounts count_values(type_t type, const void* elements, std::size_t count);
 
 } // namespace talcmp
-
-#endif

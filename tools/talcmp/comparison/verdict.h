@@ -1,8 +1,7 @@
 // What is said of a pair of elements: from which tolerance on they are the same, or why they are
 // not.
 
-#ifndef TALCMP_VERDICT_H
-#define TALCMP_VERDICT_H
+#pragma once
 
 #include "digits.h"
 
@@ -32,5 +31,3 @@ struct Verdict {
 Verdict verdict_on(const Pairs& pairs, std::size_t i, Sameness sameness);
 
 } // namespace talcmp
-
-#endif

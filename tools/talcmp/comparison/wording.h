@@ -1,7 +1,6 @@
 // What a comparison found, in words.
 
-#ifndef TALCMP_WORDING_H
-#define TALCMP_WORDING_H
+#pragma once
 
 #include "comparison.h"
 
@@ -31,5 +30,3 @@ std::string difference_text(const Comparison& comparison);
 std::string reason_of_no_tolerance(const Comparison& comparison);
 
 } // namespace talcmp
-
-#endif

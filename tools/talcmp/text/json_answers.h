@@ -1,7 +1,6 @@
 // Outcomes as one JSON document on standard output, which talcmp.schema.json describes.
 
-#ifndef TALCMP_JSON_ANSWERS_H
-#define TALCMP_JSON_ANSWERS_H
+#pragma once
 
 #include "command_line.h"
 #include "outcome.h"
@@ -30,5 +29,3 @@ class JsonAnswers : public Answers {
 };
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // A JSON document that is written piece by piece.
 
-#ifndef TALCMP_JSON_WRITER_H
-#define TALCMP_JSON_WRITER_H
+#pragma once
 
 #include <nlohmann/json_fwd.hpp>
 
@@ -46,5 +45,3 @@ class JsonWriter {
 };
 
 } // namespace talcmp
-
-#endif

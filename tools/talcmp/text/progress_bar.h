@@ -1,7 +1,6 @@
 // A bar on the terminal for comparisons that take long.
 
-#ifndef TALCMP_PROGRESS_BAR_H
-#define TALCMP_PROGRESS_BAR_H
+#pragma once
 
 #include "progress_listener.h"
 
@@ -42,5 +41,3 @@ class ProgressBar : public ProgressListener {
 };
 
 } // namespace talcmp
-
-#endif

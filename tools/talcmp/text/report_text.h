@@ -1,7 +1,6 @@
 // A report for people.
 
-#ifndef TALCMP_REPORT_TEXT_H
-#define TALCMP_REPORT_TEXT_H
+#pragma once
 
 #include "comparison.h"
 #include "terminal.h"
@@ -15,5 +14,3 @@ std::string report_text(const Comparison& comparison, const Question& question,
                         const Terminal& terminal);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // A line at the end of what is on the terminal, which is gone when something else is written there.
 
-#ifndef TALCMP_STATUS_LINE_H
-#define TALCMP_STATUS_LINE_H
+#pragma once
 
 #include <string>
 
@@ -18,5 +17,3 @@ void clear_status();
 void clear_status_at_signals();
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // What a terminal needs that a file or a pipe does not.
 
-#ifndef TALCMP_TERMINAL_H
-#define TALCMP_TERMINAL_H
+#pragma once
 
 #include <string>
 
@@ -36,5 +35,3 @@ bool takes_escapes();
 int columns_of(int descriptor);
 
 } // namespace talcmp
-
-#endif

@@ -1,7 +1,6 @@
 // Outcomes as lines of text on standard output.
 
-#ifndef TALCMP_TEXT_ANSWERS_H
-#define TALCMP_TEXT_ANSWERS_H
+#pragma once
 
 #include "command_line.h"
 #include "outcome.h"
@@ -27,5 +26,3 @@ class TextAnswers : public Answers {
 };
 
 } // namespace talcmp
-
-#endif
