@@ -1,8 +1,8 @@
-// How often the module is asked about pairs of which it has answered already, or which are alike.
+// How often the module is asked about pairs that it has answered already, or that are alike.
 
-#include "comparison.h"
 #include "talnumericarray_compare.h"
 
+#include "support/compare_arrays.h"
 #include "support/memory_array.h"
 
 #include <gtest/gtest.h>
@@ -23,12 +23,6 @@ namespace {
 
 int questions = 0;
 
-class NoListener : public talcmp::ProgressListener {
-  public:
-    void begin(std::uint64_t /*total_bytes*/) override {}
-    void advance(std::uint64_t /*bytes*/) override {}
-};
-
 // A hundred sums, of which two of three differ, in one to four digits.
 talcmp::Comparison compare_sums(const bool report, const std::size_t differences) {
     std::vector<double> forward(100);
@@ -39,16 +33,13 @@ talcmp::Comparison compare_sums(const bool report, const std::size_t differences
         backward[i] =
             forward[i] + static_cast<double>(places) * std::numeric_limits<double>::epsilon();
     }
-    talcmp::Question question;
+    talcmp::Question question = question_of(1);
     question.report = report;
     question.differences = differences;
-    question.threads = 1;
-    NoListener listener;
     using Array = MemoryArray<double>;
     questions = 0;
-    return talcmp::compare({"a", std::make_unique<Array>(talcmp::Shape{100}, forward)},
-                           {"b", std::make_unique<Array>(talcmp::Shape{100}, backward)}, question,
-                           listener);
+    return compare_arrays(std::make_unique<Array>(talcmp::Shape{100}, forward),
+                          std::make_unique<Array>(talcmp::Shape{100}, backward), question);
 }
 
 TEST(Questions, AreFewWhereAReportIsAskedFor) {

@@ -1,17 +1,19 @@
 // How often, and how far, arrays are read until the answer is known.
 
 #include "byte_stream.h"
-#include "comparison.h"
 #include "npy_array.h"
-#include "trouble.h"
 
+#include "support/compare_arrays.h"
+#include "support/memory_array.h"
 #include "support/memory_bytes.h"
+#include "support/named_cases.h"
 #include "support/npy_bytes.h"
+#include "support/thrown_message.h"
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <atomic>
+#include <complex>
 #include <cstdint>
 #include <limits>
 #include <memory>
@@ -31,53 +33,19 @@ struct Reads {
 };
 
 // Complex zeros, except a one at the position `one`; those from `broken` on cannot be read.
-class CountedArray : public talcmp::ArraySource {
-  public:
-    CountedArray(talcmp::Shape shape, const bool fortran_order, Reads& reads,
-                 const std::uint64_t one = nowhere, const std::uint64_t broken = nowhere)
-        : shape_(std::move(shape)), fortran_order_(fortran_order), reads_(reads), one_(one),
-          broken_(broken) {}
-
-    const talcmp::ElementType& type() const override {
-        return talcmp::element_type(COMPLEX_REAL64_TYPE);
-    }
-    const talcmp::Shape& shape() const override { return shape_; }
-    bool fortran_order() const override { return fortran_order_; }
-    bool random_access() const override { return true; }
-
-    void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
-        if (first + count > broken_) {
+Source counted_array(talcmp::Shape shape, const Order order, Reads& reads,
+                     const std::uint64_t one = nowhere, const std::uint64_t broken = nowhere) {
+    using Complex = std::complex<double>;
+    const auto read = [&reads, one, broken](const std::uint64_t first, const std::uint64_t count,
+                                            Complex* elements) {
+        if (first + count > broken) {
             throw talcmp::Trouble("array", "is broken");
         }
-        auto* const values = static_cast<std::complex<double>*>(elements);
-        std::fill_n(values, count, 0.0);
-        if (first <= one_ && one_ < first + count) {
-            values[one_ - first] = 1;
-        }
-        ++reads_.count;
-        reads_.elements += count;
-    }
-
-  private:
-    talcmp::Shape shape_;
-    bool fortran_order_;
-    Reads& reads_;
-    std::uint64_t one_;
-    std::uint64_t broken_;
-};
-
-class NoListener : public talcmp::ProgressListener {
-  public:
-    void begin(std::uint64_t /*total_bytes*/) override {}
-    void advance(std::uint64_t /*bytes*/) override {}
-};
-
-talcmp::Comparison compare(std::unique_ptr<talcmp::ArraySource> first,
-                           std::unique_ptr<talcmp::ArraySource> second,
-                           const talcmp::Question& question) {
-    NoListener listener;
-    return talcmp::compare({"first", std::move(first)}, {"second", std::move(second)}, question,
-                           listener);
+        read_zeros_and_one(one, first, count, elements);
+        ++reads.count;
+        reads.elements += count;
+    };
+    return std::make_unique<FunctionArray<Complex>>(std::move(shape), read, order);
 }
 
 // ---- In two orders
@@ -86,10 +54,6 @@ struct Axes {
     const char* name;
     talcmp::Shape shape;
 };
-
-void PrintTo(const Axes& axes, std::ostream* out) {
-    *out << axes.name;
-}
 
 // Several hundred thousand elements each: more than are compared at once.
 const Axes axes[] = {
@@ -102,48 +66,41 @@ const Axes axes[] = {
     {"LongLast", {2, 200000}},
 };
 
-class TwoOrders : public testing::TestWithParam<Axes> {};
+class TwoOrders : public NamedCaseTest<Axes> {};
 
 TEST_P(TwoOrders, AreBothReadInLongRuns) {
     constexpr std::uint64_t shortest_mean = 128; // elements, of 16 bytes
-    Reads reads1;
-    Reads reads2;
-    talcmp::Question question;
-    question.threads = 1;
+    Reads reads[2];
+    Source first = counted_array(GetParam().shape, Order::c, reads[0]);
+    const std::uint64_t count = talcmp::element_count(*first);
     const talcmp::Comparison result =
-        compare(std::make_unique<CountedArray>(GetParam().shape, false, reads1),
-                std::make_unique<CountedArray>(GetParam().shape, true, reads2), question);
+        compare_arrays(std::move(first), counted_array(GetParam().shape, Order::fortran, reads[1]),
+                       question_of(1));
     EXPECT_EQ(result.difference, talcmp::Difference::none);
-    for (const Reads* reads : {&reads1, &reads2}) {
-        EXPECT_EQ(reads->elements,
-                  talcmp::element_count(CountedArray(GetParam().shape, false, reads1)));
-        EXPECT_GE(reads->elements / reads->count, shortest_mean);
+    for (const Reads& each : reads) {
+        EXPECT_EQ(each.elements, count);
+        EXPECT_GE(each.elements / each.count, shortest_mean);
     }
 }
 
-std::string name_of_axes(const testing::TestParamInfo<Axes>& axes_of_test) {
-    return axes_of_test.param.name;
-}
+INSTANTIATE_TEST_SUITE_P(Axes, TwoOrders, named_cases(axes), name_of_case);
 
-INSTANTIATE_TEST_SUITE_P(Axes, TwoOrders, testing::ValuesIn(axes), name_of_axes);
-
-// ---- Where only is asked whether there is a difference
+// ---- Where the only question is whether there is a difference
 
 class OnlyWhether : public testing::TestWithParam<unsigned> {
   protected:
     static constexpr std::uint64_t length = 1000;
     static constexpr std::uint64_t size = length * length;
 
-    // In Fortran order both.
+    // Of two arrays in Fortran order.
     static talcmp::Difference difference(const std::uint64_t one, const std::uint64_t broken,
                                          Reads& reads, const bool only_whether = true) {
-        talcmp::Question question;
-        question.threads = GetParam();
+        talcmp::Question question = question_of(GetParam());
         question.only_whether = only_whether;
         Reads ignored;
         const talcmp::Shape shape = {length, length};
-        return compare(std::make_unique<CountedArray>(shape, true, reads, one, broken),
-                       std::make_unique<CountedArray>(shape, true, ignored), question)
+        return compare_arrays(counted_array(shape, Order::fortran, reads, one, broken),
+                              counted_array(shape, Order::fortran, ignored), question)
             .difference;
     }
 };
@@ -165,7 +122,7 @@ TEST_P(OnlyWhether, SeesTheLastDifferenceToo) {
     EXPECT_EQ(reads.elements, size);
 }
 
-TEST_P(OnlyWhether, DoesNotReachWhatIsBrokenBehindADifference) {
+TEST_P(OnlyWhether, DoesNotReachWhatIsBrokenAfterADifference) {
     Reads reads;
     EXPECT_EQ(difference(5, size / 2, reads), talcmp::Difference::elements);
     EXPECT_THROW(difference(size - 1, size / 2, reads), talcmp::Trouble);
@@ -192,7 +149,7 @@ class CountedBytes : public MemoryBytes {
     std::uint64_t& asked_;
 };
 
-// The same bytes, which come but once.
+// The same bytes, which can be read only once.
 class Stream : public talcmp::ByteStream {
   public:
     explicit Stream(std::string bytes) : bytes_(std::move(bytes)) {}
@@ -214,12 +171,7 @@ std::string trouble_at_the_end(const std::string& bytes, const std::uint64_t rea
     std::vector<double> elements(static_cast<std::size_t>(read_before));
     talcmp::NpyArray array("array", std::make_unique<Stream>(bytes));
     array.read(0, read_before, elements.data());
-    try {
-        array.check_to_end();
-    } catch (const talcmp::Trouble& trouble) {
-        return trouble.what();
-    }
-    return "none";
+    return thrown_message([&array] { array.check_to_end(); });
 }
 
 TEST(End, IsNotReadOfAFileWhoseSizeIsKnown) {

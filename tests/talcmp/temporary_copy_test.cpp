@@ -1,8 +1,11 @@
-// Copies of arrays that come but once, where there is no room for them or they are tampered with.
+// Copies of arrays that can be read only once, where there is no room for them or they are tampered
+// with.
 
 #include "temporary_copy.h"
 
+#include "support/memory_array.h"
 #include "support/temporary_folder.h"
+#include "support/thrown_message.h"
 
 #include <gtest/gtest.h>
 
@@ -12,6 +15,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <memory>
+#include <numeric>
 #include <string>
 #include <utility>
 #include <vector>
@@ -25,15 +29,11 @@ namespace fs = std::filesystem;
 
 constexpr std::uint64_t length = 100000;
 
-// The numbers 0, 1, 2, ... as bytes, which come but once.
-class Bytes : public talcmp::ArraySource {
+// The numbers 0, 1, 2, ... as bytes, which can be read only once.
+class ByteNumbers : public TypedArray<std::uint8_t> {
   public:
-    explicit Bytes(std::uint64_t& checked) : checked_(checked) {}
-
-    const talcmp::ElementType& type() const override { return talcmp::element_type(UBIT8_TYPE); }
-    const talcmp::Shape& shape() const override { return shape_; }
-    bool fortran_order() const override { return false; }
-    bool random_access() const override { return false; }
+    explicit ByteNumbers(std::uint64_t& checked)
+        : TypedArray({length}, Order::c, Access::once), checked_(checked) {}
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         EXPECT_EQ(first, next_);
@@ -45,7 +45,6 @@ class Bytes : public talcmp::ArraySource {
     void check_to_end() override { checked_ = next_; }
 
   private:
-    talcmp::Shape shape_ = {length};
     std::uint64_t next_ = 0;
     std::uint64_t& checked_;
 };
@@ -56,17 +55,12 @@ class TemporaryCopies : public testing::Test {
     void TearDown() override { ::unsetenv("TMPDIR"); }
 
     talcmp::TemporaryCopy take() {
-        return {std::make_unique<Bytes>(checked_),
+        return {std::make_unique<ByteNumbers>(checked_),
                 [this](const std::uint64_t bytes) { copied_ += bytes; }};
     }
 
     std::string trouble_in_taking() {
-        try {
-            take();
-        } catch (const talcmp::Trouble& trouble) {
-            return trouble.what();
-        }
-        return "none";
+        return thrown_message([this] { take(); });
     }
 
     // The only file that is open in the folder.
@@ -96,14 +90,12 @@ TEST_F(TemporaryCopies, AreReadInAnyOrderAndLeaveNoFile) {
     EXPECT_EQ(copied(), length);
     EXPECT_EQ(checked(), length);
     EXPECT_TRUE(fs::is_empty(folder_name()));
-    for (const std::uint64_t first :
-         {std::uint64_t{99990}, std::uint64_t{0}, std::uint64_t{16380}}) {
+    for (const unsigned first : {99990U, 0U, 16380U}) {
         std::vector<std::uint8_t> elements(10);
+        std::vector<std::uint8_t> expected(elements.size());
+        std::iota(expected.begin(), expected.end(), static_cast<std::uint8_t>(first));
         copy.read(first, elements.size(), elements.data());
-        for (const std::uint8_t& element : elements) {
-            const auto place = first + static_cast<std::uint64_t>(&element - elements.data());
-            EXPECT_EQ(element, static_cast<std::uint8_t>(place));
-        }
+        EXPECT_EQ(elements, expected);
     }
 }
 
@@ -139,13 +131,8 @@ TEST_F(TemporaryCopies, AreTroubleWhereTheyWereCutShort) {
     ASSERT_EQ(::truncate(open_file().c_str(), 50000), 0);
     std::vector<std::uint8_t> elements(10);
     copy.read(49990, elements.size(), elements.data());
-    try {
-        copy.read(49991, elements.size(), elements.data());
-        FAIL() << "nothing was noticed";
-    } catch (const talcmp::Trouble& trouble) {
-        EXPECT_EQ(trouble.what(),
-                  folder_name() + ": the temporary copy of the array there was cut short");
-    }
+    EXPECT_EQ(thrown_message([&] { copy.read(49991, elements.size(), elements.data()); }),
+              folder_name() + ": the temporary copy of the array there was cut short");
 }
 
 } // namespace

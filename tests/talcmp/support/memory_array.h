@@ -1,7 +1,6 @@
-// An array in memory.
+// Arrays that no file holds.
 
-#ifndef TALNUMERICARRAY_TESTS_MEMORY_ARRAY_H
-#define TALNUMERICARRAY_TESTS_MEMORY_ARRAY_H
+#pragma once
 
 #include "array_source.h"
 #include "taldata_array_element_types.h"
@@ -10,6 +9,7 @@
 #include <atomic>
 #include <chrono>
 #include <cstdint>
+#include <functional>
 #include <stdexcept>
 #include <thread>
 #include <utility>
@@ -18,14 +18,12 @@
 enum class Order { c, fortran };
 enum class Access { random, once };
 
-// Elements in the order in which they are stored. What the contract of sources forbids is thrown.
 template <typename T>
-class MemoryArray : public talcmp::ArraySource {
+class TypedArray : public talcmp::ArraySource {
   public:
-    MemoryArray(talcmp::Shape shape, std::vector<T> elements, const Order order = Order::c,
-                const Access access = Access::random)
-        : shape_(std::move(shape)), elements_(std::move(elements)), order_(order), access_(access) {
-    }
+    explicit TypedArray(talcmp::Shape shape, const Order order = Order::c,
+                        const Access access = Access::random)
+        : shape_(std::move(shape)), order_(order), access_(access) {}
 
     const talcmp::ElementType& type() const override {
         return talcmp::element_type(element_type_id<T>);
@@ -34,11 +32,53 @@ class MemoryArray : public talcmp::ArraySource {
     bool fortran_order() const override { return order_ == Order::fortran; }
     bool random_access() const override { return access_ == Access::random; }
 
+  private:
+    talcmp::Shape shape_;
+    Order order_;
+    Access access_;
+};
+
+// Its elements are what a function makes of their positions.
+template <typename T>
+class FunctionArray : public TypedArray<T> {
+  public:
+    using Read = std::function<void(std::uint64_t first, std::uint64_t count, T* elements)>;
+
+    FunctionArray(talcmp::Shape shape, Read read, const Order order = Order::c,
+                  const Access access = Access::random)
+        : TypedArray<T>(std::move(shape), order, access), read_(std::move(read)) {}
+
+    void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
+        read_(first, count, static_cast<T*>(elements));
+    }
+
+  private:
+    Read read_;
+};
+
+// Zeros, except a one at the position `one`.
+template <typename T>
+void read_zeros_and_one(const std::uint64_t one, const std::uint64_t first,
+                        const std::uint64_t count, T* elements) {
+    std::fill_n(elements, count, T(0));
+    if (first <= one && one < first + count) {
+        elements[one - first] = 1;
+    }
+}
+
+// Elements in the order in which they are stored. What the contract of sources forbids is thrown.
+template <typename T>
+class MemoryArray : public TypedArray<T> {
+  public:
+    MemoryArray(talcmp::Shape shape, std::vector<T> elements, const Order order = Order::c,
+                const Access access = Access::random)
+        : TypedArray<T>(std::move(shape), order, access), elements_(std::move(elements)) {}
+
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         if (count > elements_.size() || first > elements_.size() - count) {
             throw std::logic_error("elements are read that the array does not have");
         }
-        if (access_ == Access::once) {
+        if (!this->random_access()) {
             read_once(first, count);
         }
         std::copy_n(elements_.data() + first, count, static_cast<T*>(elements));
@@ -58,12 +98,7 @@ class MemoryArray : public talcmp::ArraySource {
         reading_ = false;
     }
 
-    talcmp::Shape shape_;
     std::vector<T> elements_;
-    Order order_;
-    Access access_;
     std::atomic<bool> reading_ = false;
     std::uint64_t read_ = 0; // elements that can be read only once
 };
-
-#endif

@@ -1,0 +1,35 @@
+// Comparisons of two arrays, which messages call "a" and "b".
+
+#pragma once
+
+#include "comparison.h"
+
+#include <cstdint>
+#include <memory>
+#include <utility>
+
+using Source = std::unique_ptr<talcmp::ArraySource>;
+
+class NoListener : public talcmp::ProgressListener {
+  public:
+    void begin(std::uint64_t /*total_bytes*/) override {}
+    void advance(std::uint64_t /*bytes*/) override {}
+};
+
+inline talcmp::Comparison compare_arrays(Source first, Source second,
+                                         const talcmp::Question& question,
+                                         talcmp::ProgressListener& listener) {
+    return talcmp::compare({"a", std::move(first)}, {"b", std::move(second)}, question, listener);
+}
+
+inline talcmp::Comparison compare_arrays(Source first, Source second,
+                                         const talcmp::Question& question) {
+    NoListener listener;
+    return compare_arrays(std::move(first), std::move(second), question, listener);
+}
+
+inline talcmp::Question question_of(const unsigned threads) {
+    talcmp::Question question;
+    question.threads = threads;
+    return question;
+}
