@@ -2,14 +2,14 @@
 
 #include "options.h"
 
+#include "support/named_cases.h"
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
 #include "support/temporary_folder.h"
 
 #include <gtest/gtest.h>
 
-#include <filesystem>
-#include <ostream>
+#include <sstream>
 #include <string>
 #include <vector>
 
@@ -17,22 +17,25 @@ namespace {
 
 using Words = std::vector<std::string>;
 
+// What the spaces of a text separate; or words that are given one by one, as one is empty or has a
+// space in it.
+struct Arguments : Words {
+    using Words::Words;
+    Arguments(const char* const text) {
+        std::istringstream words(text);
+        for (std::string word; std::getline(words, word, ' ');) {
+            push_back(word);
+        }
+    }
+};
+
 // ---- Those that it does not understand
 
 struct BadUsage {
     const char* name;
-    Words words;
+    Arguments arguments;
     std::string message;
 };
-
-void PrintTo(const BadUsage& usage, std::ostream* out) {
-    *out << usage.name;
-}
-
-template <typename Case>
-std::string name_of(const testing::TestParamInfo<Case>& info) {
-    return info.param.name;
-}
 
 const std::string tolerance_of = "--tol takes a number of binary digits, such as 10 or 2.5, not ";
 const std::string differences_of = "--max-differences takes a number from 1 to 1000000, not ";
@@ -45,217 +48,166 @@ const std::string not_quiet =
 
 const BadUsage operands[] = {
     {"None", {}, too_few},
-    {"One", {"a"}, too_few},
+    {"One", "a", too_few},
     {"EmptyOnes", {"", ""}, too_few},
     {"EmptyFirst", {"", "b"}, too_few},
     {"EmptySecond", {"a", ""}, too_few},
-    {"Three", {"a", "b", "c"}, too_many},
-    {"ThirdBehindAPattern", {"a", "b", "--exclude", "x", "c"}, too_many},
-    {"ThirdBehindDashes", {"a", "--", "-b", "--tol"}, too_many},
-    {"TwoStandardInputs", {"-", "-"}, "standard input can be only one of the two arrays"},
-    {"QuietAndVerbose", {"-q", "-v", "a", "b"}, not_quiet},
-    {"QuietAndVerboseInOneWord", {"-qv", "a", "b"}, not_quiet},
-    {"QuietReport", {"-q", "--report", "a", "b"}, not_quiet},
-    {"QuietJson", {"--quiet", "--json", "a", "b"}, not_quiet},
+    {"Three", "a b c", too_many},
+    {"ThirdAfterAPattern", "a b --exclude x c", too_many},
+    {"ThirdAfterDashes", "a -- -b --tol", too_many},
+    {"TwoStandardInputs", "- -", "standard input can be only one of the two arrays"},
+    {"QuietAndVerbose", "-q -v a b", not_quiet},
+    {"QuietAndVerboseInOneWord", "-qv a b", not_quiet},
+    {"QuietReport", "-q --report a b", not_quiet},
+    {"QuietJson", "--quiet --json a b", not_quiet},
 };
 
 const std::string by_tol = "'; reals are tolerated by --tol DIGITS, in binary digits";
 
 const BadUsage unknown[] = {
-    {"Long", {"--fast", "a", "b"}, "there is no option '--fast'"},
-    {"Short", {"-t", "a", "b"}, "there is no option '-t'"},
-    {"ShortBehindAFlag", {"-vt", "a", "b"}, "there is no option '-vt'"},
-    {"Number", {"-5", "a"}, "there is no option '-5'"},
-    {"Abbreviated",
-     {"--strict", "a", "b"},
-     "there is no option '--strict'; did you mean --strict-type?"},
-    {"AbbreviatedWithValue",
-     {"--max=3", "a", "b"},
+    {"Long", "--fast a b", "there is no option '--fast'"},
+    {"Short", "-t a b", "there is no option '-t'"},
+    {"ShortAfterAFlag", "-vt a b", "there is no option '-vt'"},
+    {"Number", "-5 a", "there is no option '-5'"},
+    {"Abbreviated", "--strict a b", "there is no option '--strict'; did you mean --strict-type?"},
+    {"AbbreviatedWithValue", "--max=3 a b",
      "there is no option '--max'; did you mean --max-differences?"},
-    {"OneLetterTooMany",
-     {"--slices", "1", "a", "b"},
-     "there is no option '--slices'; did you mean --slice?"},
-    {"OneLetterTooFew", {"--jso", "a", "b"}, "there is no option '--jso'; did you mean --json?"},
-    {"OtherLetter",
-     {"--raport", "a", "b"},
-     "there is no option '--raport'; did you mean --report?"},
-    {"LettersExchanged",
-     {"--thraeds=3", "a", "b"},
+    {"OneLetterTooMany", "--slices 1 a b", "there is no option '--slices'; did you mean --slice?"},
+    {"OneLetterTooFew", "--jso a b", "there is no option '--jso'; did you mean --json?"},
+    {"OtherLetter", "--raport a b", "there is no option '--raport'; did you mean --report?"},
+    {"LettersExchanged", "--thraeds=3 a b",
      "there is no option '--thraeds'; did you mean --threads?"},
-    {"InCapitals", {"--TOL", "3", "a", "b"}, "there is no option '--TOL'"},
-    {"OneDash", {"-tol", "3", "a", "b"}, "there is no option '-tol'; did you mean --tol?"},
-    {"RelativeTolerance", {"--rtol", "1e-5", "a", "b"}, "there is no option '--rtol" + by_tol},
-    {"RelativeToleranceWithEquals",
-     {"--rtol=1e-5", "a", "b"},
-     "there is no option '--rtol" + by_tol},
-    {"AbsoluteTolerance", {"--atol", "0", "a", "b"}, "there is no option '--atol" + by_tol},
-    {"Tolerance", {"--tolerance", "3", "a", "b"}, "there is no option '--tolerance" + by_tol},
-    {"ToleranceMisspelt",
-     {"--tolerence", "3", "a", "b"},
-     "there is no option '--tolerence" + by_tol},
-    {"Epsilon", {"--eps", "1e-5", "a", "b"}, "there is no option '--eps" + by_tol},
-    {"OnlyEquals", {"--=", "a", "b"}, "there is no option '--'"},
-    {"Controls",
-     {"--\x1B[31m\n\xC2\x9B\x9B\xE2\x80\xAE.", "a", "b"},
-     "there is no option '--?[31m????.'"},
+    {"InCapitals", "--TOL 3 a b", "there is no option '--TOL'"},
+    {"OneDash", "-tol 3 a b", "there is no option '-tol'; did you mean --tol?"},
+    {"RelativeTolerance", "--rtol 1e-5 a b", "there is no option '--rtol" + by_tol},
+    {"RelativeToleranceWithEquals", "--rtol=1e-5 a b", "there is no option '--rtol" + by_tol},
+    {"AbsoluteTolerance", "--atol 0 a b", "there is no option '--atol" + by_tol},
+    {"Tolerance", "--tolerance 3 a b", "there is no option '--tolerance" + by_tol},
+    {"ToleranceMisspelt", "--tolerence 3 a b", "there is no option '--tolerence" + by_tol},
+    {"Epsilon", "--eps 1e-5 a b", "there is no option '--eps" + by_tol},
+    {"OnlyEquals", "--= a b", "there is no option '--'"},
+    {"Controls", "--\x1B[31m\n\xC2\x9B\x9B\xE2\x80\xAE. a b", "there is no option '--?[31m????.'"},
 };
 
 const BadUsage values[] = {
-    {"Missing", {"a", "b", "--tol"}, "--tol needs a value"},
-    {"MissingBehindALetter", {"a", "b", "-n"}, "-n needs a value"},
-    {"MissingBeforeAnOption",
-     {"--include", "--json", "a", "b"},
+    {"Missing", "a b --tol", "--tol needs a value"},
+    {"MissingAfterALetter", "a b -n", "-n needs a value"},
+    {"MissingBeforeAnOption", "--include --json a b",
      "--include needs a value, and '--json' is an option"},
-    {"MissingBeforeALetter",
-     {"--include", "-v", "a", "b"},
-     "--include needs a value, and '-v' is an option"},
-    {"MissingBeforeDashes",
-     {"--tol", "--", "a", "b"},
-     "--tol needs a value, and '--' is an option"},
-    {"Unwanted", {"--json=1", "a", "b"}, "--json takes no value"},
-    {"UnwantedAndEmpty", {"--strict-type=", "a", "b"}, "--strict-type takes no value"},
-    {"UnwantedByHelp", {"--help=all"}, "--help takes no value"},
-    {"TolTwice", {"--tol", "1", "--tol=2", "a", "b"}, "--tol is given twice"},
-    {"DifferencesTwice",
-     {"-n1", "--max-differences", "1", "a", "b"},
-     "--max-differences is given twice"},
-    {"SliceTwice", {"--slice=1", "--slice=1", "a", "b"}, "--slice is given twice"},
-    {"ThreadsTwice", {"--threads=1", "--threads=1", "a", "b"}, "--threads is given twice"},
-    {"NoTol", {"--tol=", "a", "b"}, "--tol: empty value"},
-    {"NoSlice", {"--slice=", "a", "b"}, "--slice: empty value"},
-    {"NoInclude", {"--include=", "a", "b"}, "--include: empty value"},
-    {"NoExclude", {"--exclude=", "a", "b"}, "--exclude: empty value"},
-    {"NoThreads", {"--threads=", "a", "b"}, "--threads: empty value"},
-    {"NoDifferences", {"--max-differences=", "a", "b"}, "--max-differences: empty value"},
+    {"MissingBeforeALetter", "--include -v a b", "--include needs a value, and '-v' is an option"},
+    {"MissingBeforeDashes", "--tol -- a b", "--tol needs a value, and '--' is an option"},
+    {"Unwanted", "--json=1 a b", "--json takes no value"},
+    {"UnwantedAndEmpty", "--strict-type= a b", "--strict-type takes no value"},
+    {"UnwantedByHelp", "--help=all", "--help takes no value"},
+    {"TolTwice", "--tol 1 --tol=2 a b", "--tol is given twice"},
+    {"DifferencesTwice", "-n1 --max-differences 1 a b", "--max-differences is given twice"},
+    {"SliceTwice", "--slice=1 --slice=1 a b", "--slice is given twice"},
+    {"ThreadsTwice", "--threads=1 --threads=1 a b", "--threads is given twice"},
+    {"NoTol", "--tol= a b", "--tol: empty value"},
+    {"NoSlice", "--slice= a b", "--slice: empty value"},
+    {"NoInclude", "--include= a b", "--include: empty value"},
+    {"NoExclude", "--exclude= a b", "--exclude: empty value"},
+    {"NoThreads", "--threads= a b", "--threads: empty value"},
+    {"NoDifferences", "--max-differences= a b", "--max-differences: empty value"},
     {"EmptyTol", {"--tol", "", "a", "b"}, "--tol: empty value"},
     {"EmptySlice", {"--slice", "", "a", "b"}, "--slice: empty value"},
     {"EmptyInclude", {"--include", "", "a", "b"}, "--include: empty value"},
     {"EmptyDifferences", {"-n", "", "a", "b"}, "-n: empty value"},
-    {"TolOfFile", {"--tol", "a", "b"}, tolerance_of + "'a'"},
-    {"TolOfText", {"--tol", "x", "a", "b"}, tolerance_of + "'x'"},
-    {"TolOfNaN", {"--tol", "nan", "a", "b"}, tolerance_of + "'nan'"},
-    {"TolOutOfRange",
-     {"--tol", "1e999", "a", "b"},
-     "--tol 1e999 is too large or too small for a double"},
+    {"TolOfFile", "--tol a b", tolerance_of + "'a'"},
+    {"TolOfText", "--tol x a b", tolerance_of + "'x'"},
+    {"TolOfNaN", "--tol nan a b", tolerance_of + "'nan'"},
+    {"TolOutOfRange", "--tol 1e999 a b", "--tol 1e999 is too large or too small for a double"},
     {"TolWithSpace", {"--tol", "10 ", "a", "b"}, tolerance_of + "'10 '"},
-    {"TolWithUnit", {"--tol=10bits", "a", "b"}, tolerance_of + "'10bits'"},
-    {"TolWithDecimalComma", {"--tol=2,5", "a", "b"}, tolerance_of + "'2,5'"},
-    {"TolWithEquals", {"--tol==1", "a", "b"}, tolerance_of + "'=1'"},
-    {"TolOfTwoLines", {"--tol", "1\n2", "a", "b"}, tolerance_of + "'1?2'"},
-    {"TolWithControls",
-     {"--tol=\xC2\x9B"
-      "31m\xE2\x80\xAE",
-      "a", "b"},
-     tolerance_of + "'?31m?'"},
-    {"ZeroDifferences", {"-n", "0", "a", "b"}, differences_of + "'0'"},
-    {"NegativeDifferences", {"-n", "-1", "a", "b"}, differences_of + "'-1'"},
-    {"DifferencesOfText", {"-nall", "a", "b"}, differences_of + "'all'"},
-    {"DifferencesOfTwoLines", {"--max-differences=1\n", "a", "b"}, differences_of + "'1?'"},
-    {"TooManyDifferences", {"-n", "1000001", "a", "b"}, differences_of + "'1000001'"},
-    {"ZeroThreads", {"--threads", "0", "a", "b"}, threads_of + "'0'"},
-    {"TooManyThreads", {"--threads", "65", "a", "b"}, threads_of + "'65'"},
-    {"SliceOfText", {"--slice", "x", "a", "b"}, slice_of + "'x': 'x' is no index"},
-    {"SliceOfTwoLines", {"--slice", "1\n2", "a", "b"}, slice_of + "'1?2': '1?2' is no index"},
-    {"SliceWithoutIndex",
-     {"--slice", "1,,2", "a", "b"},
-     slice_of + "'1,,2': an axis has neither an index nor a colon"},
-    {"SliceOfThreeColons",
-     {"--slice", "::,1:2:3:4", "a", "b"},
-     slice_of + "'::,1:2:3:4': '1:2:3:4' has more than two colons"},
-    {"SliceWithStepZero",
-     {"--slice", "::0", "a", "b"},
-     slice_of + "'::0': the step 0 is not positive"},
-    {"SliceBackwards",
-     {"--slice", "::-1", "a", "b"},
-     slice_of + "'::-1': the step -1 is not positive"},
-    {"SliceOutOfRange",
-     {"--slice", "9223372036854775808", "a", "b"},
-     slice_of + "'9223372036854775808': '9223372036854775808' is no index"},
-    {"SliceWithBrackets", {"--slice", "[1]", "a", "b"}, slice_of + "'[1]': '[1]' is no index"},
+    {"TolWithUnit", "--tol=10bits a b", tolerance_of + "'10bits'"},
+    {"TolWithDecimalComma", "--tol=2,5 a b", tolerance_of + "'2,5'"},
+    {"TolWithEquals", "--tol==1 a b", tolerance_of + "'=1'"},
+    {"TolOfTwoLines", "--tol 1\n2 a b", tolerance_of + "'1?2'"},
+    {"TolWithControls", "--tol=\xC2\x9Bm\xE2\x80\xAE a b", tolerance_of + "'?m?'"},
+    {"ZeroDifferences", "-n 0 a b", differences_of + "'0'"},
+    {"NegativeDifferences", "-n -1 a b", differences_of + "'-1'"},
+    {"DifferencesOfText", "-nall a b", differences_of + "'all'"},
+    {"DifferencesOfTwoLines", "--max-differences=1\n a b", differences_of + "'1?'"},
+    {"TooManyDifferences", "-n 1000001 a b", differences_of + "'1000001'"},
+    {"ZeroThreads", "--threads 0 a b", threads_of + "'0'"},
+    {"TooManyThreads", "--threads 65 a b", threads_of + "'65'"},
+    {"SliceOfText", "--slice x a b", slice_of + "'x': 'x' is no index"},
+    {"SliceOfTwoLines", "--slice 1\n2 a b", slice_of + "'1?2': '1?2' is no index"},
 };
 
-class BadUsages : public testing::TestWithParam<BadUsage> {};
+class BadUsages : public NamedCaseTest<BadUsage> {};
 
 TEST_P(BadUsages, AreRefusedWithAHint) {
-    const ProcessResult outcome = run_talcmp(GetParam().words);
+    const ProcessResult outcome = run_talcmp(GetParam().arguments);
     EXPECT_EQ(outcome.status, 2);
     EXPECT_EQ(outcome.output, "");
     EXPECT_EQ(outcome.errors, "talcmp: " + GetParam().message + "; see 'talcmp --help'\n");
 }
 
-INSTANTIATE_TEST_SUITE_P(Operand, BadUsages, testing::ValuesIn(operands), name_of<BadUsage>);
-INSTANTIATE_TEST_SUITE_P(Unknown, BadUsages, testing::ValuesIn(unknown), name_of<BadUsage>);
-INSTANTIATE_TEST_SUITE_P(Value, BadUsages, testing::ValuesIn(values), name_of<BadUsage>);
+INSTANTIATE_TEST_SUITE_P(Operand, BadUsages, named_cases(operands), name_of_case);
+INSTANTIATE_TEST_SUITE_P(Unknown, BadUsages, named_cases(unknown), name_of_case);
+INSTANTIATE_TEST_SUITE_P(Value, BadUsages, named_cases(values), name_of_case);
 
 // ---- Those that it understands
 
 struct Usage {
     const char* name;
-    Words words;
-    std::string output; // of arrays that are the same but under the tolerance 0
+    Arguments arguments;
+    std::string output; // of arrays that differ under the tolerance 0 alone
     int status = 0;
 };
 
-void PrintTo(const Usage& usage, std::ostream* out) {
-    *out << usage.name;
-}
-
-const std::string first = "a.npy b.npy differ: [0]: 1 and 1.0000000000000002 (the same from --tol "
-                          "1 on)\n";
-const std::string second = "a.npy b.npy differ: [1]: 2 and 2.0000000000000004 (the same from "
-                           "--tol 1 on)\n";
+const std::string differ = "a.npy b.npy differ: ";
+const std::string from_one = " (the same from --tol 1 on)\n";
+const std::string first = differ + "[0]: 1 and 1.0000000000000002" + from_one;
+const std::string second = differ + "[1]: 2 and 2.0000000000000004" + from_one;
+const std::string third = differ + "[2]: 4 and 4.000000000000001" + from_one;
 const std::string same = "a.npy b.npy are the same\n";
 
 const Usage usages[] = {
-    {"NoOptions", {"a.npy", "b.npy"}, first, 1},
-    {"OptionsBetweenOperands", {"a.npy", "--tol", "1", "b.npy"}, ""},
-    {"OptionsBehindOperands", {"a.npy", "b.npy", "--tol=1"}, ""},
-    {"NegativeTolerance", {"--tol", "-1", "a.npy", "b.npy"}, first, 1},
-    {"ValueThatLooksLikeAnOption", {"--include=--json", "a.npy", "b.npy"}, first, 1},
-    {"NegativeSlice", {"--slice", "-1:", "a.npy", "b.npy"}, second, 1},
-    {"LetterAndValue", {"-n", "2", "a.npy", "b.npy"}, first + second, 1},
-    {"LetterWithValue", {"-n2", "a.npy", "b.npy"}, first + second, 1},
-    {"MostDifferences", {"-n1000000", "a.npy", "b.npy"}, first + second, 1},
-    {"FlagTwice", {"-v", "--verbose", "--tol=1", "a.npy", "b.npy"}, same},
-    {"FlagsInOneWord", {"-vv", "--tol=1", "a.npy", "b.npy"}, same},
-    {"FlagAndValueInOneWord", {"-vn2", "a.npy", "b.npy"}, first + second, 1},
+    {"NoOptions", "a.npy b.npy", first, 1},
+    {"OptionsBetweenOperands", "a.npy --tol 1 b.npy", ""},
+    {"OptionsAfterOperands", "a.npy b.npy --tol=1", ""},
+    {"NegativeTolerance", "--tol -1 a.npy b.npy", first, 1},
+    {"ValueThatLooksLikeAnOption", "--include=--json a.npy b.npy", first, 1},
+    {"NegativeSlice", "--slice -1: a.npy b.npy", third, 1},
+    {"LetterAndValue", "-n 2 a.npy b.npy", first + second, 1},
+    {"LetterWithValue", "-n2 a.npy b.npy", first + second, 1},
+    {"AllDifferences", "--max-differences=3 a.npy b.npy", first + second + third, 1},
+    {"MostDifferences", "-n1000000 a.npy b.npy", first + second + third, 1},
+    {"FlagTwice", "-v --verbose --tol=1 a.npy b.npy", same},
+    {"FlagsInOneWord", "-vv --tol=1 a.npy b.npy", same},
+    {"FlagAndValueInOneWord", "-vn2 a.npy b.npy", first + second, 1},
     {"ThreadsAndPatterns",
-     {"--threads", "64", "--include", "x", "--include", "y", "--exclude=z", "--exclude=z", "a.npy",
-      "b.npy"},
-     first,
-     1},
-    {"StrictType", {"--strict-type", "--tol=1", "a.npy", "b.npy"}, ""},
-    {"Quiet", {"--quiet", "a.npy", "b.npy"}, "", 1},
-    {"OperandsBehindDashes", {"--tol=1", "--", "-x", "--tol"}, ""},
+     "--threads 64 --include x --include y --exclude=z --exclude=z a.npy b.npy", first, 1},
+    {"StrictType", "--strict-type --tol=1 a.npy b.npy", ""},
+    {"Quiet", "--quiet a.npy b.npy", "", 1},
+    {"OperandsAfterDashes", "--tol=1 -- -x --tol", ""},
 };
 
 // Runs talcmp in a folder with the files a.npy and b.npy, -x and --tol.
-class Usages : public testing::TestWithParam<Usage> {
+class Usages : public NamedCaseTest<Usage> {
   protected:
     void SetUp() override {
         for (const char* const name : {"a.npy", "-x"}) {
-            folder_.write(name, npy::row<double>({1, 2}));
+            folder_.write(name, npy::row<double>({1, 2, 4}));
         }
         for (const char* const name : {"b.npy", "--tol"}) {
-            folder_.write(name, npy::row<double>({1 + 0x1p-52, 2 + 0x1p-51}));
+            folder_.write(name, npy::row<double>({1 + 0x1p-52, 2 + 0x1p-51, 4 + 0x1p-50}));
         }
-        std::filesystem::current_path(folder_.path_of(""));
     }
-    void TearDown() override { std::filesystem::current_path(before_); }
 
   private:
-    TemporaryFolder folder_;
-    std::filesystem::path before_ = std::filesystem::current_path();
+    CurrentFolder folder_;
 };
 
 TEST_P(Usages, AreUnderstood) {
-    const ProcessResult outcome = run_talcmp(GetParam().words);
+    const ProcessResult outcome = run_talcmp(GetParam().arguments);
     EXPECT_EQ(outcome.status, GetParam().status);
     EXPECT_EQ(outcome.output, GetParam().output);
     EXPECT_EQ(outcome.errors, "");
 }
 
-INSTANTIATE_TEST_SUITE_P(CommandLine, Usages, testing::ValuesIn(usages), name_of<Usage>);
+INSTANTIATE_TEST_SUITE_P(CommandLine, Usages, named_cases(usages), name_of_case);
 
 TEST(SortedWords, DoNotDependOnThoseSortedBefore) {
     const std::vector<talcmp::Option> options = {{"--flag", talcmp::Option::Kind::flag, 'f'},

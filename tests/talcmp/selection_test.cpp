@@ -3,13 +3,15 @@
 #include "layout.h"
 #include "selection.h"
 
+#include "support/indices.h"
 #include "support/memory_array.h"
+#include "support/named_cases.h"
+#include "support/thrown_message.h"
 
 #include <gtest/gtest.h>
 
 #include <cstdint>
 #include <optional>
-#include <ostream>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -18,21 +20,6 @@ namespace {
 
 using talcmp::Shape;
 
-template <typename Case>
-std::string name_of(const testing::TestParamInfo<Case>& info) {
-    return info.param.name;
-}
-
-template <typename Action>
-std::string complaint_of(const Action& action) {
-    try {
-        action();
-    } catch (const std::invalid_argument& error) {
-        return error.what();
-    }
-    return "none";
-}
-
 // ---- From text
 
 struct Range {
@@ -40,10 +27,6 @@ struct Range {
     std::string text;
     std::string meaning; // of each axis "start:stop:step", or "[index]"
 };
-
-void PrintTo(const Range& range, std::ostream* out) {
-    *out << range.name;
-}
 
 const Range ranges[] = {
     {"Whole", ":", " ::1"},
@@ -75,36 +58,40 @@ std::string meaning_of(const talcmp::Selection& selection) {
     return text;
 }
 
-class Ranges : public testing::TestWithParam<Range> {};
+class Ranges : public NamedCaseTest<Range> {};
 
 TEST_P(Ranges, AreRead) {
     EXPECT_EQ(meaning_of(talcmp::read_selection(GetParam().text)), GetParam().meaning);
 }
 
-INSTANTIATE_TEST_SUITE_P(Selection, Ranges, testing::ValuesIn(ranges), name_of<Range>);
+INSTANTIATE_TEST_SUITE_P(Selection, Ranges, named_cases(ranges), name_of_case);
 
 const Range bad_ranges[] = {
     {"Nothing", "", "an axis has neither an index nor a colon"},
     {"Space", " ", "an axis has neither an index nor a colon"},
     {"NothingBetween", "1,,2", "an axis has neither an index nor a colon"},
-    {"NothingBehind", "1,", "an axis has neither an index nor a colon"},
+    {"NothingAfter", "1,", "an axis has neither an index nor a colon"},
     {"Text", "x", "'x' is no index"},
-    {"TextBehindANumber", "1:2x", "'2x' is no index"},
+    {"TextAfterANumber", "1:2x", "'2x' is no index"},
     {"SpaceInANumber", "1 2:", "'1 2' is no index"},
     {"Fraction", " 1.5 ", "'1.5' is no index"},
     {"TooLarge", "9223372036854775808", "'9223372036854775808' is no index"},
     {"ThreeColons", "1:2:3:4", "'1:2:3:4' has more than two colons"},
+    {"ThreeColonsLater", "::,1:2:3:4", "'1:2:3:4' has more than two colons"},
+    {"Brackets", "[1]", "'[1]' is no index"},
     {"StepZero", "::0", "the step 0 is not positive"},
     {"Backwards", "::-1", "the step -1 is not positive"},
 };
 
-class BadRanges : public testing::TestWithParam<Range> {};
+class BadRanges : public NamedCaseTest<Range> {};
 
 TEST_P(BadRanges, AreRefused) {
-    EXPECT_EQ(complaint_of([] { talcmp::read_selection(GetParam().text); }), GetParam().meaning);
+    EXPECT_EQ(
+        thrown_message<std::invalid_argument>([] { talcmp::read_selection(GetParam().text); }),
+        GetParam().meaning);
 }
 
-INSTANTIATE_TEST_SUITE_P(Selection, BadRanges, testing::ValuesIn(bad_ranges), name_of<Range>);
+INSTANTIATE_TEST_SUITE_P(Selection, BadRanges, named_cases(bad_ranges), name_of_case);
 
 // ---- Of an array
 
@@ -122,10 +109,6 @@ struct Part {
     std::vector<std::uint64_t> strides; // 0 where there is no second index
 };
 
-void PrintTo(const Part& part, std::ostream* out) {
-    *out << part.name;
-}
-
 const Part parts[] = {
     {"Whole", {4, 5, 6}, Order::c, ":", 0, {4, 5, 6}, {30, 6, 1}},
     {"WholeOfColumns", {4, 5, 6}, Order::fortran, ":", 0, {4, 5, 6}, {1, 4, 20}},
@@ -142,16 +125,10 @@ const Part parts[] = {
     {"Backwards", {9}, Order::c, "5:5", 5, {0}, {0}},
     {"FarthestStart", {9}, Order::c, "-9223372036854775808:", 0, {9}, {1}},
     {"OneElement", {9}, Order::c, "8:", 8, {1}, {0}},
-    {"Longest",
-     {1, 18446744073709551615U},
-     Order::c,
-     ":,1:",
-     1,
-     {1, 18446744073709551614U},
-     {0, 1}},
+    {"Longest", {1, UINT64_MAX}, Order::c, ":,1:", 1, {1, UINT64_MAX - 1}, {0, 1}},
 };
 
-class Parts : public testing::TestWithParam<Part> {};
+class Parts : public NamedCaseTest<Part> {};
 
 TEST_P(Parts, LieWhereTheyAreSelected) {
     const Part& part = GetParam();
@@ -162,11 +139,11 @@ TEST_P(Parts, LieWhereTheyAreSelected) {
     EXPECT_EQ(view.strides, part.strides);
 }
 
-INSTANTIATE_TEST_SUITE_P(Selection, Parts, testing::ValuesIn(parts), name_of<Part>);
+INSTANTIATE_TEST_SUITE_P(Selection, Parts, named_cases(parts), name_of_case);
 
 TEST(NoPart, IsSelectedWhereThereIsNone) {
     const auto complaint = [](const Shape& shape, const std::string& text) {
-        return complaint_of(
+        return thrown_message<std::invalid_argument>(
             [&] { select(array_of(shape, Order::c), talcmp::read_selection(text)); });
     };
     EXPECT_EQ(complaint({2, 4}, "1,3"), "none");
@@ -179,22 +156,6 @@ TEST(NoPart, IsSelectedWhereThereIsNone) {
 }
 
 // ---- Positions
-
-// All indices in row-major order.
-std::vector<Shape> indices_of(const Shape& shape) {
-    std::vector<Shape> indices = {{}};
-    for (const std::uint64_t extent : shape) {
-        std::vector<Shape> longer;
-        for (const Shape& index : indices) {
-            for (std::uint64_t i = 0; i < extent; ++i) {
-                longer.push_back(index);
-                longer.back().push_back(i);
-            }
-        }
-        indices = longer;
-    }
-    return indices;
-}
 
 TEST(Positions, AreThoseOfIndices) {
     const Shape shape = {3, 1, 4, 2};

@@ -39,3 +39,18 @@ class TemporaryFolder {
   private:
     std::string path_;
 };
+
+// Is the current folder as long as it lives.
+class CurrentFolder : public TemporaryFolder {
+  public:
+    CurrentFolder() { std::filesystem::current_path(path_of("")); }
+    CurrentFolder(const CurrentFolder&) = delete;
+    CurrentFolder& operator=(const CurrentFolder&) = delete;
+    ~CurrentFolder() {
+        std::error_code ignored;
+        std::filesystem::current_path(before_, ignored);
+    }
+
+  private:
+    std::filesystem::path before_ = std::filesystem::current_path();
+};
