@@ -7,10 +7,11 @@
 #include "npz_file.h"
 #include "pipe.h"
 #include "regular_file.h"
-#include "trouble.h"
 
+#include "support/named_cases.h"
 #include "support/npy_bytes.h"
 #include "support/temporary_folder.h"
+#include "support/thrown_message.h"
 #include "support/zip_bytes.h"
 
 #include <gtest/gtest.h>
@@ -19,7 +20,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
-#include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -42,16 +42,6 @@ std::string read(talcmp::ByteSource& source, const std::uint64_t offset, const s
     std::string bytes(count, '\0');
     bytes.resize(source.read(offset, bytes.data(), count));
     return bytes;
-}
-
-template <typename Action>
-std::string trouble_of(const Action& action) {
-    try {
-        action();
-    } catch (const talcmp::Trouble& trouble) {
-        return trouble.what();
-    }
-    return "none";
 }
 
 // ---- Streams
@@ -82,21 +72,17 @@ struct Reading {
     std::vector<std::pair<std::uint64_t, std::size_t>> parts; // offset and count
 };
 
-void PrintTo(const Reading& reading, std::ostream* out) {
-    *out << reading.name;
-}
-
 const Reading readings[] = {
     {"All", {{0, 200000}}},
     {"OneAfterTheOther", {{0, 1}, {1, 7}, {8, 0}, {8, 199992}}},
     {"WithFewBytesBetween", {{3, 4}, {9, 10}, {100, 5}}},
     {"WithManyBytesBetween", {{65536, 3}, {131075, 5}, {199999, 1}}},
     {"PastTheEnd", {{199990, 100}, {200000, 1}}},
-    {"BehindTheEnd", {{199999, 1}, {300000, 4}}},
-    {"FarBehindTheEnd", {{5, 1}, {200001, 4}}},
+    {"AfterTheEnd", {{199999, 1}, {300000, 4}}},
+    {"FarAfterTheEnd", {{5, 1}, {200001, 4}}},
 };
 
-class Streams : public testing::TestWithParam<Reading> {};
+class Streams : public NamedCaseTest<Reading> {};
 
 TEST_P(Streams, AreReadInPiecesOfWhateverLength) {
     const std::string bytes = text_of_length(200000);
@@ -112,8 +98,7 @@ TEST_P(Streams, AreReadInPiecesOfWhateverLength) {
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Bytes, Streams, testing::ValuesIn(readings),
-                         [](const auto& of) { return std::string(of.param.name); });
+INSTANTIATE_TEST_SUITE_P(Bytes, Streams, named_cases(readings), name_of_case);
 
 // ---- Descriptors
 
@@ -184,7 +169,7 @@ TEST(Files, OfOneArrayHaveOneMemberWithoutAName) {
 TEST(Files, ThatAreNoneAreTrouble) {
     const TemporaryFolder folder;
     const auto trouble = [](const std::string& path) {
-        return trouble_of([&path] { talcmp::open_array_file(path); });
+        return thrown_message([&path] { talcmp::open_array_file(path); });
     };
     const std::string missing = folder.path_of("missing");
     EXPECT_EQ(trouble(missing), missing + ": cannot be opened: No such file or directory");
@@ -199,10 +184,11 @@ TEST(Files, ThatCannotBeReadAreTrouble) {
     const talcmp::Descriptor descriptor(
         ::open(folder.path_of("").c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     char byte = 0;
-    EXPECT_EQ(trouble_of([&] { talcmp::read_at(descriptor.number(), "name", 0, &byte, 1); }),
+    EXPECT_EQ(thrown_message([&] { talcmp::read_at(descriptor.number(), "name", 0, &byte, 1); }),
               "name: cannot be read: Is a directory");
     talcmp::Pipe pipe("pipe", talcmp::Descriptor(::dup(descriptor.number())));
-    EXPECT_EQ(trouble_of([&] { pipe.read(0, &byte, 1); }), "pipe: cannot be read: Is a directory");
+    EXPECT_EQ(thrown_message([&] { pipe.read(0, &byte, 1); }),
+              "pipe: cannot be read: Is a directory");
 }
 
 TEST(Pipes, AreReadToTheirEnd) {

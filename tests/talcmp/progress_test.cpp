@@ -3,6 +3,8 @@
 #include "progress_bar.h"
 #include "status_line.h"
 
+#include "support/named_cases.h"
+
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -12,7 +14,6 @@
 #include <cstdint>
 #include <cstdlib>
 #include <limits>
-#include <ostream>
 #include <string>
 #include <thread>
 
@@ -30,10 +31,6 @@ struct Progress {
     int columns;
     std::string text;
 };
-
-void PrintTo(const Progress& progress, std::ostream* out) {
-    *out << progress.name;
-}
 
 constexpr std::uint64_t huge = std::numeric_limits<std::uint64_t>::max();
 
@@ -64,7 +61,7 @@ const Progress cases[] = {
     {"NoColumns", 50, 100, 1, 0, ""},
 };
 
-class ProgressText : public testing::TestWithParam<Progress> {};
+class ProgressText : public NamedCaseTest<Progress> {};
 
 TEST_P(ProgressText, Is) {
     const Progress& progress = GetParam();
@@ -73,11 +70,7 @@ TEST_P(ProgressText, Is) {
         progress.text);
 }
 
-std::string name_of(const testing::TestParamInfo<Progress>& progress) {
-    return progress.param.name;
-}
-
-INSTANTIATE_TEST_SUITE_P(Bar, ProgressText, testing::ValuesIn(cases), name_of);
+INSTANTIATE_TEST_SUITE_P(Bar, ProgressText, named_cases(cases), name_of_case);
 
 // ---- When it is drawn
 

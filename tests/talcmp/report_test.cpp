@@ -4,6 +4,7 @@
 
 #include "taldata_array_element_types.h"
 
+#include "support/named_cases.h"
 #include "support/type_names.h"
 
 #include <gtest/gtest.h>
@@ -14,7 +15,6 @@
 #include <cstdint>
 #include <limits>
 #include <optional>
-#include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -140,26 +140,22 @@ struct Counted {
     Reals second;
     double tolerance;
     std::string report;
-    std::string listed; // the first three of those that differ
+    std::string listed = {}; // the first three of those that differ
 };
-
-void PrintTo(const Counted& counted, std::ostream* out) {
-    *out << counted.name;
-}
 
 const Reals ones(6, 1.0);
 const Reals others = {1, with_digits(1), with_digits(3), with_digits(53), with_digits(3), -1};
 const std::string digits_of_others = "; digits 1x0 1x1 2x3 1x53 1x54; from 54, worst 54 at 5:54; "
                                      "0 0 0, 0 0 0";
+const std::string zero_digits = "; digits 1x0 1x1; from 1, worst 1 at 0:1; 0 0 1, 0 0 0";
+const std::string nan_digits = "; digits 2x0; from 53, worst 0; 1 0 0, 1 0 0";
+const Reals zeros(2, 0.0);
+const Reals negative_zero = {-0.0, 0};
+const Reals one_and_nan = {1, nan};
 
 const Counted counted[] = {
-    {"Nothing", {}, {}, 0, "0 pairs, 0 differ; digits; from 1, worst 0; 0 0 0, 0 0 0", ""},
-    {"Equal",
-     {1, 2},
-     {1, 2},
-     0,
-     "2 pairs, 0 differ; digits 2x0; from 1, worst 0; 0 0 0, 0 0 0",
-     ""},
+    {"Nothing", {}, {}, 0, "0 pairs, 0 differ; digits; from 1, worst 0; 0 0 0, 0 0 0"},
+    {"Equal", ones, ones, 0, "6 pairs, 0 differ; digits 6x0; from 1, worst 0; 0 0 0, 0 0 0"},
     {"BitByBit", ones, others, 0, "6 pairs, 5 differ" + digits_of_others, "1:1 2:3 3:53"},
     {"Negative", ones, others, -1, "6 pairs, 5 differ" + digits_of_others, "1:1 2:3 3:53"},
     {"Half", ones, others, 0.5, "6 pairs, 4 differ" + digits_of_others, "2:3 3:53 4:3"},
@@ -169,47 +165,19 @@ const Counted counted[] = {
     {"AlmostThree", ones, others, 2.75, "6 pairs, 2 differ" + digits_of_others, "3:53 5:54"},
     {"Three", ones, others, 3, "6 pairs, 2 differ" + digits_of_others, "3:53 5:54"},
     {"AlmostAll", ones, others, 52.5, "6 pairs, 2 differ" + digits_of_others, "3:53 5:54"},
-    {"FarAsTheFactorIsRemembered",
-     {1},
-     {2.5},
-     52.5,
-     "1 pairs, 0 differ; digits 1x53; from 53, worst 53 at 0:53; 0 0 0, 0 0 0",
-     ""},
+    {"FarAsTheFactorIsRemembered", Reals({1}), Reals({2.5}), 52.5,
+     "1 pairs, 0 differ; digits 1x53; from 53, worst 53 at 0:53; 0 0 0, 0 0 0"},
     {"All", ones, others, 53, "6 pairs, 1 differ" + digits_of_others, "5:54"},
     {"MoreThanAll", ones, others, 1e300, "6 pairs, 1 differ" + digits_of_others, "5:54"},
-    {"Zeros",
-     {-0.0, 0},
-     {0, 0},
-     0,
-     "2 pairs, 1 differ; digits 1x0 1x1; from 1, worst 1 at 0:1; 0 0 1, 0 0 0",
-     "0:1"},
-    {"ZerosNegative",
-     {-0.0, 0},
-     {0, 0},
-     -1,
-     "2 pairs, 0 differ; digits 1x0 1x1; from 1, worst 1 at 0:1; 0 0 1, 0 0 0",
-     ""},
-    {"EqualNaNs",
-     {1, nan},
-     {1, nan},
-     0,
-     "2 pairs, 0 differ; digits 2x0; from 53, worst 0; 1 0 0, 1 0 0",
-     ""},
-    {"EqualNaNsUnderOne",
-     {1, nan},
-     {1, nan},
-     1,
-     "2 pairs, 1 differ; digits 2x0; from 53, worst 0; 1 0 0, 1 0 0",
-     "1:0"},
-    {"Infinities",
-     {infinity, 1},
-     {-infinity, infinity},
-     0,
-     "2 pairs, 2 differ; digits 1x53 1x54; from 54, worst 54 at 0:54; 0 1 0, 0 2 0",
-     "0:54 1:53"},
+    {"Zeros", negative_zero, zeros, 0, "2 pairs, 1 differ" + zero_digits, "0:1"},
+    {"ZerosNegative", negative_zero, zeros, -1, "2 pairs, 0 differ" + zero_digits},
+    {"EqualNaNs", one_and_nan, one_and_nan, 0, "2 pairs, 0 differ" + nan_digits},
+    {"EqualNaNsUnderOne", one_and_nan, one_and_nan, 1, "2 pairs, 1 differ" + nan_digits, "1:0"},
+    {"Infinities", Reals({infinity, 1}), Reals({-infinity, infinity}), 0,
+     "2 pairs, 2 differ; digits 1x53 1x54; from 54, worst 54 at 0:54; 0 1 0, 0 2 0", "0:54 1:53"},
 };
 
-class Reports : public testing::TestWithParam<Counted> {};
+class Reports : public NamedCaseTest<Counted> {};
 
 TEST_P(Reports, CountAllPairsAndListTheFirst) {
     for (const bool in_order : {true, false}) {
@@ -224,8 +192,7 @@ TEST_P(Reports, CountAllPairsAndListTheFirst) {
     }
 }
 
-INSTANTIATE_TEST_SUITE_P(Tolerance, Reports, testing::ValuesIn(counted),
-                         [](const auto& of) { return std::string(of.param.name); });
+INSTANTIATE_TEST_SUITE_P(Tolerance, Reports, named_cases(counted), name_of_case);
 
 // Stretches come in any order, and those of arrays in column-major order with any numbers in them.
 TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {

@@ -2,6 +2,8 @@
 
 #include "shown.h"
 
+#include "support/named_cases.h"
+
 #include <gtest/gtest.h>
 
 #include <string>
@@ -16,10 +18,6 @@ struct Text {
     std::string shown;
 };
 
-void PrintTo(const Text& text, std::ostream* out) {
-    *out << text.name;
-}
-
 std::string repeated(const std::string& text, const int times) {
     std::string result;
     for (int i = 0; i < times; ++i) {
@@ -33,11 +31,8 @@ const Text texts[] = {
     {"Ascii", "a b~[1]", "a b~[1]"},
     {"AsciiControls", std::string("\0\t\n\r\x1B[31m\x1F\x7F.", 12), "?????[31m??."},
     {"FirstAndLastC1Control", "a\xC2\x80\xC2\x9F.", "a??."},
-    {"BehindC1Controls", "\xC2\xA0\xC2\xBF", "\xC2\xA0\xC2\xBF"},
-    {"C1Byte",
-     "a\x9B"
-     "31m",
-     "a?31m"},
+    {"AfterC1Controls", "\xC2\xA0\xC2\xBF", "\xC2\xA0\xC2\xBF"},
+    {"C1Byte", "a\x9Bm", "a?m"},
     {"ArabicLetterMark", "\xD8\x9B\xD8\x9C\xD8\x9D", "\xD8\x9B?\xD8\x9D"},
     {"DirectionMarks", "\xE2\x80\x8D\xE2\x80\x8E\xE2\x80\x8F\xE2\x80\x90",
      "\xE2\x80\x8D??\xE2\x80\x90"},
@@ -46,15 +41,11 @@ const Text texts[] = {
      "?????\xE2\x80\xAF"},
     {"Isolates", "\xE2\x81\xA5\xE2\x81\xA6\xE2\x81\xA7\xE2\x81\xA8\xE2\x81\xA9\xE2\x81\xAA",
      "\xE2\x81\xA5????\xE2\x81\xAA"},
-    {"Umlaut",
-     "gr\xC3\xB6\xC3\x9F"
-     "e",
-     "gr\xC3\xB6\xC3\x9F"
-     "e"},
+    {"Umlaut", "gr\xC3\xB6\xC3\x9F.", "gr\xC3\xB6\xC3\x9F."},
     {"Kanji", "\xE6\xBC\xA2", "\xE6\xBC\xA2"},
     {"Emoji", "\xF0\x9F\x98\x80", "\xF0\x9F\x98\x80"},
     {"LastCharacter", "\xF4\x8F\xBF\xBF", "\xF4\x8F\xBF\xBF"},
-    {"BehindTheLastCharacter", "\xF4\x90\x80\x80", "????"},
+    {"AfterTheLastCharacter", "\xF4\x90\x80\x80", "????"},
     {"ReplacementCharacter", "\xEF\xBF\xBD", "\xEF\xBF\xBD"},
     {"OverlongInTwo", "\xC1\xBF", "??"},
     {"OverlongInThree", "\xE0\x9F\xBF", "???"},
@@ -74,20 +65,16 @@ const Text texts[] = {
     {"NoLeads", "\xBF\xF5\xFF", "???"},
 };
 
-class Shown : public testing::TestWithParam<Text> {};
+class Shown : public NamedCaseTest<Text> {};
 
 TEST_P(Shown, IsHarmless) {
     EXPECT_EQ(shown(GetParam().text), GetParam().shown);
     EXPECT_EQ(shown(shown(GetParam().text)), GetParam().shown);
 }
 
-std::string name_of(const testing::TestParamInfo<Text>& text) {
-    return text.param.name;
-}
+INSTANTIATE_TEST_SUITE_P(Text, Shown, named_cases(texts), name_of_case);
 
-INSTANTIATE_TEST_SUITE_P(Text, Shown, testing::ValuesIn(texts), name_of);
-
-TEST(StandIns, AreToldWhatTheyStandFor) {
+TEST(StandIns, MayDependOnWhatTheyStandFor) {
     const auto stand_in = [](const char32_t code) {
         return "<" + std::to_string(static_cast<unsigned>(code)) + ">";
     };

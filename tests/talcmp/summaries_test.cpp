@@ -7,8 +7,8 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <regex>
 #include <string>
-#include <utility>
 #include <vector>
 
 namespace {
@@ -22,57 +22,33 @@ const std::string broken = "broken";
 // Runs talcmp in a folder with the folders first/ and second/.
 class Summaries : public testing::Test {
   protected:
+    CurrentFolder folder_;
+
     void SetUp() override {
         for (const char* const name : {"first", "second"}) {
-            std::filesystem::create_directory(folder_.path_of(name));
+            std::filesystem::create_directory(name);
         }
-        std::filesystem::current_path(folder_.path_of(""));
-    }
-    void TearDown() override { std::filesystem::current_path(before_); }
-
-    void write(const std::string& path, const std::string& bytes) const {
-        folder_.write(path, bytes);
     }
 
     // Of the files `name`0.npy, `name`1.npy...; of none where the bytes are empty.
     void write_pairs(const std::string& name, const int count, const std::string& first,
                      const std::string& second) const {
         for (int i = 0; i < count; ++i) {
-            const std::string file = name + std::to_string(i) + ".npy";
-            for (const auto& [folder, bytes] :
-                 {std::pair("first/", &first), std::pair("second/", &second)}) {
-                if (!bytes->empty()) {
-                    write(folder + file, *bytes);
-                }
+            const std::string file = "/" + name + std::to_string(i) + ".npy";
+            if (!first.empty()) {
+                folder_.write("first" + file, first);
+            }
+            if (!second.empty()) {
+                folder_.write("second" + file, second);
             }
         }
     }
 
-    // Each count is another one.
-    void write_all_kinds() const {
-        write_pairs("a", 5, one, one);
-        write_pairs("b", 4, one, two);
-        write_pairs("c", 3, one, "");
-        write_pairs("d", 2, "", one);
-        write_pairs("e", 1, broken, one);
-    }
-
-    static std::string lines(const std::string& name, const int count, const std::string& before,
-                             const std::string& after) {
+    // The line with each number below `count` for its '#'s.
+    static std::string lines(const std::string& line, const int count) {
         std::string text;
         for (int i = 0; i < count; ++i) {
-            const std::string file = name + std::to_string(i) + ".npy";
-            text += before + "first/" + file + " second/" + file + after + "\n";
-        }
-        return text;
-    }
-
-    static std::string lone_lines(const std::string& name, const int count,
-                                  const std::string& folder) {
-        std::string text;
-        for (int i = 0; i < count; ++i) {
-            text += "first second differ: only in " + folder + ": " + name + std::to_string(i)
-                    + ".npy\n";
+            text += std::regex_replace(line, std::regex("#"), std::to_string(i)) + "\n";
         }
         return text;
     }
@@ -84,32 +60,34 @@ class Summaries : public testing::Test {
         EXPECT_EQ(outcome.output, output);
         EXPECT_EQ(outcome.errors, errors);
     }
-
-  private:
-    TemporaryFolder folder_;
-    std::filesystem::path before_ = std::filesystem::current_path();
 };
 
 const std::string no_npy =
     "talcmp: first/e0.npy: is not an .npy file: it does not begin with \\x93NUMPY\n";
 
 TEST_F(Summaries, CountEachKind) {
-    write_all_kinds();
-    const std::string output = lines("a", 5, "", " are the same")
-                               + lines("b", 4, "", " differ: [0]: 1 and 2 (no digit in common)")
-                               + lone_lines("c", 3, "first") + lone_lines("d", 2, "second")
-                               + "5 the same, 4 different, 3 only in the first, 2 only in the "
-                                 "second, 1 in trouble\n";
+    // Each count is another one.
+    write_pairs("a", 5, one, one);
+    write_pairs("b", 4, one, two);
+    write_pairs("c", 3, one, "");
+    write_pairs("d", 2, "", one);
+    write_pairs("e", 1, broken, one);
+    const std::string output =
+        lines("first/a#.npy second/a#.npy are the same", 5)
+        + lines("first/b#.npy second/b#.npy differ: [0]: 1 and 2 (no digit in common)", 4)
+        + lines("first second differ: only in first: c#.npy", 3)
+        + lines("first second differ: only in second: d#.npy", 2)
+        + "5 the same, 4 different, 3 only in the first, 2 only in the second, 1 in trouble\n";
     expect({"first", "second"}, 2, output, no_npy);
     expect({"-v", "first", "second"}, 2, output, no_npy);
     expect({"-q", "first", "second"}, 2, "", no_npy);
 }
 
 TEST_F(Summaries, EndWithTheStatusOfTheWorst) {
-    const std::string nothing_more = " 0 only in the first, 0 only in the second, 0 in trouble\n";
     write_pairs("a", 1, one, one);
     expect({"first", "second"}, 0,
-           lines("a", 1, "", " are the same") + "1 the same, 0 different," + nothing_more);
+           "first/a0.npy second/a0.npy are the same\n"
+           "1 the same, 0 different, 0 only in the first, 0 only in the second, 0 in trouble\n");
     expect({"-q", "first", "second"}, 0, "");
     write_pairs("b", 1, one, two);
     expect({"-q", "first", "second"}, 1, "");
@@ -126,8 +104,8 @@ TEST_F(Summaries, AreNotOfOnePairOfFiles) {
     write_pairs("a", 1, one, one);
     write_pairs("b", 1, one, two);
     const std::string same = "first/a0.npy second/a0.npy are the same\n";
-    const std::string different = "first/b0.npy second/b0.npy differ: [0]: 1 and 2 (no digit in "
-                                  "common)\n";
+    const std::string different =
+        "first/b0.npy second/b0.npy differ: [0]: 1 and 2 (no digit in common)\n";
     expect({"first/a0.npy", "second/a0.npy"}, 0, "");
     expect({"-v", "first/a0.npy", "second/a0.npy"}, 0, same);
     expect({"-q", "first/a0.npy", "second/a0.npy"}, 0, "");
@@ -141,42 +119,51 @@ TEST_F(Summaries, AreNotOfOperandsInTrouble) {
     const std::string trouble =
         "talcmp: first: holds no .npy or .npz file to compare, nor does second\n";
     expect({"first", "second"}, 2, "", trouble);
-    expect({"-v", "first", "second"}, 2, "", trouble);
-    expect({"-q", "first", "second"}, 2, "", trouble);
-    expect({"--report", "first", "second"}, 2, "", trouble);
+    for (const char* const option : {"-v", "-q", "--report"}) {
+        expect({option, "first", "second"}, 2, "", trouble);
+    }
 }
 
 TEST_F(Summaries, FollowReports) {
-    write_pairs("a", 1, npy::row<float>({}), npy::row<float>({}));
-    write_pairs("b", 1, npy::row<float>({}), npy::row<float>({1}));
-    const std::string facts = "  first array           float32 (0,)\n";
-    expect({"--report", "--tol=2.5", "first", "second"}, 1,
-           "first/a0.npy second/a0.npy are the same (no elements)\n" + facts
-               + "  second array          float32 (0,)\n"
-                 "  tolerance             2.5 binary digits\n"
-                 "  pairs                 0\n"
-                 "first/b0.npy second/b0.npy differ: shape (0,) and (1,)\n"
-               + facts
-               + "  second array          float32 (1,)\n"
-                 "  tolerance             2.5 binary digits\n"
-                 "1 the same, 1 different, 0 only in the first, 0 only in the second, "
-                 "0 in trouble\n");
+    write_pairs("a", 1, npy::row<float>({}), npy::row<double>({}));
+    write_pairs("b", 1, npy::row<float>({}), npy::row<double>({1}));
+    const std::string first = "  first array           float32 (0,)\n";
+    for (const std::string tolerance : {"0", "2.5"}) {
+        const std::string under = "  tolerance             " + tolerance + " binary digits\n";
+        expect({"--report", "--tol=" + tolerance, "first", "second"}, 1,
+               "first/a0.npy second/a0.npy are the same (no elements)\n" + first
+                   + "  second array          float64 (0,)\n" + under
+                   + "  pairs                 0\n"
+                     "first/b0.npy second/b0.npy differ: shape (0,) and (1,)\n"
+                   + first + "  second array          float64 (1,)\n" + under
+                   + "1 the same, 1 different, 0 only in the first, 0 only in the second, "
+                     "0 in trouble\n");
+    }
 }
 
+// Controls of either kind, an override of the direction, a separator of lines, half a character; an
+// umlaut is none of these.
 TEST_F(Summaries, ShowNamesInOneLine) {
-    write("first/a\n.npy", one);
-    write("second/a\n.npy", one);
-    write("second/b\x1B.npy", one);
-    write("first/c\xC2\x9B.npy", broken);
-    write("second/c\xC2\x9B.npy", one);
+    folder_.write("first/a\n.npy", one);
+    folder_.write("second/a\n.npy", one);
+    folder_.write("second/b\x1B[31m.npy", one);
+    folder_.write("first/c\xC2\x9B.npy", broken);
+    folder_.write("second/c\xC2\x9B.npy", one);
+    folder_.write("first/gr\xC3\xBCn\xE2\x80\xAE\xE2\x80\xA8\xC3.npy", one);
+    folder_.write("second/gr\xC3\xBCn\xE2\x80\xAE\xE2\x80\xA8\xC3.npy", two);
     expect({"first", "second"}, 2,
            "first/a?.npy second/a?.npy are the same\n"
-           "first second differ: only in second: b?.npy\n"
-           "1 the same, 0 different, 0 only in the first, 1 only in the second, 1 in trouble\n",
+           "first second differ: only in second: b?[31m.npy\n"
+           "first/gr\xC3\xBCn???.npy second/gr\xC3\xBCn???.npy differ: [0]: 1 and 2 (no digit in "
+           "common)\n"
+           "1 the same, 1 different, 0 only in the first, 1 only in the second, 1 in trouble\n",
            "talcmp: first/c?.npy: is not an .npy file: it does not begin with \\x93NUMPY\n");
+    expect({"[\x9B].npy", "first/a\n.npy"}, 2, "",
+           "talcmp: [?].npy: there is no such file; a pattern can be compared with another one or "
+           "with a folder\n");
 }
 
-// What is known before the trouble stands before it, on one terminal or in one file too.
+// What is known before the trouble is printed before it, on one terminal or in one file too.
 TEST_F(Summaries, KeepTheirOrderWithTrouble) {
     write_pairs("a", 1, one, one);
     write_pairs("b", 1, broken, one);

@@ -3,6 +3,7 @@
 #include "traversal.h"
 
 #include "support/memory_array.h"
+#include "support/named_cases.h"
 
 #include <gtest/gtest.h>
 
@@ -12,7 +13,6 @@
 #include <cstdint>
 #include <functional>
 #include <numeric>
-#include <ostream>
 #include <string>
 #include <type_traits>
 #include <utility>
@@ -83,10 +83,6 @@ struct Way {
     bool is_linear = false; // whether both are read from the beginning to the end
 };
 
-void PrintTo(const Way& way, std::ostream* out) {
-    *out << way.name;
-}
-
 const Way ways[] = {
     {"OneElement", {1, 1}, ":", Order::c, Order::fortran, 1, true},
     {"NoAxis", {}, ":", Order::c, Order::c, 1, true},
@@ -117,7 +113,7 @@ const Way ways[] = {
     {"Steps", {90, 100, 11}, "3::3,1::7,::2", Order::fortran, Order::c, std::uint64_t{29} * 15 * 6},
 };
 
-class Ways : public testing::TestWithParam<Way> {
+class Ways : public NamedCaseTest<Way> {
   protected:
     const Way& way_ = GetParam();
     talcmp::Selection selection_ =
@@ -198,7 +194,6 @@ TEST_P(Ways, LeadToEveryPairOnce) {
     expect_every_pair_once<std::complex<double>>();
 }
 
-INSTANTIATE_TEST_SUITE_P(Traversal, Ways, testing::ValuesIn(ways),
-                         [](const auto& way) { return std::string(way.param.name); });
+INSTANTIATE_TEST_SUITE_P(Traversal, Ways, named_cases(ways), name_of_case);
 
 } // namespace
