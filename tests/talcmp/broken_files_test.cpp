@@ -4,9 +4,11 @@
 
 #include "../support/protected_memory.h"
 #include "support/memory_bytes.h"
+#include "support/named_cases.h"
 #include "support/npy_bytes.h"
 #include "support/run_talcmp.h"
 #include "support/temporary_folder.h"
+#include "support/thrown_message.h"
 #include "support/zip_bytes.h"
 
 #include <gtest/gtest.h>
@@ -14,8 +16,8 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
+#include <filesystem>
 #include <optional>
-#include <ostream>
 #include <string>
 #include <vector>
 
@@ -27,6 +29,7 @@ namespace {
 const std::string two_reals = npy::elements<double>({1, 2});
 const std::string real = npy::descr<double>();
 const std::string good_dictionary = npy::dictionary(real, "False", "(2,)");
+const std::string good_length = npy::little_endian(good_dictionary.size(), 2);
 
 std::string file(const std::string& dictionary) {
     return npy::header(dictionary) + two_reals;
@@ -44,9 +47,9 @@ std::string with_shape(const std::string& shape) {
     return file(npy::dictionary(real, "False", shape));
 }
 
-std::string with_version(const int major, const int minor) {
-    return npy::magic + npy::version(major, minor) + npy::little_endian(good_dictionary.size(), 2)
-           + good_dictionary + two_reals;
+// A good file, except for its version and what its header says of the length of the dictionary.
+std::string with_beginning(const int major, const int minor, const std::string& length) {
+    return npy::magic + npy::version(major, minor) + length + good_dictionary + two_reals;
 }
 
 std::string shape_of_ones(const int rank) {
@@ -55,16 +58,6 @@ std::string shape_of_ones(const int rank) {
         shape += "1, ";
     }
     return shape + ")";
-}
-
-// A file whose header says that its dictionary has `length` bytes.
-std::string with_length(const int major, const std::string& length) {
-    return npy::magic + npy::version(major, 0) + length + good_dictionary + two_reals;
-}
-
-// Of spaces.
-std::string with_dictionary_of(const std::size_t length) {
-    return npy::header(std::string(length, ' '), 2);
 }
 
 std::string quoted(const char byte_order, const std::string& code) {
@@ -89,12 +82,9 @@ void expect_refused(const TemporaryFolder& folder, const std::string& broken,
 struct BrokenFile {
     const char* name;
     std::string bytes;
-    std::string message; // after the name of the file
+    std::string message;     // after the name of the file
+    std::string member = {}; // in brackets, where the message is of one
 };
-
-void PrintTo(const BrokenFile& broken, std::ostream* out) {
-    *out << broken.name;
-}
 
 std::string short_header(const std::string& there) {
     return "ends inside its header: " + there + "; is the file complete?";
@@ -142,25 +132,26 @@ const BrokenFile beginnings[] = {
     {"OnlyMagic", npy::magic, short_header("2 bytes of version expected, 0 there")},
     {"HalfAVersion", npy::magic + std::string("\1"),
      short_header("2 bytes of version expected, 1 there")},
-    {"Version0", with_version(0, 0), unknown_version("0.0")},
-    {"Version4", with_version(4, 0), unknown_version("4.0")},
-    {"Version1_1", with_version(1, 1), unknown_version("1.1")},
-    {"Version255", with_version(255, 255), unknown_version("255.255")},
+    {"Version0", with_beginning(0, 0, good_length), unknown_version("0.0")},
+    {"Version4", with_beginning(4, 0, good_length), unknown_version("4.0")},
+    {"Version1_1", with_beginning(1, 1, good_length), unknown_version("1.1")},
+    {"Version255", with_beginning(255, 255, good_length), unknown_version("255.255")},
     {"NoLength", npy::magic + npy::version(1, 0),
      short_header("2 bytes of header length expected, 0 there")},
     {"HalfALength1", npy::magic + npy::version(1, 0) + "v",
      short_header("2 bytes of header length expected, 1 there")},
     {"HalfALength2", npy::magic + npy::version(2, 0) + "abc",
      short_header("4 bytes of header length expected, 3 there")},
-    {"Length0", with_length(1, npy::little_endian(0, 2)), expected("a dictionary", 0)},
-    {"Length0Version3", with_length(3, npy::little_endian(0, 4)), expected("a dictionary", 0)},
-    {"LengthBeyondTheFile", with_length(1, "\xFF\xFF"),
+    {"Length0", with_beginning(1, 0, npy::little_endian(0, 2)), expected("a dictionary", 0)},
+    {"Length0Version3", with_beginning(3, 0, npy::little_endian(0, 4)),
+     expected("a dictionary", 0)},
+    {"LengthBeyondTheFile", with_beginning(1, 0, "\xFF\xFF"),
      short_header("65535 bytes of dictionary expected, 73 there")},
-    {"LengthOf4GiB", with_length(2, "\xFF\xFF\xFF\xFF"),
+    {"LengthOf4GiB", with_beginning(2, 0, "\xFF\xFF\xFF\xFF"),
      short_header("4294967295 bytes of dictionary expected, 73 there")},
-    {"LengthOf2To20And1", with_dictionary_of((std::size_t{1} << 20U) + 1),
+    {"LengthOf2To20And1", npy::header(std::string(1048577, ' '), 2),
      "has a header of 1048577 bytes; 2^20 are supported"},
-    {"LengthOf2To20", with_dictionary_of(std::size_t{1} << 20U), expected("a dictionary", 1048576)},
+    {"LengthOf2To20", npy::header(std::string(1048576, ' '), 2), expected("a dictionary", 1048576)},
     {"LengthOneTooLong",
      npy::magic + npy::version(1, 0) + npy::little_endian(good_dictionary.size() + 1, 2)
          + good_dictionary,
@@ -271,117 +262,60 @@ const BrokenFile unsupported[] = {
     {"OnlyByteOrder", with_descr(quoted(npy::native, "")),
      unsupported_type(quoted(npy::native, ""))},
     {"EmptyDescr", with_descr("''"), orderless("''")},
-    {"SpaceBehindDescr", with_descr(quoted(npy::native, "f8 ")),
+    {"SpaceAfterDescr", with_descr(quoted(npy::native, "f8 ")),
      unsupported_type(quoted(npy::native, "f8 "))},
     {"NumberAsDescr", with_descr("8"), expected("a string in quotes", 10)},
     {"NoneAsDescr", with_descr("None"), expected("a string in quotes", 10)},
 };
 
-class BrokenFiles : public testing::TestWithParam<BrokenFile> {};
+const std::string two_of_one_name = "has two members of the name 'a'";
+
+const BrokenFile archives[] = {
+    {"TwoMembersOfOneName", zipped::archive({{"a.npy"}, {"b.npy"}, {"a.npy"}}), two_of_one_name},
+    // NumPy calls both arrays so.
+    {"NamesWithAndWithoutSuffix", zipped::archive({{"a"}, {"a.npy"}}), two_of_one_name},
+    {"UnknownMethod", zipped::archive({{"a.npy", file(good_dictionary), 0, 97}}),
+     "cannot be opened: Compression method not supported", "[a]"},
+    {"WrongChecksum", zipped::archive({{"a.npy", file(good_dictionary)}}),
+     "cannot be read: CRC error; is the archive damaged?", "[a]"},
+};
+
+class BrokenFiles : public NamedCaseTest<BrokenFile> {};
 
 TEST_P(BrokenFiles, AreRefused) {
     const TemporaryFolder folder;
     const std::string broken = folder.write("broken.npy", GetParam().bytes);
-    expect_refused(folder, broken, ": " + GetParam().message);
+    expect_refused(folder, broken, GetParam().member + ": " + GetParam().message);
 }
 
-template <typename Case>
-std::string name_of(const testing::TestParamInfo<Case>& info) {
-    return info.param.name;
-}
+INSTANTIATE_TEST_SUITE_P(Beginning, BrokenFiles, named_cases(beginnings), name_of_case);
+INSTANTIATE_TEST_SUITE_P(Dictionary, BrokenFiles, named_cases(dictionaries), name_of_case);
+INSTANTIATE_TEST_SUITE_P(Shape, BrokenFiles, named_cases(shapes), name_of_case);
+INSTANTIATE_TEST_SUITE_P(Elements, BrokenFiles, named_cases(unsupported), name_of_case);
+INSTANTIATE_TEST_SUITE_P(Archive, BrokenFiles, named_cases(archives), name_of_case);
 
-INSTANTIATE_TEST_SUITE_P(Beginning, BrokenFiles, testing::ValuesIn(beginnings),
-                         name_of<BrokenFile>);
-INSTANTIATE_TEST_SUITE_P(Dictionary, BrokenFiles, testing::ValuesIn(dictionaries),
-                         name_of<BrokenFile>);
-INSTANTIATE_TEST_SUITE_P(Shape, BrokenFiles, testing::ValuesIn(shapes), name_of<BrokenFile>);
-INSTANTIATE_TEST_SUITE_P(Elements, BrokenFiles, testing::ValuesIn(unsupported),
-                         name_of<BrokenFile>);
+// ---- What cannot be opened
 
-// ---- Archives
-
-struct BrokenArchive {
-    const char* name;
-    std::vector<zipped::Member> members;
-    std::string message; // after the name of the file
-};
-
-void PrintTo(const BrokenArchive& broken, std::ostream* out) {
-    *out << broken.name;
-}
-
-const BrokenArchive archives[] = {
-    {"TwoMembersOfOneName", {{"a.npy"}, {"b.npy"}, {"a.npy"}}, ": has two members of the name 'a'"},
-    // NumPy calls both arrays so.
-    {"NamesWithAndWithoutSuffix", {{"a"}, {"a.npy"}}, ": has two members of the name 'a'"},
-    {"UnknownMethod",
-     {{"a.npy", file(good_dictionary), 0, 97}},
-     "[a]: cannot be opened: Compression method not supported"},
-    {"WrongChecksum",
-     {{"a.npy", file(good_dictionary)}},
-     "[a]: cannot be read: CRC error; is the archive damaged?"},
-};
-
-class BrokenArchives : public testing::TestWithParam<BrokenArchive> {};
-
-TEST_P(BrokenArchives, AreRefused) {
+TEST(Operands, ThatCannotBeOpenedAreRefused) {
     const TemporaryFolder folder;
-    const std::string broken = folder.write("broken.npz", zipped::archive(GetParam().members));
-    expect_refused(folder, broken, GetParam().message);
+    const std::string path = folder.path_of("broken.npy");
+    expect_refused(folder, path, ": cannot be opened: No such file or directory");
+    std::filesystem::create_symlink(path, path);
+    expect_refused(folder, path, ": cannot be opened: Too many levels of symbolic links");
+    std::filesystem::remove(path);
+    std::filesystem::create_symlink("/dev/null", path);
+    expect_refused(folder, path, ": is neither a file nor a pipe; save the array to a file first");
 }
 
-INSTANTIATE_TEST_SUITE_P(Member, BrokenArchives, testing::ValuesIn(archives),
-                         name_of<BrokenArchive>);
-
-// ---- What is no file that can be read
-
-struct NoFile {
-    const char* name;
-    void (*make)(const TemporaryFolder& folder, const std::string& path);
-    std::string message;
-};
-
-void PrintTo(const NoFile& no_file, std::ostream* out) {
-    *out << no_file.name;
-}
-
-void make_nothing(const TemporaryFolder& /*folder*/, const std::string& /*path*/) {}
-
-void make_link_to_device(const TemporaryFolder& /*folder*/, const std::string& path) {
-    ASSERT_EQ(::symlink("/dev/null", path.c_str()), 0);
-}
-
-void make_link_to_itself(const TemporaryFolder& /*folder*/, const std::string& path) {
-    ASSERT_EQ(::symlink(path.c_str(), path.c_str()), 0);
-}
-
-void make_unreadable(const TemporaryFolder& folder, const std::string& path) {
+TEST(Operands, ThatMayNotBeReadAreRefused) {
     if (::geteuid() == 0) {
         GTEST_SKIP() << "the superuser can read any file";
     }
-    folder.write("broken.npy", file(good_dictionary));
-    ASSERT_EQ(::chmod(path.c_str(), 0), 0);
-}
-
-const NoFile no_files[] = {
-    {"Missing", make_nothing, "cannot be opened: No such file or directory"},
-    {"Device", make_link_to_device, "is neither a file nor a pipe; save the array to a file first"},
-    {"LinkToItself", make_link_to_itself, "cannot be opened: Too many levels of symbolic links"},
-    {"Unreadable", make_unreadable, "cannot be opened: Permission denied"},
-};
-
-class NoFiles : public testing::TestWithParam<NoFile> {};
-
-TEST_P(NoFiles, AreRefused) {
     const TemporaryFolder folder;
-    const std::string path = folder.path_of("broken.npy");
-    GetParam().make(folder, path);
-    if (!IsSkipped() && !HasFatalFailure()) {
-        expect_refused(folder, path, ": " + GetParam().message);
-    }
+    const std::string path = folder.write("broken.npy", file(good_dictionary));
+    ASSERT_EQ(::chmod(path.c_str(), 0), 0);
+    expect_refused(folder, path, ": cannot be opened: Permission denied");
 }
-
-INSTANTIATE_TEST_SUITE_P(Operand, NoFiles, testing::ValuesIn(no_files), name_of<NoFile>);
 
 // ---- Systematically broken files
 
@@ -396,10 +330,6 @@ TEST(Truncations, AreRefusedAtEveryLength) {
     }
 }
 
-bool is_printable(const std::string& text) {
-    return std::all_of(text.begin(), text.end(), [](const char c) { return c >= ' ' && c <= '~'; });
-}
-
 // Reads the header where no memory follows, so that a read past the file is noticed.
 talcmp::NpyHeader read_at_end(const ProtectedMemory& memory, const std::string& bytes) {
     auto* const place = static_cast<char*>(memory.before_end(bytes.size()));
@@ -408,15 +338,18 @@ talcmp::NpyHeader read_at_end(const ProtectedMemory& memory, const std::string& 
     return talcmp::read_npy_header(file);
 }
 
-// Anything that is thrown but NpyError fails the test.
+// Any other exception than NpyError fails the test.
 void expect_header_or_error(const ProtectedMemory& memory, const std::string& bytes) {
     try {
         const talcmp::NpyHeader header = read_at_end(memory, bytes);
         EXPECT_NE(header.type, nullptr);
         EXPECT_LE(header.element_count, bytes.size() - header.data_offset);
     } catch (const talcmp::NpyError& error) {
-        EXPECT_FALSE(std::string(error.what()).empty());
-        EXPECT_TRUE(is_printable(error.what())) << error.what();
+        const std::string message = error.what();
+        EXPECT_FALSE(message.empty());
+        EXPECT_TRUE(std::all_of(message.begin(), message.end(), [](const char c) {
+            return c >= ' ' && c <= '~';
+        })) << message;
     }
 }
 
@@ -451,22 +384,16 @@ class Stream : public MemoryBytes {
     std::optional<std::uint64_t> size() const override { return std::nullopt; }
 };
 
-// What is wrong with the header; nothing where it is read.
 std::string wrong_in_stream(const std::string& shape) {
     const std::string bytes = npy::header(npy::dictionary(real, "False", shape));
     Stream stream(bytes);
-    try {
-        talcmp::read_npy_header(stream);
-    } catch (const talcmp::NpyError& error) {
-        return error.what();
-    }
-    return "";
+    return thrown_message<talcmp::NpyError>([&stream] { talcmp::read_npy_header(stream); });
 }
 
 TEST(Streams, AreRefusedWhereTheirElementsCannotBeCounted) {
     const std::string too_many = "has a shape of more than 2^58 elements";
-    EXPECT_EQ(wrong_in_stream("(2, 3)"), "");
-    EXPECT_EQ(wrong_in_stream("(288230376151711744,)"), ""); // 2^58
+    EXPECT_EQ(wrong_in_stream("(2, 3)"), "none");
+    EXPECT_EQ(wrong_in_stream("(288230376151711744,)"), "none"); // 2^58
     EXPECT_EQ(wrong_in_stream("(288230376151711745,)"), too_many);
     EXPECT_EQ(wrong_in_stream("(4294967296, 4294967296)"), too_many);
 }
