@@ -63,17 +63,14 @@ struct Answer {
     std::string option = {};
 };
 
-// Arrays of one element, of which the bits are given.
-std::string real_of_bits(const std::uint64_t bits) {
-    return npy::header(npy::dictionary(npy::descr<double>(), "False", "(1,)")) + npy::element(bits);
+// An array of one element, of which the bits are given.
+template <typename T, typename Bits>
+std::string of_bits(const Bits bits) {
+    return npy::header(npy::dictionary(npy::descr<T>(), "False", "(1,)")) + npy::element(bits);
 }
 
-std::string single_of_bits(const std::uint32_t bits) {
-    return npy::header(npy::dictionary(npy::descr<float>(), "False", "(1,)")) + npy::element(bits);
-}
-
-const std::string nan1 = real_of_bits(0x7FF8000000000123);
-const std::string nan2 = real_of_bits(0xFFF8000000000456);
+const std::string nan1 = of_bits<double>(std::uint64_t{0x7FF8000000000123});
+const std::string nan2 = of_bits<double>(std::uint64_t{0xFFF8000000000456});
 constexpr double infinity = std::numeric_limits<double>::infinity();
 
 const Answer values[] = {
@@ -122,7 +119,8 @@ const Answer values[] = {
     {"EqualNaNs", nan1, nan1},
     {"UnequalNaNs", nan1, nan2,
      "[0]: nan(0x7ff8000000000123) and nan(0xfff8000000000456) (two NaNs)"},
-    {"SingleNaN", single_of_bits(0x7FC00ABC), f32({1}), "[0]: nan(0x7fc00abc) and 1 (a NaN)"},
+    {"SingleNaN", of_bits<float>(std::uint32_t{0x7FC00ABC}), f32({1}),
+     "[0]: nan(0x7fc00abc) and 1 (a NaN)"},
 };
 
 const std::string near_far = f64({1.1, 2.5});

@@ -160,22 +160,16 @@ using Bytes8 = std::vector<std::int8_t>;
 using talcmp::Difference;
 
 // Adds up what it is called with.
-class Listener : public talcmp::ProgressListener {
-  public:
+struct Listener : talcmp::ProgressListener {
+    int begun = 0;
+    std::uint64_t total = 0;
+    std::atomic<std::uint64_t> done = 0;
+
     void begin(const std::uint64_t total_bytes) override {
-        begun_ += 1;
-        total_ += total_bytes;
+        begun += 1;
+        total += total_bytes;
     }
-    void advance(const std::uint64_t bytes) override { done_ += bytes; }
-
-    int begun() const { return begun_; }
-    std::uint64_t total() const { return total_; }
-    std::uint64_t done() const { return done_; }
-
-  private:
-    int begun_ = 0;
-    std::uint64_t total_ = 0;
-    std::atomic<std::uint64_t> done_ = 0;
+    void advance(const std::uint64_t bytes) override { done += bytes; }
 };
 
 template <typename T>
@@ -297,7 +291,7 @@ TEST_P(Comparisons, ReadNothingWhereTheTypesDifferAlready) {
     EXPECT_EQ(result.difference, Difference::type);
     EXPECT_TRUE(result.places.empty());
     EXPECT_FALSE(result.report.has_value());
-    EXPECT_EQ(listener_.begun(), 0);
+    EXPECT_EQ(listener_.begun, 0);
 }
 
 TEST_P(Comparisons, KnowTheArrays) {
@@ -315,7 +309,7 @@ TEST_P(Comparisons, KnowTheArrays) {
     EXPECT_EQ(result.array2.shape, (Shape{4, 2}));
     EXPECT_EQ(result.array2.selected_shape, (Shape{3, 2}));
     EXPECT_FALSE(result.array2.fortran_order);
-    EXPECT_EQ(listener_.begun(), 0);
+    EXPECT_EQ(listener_.begun, 0);
 }
 
 TEST_P(Comparisons, KnowWhetherThereIsAnyElement) {
@@ -348,11 +342,11 @@ TEST_P(Comparisons, AnnounceAllThatTheyRead) {
                     listener);
                 EXPECT_EQ(result.difference, Difference::none);
                 const bool copied = order == Order::fortran;
-                EXPECT_EQ(listener.begun(), 1);
-                EXPECT_EQ(listener.total(),
+                EXPECT_EQ(listener.begun, 1);
+                EXPECT_EQ(listener.total,
                           pairs * 5 + (copied && access1 == Access::once ? pairs : 0)
                               + (copied && access2 == Access::once ? 4 * pairs : 0));
-                EXPECT_EQ(listener.done(), listener.total());
+                EXPECT_EQ(listener.done, listener.total);
             }
         }
     }
@@ -360,11 +354,11 @@ TEST_P(Comparisons, AnnounceAllThatTheyRead) {
 
 TEST_P(Comparisons, ReadNoFurtherThanToThePlacesThatAreListed) {
     compare(row(Bytes8(length)), row(Bytes8(length, 1)));
-    EXPECT_EQ(listener_.total(), 2 * length);
+    EXPECT_EQ(listener_.total, 2 * length);
     if (GetParam() == 1) {
-        EXPECT_LT(listener_.done(), length);
+        EXPECT_LT(listener_.done, length);
     }
-    EXPECT_GT(listener_.done(), 0U);
+    EXPECT_GT(listener_.done, 0U);
 }
 
 // ---- Threads

@@ -74,29 +74,29 @@ INSTANTIATE_TEST_SUITE_P(Bar, ProgressText, named_cases(cases), name_of_case);
 
 // ---- When it is drawn
 
-// Takes the place of standard error.
-class TerminalAsErrors {
-  public:
-    TerminalAsErrors() {
+constexpr auto patience = std::chrono::milliseconds(550);
+
+// With a terminal as standard error.
+class ProgressBar : public testing::Test {
+  protected:
+    void SetUp() override {
+        ::setenv("TERM", "xterm", 1);
         struct winsize size = {};
         size.ws_col = 50;
-        if (::openpty(&controller_, &device_, nullptr, nullptr, &size) == 0) {
-            ::dup2(device_, STDERR_FILENO);
-            ::fcntl(controller_, F_SETFL, O_NONBLOCK);
+        if (::openpty(&controller_, &device_, nullptr, nullptr, &size) != 0) {
+            GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
         }
+        ::dup2(device_, STDERR_FILENO);
+        ::fcntl(controller_, F_SETFL, O_NONBLOCK);
     }
-    TerminalAsErrors(const TerminalAsErrors&) = delete;
-    TerminalAsErrors& operator=(const TerminalAsErrors&) = delete;
-    ~TerminalAsErrors() {
+    void TearDown() override {
         ::dup2(old_errors_, STDERR_FILENO);
         for (const int file : {controller_, device_, old_errors_}) {
             ::close(file);
         }
     }
 
-    bool is_there() const { return controller_ >= 0; }
-
-    // What has been written to it since the last call.
+    // What has been written to the terminal since the last call.
     std::string take() const {
         std::array<char, 4096> text = {};
         const ssize_t length = ::read(controller_, text.data(), text.size());
@@ -107,23 +107,6 @@ class TerminalAsErrors {
     int old_errors_ = ::dup(STDERR_FILENO);
     int controller_ = -1;
     int device_ = -1;
-};
-
-constexpr auto patience = std::chrono::milliseconds(550);
-
-class ProgressBar : public testing::Test {
-  protected:
-    void SetUp() override {
-        ::setenv("TERM", "xterm", 1);
-        if (!terminal_.is_there()) {
-            GTEST_SKIP() << "NOT TESTED: there is no pseudo-terminal";
-        }
-    }
-
-    std::string take() const { return terminal_.take(); }
-
-  private:
-    TerminalAsErrors terminal_;
 };
 
 TEST_F(ProgressBar, BeginsAnewWithEachPair) {

@@ -1,6 +1,5 @@
 // How often, and how far, arrays are read until the answer is known.
 
-#include "byte_stream.h"
 #include "npy_array.h"
 
 #include "support/compare_arrays.h"
@@ -17,7 +16,6 @@
 #include <cstdint>
 #include <limits>
 #include <memory>
-#include <optional>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -149,27 +147,9 @@ class CountedBytes : public MemoryBytes {
     std::uint64_t& asked_;
 };
 
-// The same bytes, which can be read only once.
-class Stream : public talcmp::ByteStream {
-  public:
-    explicit Stream(std::string bytes) : bytes_(std::move(bytes)) {}
-
-    std::optional<std::uint64_t> size() const override { return std::nullopt; }
-
-  private:
-    std::size_t read_next(void* const bytes, const std::size_t count) override {
-        const std::size_t there = bytes_.copy(static_cast<char*>(bytes), count, position_);
-        position_ += there;
-        return there;
-    }
-
-    std::string bytes_;
-    std::size_t position_ = 0;
-};
-
 std::string trouble_at_the_end(const std::string& bytes, const std::uint64_t read_before) {
     std::vector<double> elements(static_cast<std::size_t>(read_before));
-    talcmp::NpyArray array("array", std::make_unique<Stream>(bytes));
+    talcmp::NpyArray array("array", std::make_unique<MemoryStream>(bytes));
     array.read(0, read_before, elements.data());
     return thrown_message([&array] { array.check_to_end(); });
 }

@@ -1,8 +1,8 @@
-// A file in memory.
+// Files in memory.
 
 #pragma once
 
-#include "byte_source.h"
+#include "byte_stream.h"
 
 #include <algorithm>
 #include <cstring>
@@ -28,4 +28,24 @@ class MemoryBytes : public talcmp::ByteSource {
 
   private:
     std::string_view bytes_;
+};
+
+// Can be read only once, and hands out no more than `at_once` bytes.
+class MemoryStream : public talcmp::ByteStream {
+  public:
+    explicit MemoryStream(const std::string_view bytes,
+                          const std::size_t at_once = std::string_view::npos)
+        : bytes_(bytes), at_once_(at_once) {}
+
+    std::optional<std::uint64_t> size() const override { return std::nullopt; }
+
+  private:
+    std::size_t read_next(void* const bytes, const std::size_t count) override {
+        const std::size_t there = bytes_.copy(static_cast<char*>(bytes), std::min(count, at_once_));
+        bytes_.remove_prefix(there);
+        return there;
+    }
+
+    std::string_view bytes_;
+    std::size_t at_once_;
 };
