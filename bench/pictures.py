@@ -22,24 +22,29 @@ def colour(value, pale_at, red_at):
     return "#" + "".join(f"{round(p + share * (r - p)):02x}" for p, r in zip(pale, red))
 
 
+def words_in_row(y, words):
+    """Pairs of a word and the place of its middle."""
+    spans = "".join(f'<tspan x="{x}">{word}</tspan>' for word, x in words)
+    return f'<text y="{y}">{spans}</text>'
+
+
 def heat_map(title, types, values, scale, digits):
     """`values` by pairs of types: a row for the first type, a column for the second."""
     cell_width, cell_height, left, top = 62, 24, 78, 58
     count = len(types)
     width, height = left + count * cell_width + 8, top + count * cell_height + 8
     lines = [f'<text x="{width // 2}" y="20" font-size="14">{title}</text>']
-    for i, name in enumerate(types):
-        x, y = left + i * cell_width + cell_width // 2, top + i * cell_height + 16
-        lines.append(f'<text x="{x}" y="{top - 8}">{name}</text>')
-        lines.append(f'<text x="{left - 6}" y="{y}" text-anchor="end">{name}</text>')
-    for (type1, type2), value in values.items():
-        x = left + types.index(type2) * cell_width
-        y = top + types.index(type1) * cell_height
-        lines.append(
-            f'<rect x="{x}" y="{y}" width="{cell_width - 1}" height="{cell_height - 1}" '
-            f'fill="{colour(value, *scale)}"/>'
-        )
-        lines.append(f'<text x="{x + cell_width // 2}" y="{y + 16}">{value:.{digits}f}</text>')
+    columns = {name: left + i * cell_width for i, name in enumerate(types)}
+    middles = {name: x + cell_width // 2 for name, x in columns.items()}
+    lines.append(words_in_row(top - 8, middles.items()))
+    for i, type1 in enumerate(types):
+        row = {type2: values[type1, type2] for type2 in types if (type1, type2) in values}
+        cells = (f'<rect x="{columns[type2]}" width="{cell_width - 1}" height="{cell_height - 1}" '
+                 f'fill="{colour(value, *scale)}"/>' for type2, value in row.items())
+        numbers = ((f"{value:.{digits}f}", middles[type2]) for type2, value in row.items())
+        lines += [f'<g transform="translate(0 {top + i * cell_height})">',
+                  f'<text x="{left - 6}" y="16" text-anchor="end">{type1}</text>',
+                  "".join(cells), words_in_row(16, numbers), "</g>"]
     return svg(width, height, lines)
 
 
