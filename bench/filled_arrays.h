@@ -1,7 +1,6 @@
 // Pairs of arrays to be compared, of every pair of element types, in memory of the caller.
 
-#ifndef TALNUMERICARRAY_BENCH_FILLED_ARRAYS_H
-#define TALNUMERICARRAY_BENCH_FILLED_ARRAYS_H
+#pragma once
 
 #include "promotion_rules.h"
 #include "to_type.h"
@@ -115,5 +114,3 @@ void fill(const Contents contents, void* const memory1, void* const memory2,
 inline int right_answer(const Contents contents) {
     return contents == Contents::identical || contents == Contents::near ? 1 : 0;
 }
-
-#endif

@@ -1,7 +1,6 @@
 // Lists of rows, printed as JSON.
 
-#ifndef TALNUMERICARRAY_BENCH_JSON_ROWS_H
-#define TALNUMERICARRAY_BENCH_JSON_ROWS_H
+#pragma once
 
 #include <cstddef>
 #include <cstdio>
@@ -53,5 +52,3 @@ class JsonRows {
   private:
     const char* before_row_ = "[\n{";
 };
-
-#endif

@@ -1,8 +1,7 @@
 // Contenders take turns in short batches of calls, so that what else the machine does is shared,
 // and the shortest time of each counts.
 
-#ifndef TALNUMERICARRAY_BENCH_TURNS_H
-#define TALNUMERICARRAY_BENCH_TURNS_H
+#pragma once
 
 #include <algorithm>
 #include <chrono>
@@ -90,5 +89,3 @@ inline void take_turns(std::vector<Contender>& contenders, const Effort& effort)
         }
     }
 }
-
-#endif

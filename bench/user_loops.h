@@ -1,8 +1,7 @@
 // What a program without the library would write: one plain loop over two arrays, for every pair of
 // element types that the library has a loop for.
 
-#ifndef TALNUMERICARRAY_BENCH_USER_LOOPS_H
-#define TALNUMERICARRAY_BENCH_USER_LOOPS_H
+#pragma once
 
 #include "type_properties.h"
 
@@ -14,5 +13,3 @@ using UserLoop = bool (*)(double relative, const void* data1, const void* data2,
 // processor. They are the same code.
 UserLoop user_loop(type_t id1, type_t id2);
 UserLoop user_loop_for_this_processor(type_t id1, type_t id2);
-
-#endif

@@ -1,7 +1,6 @@
 // Arrays for the fuzzers, and calls whose answers are compared with the oracle's.
 
-#ifndef TALNUMERICARRAY_FUZZ_CHECKED_CALL_H
-#define TALNUMERICARRAY_FUZZ_CHECKED_CALL_H
+#pragma once
 
 #include "taldata_array.h"
 
@@ -72,5 +71,3 @@ void check_call(oracle::State& state, double tolerance, int compare_different_ty
 [[noreturn]] void fail(const std::string& what_is_wrong);
 
 } // namespace fuzz
-
-#endif

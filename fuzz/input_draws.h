@@ -1,8 +1,7 @@
 // Draws from the bytes of an input. Bytes of zero draw what is plainest, as does an input that is
 // used up.
 
-#ifndef TALNUMERICARRAY_FUZZ_INPUT_DRAWS_H
-#define TALNUMERICARRAY_FUZZ_INPUT_DRAWS_H
+#pragma once
 
 #include "draws.h"
 
@@ -38,5 +37,3 @@ class InputDraws final : public oracle::Draws {
 };
 
 } // namespace fuzz
-
-#endif

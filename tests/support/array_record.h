@@ -1,7 +1,6 @@
 // Records over dimensions and elements that are somewhere else, for tests, benchmarks and fuzzers.
 
-#ifndef TALNUMERICARRAY_TESTS_ARRAY_RECORD_H
-#define TALNUMERICARRAY_TESTS_ARRAY_RECORD_H
+#pragma once
 
 #include "taldata_array.h"
 
@@ -44,5 +43,3 @@ class ArrayRecord {
     talint length_;
     st_TalDataArray record_;
 };
-
-#endif

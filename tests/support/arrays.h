@@ -1,7 +1,6 @@
 // Arrays for tests: records that own their dimensions and elements, and short ways to compare them.
 
-#ifndef TALNUMERICARRAY_TESTS_ARRAYS_H
-#define TALNUMERICARRAY_TESTS_ARRAYS_H
+#pragma once
 
 #include "taldata_array_element_types.h"
 #include "talnumericarray_compare.h"
@@ -84,5 +83,3 @@ template <typename Check>
 void in_new_thread(const Check& check) {
     std::thread(check).join();
 }
-
-#endif

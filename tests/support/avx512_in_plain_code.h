@@ -5,8 +5,7 @@
 // intrinsics are functions written here, which are found before the compiler's. An intrinsic that
 // is missing here is the compiler's, which refuses it under a target without AVX-512.
 
-#ifndef TALNUMERICARRAY_TESTS_AVX512_IN_PLAIN_CODE_H
-#define TALNUMERICARRAY_TESTS_AVX512_IN_PLAIN_CODE_H
+#pragma once
 
 #pragma GCC visibility push(hidden)
 namespace talnumericarray {
@@ -258,5 +257,3 @@ struct avx512_in_plain_code : for_avx512_in_plain_code::loops {
 } // namespace talnumericarray
 
 #pragma GCC visibility pop
-
-#endif

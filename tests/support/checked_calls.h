@@ -1,7 +1,6 @@
 // Random calls of the module, each of them checked against the oracle.
 
-#ifndef TALNUMERICARRAY_TESTS_CHECKED_CALLS_H
-#define TALNUMERICARRAY_TESTS_CHECKED_CALLS_H
+#pragma once
 
 #include <cstdint>
 #include <vector>
@@ -30,5 +29,3 @@ Tally run_checked_calls(std::uint64_t seed, std::uint64_t calls,
                         const std::vector<double>& tolerances = {});
 
 } // namespace oracle
-
-#endif

@@ -1,7 +1,6 @@
 // What a child process comes to.
 
-#ifndef TALNUMERICARRAY_TESTS_CHILD_PROCESS_H
-#define TALNUMERICARRAY_TESTS_CHILD_PROCESS_H
+#pragma once
 
 #include <cerrno>
 #include <ostream>
@@ -46,5 +45,3 @@ ChildEnd in_child(const Body& body) {
     }
     return WIFEXITED(status) ? ChildEnd{WEXITSTATUS(status), 0} : killed_by(WTERMSIG(status));
 }
-
-#endif

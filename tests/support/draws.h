@@ -1,7 +1,6 @@
 // Random numbers that are hard to compare, for tests, fuzzers and whoever else draws elements.
 
-#ifndef TALNUMERICARRAY_TESTS_DRAWS_H
-#define TALNUMERICARRAY_TESTS_DRAWS_H
+#pragma once
 
 #include <algorithm>
 #include <cmath>
@@ -139,5 +138,3 @@ Real random_real(Draws& draws) {
 }
 
 } // namespace oracle
-
-#endif

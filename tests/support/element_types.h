@@ -1,8 +1,7 @@
 // The element types at run time, made from the one list, and a check for every ordered pair of
 // them.
 
-#ifndef TALNUMERICARRAY_TESTS_ELEMENT_TYPES_H
-#define TALNUMERICARRAY_TESTS_ELEMENT_TYPES_H
+#pragma once
 
 #include "taldata_array_element_types.h"
 #include "to_type.h"
@@ -106,5 +105,3 @@ inline Values near_threes(const ElementType& type1, const ElementType& type2) {
     const bool doubles = compared_digits(type1, type2) == std::numeric_limits<double>::digits;
     return usual_and(type1, type2, 3, doubles ? 3 + 0x1p-44 : 3 + 0x1p-15);
 }
-
-#endif

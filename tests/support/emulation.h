@@ -1,7 +1,6 @@
 // How much of a long loop over lengths, places and draws a test makes.
 
-#ifndef TALNUMERICARRAY_TESTS_EMULATION_H
-#define TALNUMERICARRAY_TESTS_EMULATION_H
+#pragma once
 
 #include <cstddef>
 
@@ -12,6 +11,4 @@
 inline constexpr std::size_t emulated_stride = 8;
 #else
 inline constexpr std::size_t emulated_stride = 1;
-#endif
-
 #endif

@@ -1,8 +1,7 @@
 // Where the steps of the tolerant comparison and its meaning part over random pairs, and how far
 // from the limit they may.
 
-#ifndef TALNUMERICARRAY_TESTS_EXACTNESS_H
-#define TALNUMERICARRAY_TESTS_EXACTNESS_H
+#pragma once
 
 #include "compare.h"
 #include "exact_rule.h"
@@ -245,5 +244,3 @@ class Survey {
 };
 
 } // namespace exactness
-
-#endif

@@ -1,8 +1,7 @@
 // What a program can ask of floating-point arithmetic: a direction of rounding, and subnormal
 // numbers taken for zero.
 
-#ifndef TALNUMERICARRAY_TESTS_FLOATING_POINT_MODES_H
-#define TALNUMERICARRAY_TESTS_FLOATING_POINT_MODES_H
+#pragma once
 
 #include <gtest/gtest.h>
 
@@ -123,5 +122,3 @@ class FlushingScope {
   private:
     std::uint64_t before_;
 };
-
-#endif

@@ -9,8 +9,7 @@
 // the answers stands for four calls, its highest bit for the first; a bit is set if the arrays are
 // the same.
 
-#ifndef TALNUMERICARRAY_TESTS_GOLDEN_CALLS_H
-#define TALNUMERICARRAY_TESTS_GOLDEN_CALLS_H
+#pragma once
 
 #include <cstdint>
 #include <istream>
@@ -41,5 +40,3 @@ struct Tally {
 Tally check(std::istream& records);
 
 } // namespace golden
-
-#endif

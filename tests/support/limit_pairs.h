@@ -1,7 +1,6 @@
 // Random pairs of reals at and around the limit of a tolerance, and tolerances of each kind.
 
-#ifndef TALNUMERICARRAY_TESTS_LIMIT_PAIRS_H
-#define TALNUMERICARRAY_TESTS_LIMIT_PAIRS_H
+#pragma once
 
 #include "draws.h"
 
@@ -168,5 +167,3 @@ std::pair<T, T> random_pair(oracle::Random& random, const Place place, const T s
 }
 
 } // namespace exactness
-
-#endif

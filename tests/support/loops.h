@@ -2,8 +2,7 @@
 // one, as functions that are chosen at run time, and the plain loop over the element test, which
 // each of them has to answer and remember as.
 
-#ifndef TALNUMERICARRAY_TESTS_LOOPS_H
-#define TALNUMERICARRAY_TESTS_LOOPS_H
+#pragma once
 
 #include "element_types.h"
 
@@ -98,5 +97,3 @@ inline constexpr std::size_t longest = 300;
 std::vector<unsigned char> sevens(const ElementType& type, std::size_t count);
 
 double least_subnormal(const Pair& pair);
-
-#endif

@@ -1,8 +1,7 @@
 // Calls of every kind, with their arrays and answers made ready, for tests that watch what happens
 // during calls and nothing else.
 
-#ifndef TALNUMERICARRAY_TESTS_PREPARED_CALLS_H
-#define TALNUMERICARRAY_TESTS_PREPARED_CALLS_H
+#pragma once
 
 #include "arrays.h"
 #include "element_types.h"
@@ -101,5 +100,3 @@ class PreparedCalls {
     std::deque<AnyArray> arrays_; // which are not moved
     std::vector<PreparedCall> calls_;
 };
-
-#endif

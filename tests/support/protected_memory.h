@@ -1,7 +1,6 @@
 // Memory that ends where nothing can be read, or that cannot be written.
 
-#ifndef TALNUMERICARRAY_TESTS_PROTECTED_MEMORY_H
-#define TALNUMERICARRAY_TESTS_PROTECTED_MEMORY_H
+#pragma once
 
 #include <cstddef>
 #include <cstdint>
@@ -49,5 +48,3 @@ class ProtectedMemory {
     void* mapped_;
     unsigned char* begin_ = nullptr;
 };
-
-#endif

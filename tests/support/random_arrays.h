@@ -1,8 +1,7 @@
 // Random tolerances and pairs of arrays that are hard to compare: most positions hold the same
 // number, and the others lie within a few units of the last place of the limit.
 
-#ifndef TALNUMERICARRAY_TESTS_RANDOM_ARRAYS_H
-#define TALNUMERICARRAY_TESTS_RANDOM_ARRAYS_H
+#pragma once
 
 #include "draws.h"
 
@@ -36,5 +35,3 @@ void fill_arrays(Draws& draws, double tolerance, int first_id, int second_id, st
                  void* first, void* second);
 
 } // namespace oracle
-
-#endif

@@ -1,7 +1,6 @@
 // The factor of a tolerance, in integer arithmetic: every platform has the same, whatever its pow.
 
-#ifndef TALNUMERICARRAY_TESTS_ROUNDED_FACTOR_H
-#define TALNUMERICARRAY_TESTS_ROUNDED_FACTOR_H
+#pragma once
 
 #include <cmath>
 #include <cstdint>
@@ -39,5 +38,3 @@ Real rounded_factor(const Real tolerance) {
 }
 
 } // namespace oracle
-
-#endif

@@ -1,7 +1,6 @@
 // Which sanitizer's instrumentation the tests are compiled with.
 
-#ifndef TALNUMERICARRAY_TESTS_SANITIZERS_H
-#define TALNUMERICARRAY_TESTS_SANITIZERS_H
+#pragma once
 
 #if defined(__SANITIZE_ADDRESS__)
 inline constexpr bool address_sanitizer = true;
@@ -13,6 +12,4 @@ inline constexpr bool address_sanitizer = false;
 inline constexpr bool thread_sanitizer = true;
 #else
 inline constexpr bool thread_sanitizer = false;
-#endif
-
 #endif

@@ -1,8 +1,7 @@
 // Surveys of the pairs of one kind: each draws a tolerance, judges some pairs under it, and draws
 // the next.
 
-#ifndef TALNUMERICARRAY_TESTS_SURVEYS_H
-#define TALNUMERICARRAY_TESTS_SURVEYS_H
+#pragma once
 
 #include "draws.h"
 #include "exactness.h"
@@ -159,5 +158,3 @@ Tally survey_integers(oracle::Random& random, const Kind kind, const Factor fact
 }
 
 } // namespace exactness
-
-#endif

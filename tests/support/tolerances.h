@@ -1,7 +1,6 @@
 // Tolerances of every kind, for answers that must not depend on them.
 
-#ifndef TALNUMERICARRAY_TESTS_TOLERANCES_H
-#define TALNUMERICARRAY_TESTS_TOLERANCES_H
+#pragma once
 
 #include <cmath>
 
@@ -19,5 +18,3 @@ int under_every_tolerance(const Ask& ask) {
     }
     return answer;
 }
-
-#endif

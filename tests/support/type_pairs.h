@@ -1,7 +1,6 @@
 // Calls for every element type of the one list, and for every ordered pair of them.
 
-#ifndef TALNUMERICARRAY_TESTS_TYPE_PAIRS_H
-#define TALNUMERICARRAY_TESTS_TYPE_PAIRS_H
+#pragma once
 
 #include "taldata_array_element_types.h"
 
@@ -36,5 +35,3 @@ void for_each_pair_with_loop(const Action& action) {
         }
     });
 }
-
-#endif

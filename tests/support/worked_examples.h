@@ -1,8 +1,7 @@
 // Worked examples of the rule, by which a reader can trust the oracle before it judges the module,
 // and the module by itself. No answer depends on what has been compared before.
 
-#ifndef TALNUMERICARRAY_TESTS_WORKED_EXAMPLES_H
-#define TALNUMERICARRAY_TESTS_WORKED_EXAMPLES_H
+#pragma once
 
 #include "taldata_array_element_types.h"
 
@@ -210,5 +209,3 @@ inline std::vector<ExampleOfElements> examples_of_elements() {
         {{1e300}, C32(1, 2), C32(1000, -2), false},
     };
 }
-
-#endif
