@@ -1,19 +1,15 @@
 """The module as a target: its mutants, and the tests that are built with one after the other."""
 
-import functools
-import hashlib
 import re
 import shutil
 import subprocess
 import threading
-from collections import defaultdict
 from dataclasses import dataclass, field, replace
-from pathlib import Path
 
 import mutants
 import steps
-from steps import (FLAGS, ROOT, SURVIVES, TIME_OUT, WORK, Broken, Killed, command, digest,
-                   first_error, precompile, run_test)
+from steps import (ROOT, SURVIVES, TIME_OUT, WORK, Killed, command, digest, first_error, precompile,
+                   run_test)
 
 FILES = ["Includes/taldata_array_element_types.h", "Includes/talnumericarray.h",
          "Includes/taltensor.h", "TalNumericArray/*.cpp", "TalNumericArray/*.h",
@@ -45,6 +41,14 @@ class Program:
     run: tuple = field(default=(), repr=False)
     module_level: str = "-O0"
     sets: str = field(default="", repr=False)  # of the module, if not those for the mutant's file
+
+    @property
+    def sources(self):
+        return *self.mutated, *self.fixed
+
+    def flags(self, source, sets):
+        level = self.level if source in self.mutated else "-O1"
+        return *level.split(), f"-D{sets}"
 
 
 def own(name, *fixed, **settings):
@@ -101,16 +105,12 @@ def rank(mutant):
     """Bounds before other operators and numbers, names last; among equals, a choice that stays."""
     before, _, after = mutant.name[mutant.name.rindex("[") + 1 : -1].partition(" -> ")
     by_name = before[0].isalpha() and before not in ("true", "false")
-    chance = hashlib.sha256(mutant.name.encode()).hexdigest()
-    return by_name, BOUNDS.get(before, "") != after.split(" (")[0], chance
+    return by_name, BOUNDS.get(before, "") != after.split(" (")[0], mutant.chance
 
 
 def chosen(found):
     """One mutant of each line, and all that change the order of two statements."""
-    by_line = defaultdict(list)
-    for mutant in found:
-        by_line[mutant.line].append(mutant)
-    for _, line in sorted(by_line.items()):
+    for line in mutants.by_line(found):
         best = min((mutant for mutant in line if not mutant.change.swaps), key=rank, default=None)
         yield from (mutant for mutant in line if mutant is best or mutant.change.swaps)
 
@@ -120,7 +120,7 @@ def chosen(found):
 def sets_for(path):
     """The sets that the module is built with for mutants of a file. All have the same loops, so
     one will do, except where sets are defined and chosen."""
-    if any(name in path for name in ("instruction_sets", "sameq_walk", "avx512")):
+    if path is None or any(name in path for name in ("instruction_sets", "sameq_walk", "avx512")):
         return ALL_SETS
     return BASELINE if "sse2" in path else ONE_SET
 
@@ -128,68 +128,18 @@ def sets_for(path):
 class Tree(steps.Tree):
     """The module with one file at a time another."""
 
-    def __init__(self, folder):
-        super().__init__(folder, FOLDERS)
-        self.sets = ALL_SETS
+    folders = includes = FOLDERS
 
-    def put(self, path, text):
-        super().put(path, text)
-        self.sets = sets_for(path)
+    def sees(self, source):
+        return True  # as what does not is taken from the copy without a mutant anyway
 
-    def object(self, source, level, sets=""):
-        """The file that `source` is compiled to, once."""
-        key = source, level, sets or self.sets
-        if key not in self.objects:
-            target = self.folder / f"{digest(*key)[:16]}.o"
-            self._compile(source, [*level.split(), f"-D{sets or self.sets}"], target)
-            self.objects[key] = target
-        return self.objects[key]
-
-    def _compile(self, source, flags, target):
-        compile_source(self.folder, source, flags, target)
-
-
-class UnharmedTree(Tree):
-    """The module as it is. What was built from the same texts by an earlier run is taken again."""
-
-    def __init__(self, folder):
-        super().__init__(folder)
-        self.lock = threading.RLock()
-
-    def object(self, source, level, sets=""):
-        with self.lock:
-            return super().object(source, level, sets)
-
-    def _compile(self, source, flags, target):
-        stamp = Path(f"{target}.stamp")
-        texts = digest(*flags, *self.texts.values(), test_texts((source,)))
-        if not (target.exists() and stamp.exists() and stamp.read_text() == texts):
-            stamp.unlink(missing_ok=True)
-            super()._compile(source, flags, target)
-            stamp.write_text(texts)
-
-
-@functools.lru_cache(maxsize=None)
-def test_texts(sources):
-    """The sources and what they include of the tests, as one number."""
-    _, text = command(["g++", *FLAGS, *(f"-I{name}" for name in (*FOLDERS, "tests")), "-MM",
-                       *sources], cwd=ROOT)
-    names = {name for name in text.split() if name.startswith("tests/")}
-    return digest(*((ROOT / name).read_text(encoding="utf-8") for name in sorted(names)))
-
-
-def compile_source(folder, source, flags, target):
-    words = ["g++", *FLAGS, *flags, *(f"-I{name}" for name in FOLDERS)]
-    if source.startswith("tests/"):
-        words += ["-include", str(WORK / "gtest.h"), f"-I{ROOT}/tests",
-                  f"-DDEFAULT_RANDOM_CALLS={RANDOM_CALLS}",
-                  f'-DGOLDEN_CALLS="{ROOT}/tests/golden_calls.txt"', "-c", str(ROOT / source)]
-    else:
-        words += ["-include", str(WORK / "standard.h")] if "-O0" in flags else []
-        words += ["-fno-exceptions", "-c", source]
-    status, text = command([*words, "-o", str(target)], cwd=folder)
-    if status != 0:
-        raise Broken(first_error(text))
+    def _options(self, source, flags):
+        if source.startswith("tests/"):
+            return ["-include", str(WORK / "gtest.h"), f"-I{ROOT}/tests",
+                    f"-DDEFAULT_RANDOM_CALLS={RANDOM_CALLS}",
+                    f'-DGOLDEN_CALLS="{ROOT}/tests/golden_calls.txt"']
+        header = ["-include", str(WORK / "standard.h")] if "-O0" in flags else []
+        return [*header, "-fno-exceptions"]
 
 
 STANDARD_HEADERS = ["algorithm", "cfloat", "cmath", "complex", "cstddef", "cstdint", "cstring",
@@ -200,37 +150,31 @@ class Bench(steps.Bench):
     """What all copies of the module share: the objects that see no mutant, besides."""
 
     def __init__(self, memory):
-        precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
         precompile("standard.h", STANDARD_HEADERS, ["-O0", "-fno-exceptions"])
-        super().__init__(memory, UnharmedTree(WORK / "original"))
-        self.compiled = self._lines_compiled()
-        self.needs = {part: self._dependencies(part.mutated)
-                      for part in (*SCALARS, *PARTS, CERTAINTY)}
+        super().__init__(memory, Tree(WORK / "original"))
+        self.compiled = self.tree.lines_compiled(MODULE) | self.tree.lines_compiled(TABLE)
         self.suite = None
         self.suite_lock = threading.Lock()
 
-    @staticmethod
-    def tree_of(folder):
-        return Tree(folder)
+    def tree_of(self, folder):
+        return Tree(folder, self.tree)
 
     def is_compiled(self, mutant):
         return (mutant.path, mutant.line) in self.compiled
 
-    def sources(self, program):
-        """What the finding depends on besides the module."""
-        return digest(repr(program), test_texts((*program.mutated, *program.fixed)))
+    def needs(self, program, source):
+        return self.tree.needs(source, *program.flags(source, ALL_SETS))
 
     def run(self, program, tree, seconds):
         """Builds and runs the program with the tree's module; raises Killed where a test fails."""
-        objects = [tree.object(source, program.level) for source in program.mutated]
-        objects += [tree.object(MODULE, program.module_level, program.sets),
-                    tree.object(TABLE, "-O0")]
-        objects += [self.tree.object(source, "-O1") for source in program.fixed]
+        sets = sets_for(tree.changed)
+        objects = [tree.object(source, *program.flags(source, sets)) for source in program.mutated]
+        objects += [tree.object(MODULE, program.module_level, f"-D{program.sets or sets}"),
+                    tree.object(TABLE, "-O0", f"-D{sets}")]
+        objects += [self.tree.object(source, *program.flags(source, ALL_SETS))
+                    for source in program.fixed]
         target = tree.folder / "program"
-        status, text = command(["g++", "-fuse-ld=gold", *map(str, objects), *program.link,
-                                "-lgtest", "-lgtest_main", "-pthread", "-o", str(target)])
-        if status != 0:
-            raise Broken("does not link: " + first_error(text))
+        steps.link(target, *objects, *program.link, "-lgtest", "-lgtest_main")
         run_test([str(target), *program.run], seconds, cwd=tree.folder)
 
     def steps(self, mutant, tree):
@@ -241,7 +185,8 @@ class Bench(steps.Bench):
 
         def steps_of(parts):
             return (step(part) for part in parts
-                    if mutant.path in self.needs[part] or mutant.path in (MODULE, TABLE))
+                    if mutant.path in (MODULE, TABLE)
+                    or any(mutant.path in self.needs(part, source) for source in part.mutated))
 
         if "avx512" in mutant.path:
             yield step(CERTAINTY_OF_AVX512)
@@ -267,8 +212,9 @@ class Bench(steps.Bench):
 
     def _same_code(self, tree):
         """No test of what is compiled can tell them apart."""
-        same = all(tree.object(source, "-O1").read_bytes()
-                   == self.tree.object(source, "-O1", tree.sets).read_bytes()
+        flags = "-O1", f"-D{sets_for(tree.changed)}"
+        same = all(tree.object(source, *flags).read_bytes()
+                   == self.tree.object(source, *flags).read_bytes()
                    for source in (MODULE, TABLE))
         return (SURVIVES, "same machine code") if same else None
 
@@ -276,27 +222,6 @@ class Bench(steps.Bench):
         with self.suite_lock:
             self.suite = self.suite or Suite()
             self.suite.run_with(mutant.path, mutant.applied(tree.texts[mutant.path]))
-
-    def _dependencies(self, sources):
-        """The files of the module that the sources include, or are."""
-        found = set()
-        for source in sources:
-            path = ROOT / source if source.startswith("tests/") else Path(source)
-            words = ["g++", *FLAGS, *(f"-I{name}" for name in FOLDERS), f"-I{ROOT}/tests",
-                     "-MM", str(path)]
-            _, text = command(words, cwd=self.tree.folder)
-            found.update(name for name in text.replace("\\\n", " ").split()
-                         if name in self.tree.texts)
-        return found
-
-    def _lines_compiled(self):
-        """Pairs of a file and a line of it that the preprocessor leaves of the module here."""
-        compiled = set()
-        for source in (MODULE, TABLE):
-            words = ["g++", *FLAGS, *(f"-I{name}" for name in FOLDERS), "-E", source]
-            _, text = command(words, cwd=self.tree.folder)
-            compiled |= steps.lines_in(text)
-        return compiled
 
 
 # ---- The release build's own checks

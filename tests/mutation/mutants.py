@@ -1,8 +1,12 @@
 """Makes mutants of C++ sources from their text: one small change each, with a name that holds."""
 
+import bisect
+import hashlib
+import itertools
+import operator
 import re
 from collections import Counter
-from dataclasses import dataclass
+from dataclasses import dataclass, replace
 
 # ---- Tokens
 
@@ -27,6 +31,9 @@ class Token:
     text: str
     begin: int
     end: int
+
+    def replaced(self, text):
+        return Change(self.begin, self.end, text)
 
 
 def code_of(source):
@@ -56,7 +63,7 @@ def without_assertions(tokens):
 
 
 def without_heads(tokens):
-    """Without the parameters of templates, hardly a change of which compiles."""
+    """Without the parameters of templates, almost no change of which compiles."""
     kept, depth, begins = [], 0, False
     for token in tokens:
         begins = begins or token.text == "template"
@@ -92,9 +99,12 @@ class Change:
     swaps: bool = False  # the order of two statements
     whole: bool = False  # statements, conditions or texts
 
+    def applied(self, text):
+        return text[: self.begin] + self.text + text[self.end :]
 
-# An operator has blanks on both sides, as the sources are formatted; what looks like one and has
-# not is a bracket of a template, a reference or a pointer.
+
+# An operator has blanks on both sides, as the sources are formatted. What looks like one without
+# them is a bracket of a template, a reference or a pointer.
 OPERATORS = {
     "<": ("<=", ">="),
     "<=": ("<", ">"),
@@ -121,49 +131,39 @@ OPERATORS = {
     "?": ("|| true ?", "&& false ?"),
 }
 
-# What stands for these words in turn. An empty one takes the word away.
+def both_ways(*pairs):
+    return {**dict(pairs), **{other: one for one, other in pairs}}
+
+
+# What replaces these words. An empty one takes the word away.
 WORDS = {
-    "true": ("false",),
-    "false": ("true",),
-    "double": ("float",),
-    "float": ("double",),
-    "uint8_t": ("int8_t",),
-    "uint16_t": ("int16_t",),
-    "uint32_t": ("int32_t",),
-    "uint64_t": ("int64_t",),
-    "is_signed_v": ("is_unsigned_v",),
-    "is_unsigned_v": ("is_signed_v",),
-    "is_integral_v": ("is_floating_point_v",),
-    "is_floating_point_v": ("is_integral_v",),
-    "is_integral": ("is_floating_point",),
-    "is_floating_point": ("is_integral",),
-    "conjunction_v": ("disjunction_v",),
-    "disjunction_v": ("conjunction_v",),
-    "make_unsigned_t": ("make_signed_t",),
-    "min": ("max",),
-    "denorm_min": ("min",),
-    "epsilon": ("min",),
-    "digits": ("digits10",),
-    "fabs": ("trunc",),
-    "__builtin_fabs": ("__builtin_trunc",),
-    "__builtin_fabsf": ("__builtin_truncf",),
-    "volatile": ("",),
-    "thread_local": ("",),
-    "equality": ("nearness<float>",),
-    "avx2": ("avx512",),
+    **both_ways(("true", "false"), ("double", "float"), ("is_signed_v", "is_unsigned_v"),
+                ("is_integral_v", "is_floating_point_v"), ("is_integral", "is_floating_point"),
+                ("conjunction_v", "disjunction_v")),
+    "uint8_t": "int8_t",
+    "uint16_t": "int16_t",
+    "uint32_t": "int32_t",
+    "uint64_t": "int64_t",
+    "make_unsigned_t": "make_signed_t",
+    "min": "max",
+    "denorm_min": "min",
+    "epsilon": "min",
+    "digits": "digits10",
+    "fabs": "trunc",
+    "__builtin_fabs": "__builtin_trunc",
+    "__builtin_fabsf": "__builtin_truncf",
+    "volatile": "",
+    "thread_local": "",
+    "equality": "nearness<float>",
+    "avx2": "avx512",
 }
 
 # Types of variables with an initial value.
 NARROWER = {"talint": "short", "size_t": "uint16_t", "D": "std::uint8_t"}
 
-# Names that are easily taken for each other, besides those that differ by 1 and 2 or by x and y.
-TAKEN_FOR = {
-    "real_part": "imaginary_part",
-    "imaginary_part": "real_part",
-    "rdata1": "idata1",
-    "idata1": "rdata1",
-    "rdata2": "idata2",
-    "idata2": "rdata2",
+# Names that are easily confused, besides those that differ by 1 and 2 or by x and y.
+CONFUSED = {
+    **both_ways(("real_part", "imaginary_part"), ("rdata1", "idata1"), ("rdata2", "idata2")),
     "diff": "max",
     "begin": "end",
     "in_pages": "passed",
@@ -176,8 +176,8 @@ _SWAPPED = str.maketrans("12xy", "21yx")
 
 
 def other_name(name, names):
-    if name in TAKEN_FOR:
-        return TAKEN_FOR[name]
+    if name in CONFUSED:
+        return CONFUSED[name]
     other = re.sub(r"(?<![a-zA-Z])[xy](?![a-zA-Z])|(?<=n)[xy]$|[12](?=_?$)",
                    lambda match: match.group().translate(_SWAPPED), name)
     return other if other != name and other in names else None
@@ -213,40 +213,36 @@ class Source:
     def _spaced(self, token):
         return self.text[token.begin - 1] in " \n" and self.text[token.end] in " \n"
 
-    def _replaced(self, token, texts):
-        for text in texts:
-            yield Change(token.begin, token.end, text)
-
     def _token_changes(self, index, token):
         if token.kind == "mark":
             yield from self._mark_changes(token)
         elif token.kind == "number":
-            yield from self._replaced(token, other_numbers(token.text))
+            yield from map(token.replaced, other_numbers(token.text))
         elif token.kind == "attribute" and TELLING_ATTRIBUTE.search(token.text):
-            yield Change(token.begin, token.end, "")
+            yield token.replaced("")
         elif token.kind == "word":
             yield from self._word_changes(index, token)
 
     def _mark_changes(self, token):
         if token.text in OPERATORS and self._spaced(token):
-            yield from self._replaced(token, OPERATORS[token.text])
+            yield from map(token.replaced, OPERATORS[token.text])
         elif token.text in ("!", "-", "~") and not self.text[token.end].isspace():
             # Of one operand: taken away.
-            yield Change(token.begin, token.end, "")
+            yield token.replaced("")
         elif token.text == "++":
-            yield from self._replaced(token, ["--"])
+            yield token.replaced("--")
 
     def _word_changes(self, index, token):
         before, after = self._text_at(index - 1), self._text_at(index + 1)
         if token.text in WORDS and not (token.text == "min" and before == "&"):
-            yield from self._replaced(token, WORDS[token.text])
+            yield token.replaced(WORDS[token.text])
         if token.text in NARROWER and self._text_at(index + 2) == "=":
-            yield Change(token.begin, token.end, NARROWER[token.text])
+            yield token.replaced(NARROWER[token.text])
         declared = self.tokens[index - 1].kind == "word" and before not in ("return", "else")
         glued = before in ("*", "&", ">") and self.text[token.begin - 2] != " "
         other = other_name(token.text, self.names)
         if other and not declared and not (glued and after in (",", ")", "=", ";", "(")):
-            yield Change(token.begin, token.end, other)
+            yield token.replaced(other)
 
     def _condition_changes(self):
         for index, token in enumerate(self.tokens):
@@ -286,20 +282,22 @@ class Source:
             if self._text_at(opening + 1) == "return" and self._text_at(last + 1) != "else":
                 yield index, last
 
+    def _replaced(self, span, text):
+        return Change(self.tokens[span[0]].begin, self.tokens[span[1]].end, text)
+
     def _range_text(self, span):
         return self.text[self.tokens[span[0]].begin : self.tokens[span[1]].end]
 
     def _statement_changes(self):
         statements = list(self._statements())
         for span in statements:
-            yield Change(self.tokens[span[0]].begin, self.tokens[span[1]].end, ";")
+            yield self._replaced(span, ";")
         for spans in (statements, list(self._returning_ifs())):
             for one, other in zip(spans, spans[1:]):
                 if one[1] + 1 == other[0]:
-                    begin, end = self.tokens[one[0]].begin, self.tokens[other[1]].end
                     between = self.text[self.tokens[one[1]].end : self.tokens[other[0]].begin]
-                    yield Change(begin, end,
-                                 self._range_text(other) + between + self._range_text(one), True)
+                    swapped = self._range_text(other) + between + self._range_text(one)
+                    yield replace(self._replaced((one[0], other[1]), swapped), swaps=True)
 
 
 # ---- Mutants
@@ -312,7 +310,18 @@ class Mutant:
     change: Change
 
     def applied(self, text):
-        return text[: self.change.begin] + self.change.text + text[self.change.end :]
+        return self.change.applied(text)
+
+    @property
+    def chance(self):
+        """To choose among equals; the same in every run."""
+        return hashlib.sha256(self.name.encode()).hexdigest()
+
+
+def by_line(found):
+    """The mutants of each line, as a list."""
+    line = operator.attrgetter("line")
+    return (list(of_line) for _, of_line in itertools.groupby(sorted(found, key=line), line))
 
 
 def shown(text, most=60):
@@ -321,7 +330,7 @@ def shown(text, most=60):
 
 
 class Places:
-    """Names a place by the text of its line, with those in front of it where that stands twice."""
+    """Names a place by the text of its line, and by the lines before it where that occurs twice."""
 
     def __init__(self, text):
         lines = [" ".join(line.split("//")[0].split()) for line in text.split("\n")]
@@ -332,10 +341,7 @@ class Places:
             self.starts.append(self.starts[-1] + len(line) + 1)
 
     def line_of(self, offset):
-        low = 0
-        while self.starts[low + 1] <= offset:
-            low += 1
-        return low
+        return bisect.bisect_right(self.starts, offset) - 1
 
     def _run(self, index, count):
         return tuple(line for _, line in self.code[max(0, index - count + 1) : index + 1])
@@ -354,7 +360,7 @@ def mutants_of(path, text, source=Source):
     places = Places(text)
     found, seen, taken = [], set(), Counter()
     for change in source(text).changes():
-        mutated = text[: change.begin] + change.text + text[change.end :]
+        mutated = change.applied(text)
         if mutated in seen or mutated == text:
             continue
         seen.add(mutated)

@@ -2,6 +2,7 @@
 single operators."""
 
 import re
+from dataclasses import replace
 
 from mutants import Change, Source, closing
 
@@ -19,7 +20,7 @@ class Bodies:
         self.tokens = tokens
         self.actions = []  # assignments, calls, loops, leaps: what can be left out
         self.returns = []  # of a value
-        self.conditions = []  # what stands between the brackets of an `if`
+        self.conditions = []  # what is between the brackets of an `if`
         self._scope(0, len(tokens))
 
     def _text(self, index):
@@ -112,7 +113,7 @@ class Bodies:
         return last + 1
 
     def _is_action(self, begin):
-        """Not so a declaration, which has two words or a type and a word side by side."""
+        """A declaration, which has two words or a type and a word side by side, is none."""
         first = self._text(begin)
         if first in (*LEAVES, "return") or first in DECLARES:
             return first not in DECLARES
@@ -174,9 +175,9 @@ class WholeSource(Source):
 
     def _statement_changes(self):
         for change in super()._statement_changes():
-            yield Change(change.begin, change.end, change.text, change.swaps, whole=True)
+            yield replace(change, whole=True)
 
     def _return_changes(self):
         for span in self.bodies.returns:
             if self._range_text(span) not in NO_VALUES:
-                yield Change(self.tokens[span[0]].begin, self.tokens[span[1]].end, "{}", whole=True)
+                yield replace(self._replaced(span, "{}"), whole=True)

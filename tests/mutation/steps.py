@@ -79,24 +79,98 @@ def digest(*parts):
 # ---- Copies, and what they are built with
 
 class Tree:
-    """A copy of some of the project's folders in which one file at a time is another."""
+    """A copy of some of the project's folders in which one file at a time is another. Of what does
+    not see that, the objects of the copy without a mutant are taken."""
 
-    def __init__(self, folder, names):
+    folders, includes = (), ()
+
+    def __init__(self, folder, original=None):
         self.folder = folder
+        self.original = original or self
         self.texts = {}
-        for name in names:
+        for name in self.folders:
             shutil.rmtree(folder / name, ignore_errors=True)
             shutil.copytree(ROOT / name, folder / name)
             for path in sorted((folder / name).rglob("*.*")):
                 self.texts[str(path.relative_to(folder))] = path.read_text(encoding="utf-8")
+        self.changed = None
         self.objects = {}
+        self.lock = threading.RLock()
 
     def put(self, path, text):
         (self.folder / path).write_text(text, encoding="utf-8")
+        self.changed = path
         self.objects = {}
 
     def restore(self, path):
         self.put(path, self.texts[path])
+        self.changed = None
+
+    def sees(self, source):
+        """Whether it is, or includes, what is changed here."""
+        return self.changed is not None and self.changed in self.original.needs(source)
+
+    def object(self, source, *flags):
+        """The file that `source` is compiled to."""
+        if self is not self.original and not self.sees(source):
+            return self.original.object(source, *flags)
+        with self.lock:
+            key = source, *flags
+            if key not in self.objects:
+                self.objects[key] = self._compiled(source, flags)
+            return self.objects[key]
+
+    def needs(self, source, *flags):
+        """The files of the copy and of the tests that `source` is compiled from."""
+        target = self.object(source, *flags)
+        return {name.removeprefix(f"{ROOT}/") for name in self._files_of(target)}
+
+    def lines_compiled(self, source):
+        """Pairs of a file and a line of it that the preprocessor leaves."""
+        _, text = command([*self._compiler(), "-E", source], cwd=self.folder)
+        lines, path, line = set(), "", 0
+        for row in text.split("\n"):
+            mark = re.match(r'# (\d+) "([^"]*)"', row)
+            if mark:
+                line, path = int(mark.group(1)), mark.group(2)
+                continue
+            if row.strip():
+                lines.add((path, line))
+            line += 1
+        return lines
+
+    def _compiler(self):
+        return ["g++", *FLAGS, *(f"-I{name}" for name in self.includes)]
+
+    def _options(self, source, flags):
+        """What the target's sources, or those of the tests, are compiled with besides."""
+        raise NotImplementedError
+
+    def _compiled(self, source, flags):
+        """What an earlier run compiled of the same texts is taken again."""
+        target = self.folder / f"{digest(source, *flags)[:16]}.o"
+        stamp = target.with_suffix(".stamp")
+        path = str(ROOT / source) if source.startswith("tests/") else source
+        words = [*self._compiler(), *flags, *self._options(source, flags), "-c", path]
+        if target.exists() and stamp.exists() and stamp.read_text() == self._stamp(target, words):
+            return target
+        stamp.unlink(missing_ok=True)
+        status, text = command([*words, "-MMD", "-o", str(target)], cwd=self.folder)
+        if status != 0:
+            raise Broken(first_error(text))
+        stamp.write_text(self._stamp(target, words))
+        return target
+
+    def _stamp(self, target, words):
+        paths = [self.folder / name for name in self._files_of(target)]
+        texts = (path.read_text(encoding="utf-8") for path in paths if path.exists())
+        return digest(*words, *texts)
+
+    @staticmethod
+    def _files_of(target):
+        """What it was compiled from, without the headers of the system."""
+        names = target.with_suffix(".d").read_text(encoding="utf-8").replace("\\\n", " ").split()
+        return [name for name in names[1:] if not name.startswith(("/usr", str(WORK)))]
 
 
 def temporary_folder(folder):
@@ -104,18 +178,11 @@ def temporary_folder(folder):
     return tempfile.TemporaryDirectory(dir=folder, prefix="run")
 
 
-def lines_in(preprocessed):
-    """Pairs of a file and a line of it that the preprocessor leaves."""
-    lines, path, line = set(), "", 0
-    for row in preprocessed.split("\n"):
-        mark = re.match(r'# (\d+) "([^"]*)"', row)
-        if mark:
-            line, path = int(mark.group(1)), mark.group(2)
-            continue
-        if row.strip():
-            lines.add((path, line))
-        line += 1
-    return lines
+def link(target, *words):
+    status, text = command(["g++", "-fuse-ld=gold", *map(str, words), "-pthread", "-o",
+                            str(target)])
+    if status != 0:
+        raise Broken("does not link: " + first_error(text))
 
 
 def precompile(name, headers, *flags_of_variants):
@@ -137,9 +204,16 @@ class Bench:
     spare = 10  # seconds that a program may take longer than three times as long
 
     def __init__(self, memory, tree):
+        precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
         self.memory = memory
         self.tree = tree
         self.lock = threading.RLock()
+
+    def sources(self, program):
+        """What the finding depends on besides the target."""
+        names = {name for source in program.sources for name in self.needs(program, source)}
+        return digest(repr(program), *((ROOT / name).read_text(encoding="utf-8")
+                                       for name in sorted(names) if name.startswith("tests/")))
 
     def limit(self, program):
         """The seconds that the program may take, by what it takes without a mutant."""

@@ -2,8 +2,6 @@
 
 import hashlib
 import re
-import threading
-from collections import defaultdict
 from dataclasses import dataclass
 from pathlib import Path
 
@@ -11,8 +9,7 @@ import module_steps
 import mutants
 import steps
 from statements import WholeSource
-from steps import (FLAGS, ROOT, SURVIVES, TIME_OUT, WORK, Broken, command, digest, first_error,
-                   precompile, run_test)
+from steps import ROOT, SURVIVES, TIME_OUT, WORK, command, precompile, run_test
 
 TOOL = "tools/talcmp"
 FOLDERS = [*module_steps.FOLDERS, TOOL]
@@ -35,13 +32,8 @@ def is_condition(change):
     return change.whole and (change.text in ("true", "false") or change.text.startswith("!("))
 
 
-def chance(mutant):
-    """From 0 to 1; the same in every run."""
-    return int(hashlib.sha256(mutant.name.encode()).hexdigest()[:8], 16) / 2**32
-
-
 def rank(mutant):
-    return not is_condition(mutant.change), not mutant.change.whole, chance(mutant)
+    return not is_condition(mutant.change), not mutant.change.whole, mutant.chance
 
 
 def share(change):
@@ -51,10 +43,7 @@ def share(change):
 
 def chosen(found):
     """At most one mutant of each line."""
-    by_line = defaultdict(list)
-    for mutant in found:
-        by_line[mutant.line].append(mutant)
-    for _, line in sorted(by_line.items()):
+    for line in mutants.by_line(found):
         best = min(line, key=rank)
         if hashlib.sha256(best.name[::-1].encode()).digest()[0] < 256 * share(best.change):
             yield best
@@ -63,75 +52,27 @@ def chosen(found):
 # ---- Copies of talcmp, and what is built from them
 
 class Tree(steps.Tree):
-    """talcmp with one file at a time another. Of what does not see that, the objects of the copy
-    without a mutant are taken."""
+    """talcmp with one file at a time another."""
 
-    def __init__(self, folder, original=None):
-        super().__init__(folder, FOLDERS)
-        self.original = original or self
-        self.changed = None
-        self.lock = threading.RLock()
-        self.command = folder / "talcmp"
+    folders, includes = FOLDERS, INCLUDES
 
-    def put(self, path, text):
-        super().put(path, text)
-        self.changed = path
-
-    def restore(self, path):
-        super().restore(path)
-        self.changed = None
+    @property
+    def command(self):
+        return self.folder / "talcmp"
 
     def sees(self, source):
-        """Whether it is, or includes, what is changed here."""
-        return self.changed is not None and self.changed in self.original.needs(source)
+        """Which talcmp to start differs between copies."""
+        return source == RUN_TALCMP or super().sees(source)
 
-    def object(self, source):
-        """The file that `source` is compiled to. Which talcmp to start differs between copies."""
-        if self is not self.original and source != RUN_TALCMP and not self.sees(source):
-            return self.original.object(source)
-        with self.lock:
-            if source not in self.objects:
-                self.objects[source] = self._compiled(source)
-            return self.objects[source]
-
-    def needs(self, source):
-        """The files of the copy and of the tests that `source` is compiled from."""
-        text = self.object(source).with_suffix(".d").read_text(encoding="utf-8")
-        names = text.replace("\\\n", " ").split()[1:]
-        return {name.removeprefix(f"{ROOT}/") for name in names if not name.startswith("/usr")}
-
-    def _compiled(self, source):
-        """What an earlier run compiled of the same texts is taken again."""
-        target = self.folder / f"{Path(source).stem}.o"
-        stamp = target.with_suffix(".stamp")
-        words = self._words(source)
-        if target.exists() and stamp.exists() and stamp.read_text() == self._stamp(target, words):
-            return target
-        stamp.unlink(missing_ok=True)
-        status, text = command([*words, "-MMD", "-o", str(target)], cwd=self.folder)
-        if status != 0:
-            raise Broken(first_error(text))
-        stamp.write_text(self._stamp(target, words))
-        return target
-
-    def _stamp(self, target, words):
-        names = target.with_suffix(".d").read_text(encoding="utf-8").replace("\\\n", " ").split()
-        texts = ((self.folder / name).read_text(encoding="utf-8") for name in names[1:]
-                 if not name.startswith(("/usr", str(WORK))) and (self.folder / name).exists())
-        return digest(*words, *texts)
-
-    def _words(self, source):
-        words = ["g++", *FLAGS, *(f"-I{name}" for name in INCLUDES)]
+    def _options(self, source, flags):
         if source.startswith("tests/"):
-            words += ["-O1" if source in ORACLE else "-O0", "-include", str(WORK / "gtest.h"),
-                      f"-I{ROOT}/tests", f"-I{ROOT}/{TESTS}",
-                      f'-DTALCMP_COMMAND="{self.command}"',
-                      f"-DDEFAULT_RANDOM_CALLS={module_steps.RANDOM_CALLS}"]
-        elif source in MODULE:
-            words += ["-O1", f"-D{module_steps.ONE_SET}"]
-        else:
-            words += ["-O0", "-include", str(WORK / "talcmp.h"), '-DTALCMP_VERSION="0.0.0"']
-        return [*words, "-c", str(ROOT / source if source.startswith("tests/") else source)]
+            return ["-O1" if source in ORACLE else "-O0", "-include", str(WORK / "gtest.h"),
+                    f"-I{ROOT}/tests", f"-I{ROOT}/{TESTS}",
+                    f'-DTALCMP_COMMAND="{self.command}"',
+                    f"-DDEFAULT_RANDOM_CALLS={module_steps.RANDOM_CALLS}"]
+        if source in MODULE:
+            return ["-O1", f"-D{module_steps.ONE_SET}"]
+        return ["-O0", "-include", str(WORK / "talcmp.h"), '-DTALCMP_VERSION="0.0.0"']
 
 
 # ---- The tests
@@ -167,7 +108,6 @@ class Bench(steps.Bench):
     spare = 4
 
     def __init__(self, memory):
-        precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
         precompile("talcmp.h", STANDARD_HEADERS, ["-O0"])
         super().__init__(memory, Tree(WORK / "talcmp"))
         self.sources_of_core = [path for path in self.tree.texts if path.startswith(TOOL)
@@ -177,31 +117,18 @@ class Bench(steps.Bench):
         self.core.unlink(missing_ok=True)
         objects = [self.tree.object(path) for path in (*self.sources_of_core, *MODULE)]
         command(["ar", "rcs", str(self.core), *map(str, objects)])
-        self.elsewhere = {path: self._lines_elsewhere(path) for path in self.sources_of_core
-                          if re.search(r"^#if", self.tree.texts[path], flags=re.MULTILINE)}
+        self.compiled = {path: self.tree.lines_compiled(path) for path in self.sources_of_core
+                         if re.search(r"^#if", self.tree.texts[path], flags=re.MULTILINE)}
 
     def tree_of(self, folder):
         return Tree(folder, self.tree)
 
     def is_compiled(self, mutant):
-        return mutant.line not in self.elsewhere.get(mutant.path, ())
+        lines = self.compiled.get(mutant.path)
+        return lines is None or (mutant.path, mutant.line) in lines
 
-    def _lines_elsewhere(self, path):
-        """The lines that the preprocessor leaves out here."""
-        words = ["g++", *FLAGS, *(f"-I{name}" for name in INCLUDES), "-E", path]
-        _, text = command(words, cwd=self.tree.folder)
-        compiled = steps.lines_in(text)
-        count = self.tree.texts[path].count("\n")
-        return {line for line in range(1, count + 1) if (path, line) not in compiled}
-
-    def sources(self, program):
-        """What the finding depends on besides talcmp."""
-        names = set(program.sources)
-        for source in program.sources:
-            if source.endswith(".cpp"):
-                names |= self.tree.needs(source)
-        return digest(repr(program), *((ROOT / name).read_text(encoding="utf-8")
-                                       for name in sorted(names) if name.startswith("tests/")))
+    def needs(self, program, source):
+        return self.tree.needs(source) if source.endswith(".cpp") else {source}
 
     def run(self, program, tree, seconds):
         """Builds and runs the program with the tree's talcmp; raises Killed where a test fails."""
@@ -222,10 +149,7 @@ class Bench(steps.Bench):
     def _link(self, tree, objects, target, *libraries):
         """Objects that see the mutant come first, so that the archive's are not taken."""
         changed = [tree.object(path) for path in self.sources_of_core if tree.sees(path)]
-        status, text = command(["g++", "-fuse-ld=gold", *map(str, (*objects, *changed, self.core)),
-                                *libraries, "-lzip", "-pthread", "-o", str(target)])
-        if status != 0:
-            raise Broken("does not link: " + first_error(text))
+        steps.link(target, *objects, *changed, self.core, *libraries, "-lzip")
 
     def steps(self, mutant, tree):
         """Name, sources and action of each step; the parts first where the mutant is in one."""
