@@ -1,6 +1,6 @@
 # What `cmake --install` lays down: the library, in the component Development, and talcmp, in the
-# component Runtime. Nothing of it knows the prefix, which may be moved
-# afterwards, unless CMAKE_INSTALL_LIBDIR is absolute.
+# component Runtime. Nothing of it knows the prefix, which may be moved afterwards, unless
+# CMAKE_INSTALL_LIBDIR is absolute.
 
 option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
        OFF)
@@ -17,15 +17,19 @@ set(header_folder ${CMAKE_INSTALL_INCLUDEDIR}/talnumericarray)
 set(config_folder ${CMAKE_INSTALL_LIBDIR}/cmake/TalNumericArray)
 set(generated ${PROJECT_BINARY_DIR}/install)
 
+# talnumericarray_install(COMPONENT FOLDER FILE...)
+function(talnumericarray_install component folder)
+  install(
+    FILES ${ARGN}
+    DESTINATION ${folder}
+    COMPONENT ${component})
+endfunction()
+
 # ---- Headers and archive
 
 list(TRANSFORM include_folders APPEND /*.h OUTPUT_VARIABLE header_patterns)
 file(GLOB headers CONFIGURE_DEPENDS ${header_patterns})
-install(
-  FILES ${headers}
-  DESTINATION ${header_folder}
-  COMPONENT Development)
-
+talnumericarray_install(Development ${header_folder} ${headers})
 target_include_directories(talnumericarray_compare INTERFACE $<INSTALL_INTERFACE:${header_folder}>)
 install(
   TARGETS talnumericarray_compare
@@ -42,10 +46,8 @@ configure_package_config_file(
 # Before version 1 a new minor version may break what is built on the last.
 write_basic_package_version_file(${generated}/TalNumericArrayConfigVersion.cmake
                                  COMPATIBILITY SameMinorVersion)
-install(
-  FILES ${generated}/TalNumericArrayConfig.cmake ${generated}/TalNumericArrayConfigVersion.cmake
-  DESTINATION ${config_folder}
-  COMPONENT Development)
+talnumericarray_install(Development ${config_folder} ${generated}/TalNumericArrayConfig.cmake
+                        ${generated}/TalNumericArrayConfigVersion.cmake)
 install(
   EXPORT TalNumericArray
   NAMESPACE TalNumericArray::
@@ -62,10 +64,8 @@ set(options $<TARGET_PROPERTY:talnumericarray_compare,INTERFACE_COMPILE_OPTIONS>
 configure_file(${CMAKE_CURRENT_LIST_DIR}/talnumericarray.pc.in ${generated}/talnumericarray.pc.in
                @ONLY)
 file(GENERATE OUTPUT ${generated}/talnumericarray.pc INPUT ${generated}/talnumericarray.pc.in)
-install(
-  FILES ${generated}/talnumericarray.pc
-  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig
-  COMPONENT Development)
+talnumericarray_install(Development ${CMAKE_INSTALL_LIBDIR}/pkgconfig
+                        ${generated}/talnumericarray.pc)
 
 # ---- The command
 
@@ -80,30 +80,18 @@ if(TARGET talcmp)
                             COMMAND_ERROR_IS_FATAL ANY)
     set(manual ${generated}/talcmp.1.gz)
   endif()
-  install(
-    FILES ${manual}
-    DESTINATION ${CMAKE_INSTALL_MANDIR}/man1
-    COMPONENT Runtime)
-  install(
-    FILES ${talcmp_folder}/talcmp.schema.json ${PROJECT_SOURCE_DIR}/docs/talcmp.md
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/talcmp
-    COMPONENT Runtime)
+  talnumericarray_install(Runtime ${CMAKE_INSTALL_MANDIR}/man1 ${manual})
+  talnumericarray_install(Runtime ${CMAKE_INSTALL_DATADIR}/doc/talcmp
+                          ${talcmp_folder}/talcmp.schema.json ${PROJECT_SOURCE_DIR}/docs/talcmp.md)
   install(
     DIRECTORY ${PROJECT_SOURCE_DIR}/examples/recipes
     DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/talcmp
     COMPONENT Runtime
     USE_SOURCE_PERMISSIONS)
-  install(
-    FILES ${talcmp_folder}/completions/talcmp.bash
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
-    RENAME talcmp
-    COMPONENT Runtime)
-  install(
-    FILES ${talcmp_folder}/completions/_talcmp
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/${zsh_folder}
-    COMPONENT Runtime)
-  install(
-    FILES ${talcmp_folder}/completions/talcmp.fish
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d
-    COMPONENT Runtime)
+  talnumericarray_install(Runtime ${CMAKE_INSTALL_DATADIR}/bash-completion/completions
+                          ${talcmp_folder}/completions/talcmp.bash RENAME talcmp)
+  talnumericarray_install(Runtime ${CMAKE_INSTALL_DATADIR}/zsh/${zsh_folder}
+                          ${talcmp_folder}/completions/_talcmp)
+  talnumericarray_install(Runtime ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d
+                          ${talcmp_folder}/completions/talcmp.fish)
 endif()
