@@ -24,7 +24,7 @@ print(time.perf_counter() - begin)
 
 
 def write_files(folder, count):
-    """Doubles, the same once more, and such as differ in a few digits."""
+    """Doubles, a copy of them, and some that differ in a few digits."""
     paths = [os.path.join(folder, name + ".npy") for name in ("one", "same", "near")]
     # By another process, as a child begins with the memory of its parent.
     writer = os.fork()
@@ -51,7 +51,7 @@ def seconds_of(command):
 
 
 def memory_of(command):
-    """The greatest resident memory in bytes, as far as it is seen while the command runs."""
+    """The greatest resident memory in bytes, as it is seen while the command runs."""
     most = 0
     with subprocess.Popen(command, stdout=subprocess.DEVNULL) as process:
         while process.poll() is None:

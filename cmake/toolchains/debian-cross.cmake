@@ -1,4 +1,4 @@
-# What the toolchain files beside this one share: Debian's cross compilers, with QEMU to run what
+# What the other toolchain files share: Debian's cross compilers, with QEMU to run what
 # they make. A platform's file sets
 #
 #   TALNUMERICARRAY_TRIPLE   how Debian calls the platform's tools: arm-linux-gnueabihf

@@ -1,5 +1,5 @@
 // Random pairs among pairs that are the same, in every direction of rounding and with subnormal
-// numbers taken for zero: the loops answer and remember as the element loop does.
+// numbers treated as zero: the loops answer and remember as the element loop does.
 
 #include "support/checked_calls.h"
 #include "support/emulation.h"

@@ -10,7 +10,7 @@
 
 namespace {
 
-TEST(InstructionSets, StandBestFirst) {
+TEST(InstructionSets, AreListedBestFirst) {
     const char* const best_first[] = {"AVX-512", "AVX-512 in plain code", "AVX2", "baseline",
                                       without_vectors};
     const auto* expected = std::begin(best_first);
@@ -30,7 +30,7 @@ TEST(InstructionSets, StandBestFirst) {
     }
 }
 
-// Skipped where it is not so, which CTest reports after all tests.
+// Otherwise skipped, which CTest reports after all tests.
 TEST(InstructionSets, AreAllTested) {
     std::string untested;
     for (const InstructionSet& set : instruction_sets_of_build()) {

@@ -37,7 +37,7 @@ class Poison {
     std::size_t size_;
 };
 
-TEST(Loops, WithoutVectorsReadNothingBehindTheFirstDifference) {
+TEST(Loops, WithoutVectorsReadNothingAfterTheFirstDifference) {
     if (!address_sanitizer) {
         GTEST_SKIP() << "NOT TESTED: only a sanitizer notices single bytes that are read";
     }

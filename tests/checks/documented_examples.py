@@ -5,7 +5,7 @@
 
 Each ```console block is a session: its lines after "$ " are run one after the other by bash in
 ROOT, with the programs of BIN first in the path, after their emulator if one is given, and must
-print the lines that follow them. Each block in another language must stand, line by line, in one of
+print the lines that follow them. Each block in another language must be found, line by line, in one of
 the files of ROOT that are listed for it below, which other tests run.
 """
 

@@ -3,7 +3,7 @@
 
     lint.py BUILD_FOLDER SOURCE...
 
-A check looks at all that a source includes, so that nearly all its time goes to the standard
+A check examines all that a source includes, so that nearly all its time goes to the standard
 library. Sources that are compiled alike are put together in one file. Where clang-tidy complains of
 that, its sources are linted one by one, which shows what is wrong and where.
 """

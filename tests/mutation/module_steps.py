@@ -90,7 +90,7 @@ CERTAINTY_OF_AVX512 = replace(CERTAINTY, name="certainty_of_avx512_test",
                               level="-O1 -Wno-psabi -DTALNUMERICARRAY_EMULATED"
                                     " -DAVX512_IN_PLAIN_CODE")
 
-# What the release build makes of the module beside the test programs, and the tests of that.
+# What the release build makes of the module apart from the test programs, and the tests of that.
 CHECKED_TARGETS = ["talnumericarray_compare", "small_runtime", "runtime_by_linking",
                    "runtime_by_dlopen", "talcmp", "compare_arrays"]
 CHECKED_TESTS = r"^built\.(archive|shared_object)$|^examples\."
@@ -147,7 +147,7 @@ STANDARD_HEADERS = ["algorithm", "cfloat", "cmath", "complex", "cstddef", "cstdi
 
 
 class Bench(steps.Bench):
-    """What all copies of the module share: the objects that see no mutant, besides."""
+    """What all copies of the module share, with the objects that see no mutant."""
 
     def __init__(self, memory):
         precompile("standard.h", STANDARD_HEADERS, ["-O0", "-fno-exceptions"])
@@ -211,7 +211,7 @@ class Bench(steps.Bench):
             yield "release build", checked_sources(), lambda: self._release(mutant, tree)
 
     def _same_code(self, tree):
-        """No test of what is compiled can tell them apart."""
+        """No test of what is compiled can distinguish them."""
         flags = "-O1", f"-D{sets_for(tree.changed)}"
         same = all(tree.object(source, *flags).read_bytes()
                    == self.tree.object(source, *flags).read_bytes()

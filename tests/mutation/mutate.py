@@ -5,10 +5,10 @@
     mutate.py TEXT      those with TEXT in their paths or names
     mutate.py --quick   those of quick.txt
 
-A mutant is a source with one small change in its text. Each has to make a test fail, or to stand
-in equivalent.txt with the reason why none can tell it from the source; the run fails where one does
-neither, or both. Everything is built below build/mutation. What a step finds is kept there, and is
-looked for again only where the code or the sources of the step have changed.
+A mutant is a source with one small change in its text. Each has to make a test fail, or to be
+listed in equivalent.txt with the reason why no test can distinguish it from the source. The run
+fails where one does neither, or both. Everything is built below build/mutation. What a step finds
+is kept there, and is found anew only where the code or the sources of the step have changed.
 """
 
 import json
@@ -168,7 +168,7 @@ def table(target, outcomes):
     for name, counts in by_row.items():
         cells = [counts[key] for key in target.columns]
         text += row([name, sum(cells), *cells]) if sum(cells) else ""
-    elsewhere = (f", and {total[ELSEWHERE]} lie in lines for other platforms or compilers"
+    elsewhere = (f", and {total[ELSEWHERE]} are in lines for other platforms or compilers"
                  if total[ELSEWHERE] else "")
     return f"{text}\nAnother {total[BROKEN]} do not compile{elsewhere}.\n"
 

@@ -143,11 +143,11 @@ class Tree:
         return ["g++", *FLAGS, *(f"-I{name}" for name in self.includes)]
 
     def _options(self, source, flags):
-        """What the target's sources, or those of the tests, are compiled with besides."""
+        """What the target's sources, or those of the tests, are also compiled with."""
         raise NotImplementedError
 
     def _compiled(self, source, flags):
-        """What an earlier run compiled of the same texts is taken again."""
+        """Compiles it, unless an earlier run did so from the same texts."""
         target = self.folder / f"{digest(source, *flags)[:16]}.o"
         stamp = target.with_suffix(".stamp")
         path = str(ROOT / source) if source.startswith("tests/") else source
@@ -210,7 +210,7 @@ class Bench:
         self.lock = threading.RLock()
 
     def sources(self, program):
-        """What the finding depends on besides the target."""
+        """What the finding depends on apart from the target."""
         names = {name for source in program.sources for name in self.needs(program, source)}
         return digest(repr(program), *((ROOT / name).read_text(encoding="utf-8")
                                        for name in sorted(names) if name.startswith("tests/")))

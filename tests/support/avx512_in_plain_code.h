@@ -75,7 +75,7 @@ inline Vector filled_with(const T number) noexcept {
     return vector_of<Vector, T>(lanes);
 }
 
-// Above the half, where the instruction leaves anything, is what no test takes for the right thing.
+// Above the half, where the instruction leaves anything, is what no test accepts as right.
 template <typename Vector, typename Half>
 inline Vector with_anything_above(const Half& half) noexcept {
     auto vector = filled_with<Vector, unsigned char>(0xa5);

@@ -1,4 +1,4 @@
-// What a child process comes to.
+// How a child process ends.
 
 #pragma once
 

@@ -1,4 +1,4 @@
-// Random numbers that are hard to compare, for tests, fuzzers and whoever else draws elements.
+// Random numbers that are hard to compare, for tests, fuzzers and all else that draws elements.
 
 #pragma once
 

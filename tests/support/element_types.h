@@ -100,7 +100,7 @@ inline Values usual_and(const ElementType& type1, const ElementType& type2, cons
     return second_holds_it ? Values{usual, other} : Values{other, usual};
 }
 
-// 3 and a real that is near it; beside each other, integers have none.
+// 3 and a real that is near it. No two integers are near each other.
 inline Values near_threes(const ElementType& type1, const ElementType& type2) {
     const bool doubles = compared_digits(type1, type2) == std::numeric_limits<double>::digits;
     return usual_and(type1, type2, 3, doubles ? 3 + 0x1p-44 : 3 + 0x1p-15);

@@ -4,9 +4,9 @@
 
 #include <cstddef>
 
-// An emulator takes twenty times as long, and a build that is not optimised about as long. There
-// only every so many-th step is made of loops that are the same code on every platform and run in
-// full on this machine's.
+// An emulator takes twenty times as long, and so does a build that is not optimised. There, of
+// loops that are the same code on every platform and run in full on this machine's, only every
+// eighth step is made.
 #if defined(TALNUMERICARRAY_EMULATED) || !defined(__OPTIMIZE__)
 inline constexpr std::size_t emulated_stride = 8;
 #else

@@ -1,5 +1,5 @@
-// What a program can ask of floating-point arithmetic: a direction of rounding, and subnormal
-// numbers taken for zero.
+// What a program can ask of floating-point arithmetic: a direction of rounding, and to treat
+// subnormal numbers as zero.
 
 #pragma once
 

@@ -1,5 +1,6 @@
 #include "golden_calls.h"
 
+#include "array_record.h"
 #include "element_types.h"
 #include "oracle.h"
 #include "random_arrays.h"
@@ -55,15 +56,7 @@ class Elements {
     int type_id() const { return type_->id; }
     void* data() { return bytes_.data(); }
 
-    st_TalDataArray record() {
-        st_TalDataArray result = {};
-        result.dims = &count_;
-        result.rank = 1;
-        result.data_type = type_->id;
-        result.nelems = count_;
-        result.data = bytes_.data();
-        return result;
-    }
+    st_TalDataArray record() { return record_of(type_->id, bytes_.data(), count_); }
 
     oracle::Array for_oracle() const { return {type_->id, {count_}, count_, bytes_.data()}; }
 

@@ -6,7 +6,7 @@
 //   DIGEST ANSWERS
 //
 // The digest is that of the calls: it differs if a platform draws others. Each hexadecimal digit of
-// the answers stands for four calls, its highest bit for the first; a bit is set if the arrays are
+// the answers is for four calls, its highest bit for the first; a bit is set if the arrays are
 // the same.
 
 #pragma once

@@ -15,7 +15,7 @@ namespace exactness {
 
 // ---- Tolerances
 
-// By what the rule makes of them. `last_digit` lies between `digits` - 1 and `digits`, `fractional`
+// By what the rule makes of them. `last_digit` is between `digits` - 1 and `digits`, `fractional`
 // below.
 enum class Kind { none, whole, fractional, last_digit, all };
 
@@ -136,7 +136,7 @@ std::pair<T, T> pair_at_limit(oracle::Random& random, const T magnitude, const T
     }
 }
 
-// Differs from the magnitude by up to twice the limit, or is another number altogether.
+// Differs from the magnitude by up to twice the limit, or is any other number.
 template <typename T>
 T random_partner(oracle::Random& random, const T magnitude, const T share) {
     if (random.one_in(8)) {

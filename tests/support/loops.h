@@ -36,7 +36,7 @@ void remember(const Remembered& factors);
 // Those of one tolerance, or of none.
 Remembered factors_of(double tol);
 
-// The factor where reals of so many digits are compared.
+// The factor where reals of that many digits are compared.
 double factor_of_reals(int digits, const Remembered& factors);
 
 bool same_factors(const Remembered& factors1, const Remembered& factors2);

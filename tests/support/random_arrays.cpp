@@ -62,7 +62,7 @@ Integer fitted(Integer value, Part part) {
     return {negative, value.magnitude};
 }
 
-// Lies midway between two reals of that many digits.
+// Midway between two reals of that many digits.
 std::uint64_t random_tie(Draws& draws, int digits) {
     const std::uint64_t leading = std::uint64_t{1} << digits;
     const std::uint64_t tie = (draws.bits() >> (63 - digits)) | leading | 1;
@@ -253,7 +253,7 @@ class PairWriter {
         }
     }
 
-    // Beside a large difference the partner is small and its last place is too fine to matter, so
+    // With a large difference the partner is small and its last place is too fine to matter, so
     // that the difference is nudged as well.
     template <typename Real>
     Real limit_partner(const Real anchor) {

@@ -1,5 +1,5 @@
 // Random tolerances and pairs of arrays that are hard to compare: most positions hold the same
-// number, and the others lie within a few units of the last place of the limit.
+// number, and the others are within a few units of the last place of the limit.
 
 #pragma once
 

@@ -112,7 +112,7 @@ inline Tally survey_rounded_tolerances(oracle::Random& random, const double low,
 
 // ---- Integers
 
-// Of more than `digits` digits: half of them near the middle of two reals of so many digits.
+// Of more than `digits` digits: half of them near the middle of two reals of that many digits.
 inline std::uint64_t random_long_integer(oracle::Random& random, const int digits,
                                          const int most_digits) {
     const int length = random.between(digits + 1, most_digits);

@@ -116,7 +116,7 @@ inline std::vector<ExampleOfElements> examples_of_elements() {
     constexpr float single_nan = std::numeric_limits<float>::quiet_NaN();
     constexpr UBIT64 largest = std::numeric_limits<UBIT64>::max();
     const std::vector<double> all(std::begin(every_tolerance), std::end(every_tolerance));
-    // Rounded by way of a double it would lie midway between two singles and go to the even one.
+    // Rounded by way of a double it would be midway between two singles and go to the even one.
     constexpr BIT64 above_midway = (BIT64{1} << 60) + (BIT64{1} << 36) + 1;
     return {
         // Integers, by value.
@@ -172,7 +172,7 @@ inline std::vector<ExampleOfElements> examples_of_elements() {
         {{0, 20}, 0.1F, 0.1, false},
         {{30}, 0.1F, 0.1, true},
 
-        // A complex number beside another, whose imaginary part must be zero.
+        // A complex number and another, whose imaginary part must be zero.
         {all, BIT8{5}, C64(5, 0), true},
         {all, BIT8{5}, C64(5, -0.0), true},
         {all, BIT8{5}, C64(5, 1e-300), false},
