@@ -2,8 +2,8 @@
 """Turns what the benchmarks wrote into tables and pictures: report.py [--arm] RESULTS DOCUMENTS.
 
 Reads the files of JSON in the folder RESULTS, writes pictures into the folder DOCUMENTS, renews what
-is between marks in its performance.md, and prints each bar with what was measured. With --arm it
-does so with the instructions on 32-bit ARM, and without with all else.
+is between marks in its performance.md, and prints each bar with what was measured. With --arm these
+are the instructions on 32-bit ARM, and without it all else.
 """
 
 import json
@@ -103,7 +103,7 @@ def where(row):
 
 
 def check_pairs(pairs, workload, place):
-    """All that have a loop, or, where near, all but those of integers."""
+    """All that have a loop or, where near, all except those of integers."""
     expected = 144 - 8 * 8 if workload.startswith("near") else 144 - 8
     if len(set(pairs)) != expected:
         sys.exit(f"report: {place}, {workload}: {len(set(pairs))} pairs instead of {expected}")
@@ -115,30 +115,25 @@ class Loops:
     def __init__(self, results):
         self.compiler = results["compiler"].replace("GNU", "GCC")
         self.instruction_set = results["instruction_set"]
-        self.ratios = defaultdict(dict)  # by size and workload, then by pair
+        self.sizes = list(dict.fromkeys(row["size"] for row in results["rows"]))
+        # By size and workload, then by pair.
+        self.ratios = {(size, workload): {} for size in self.sizes for workload in WORKLOADS}
         for row in results["rows"]:
             ratio = row["sameQ"] / row["memcmp"]
             self.ratios[row["size"], row["workload"]][pair_of(row)] = ratio
-        self.sizes = list(dict.fromkeys(size for size, _ in self.ratios))
-        self.ratios = {
-            (size, workload): self.ratios[size, workload]
-            for size in self.sizes
-            for workload in WORKLOADS
-        }
         for (size, workload), ratios in self.ratios.items():
             check_pairs(ratios, workload, size)
         self.types = types_of(results["rows"])
 
     def worst_workload(self, size, pair):
         """The ratio and the workload."""
-        ratios = ((self.ratios[size, w].get(pair, 0), w) for w in WORKLOADS)
-        return max(ratios)
+        return max((self.ratios[size, w].get(pair, 0), w) for w in WORKLOADS)
 
     def pairs(self, size):
         return list(self.ratios[size, "identical"])
 
     def all_pairs(self, size, workload):
-        """With the integers, which know no tolerance, as they are when identical."""
+        """With the integers, which have no tolerance, as they are when identical."""
         return {**self.ratios[size, "identical"], **self.ratios[size, workload]}
 
     def fractional(self, size):
@@ -221,6 +216,12 @@ class Measured:
         return f"{'at least' if self.at_least else 'at most'} {self.bar:g}"
 
 
+def worst_of(name, by_pair, bar):
+    """The greatest value of all pairs of types."""
+    worst = max(by_pair, key=by_pair.get)
+    return Measured(f"{name}, worst ({pair_text(worst)})", by_pair[worst], bar)
+
+
 def bars_of_short_calls(short, instruction_set):
     for contender in ("user", "user_native"):
         name = CONTENDERS[contender]
@@ -253,11 +254,10 @@ def bars_of_long_calls(loops):
     has_bars = loops.instruction_set == "AVX-512"
     for (size, workload), ratios in loops.ratios.items():
         all_mean = mean(loops.all_pairs(size, workload).values())
-        worst = max(ratios, key=ratios.get)
         name = f"{spaced(size)}, {WORKLOADS[workload]}, to memcmp"
         bars = MEMCMP_BARS.get((size, workload), {}) if has_bars else {}
         yield Measured(f"{name}, mean", all_mean, bars.get("mean"))
-        yield Measured(f"{name}, worst ({pair_text(worst)})", ratios[worst], bars.get("worst"))
+        yield worst_of(name, ratios, bars.get("worst"))
     near = loops.ratios["32KiB", "near"]
     of_reals = [ratio for pair, ratio in near.items() if set(pair) <= set(REALS)]
     yield Measured("32 KiB, near, to memcmp, mean of the pairs of reals and complex numbers",
@@ -265,10 +265,8 @@ def bars_of_long_calls(loops):
     yield Measured("32 KiB, near, to memcmp, float64", near["float64", "float64"],
                    MEMCMP_BAR_OF_DOUBLES if has_bars else None)
     for size in loops.sizes:
-        ratios = loops.fractional(size)
-        worst = max(ratios, key=ratios.get)
-        yield Measured(f"{spaced(size)}, fractional to whole tolerance, worst ({pair_text(worst)})",
-                       ratios[worst], FRACTIONAL_BAR)
+        yield worst_of(f"{spaced(size)}, fractional to whole tolerance", loops.fractional(size),
+                       FRACTIONAL_BAR)
 
 
 def bars_of_peers(peers):
@@ -447,9 +445,7 @@ def arm_table(arm):
 
 def bars_of_arm(arm):
     for build in ("VFP", "NEON"):
-        near = arm.counts[build, "near"]
-        worst = max(near, key=near.get)
-        yield Measured(f"{build}, near, worst ({pair_text(worst)})", near[worst], ARM_NEAR_BAR)
+        yield worst_of(f"{build}, near", arm.counts[build, "near"], ARM_NEAR_BAR)
     yield Measured("divisions a pair, worst",
                    max(row["divisions_a_pair"] for row in arm.results["rows"]), 0)
     for (build, name), bar in ARM_IDENTICAL_BARS.items():
@@ -468,20 +464,16 @@ def bars_of_arm(arm):
 # ---- The documents
 
 
-def renew(text, block, content):
-    """`text` with `content` between the marks of `block`."""
-    begin, end = f"<!-- measured: {block} -->\n", "<!-- end -->"
-    head, mark, tail = text.partition(begin)
-    if not mark or end not in tail:
-        sys.exit(f"report: no marks for {block} in performance.md")
-    return f"{head}{begin}{content}{tail[tail.index(end):]}"
-
-
 def renew_blocks(documents, blocks):
+    """Replaces what is between the marks of each block."""
     document = documents / "performance.md"
     text = document.read_text(encoding="utf-8")
     for block, content in blocks.items():
-        text = renew(text, block, content)
+        head, mark, tail = text.partition(f"<!-- measured: {block} -->\n")
+        _, end, rest = tail.partition("<!-- end -->")
+        if not mark or not end:
+            sys.exit(f"report: no marks for {block} in performance.md")
+        text = "".join((head, mark, content, end, rest))
     document.write_text(text, encoding="utf-8")
 
 

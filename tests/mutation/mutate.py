@@ -174,11 +174,12 @@ def table(target, outcomes):
 
 
 def renew_document(target, outcomes):
-    begin, end = f"<!-- measured: {target.mark} -->\n", "<!-- end -->"
-    head, mark, tail = DOCUMENT.read_text(encoding="utf-8").partition(begin)
-    if not mark or end not in tail:
+    text = DOCUMENT.read_text(encoding="utf-8")
+    head, mark, tail = text.partition(f"<!-- measured: {target.mark} -->\n")
+    _, end, rest = tail.partition("<!-- end -->")
+    if not mark or not end:
         sys.exit(f"mutate: no marks for the {target.mark} in docs/testing.md")
-    text = f"{head}{begin}{table(target, outcomes)}{tail[tail.index(end):]}"
+    text = "".join((head, mark, table(target, outcomes), end, rest))
     DOCUMENT.write_text(text, encoding="utf-8")
 
 

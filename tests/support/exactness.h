@@ -32,6 +32,9 @@ class QuickRule {
         : tolerance_(tolerance), digits_(digits), bounded_(tolerance > 0 && tolerance < digits),
           factor_(bounded_ ? static_cast<Wide>(exact_rule::factor(tolerance, digits)) : 0) {}
 
+    // 0 where the tolerance has none.
+    double factor() const { return static_cast<double>(factor_); }
+
     template <typename X, typename Y>
     bool same(const X x, const Y y) const {
         if constexpr (holds<X> && holds<Y>) {
@@ -164,10 +167,7 @@ class Survey {
   public:
     Survey(const double tolerance, const Factor factor)
         : tolerance_(tolerance), given_(static_cast<T>(tolerance)), kind_(kind_of(given_)),
-          factor_(factor), meaning_(tolerance, digits),
-          limit_(tolerance > 0 && tolerance < digits
-                     ? static_cast<double>(exact_rule::factor(tolerance, digits))
-                     : 0) {}
+          factor_(factor), meaning_(tolerance, digits), limit_(meaning_.factor()) {}
 
     double limit() const { return limit_; }
 

@@ -155,15 +155,20 @@ std::pair<T, T> with_random_order_and_sign(oracle::Random& random, std::pair<T, 
     return random.one_in(2) ? std::pair<T, T>{-pair.first, -pair.second} : pair;
 }
 
-// Two reals, no NaN.
+// Two reals, no NaN. One has the magnitude; at the limit they are at most so many ulps off it.
 template <typename T>
-std::pair<T, T> random_pair(oracle::Random& random, const Place place, const T share) {
-    const T magnitude = random_finite_magnitude<T>(random);
+std::pair<T, T> random_pair(oracle::Random& random, const Place place, const T share,
+                            const T magnitude, const int most_ulps) {
     const std::pair<T, T> pair =
         place == Place::at_limit
-            ? pair_at_limit(random, magnitude, share, 3)
+            ? pair_at_limit(random, magnitude, share, most_ulps)
             : std::pair<T, T>{magnitude, random_partner(random, magnitude, share)};
     return with_random_order_and_sign(random, pair);
+}
+
+template <typename T>
+std::pair<T, T> random_pair(oracle::Random& random, const Place place, const T share) {
+    return random_pair(random, place, share, random_finite_magnitude<T>(random), 3);
 }
 
 } // namespace exactness

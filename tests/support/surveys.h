@@ -90,13 +90,9 @@ Tallies survey_reals(oracle::Random& random, const Kind kind, const Factor facto
 // as a rounded tolerance moves it.
 inline std::pair<float, float> pair_under_rounded_tolerance(oracle::Random& random,
                                                             const Place place, const float share) {
-    constexpr int ulps = 12;
     const auto significand = static_cast<float>(1 + random.unit());
     const float magnitude = std::ldexp(significand, random.between(-60, 60));
-    return with_random_order_and_sign(
-        random, place == Place::random
-                    ? std::pair<float, float>{magnitude, random_partner(random, magnitude, share)}
-                    : pair_at_limit(random, magnitude, share, ulps));
+    return random_pair(random, place, share, magnitude, 12);
 }
 
 inline Tally survey_rounded_tolerances(oracle::Random& random, const double low, const double high,
