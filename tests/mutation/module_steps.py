@@ -131,7 +131,8 @@ class Tree(steps.Tree):
     folders = includes = FOLDERS
 
     def sees(self, source):
-        return True  # as what does not is taken from the copy without a mutant anyway
+        """So they do: a program's other sources are compiled in the copy without a mutant alone."""
+        return True
 
     def _options(self, source, flags):
         if source.startswith("tests/"):
