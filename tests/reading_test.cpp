@@ -213,6 +213,33 @@ TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
     EXPECT_EQ(pairs_with_a_loop, 136);
 }
 
+// Sevens everywhere, except for one eight: an element that is taken from another place is a seven.
+TEST(Reading, FindsEachElementOfShortArraysAcrossPages) {
+    constexpr talint longest = 16;
+    constexpr std::size_t in_page = page / sizeof(float);
+    alignas(page) static float memory1[2 * in_page];
+    alignas(page) static float memory2[2 * in_page];
+    std::fill(std::begin(memory1), std::end(memory1), 7.0F);
+    std::fill(std::begin(memory2), std::end(memory2), 7.0F);
+    const ElementType& type = element_types[REAL32_TYPE - 1];
+    for (talint count = 2; count <= longest; ++count) {
+        for (talint before_edge = 0; before_edge <= count; ++before_edge) {
+            float* const across = memory1 + in_page - before_edge;
+            float* const within = memory2 + in_page / 2;
+            auto record1 = record_of(type, across, &count);
+            auto record2 = record_of(type, within, &count);
+            for (talint position = 0; position < count; ++position) {
+                within[position] = 8;
+                EXPECT_EQ(TalNumericArray_sameQ(10, 1, &record1, &record2), 0)
+                    << position << " of " << count << ", " << before_edge << " before the edge";
+                EXPECT_EQ(TalNumericArray_sameQ(10, 1, &record2, &record1), 0)
+                    << position << " of " << count << ", " << before_edge << " before the edge";
+                within[position] = 7;
+            }
+        }
+    }
+}
+
 // Records, dimensions and elements, all in memory that cannot be written.
 TEST(Reading, WritesNothing) {
     constexpr talint count = 40;
