@@ -226,8 +226,8 @@ TEST(Reading, FindsEachElementOfShortArraysAcrossPages) {
         for (talint before_edge = 0; before_edge <= count; ++before_edge) {
             float* const across = memory1 + in_page - before_edge;
             float* const within = memory2 + in_page / 2;
-            auto record1 = record_of(type, across, &count);
-            auto record2 = record_of(type, within, &count);
+            auto record1 = record_of(type.id, across, count);
+            auto record2 = record_of(type.id, within, count);
             for (talint position = 0; position < count; ++position) {
                 within[position] = 8;
                 EXPECT_EQ(TalNumericArray_sameQ(10, 1, &record1, &record2), 0)
