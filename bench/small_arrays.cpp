@@ -157,7 +157,7 @@ void measure(const Lengths& all_lengths, const Contents contents, const char* co
 template <typename T1, typename T2>
 void measure_lengths(const Contents contents, const char* const workload, const Effort& effort,
                      JsonRows& rows) {
-    constexpr int bits =
+    static constexpr int bits =
         std::numeric_limits<type_common_t<to_real_type_t<T1>, to_real_type_t<T2>>>::digits;
     measure<T1, T2>(
         lengths, contents, workload, effort, {"library", "user", "user_native"},

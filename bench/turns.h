@@ -74,6 +74,7 @@ inline bool is_quick(const int count, char** const arguments) {
     const bool quick = count == 2 && std::strcmp(arguments[1], "--quick") == 0;
     if (count > 1 && !quick) {
         std::fprintf(stderr, "usage: %s [--quick]\n", arguments[0]);
+        // NOLINTNEXTLINE(concurrency-mt-unsafe): no other thread runs yet
         std::exit(2);
     }
     return quick;

@@ -37,7 +37,7 @@ class Array {
   private:
     std::vector<talint> dimensions_;
     std::vector<T> elements_;
-    st_TalDataArray record_;
+    st_TalDataArray record_{};
 };
 
 // Rank 1, of a type that is chosen at run time.

@@ -64,7 +64,7 @@ TEST(Questions, AreFewAboutOnePlace) {
 } // namespace
 
 int counted_answer(const talreal tolerance, const int compare_different_types,
-                   const TalNumericArray first, const TalNumericArray second) {
+                   TalNumericArray first, TalNumericArray second) {
     ++questions;
     return module_answer(tolerance, compare_different_types, first, second);
 }
