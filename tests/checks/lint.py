@@ -78,11 +78,14 @@ def without(text, included):
 
 def put_together(group):
     """The lines. A source without a namespace that has a name is given one of its own, so that
-    different things in different sources may have the same name."""
+    different things in different sources may have the same name. Not one with a header: what the
+    header declares would be declared twice."""
     included = set()
     for number, source in enumerate(group):
         lines = list(without(source.text(), included))
-        if "namespace {" in lines and not any(re.match(r"namespace \w", line) for line in lines):
+        has_namespace = any(re.match(r"namespace \w", line) for line in lines)
+        has_header = source.path.with_suffix(".h").exists()
+        if "namespace {" in lines and not has_namespace and not has_header:
             lines.insert(lines.index("namespace {"), f"namespace source{number} {{")
             lines.append("}")
         yield from lines

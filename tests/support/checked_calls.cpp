@@ -120,7 +120,7 @@ std::string described(const State& state, Call& call) {
     return text.str() + described("first", call.first) + described("second", call.second);
 }
 
-bool is_known(int type_id) {
+bool is_tallied(int type_id) {
     return type_id >= 1 && type_id <= 12;
 }
 
@@ -129,7 +129,7 @@ void count(Tally& tally, const Call& call, bool answer) {
     const int second = call.second.array().type_id;
     ++tally.calls;
     tally.same += answer ? 1 : 0;
-    if (is_known(first) && is_known(second)) {
+    if (is_tallied(first) && is_tallied(second)) {
         tally.answered[answer ? 1 : 0][first - 1][second - 1] = true;
     }
 }

@@ -27,13 +27,13 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr std::uint64_t length = 100000;
+constexpr std::uint64_t numbers = 100000;
 
 // The numbers 0, 1, 2, ... as bytes, which can be read only once.
 class ByteNumbers : public TypedArray<std::uint8_t> {
   public:
     explicit ByteNumbers(std::uint64_t& checked)
-        : TypedArray({length}, Order::c, Access::once), checked_(checked) {}
+        : TypedArray({numbers}, Order::c, Access::once), checked_(checked) {}
 
     void read(const std::uint64_t first, const std::uint64_t count, void* elements) override {
         EXPECT_EQ(first, next_);
@@ -87,8 +87,8 @@ class TemporaryCopies : public testing::Test {
 
 TEST_F(TemporaryCopies, AreReadInAnyOrderAndLeaveNoFile) {
     auto copy = take();
-    EXPECT_EQ(copied(), length);
-    EXPECT_EQ(checked(), length);
+    EXPECT_EQ(copied(), numbers);
+    EXPECT_EQ(checked(), numbers);
     EXPECT_TRUE(fs::is_empty(folder_name()));
     for (const unsigned first : {99990U, 0U, 16380U}) {
         std::vector<std::uint8_t> elements(10);
