@@ -43,8 +43,8 @@ struct Filling {
     std::vector<double> same_under;
 };
 
-// Threes, and threes beside numbers that are near three. Beside complex numbers zeros too, as many
-// of which as there are parts would be the same as these.
+// Threes, and threes beside numbers that are near three. With complex numbers zeros too: their parts
+// would be the same if there were too many, or if they were taken for parts of the other type.
 std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2) {
     if (type1.is_integer && type2.is_integer) {
         return {{3, 3, {0.0, 10.0}}};
@@ -52,7 +52,7 @@ std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2
     const auto [near1, near2] = near_threes(type1, type2);
     std::vector<Filling> chosen = {{3, 3, {std::begin(tolerances), std::end(tolerances)}},
                                    {near1, near2, {10, 10.5, 53}}};
-    if (type1.is_complex() != type2.is_complex()) {
+    if (type1.is_complex() || type2.is_complex()) {
         chosen.push_back({0, 0, {0.0, 10.0}});
     }
     return chosen;
