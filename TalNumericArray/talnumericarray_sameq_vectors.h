@@ -108,8 +108,8 @@ class DoubtsAboutIntegers {
     void add(equality /*bound*/, const vector<T, lanes>& x, const vector<T, lanes>& y) noexcept {
         bits_ |= reinterpret_cast<Bits>(x) ^ reinterpret_cast<Bits>(y);
         // Equal bits are different numbers if one is negative and the other unsigned and as wide.
-        if constexpr (std::is_signed_v<
-                          T1> != std::is_signed_v<T2> && sizeof(Unsigned) == sizeof(T)) {
+        constexpr bool one_is_signed = std::is_signed_v<T1> != std::is_signed_v<T2>;
+        if constexpr (one_is_signed && sizeof(Unsigned) == sizeof(T)) {
             constexpr Lane sign = static_cast<Lane>(Lane{1} << (8 * sizeof(Lane) - 1));
             bits_ |= reinterpret_cast<Bits>(x) & sign;
         }
