@@ -5,9 +5,9 @@
 
 #include <cstddef>
 
-// Bytes per element, indexed by `TalNumericArrayTypeId`. Entry 0 (`UNINITIALIZED_TYPE`) is for no
-// element type and must not be relied on. The runtime defines the table; the library has a
-// definition for programs without one.
+// Bytes per element, indexed by `TalNumericArrayTypeId`. Entry 0 (`UNINITIALIZED_TYPE`)
+// belongs to no element type and must not be relied on. The runtime defines the table; the library
+// has a definition for programs without one.
 extern const std::size_t TalNumericArray_typeSizeTable[13];
 
 #endif

@@ -9,16 +9,15 @@
 // For both functions:
 //
 // - They only read the records and what these point to, and take no reference. The caller keeps
-// them
-//   alive and unchanged during a call. Any number of threads may compare the same records at once.
+//   these alive and unchanged during a call. Any number of threads may compare the same records at
+//   once.
 // - They do not allocate, throw, lock, log or make system calls. Compiled with optimisation, they
 //   take at most 2 KiB of stack, including what they call in the C library.
 // - A signal handler may interrupt a call anywhere, call either function, and leave the interrupted
 //   call for good. A child process may call them after a fork.
 // - They are for the library or program that links them in. A shared object does not export them.
-// - They check nothing but what is said below. A null handle, a negative rank, and a null `dims`
-// with
-//   a rank above 0 are undefined behaviour.
+// - They check only what is stated below. A null handle, a negative rank, and a null `dims` with a
+//   rank above 0 are undefined behaviour.
 
 #ifndef TALNUMERICARRAY_COMPARE_H
 #define TALNUMERICARRAY_COMPARE_H

@@ -129,6 +129,7 @@ inline constexpr std::size_t vector_bytes = 64;
 struct avx512 : for_avx512::loops {
     static constexpr const char* name = "AVX-512";
 
+    // Every processor with AVX-512 has FMA.
     static bool supported() noexcept {
         return static_cast<bool>(__builtin_cpu_supports("avx512f"))
                && static_cast<bool>(__builtin_cpu_supports("avx512bw"))

@@ -3,7 +3,9 @@
 //
 // Each instruction set includes this once, in a namespace and for a target of its own, so the sets
 // share no templates. Before that it defines `vector_bytes`, the length of its longest vectors, and
-// `operations` on those and on vectors of half that length.
+// `operations<bytes>` on those and on vectors of half that length. `talnumericarray_sse2.h`
+// describes the operations. A set whose comparisons give masks has, instead of `all_ones`,
+// `if_equal` and `if_at_least`, as in `talnumericarray_avx512.h`.
 
 // The operations on a vector for `lanes` of `T`.
 template <typename T, std::size_t lanes>

@@ -125,7 +125,7 @@ inline talint certain_prefix(const talreal& tol, const T1* data1, const T2* data
 
 NESK_STRICT_SINGLES_BEGIN
 
-// The element test alone. A `len` below 1 is no elements.
+// The element test alone. A `len` below 1 means no elements.
 template <typename T1, typename T2>
 inline int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                       const talint len) noexcept {

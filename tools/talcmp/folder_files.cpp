@@ -30,7 +30,7 @@ bool is_called_like_an_array(const fs::path& path) {
     return extension == ".npy" || extension == ".npz";
 }
 
-// Otherwise something is there, if only a link that leads nowhere.
+// Whether nothing has this name; a link that leads nowhere is something.
 bool is_gone(const fs::path& path) {
     std::error_code ignored;
     return fs::symlink_status(path, ignored).type() == fs::file_type::not_found;

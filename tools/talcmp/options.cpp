@@ -14,7 +14,7 @@ bool begins_with(const std::string& text, const std::string& beginning) {
     return text.compare(0, beginning.size(), beginning) == 0;
 }
 
-// ---- What to say of an option that there is not
+// ---- What to say about an unknown option
 
 // How many characters have to be changed, put in or left out to make one word of the other.
 std::size_t distance(const std::string& one, const std::string& other) {

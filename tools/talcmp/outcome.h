@@ -1,4 +1,4 @@
-// What comes of the operands: of each two arrays that belong together, and altogether.
+// The outcome for each two arrays that belong together, and the totals.
 
 #pragma once
 
@@ -12,8 +12,9 @@ namespace talcmp {
 struct Outcome {
     enum class Kind { same, different, only_in_first, only_in_second, trouble };
     Kind kind = Kind::same;
-    std::string first;     // what the arrays are called; of one that has no counterpart, where that
-    std::string second;    // would be
+    // What the two arrays are called. Where one has no counterpart: where that would be.
+    std::string first;
+    std::string second;
     std::string name;      // of an array that has no counterpart, in a folder or an archive
     Comparison comparison; // where the kind is same or different
     std::string message;   // where there was trouble

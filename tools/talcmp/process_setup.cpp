@@ -13,8 +13,7 @@ void open_if_closed(const int standard) {
     if (::fcntl(standard, F_GETFD) >= 0) {
         return;
     }
-    // It gets the lowest number that is free. A place that is opened as such can neither be read
-    // nor written.
+    // open() takes the lowest free number. A descriptor of O_PATH can be neither read nor written.
     if (::open("/", O_PATH) != standard) {
         throw_system_trouble("standard descriptor " + std::to_string(standard), "cannot be opened");
     }

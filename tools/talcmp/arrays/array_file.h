@@ -10,8 +10,8 @@
 
 namespace talcmp {
 
-// A file with one array or several. A format is a class that implements this, and a line in
-// `formats` in array_file.cpp.
+// A file with one array or several. A format is a class that implements this, and a line of
+// `formats` in array_file.cpp, before the last one, which takes every file.
 class ArrayFile {
   public:
     ArrayFile() = default;
@@ -25,7 +25,7 @@ class ArrayFile {
     // The names of the arrays, each once; one empty name where they have none.
     virtual std::vector<std::string> members() const = 0;
 
-    // Opens an array, once each. Throws Trouble.
+    // Opens an array. Each may be opened only once. Throws Trouble.
     virtual std::unique_ptr<ArraySource> open(const std::string& member) = 0;
 };
 

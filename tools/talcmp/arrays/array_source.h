@@ -45,8 +45,8 @@ class ArraySource {
     // `elements`. Throws Trouble.
     virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
 
-    // Reads the rest, where only the end shows whether what was read is right. Until it has
-    // returned no answer can be trusted. Throws Trouble.
+    // Reads the rest, where only the end shows whether what was read is right. No answer can be
+    // trusted until this has returned. Throws Trouble.
     virtual void check_to_end() {}
 };
 

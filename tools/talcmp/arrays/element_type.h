@@ -4,6 +4,7 @@
 
 #include "taldata_array_element_types.h"
 
+#include <algorithm>
 #include <array>
 #include <cstddef>
 #include <string>
@@ -34,6 +35,14 @@ inline bool is_integer(const ElementType& type) {
 inline bool is_complex(const ElementType& type) {
     return type.kind == 'c';
 }
+
+template <typename... Types>
+constexpr std::size_t largest_size(type_list<Types...> /*types*/) {
+    return std::max({sizeof(Types)...});
+}
+
+// The size in bytes of the largest element type.
+inline constexpr std::size_t largest_element = largest_size(element_type_list{});
 
 // All element types, in the order of their ids.
 const std::array<ElementType, element_type_list::size>& element_types();

@@ -14,7 +14,7 @@
 
 namespace talcmp {
 
-// Otherwise boxes, and the pairs in them, are in row-major order.
+// Whether boxes, and the pairs in them, are in column-major order; if not, in row-major order.
 bool column_major(const ArraySource& first, const ArraySource& second);
 
 // What all boxes of a comparison have in common. It refers to what it is made of.

@@ -34,7 +34,7 @@ class BoxQueue {
         stopped_ = true;
     }
 
-    void lower_bound(const std::uint64_t bound) {
+    void lower_bound_to(const std::uint64_t bound) {
         std::uint64_t known = bound_;
         while (bound < known && !bound_.compare_exchange_weak(known, bound)) {
         }
@@ -66,7 +66,7 @@ void take_boxes(const BoxPlan& plan, BoxQueue& queue, BoxComparer& comparer,
         try {
             const Box box = plan.traversal().box(*number);
             if (!plan.is_beyond(box, queue.bound())) {
-                queue.lower_bound(comparer.compare(box));
+                queue.lower_bound_to(comparer.compare(box));
                 progress.advance(box.count * plan.bytes_of_pair());
             }
         } catch (...) {
@@ -75,8 +75,8 @@ void take_boxes(const BoxPlan& plan, BoxQueue& queue, BoxComparer& comparer,
     }
 }
 
-// Runs `action` on each number below `count`, that is in a thread of its own where the system has
-// one more; 0 is the calling thread.
+// Runs `action(0)` here and `action(1)`, `action(2)`, ... below `count` in new threads, as many as
+// the system can start.
 template <typename Action>
 void in_threads(const std::size_t count, const Action& action) {
     std::vector<std::thread> threads;

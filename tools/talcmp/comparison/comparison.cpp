@@ -90,14 +90,14 @@ void make_readable_in_any_order(NamedArray& array, ProgressListener& progress) {
     }
 }
 
-// Of the copy that is taken where elements can be read only once, and in another order than wanted.
+// The size of the copy of an array that can be read only once, and not in the order wanted.
 std::uint64_t bytes_to_copy(const Traversal& traversal, const ArraySource& source) {
     return traversal.is_linear() || source.random_access()
                ? 0
                : element_count(source) * source.type().size;
 }
 
-// What the comparison may take, to be said where there is not so much.
+// How much memory the comparison may need, for the message when there is not enough.
 std::string memory_text(const BoxPlan& plan, const std::string& other_name,
                         const unsigned threads) {
     const Traversal& traversal = plan.traversal();

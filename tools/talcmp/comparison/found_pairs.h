@@ -15,7 +15,7 @@
 namespace talcmp {
 
 // Room for an element of any type.
-using Element = std::array<unsigned char, 16>;
+using Element = std::array<unsigned char, largest_element>;
 
 // The values are kept, as an array may be readable only once.
 struct FoundPair {

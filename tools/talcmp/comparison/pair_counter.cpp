@@ -67,9 +67,9 @@ void PairCounter::add(const Pairs& pairs, const Numbering& number, const bool in
     add_worst(pairs, found, number, in_order, totals);
 }
 
-// Whether pairs of such a sameness are the same under the tolerance. No tolerance from 1 on takes a
-// sameness away that a smaller one grants; what is the same under none of them is under no smaller
-// one but 0.
+// Whether pairs of such a sameness are the same under the tolerance. A pair that is the same under
+// one tolerance from 1 on is the same under every larger one. A pair that is the same under none of
+// these can be the same only under 0.
 PairCounter::Answer PairCounter::answer_on(const Sameness sameness) const {
     if (tolerance_ == 0) {
         return sameness.at_zero() ? Answer::same : Answer::different;

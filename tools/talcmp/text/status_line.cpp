@@ -24,8 +24,8 @@ void write_to_terminal(const std::string_view text) {
     [[maybe_unused]] const ssize_t ignored = ::write(STDERR_FILENO, text.data(), text.size());
 }
 
-// Waits until no thread writes, and keeps all from it; not for long, as the terminal may have been
-// stopped. Returns whether that has come about.
+// Waits until no thread is writing, and keeps all from writing. Returns false if that takes too
+// long: the terminal may have been stopped.
 bool stop_writing() {
     constexpr int most_tries = 100;
     constexpr struct timespec millisecond = {0, 1000000};

@@ -59,7 +59,7 @@ void TextAnswers::print_difference(const Outcome& outcome) const {
 }
 
 void TextAnswers::finish(const Summary& summary) {
-    // Of the members of two archives, of which there may be none, on demand.
+    // For two archives, which may be empty, only with --verbose.
     const bool one = total(summary) == 1;
     if ((many_ || (command_line_.verbose && !one)) && !command_line_.quiet) {
         print_line(summary_text(summary));

@@ -5,8 +5,8 @@
 // and nothing is locked.
 //
 // A signal handler that compares may run between any two instructions of a comparison in its own
-// thread, and may leave that comparison for good. A tolerance is never taken together with the
-// factor of another one all the same:
+// thread, and may never return to it. Even so, a tolerance is never paired with the factor of
+// another one:
 //
 // - The cache has four slots. One word, `state`, which is read and written in one piece, says which
 //   slot is in use and whether it is being written. It also counts the writes, so it differs after
