@@ -22,7 +22,7 @@
 
 namespace {
 
-// Of this thread: those of allocating functions and of free. Volatile, as Clang takes it that new
+// Calls by this thread of allocating functions and of free. Volatile, as Clang assumes that new
 // leaves it alone.
 thread_local volatile int allocator_calls = 0;
 
@@ -30,7 +30,7 @@ thread_local volatile int allocator_calls = 0;
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 
-// Of the sanitizers, whose header Debian has with Clang alone.
+// From the sanitizers' header, which Debian has with Clang alone.
 extern "C" int __sanitizer_install_malloc_and_free_hooks(
     void (*allocated)(const volatile void* block, std::size_t size),
     void (*freed)(const volatile void* block));
@@ -48,8 +48,7 @@ const int hooks_installed = __sanitizer_install_malloc_and_free_hooks(
 
 #else
 
-// The names under which the C library has what is replaced.
-// NOLINTBEGIN(clang-diagnostic-reserved-identifier,readability-inconsistent-declaration-parameter-name)
+// The C library's own names for the functions that are replaced.
 extern "C" void* __libc_malloc(std::size_t size);
 extern "C" void* __libc_calloc(std::size_t count, std::size_t size);
 extern "C" void* __libc_realloc(void* block, std::size_t size);
@@ -104,7 +103,7 @@ int allocator_calls_of(const Body& body) {
     return allocator_calls - before;
 }
 
-// What a compiler may not leave out though nothing becomes of it.
+// Keeps allocations whose result is not used from being optimised away.
 void* volatile kept = nullptr;
 
 // NOLINTBEGIN(cppcoreguidelines-no-malloc,cppcoreguidelines-owning-memory)
@@ -158,7 +157,7 @@ BytesToStore load_runtime() {
                : reinterpret_cast<BytesToStore>(::dlsym(runtime, "small_runtime_bytes_to_store"));
 }
 
-// Two near numbers, so that a factor is remembered.
+// Compares two near numbers, so that a factor is remembered.
 void expect_no_allocation(const BytesToStore bytes_to_store) {
     const Array<double> one{1};
     const Array<double> near{1 + 0x1p-44};
@@ -168,7 +167,7 @@ void expect_no_allocation(const BytesToStore bytes_to_store) {
     EXPECT_EQ(bytes, 0U);
 }
 
-// Of a thread that was there before the shared object, and of one that was not.
+// In a thread that is older than the loaded shared object, and in a newer one.
 TEST(Allocations, AreMadeByNoFirstComparisonInALoadedSharedObject) {
     std::promise<BytesToStore> loaded;
     std::thread earlier([&loaded] {

@@ -1,4 +1,5 @@
-// Whether the program is compiled as it is meant to be: a product and a sum are one operation.
+// Whether the program is compiled as intended, with a product and a sum contracted into one
+// operation.
 
 #include <gtest/gtest.h>
 

@@ -1,5 +1,5 @@
-// Integers of 64 bits become the reals that a cast makes of them, where they are converted in
-// halves and where they are not.
+// Integers of 64 bits become the same reals as by a cast, whether they are converted in halves or
+// not.
 
 #include "talnumericarray_sameq_certainty.h"
 
@@ -15,7 +15,7 @@ void expect_cast(const std::uint64_t bits) {
     EXPECT_EQ(talnumericarray::by_halves<T>(number), static_cast<T>(number)) << number;
 }
 
-// Around every power of two, and what lies between them with both halves in use.
+// Numbers around every power of two, and numbers between these that use both halves.
 template <typename T, typename From>
 void expect_casts() {
     for (int power = 0; power < 64; ++power) {

@@ -1,4 +1,4 @@
-// A runtime that builds the module in: it brings a table of element sizes of its own.
+// A runtime that builds the module in and brings its own table of element sizes.
 
 #include "talnumericarray.h"
 #include "talnumericarray_compare.h"

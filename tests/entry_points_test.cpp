@@ -49,7 +49,7 @@ TEST(Shape, EqualShapesAndTypesAreEquivalentWhateverTheElements) {
     EXPECT_EQ(sameQ(0, array1, array2), 0);
 }
 
-// No array has such dimensions, but records of them differ by every bit all the same.
+// No array has such dimensions, but every bit of a record's dimensions counts.
 TEST(Shape, DimensionsThatDifferInTheSignAloneAreNeitherSameNorEquivalent) {
     constexpr talint sign = std::numeric_limits<talint>::min();
     for (const std::size_t place : {0U, 1U}) {
@@ -239,7 +239,7 @@ TEST(Count, OfZeroInTheFirstArrayIsEnough) {
     EXPECT_EQ(sameQ(0, array1, array2), 1);
 }
 
-// 65536 elements, which are none in 16 bits.
+// 65536 elements, which a count of 16 bits would take for none.
 TEST(Count, HasMoreThan16Bits) {
     constexpr std::size_t count = 65536;
     std::vector<BIT32> integers(count, 1);

@@ -1,5 +1,5 @@
 // The steps of the tolerant comparison against its meaning in exact arithmetic: worked examples of
-// the meaning, and how far from the limit the two may part.
+// the meaning, and how far from the limit the two may disagree.
 
 #include "compare.h"
 
@@ -90,7 +90,7 @@ TEST(ExactRule, HasTheWorkedAnswers) {
 
 // The fractions p/q that begin 1/1, 2/3, 5/7, 12/17 come as near to 1/sqrt(2) as fractions of their
 // size can, from above and from below in turn: q^2 - 2 p^2 is -1, 1, -1, 1. Under half a digit less
-// than all, numbers of which one is p/q of the other away are thus the same every other time.
+// than all, numbers that differ by p/q of the larger are thus the same every other time.
 TEST(ExactRule, TellsTheBestFractionsFromTheSquareRoot) {
     std::int64_t p = 1;
     std::int64_t q = 1;
@@ -168,7 +168,7 @@ TEST(StepsAndMeaning, PartInTheseExamples) {
     expect_to_part(partings_of_singles);
 }
 
-// What is rounded before it is compared.
+// The tolerance or a number is rounded before the comparison.
 TEST(StepsAndMeaning, PartWhereASingleIsTheCommonType) {
     EXPECT_FALSE(exact_rule::same(23.99999999, 24, 1.0, 1e30));
     EXPECT_EQ(sameQ_of(23.99999999, 1.0F, 1e30F), 1);
@@ -285,7 +285,7 @@ int sameQ(const double tolerance, const Columns<T>& columns) {
     return sameQ(tolerance, Array<T>({count}, columns.first), Array<T>({count}, columns.second));
 }
 
-// A pair that means the same under the tolerance, or one that does not.
+// A pair that by its meaning is the same under the tolerance, or one that is not.
 template <typename T>
 std::pair<T, T> pair_that_means(oracle::Random& random, const bool same, const double tolerance) {
     constexpr int digits = std::numeric_limits<T>::digits;
@@ -319,7 +319,7 @@ TEST(StepsAndMeaning, AgreeOverArraysUnderWholeTolerances) {
     expect_agreement_over_arrays<float>(random);
 }
 
-// So that what holds of the scalars, under every tolerance, holds of the predicate.
+// So that what holds for scalars under every tolerance holds for the predicate.
 template <typename T>
 void expect_arrays_to_follow_the_steps(oracle::Random& random, const Kind kind) {
     for (int i = 0; i < 5000; ++i) {
@@ -361,7 +361,7 @@ TEST(StepsAndMeaning, DifferAsFarAsTheToleranceOfSinglesIsRounded) {
     EXPECT_GT(rounded_up.laxer, 0U);
 }
 
-// An integer that equals a real keeps doing so, rounded; one that does not may begin to.
+// An integer that equals a real still does once it is rounded; one that does not may become equal.
 template <typename X, typename T>
 void expect_the_rounding_of_integers(oracle::Random& random) {
     for (const Kind kind : kinds) {

@@ -1,6 +1,6 @@
-// Prints tables of where the steps of the tolerant comparison and its meaning part. As many random
-// pairs as TALNUMERICARRAY_RANDOM_CALLS says, and a tenth of that at the limit, are dealt out to
-// the rows; TALNUMERICARRAY_SEED is the seed. Fails where the two part further from the limit than
+// Prints tables of where the steps of the tolerant comparison and its meaning disagree. The rows
+// share as many random pairs as TALNUMERICARRAY_RANDOM_CALLS says, and a tenth of that at the
+// limit; TALNUMERICARRAY_SEED is the seed. Fails where the two disagree further from the limit than
 // they may.
 
 #include "support/checked_calls.h"
@@ -34,9 +34,9 @@ using exactness::Tally;
 
 // ---- The extent of the run
 
-// The rows take equal parts: of two types of reals and, beside each, two of integers, under every
-// kind of tolerance with the factor remembered or forgotten; and of singles under tolerances in
-// ranges.
+// Every row gets an equal part of the pairs. There are rows for two types of reals and, beside
+// each, two of integers, under every kind of tolerance with the factor remembered or forgotten; and
+// rows for singles under tolerances in ranges.
 struct Range {
     const char* name;
     double low;
@@ -109,7 +109,7 @@ Row row_of(const Kind kind, const Factor factor) {
 
 // ---- Tables
 
-// A small number of units of 2^-digits is printed so, anything else as it is.
+// In units of 2^-digits if these are few, otherwise as a plain number.
 std::string distance(const std::uint64_t differing, const double furthest, const int digits) {
     if (differing == 0) {
         return "-";
@@ -212,7 +212,7 @@ std::vector<Row> survey_rounded_tolerances(oracle::Random& random, const std::ui
     return rows;
 }
 
-// In units of the factor's last place.
+// The error in units of the factor's last place.
 template <typename T>
 double error_of_factor(const T tolerance) {
     const long double exact = exact_rule::factor(tolerance, std::numeric_limits<T>::digits);

@@ -1,5 +1,5 @@
 // Integers of up to 16 bits: all values against all values. The suites whose names begin with
-// Exhaustive take up to a minute each, those of one type as they call memcmp 2^32 times.
+// Exhaustive take up to a minute each, those of one type because they call memcmp 2^32 times.
 
 #include "talnumericarray_compare.h"
 #include "talnumericarray_sameq_impl.h"

@@ -54,7 +54,7 @@ TEST(FloatingPointModes, AreKept) {
     }
 }
 
-// No comparison divides by zero; where there are no traps, none is set.
+// No comparison divides by zero. A processor without traps sets none.
 TEST(FloatingPointModes, AreKeptWithATrapSet) {
     const PreparedCalls prepared;
     ::feenableexcept(FE_DIVBYZERO);
@@ -84,10 +84,10 @@ TEST(StatusFlags, AreNeverCleared) {
     }
 }
 
-// Of so many elements in both arrays, the flags that a new thread's first comparison raises.
+// The flags that a new thread's first comparison raises, for arrays of `count` elements.
 using FlagsOf = std::function<int(std::size_t count)>;
 
-// Of two arrays of one value each.
+// The flags for two arrays that hold one value each.
 template <typename T1, typename T2>
 FlagsOf flags_of(const double tol, const T1 value1, const T2 value2) {
     return [=](const std::size_t count) {
@@ -103,8 +103,7 @@ FlagsOf flags_of(const double tol, const T1 value1, const T2 value2) {
     };
 }
 
-// Clang compares by instructions that find nothing invalid in a NaN, unless it makes vectors of
-// them.
+// Clang's comparison instructions find nothing invalid in a NaN, except in code that it vectorises.
 #if defined(__clang__)
 constexpr int invalid_of_nan = 0;
 #else

@@ -13,7 +13,7 @@
 
 namespace {
 
-// Compare in two threads for as long as it lives.
+// Two threads that compare for as long as it lives.
 class ComparingThreads {
   public:
     explicit ComparingThreads(const PreparedCalls& prepared) {
@@ -56,7 +56,7 @@ TEST(Fork, LeavesAChildThatCompares) {
     }
 }
 
-// Of numbers that differ by more than half the larger the answer shows what is remembered.
+// For numbers that differ by more than half the larger, the answer shows what is remembered.
 class WhatIsRemembered {
   public:
     bool is_the_factor() const noexcept { return answer(one_, far_) == 1; }

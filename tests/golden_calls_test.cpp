@@ -1,4 +1,4 @@
-// The recorded calls, answered here.
+// The recorded calls, answered on this platform.
 
 #include "support/arrays.h"
 #include "support/golden_calls.h"
@@ -24,7 +24,7 @@ TEST(GoldenCalls, AreAnsweredAsOnThePlatformThatRecordedThem) {
     EXPECT_GT(tally.same, tally.calls / 5);
     EXPECT_LT(tally.same, tally.calls / 5 * 4);
     EXPECT_EQ(tally.pairs_of_types, 144U);
-    // glibc's pow rounds about one factor in a thousand otherwise.
+    // glibc's pow rounds about one factor in a thousand differently.
     EXPECT_LE(tally.factors_rounded_otherwise, tally.factors / 200);
 }
 

@@ -1,5 +1,5 @@
-// How often a comparison computes a factor, seen from the calls of the library's power functions,
-// which the linker hands to this file first.
+// How often a comparison computes a factor, counted by calls to the library's power functions,
+// which the linker redirects to this file.
 
 #include "support/arrays.h"
 #include "tolerance_shift_factor.h"
@@ -48,7 +48,7 @@ class PowerCalls : public testing::Test {
     void SetUp() override { forget_calls(); }
 };
 
-// A thousand pairs that differ in their last digits, and so need a factor each.
+// A thousand pairs that differ in their last digits, and so each need a factor.
 template <typename T>
 int compare_thousand(const talreal tol) {
     const std::vector<T> ones(1000, T(1));

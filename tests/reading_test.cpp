@@ -18,13 +18,13 @@
 
 namespace {
 
-// Tolerances that compare elements in every way there is.
+// Tolerances under which elements are compared in every possible way.
 constexpr double tolerances[] = {0.0, -1.0, 10.0, 10.5, 53.0};
 
 constexpr std::size_t page = 4096;
 constexpr std::size_t longest_block = 128;
 
-// `count` elements of one value that end `phase` bytes in front of the end of the memory. Returns
+// Writes `count` elements of one value that end `phase` bytes before the end of the memory. Returns
 // the end of the last one.
 unsigned char* fill_before_end(const ProtectedMemory& memory, const std::size_t phase,
                                const ElementType& type, const std::size_t count,
@@ -43,8 +43,8 @@ struct Filling {
     std::vector<double> same_under;
 };
 
-// Threes, and threes beside numbers that are near three. With complex numbers zeros too: their parts
-// would be the same if there were too many, or if they were taken for parts of the other type.
+// Threes, and threes beside numbers near three. With complex numbers zeros too: their parts would
+// still be the same if too many were read, or if they were taken for parts of the other type.
 std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2) {
     if (type1.is_integer && type2.is_integer) {
         return {{3, 3, {0.0, 10.0}}};
@@ -58,15 +58,15 @@ std::vector<Filling> fillings(const ElementType& type1, const ElementType& type2
     return chosen;
 }
 
-// How far after its last element an array's page may end: one of complex numbers need only be
-// aligned as its parts are, so that an element may lie in two pages.
+// How many bytes after its last element an array's page may end: complex numbers need only be
+// aligned as their parts are, so that one may lie in two pages.
 std::vector<std::size_t> phases(const ElementType& type) {
     return type.is_complex() ? std::vector<std::size_t>{0, type.part_size}
                              : std::vector<std::size_t>{0};
 }
 
-// All up to the end of two blocks and a little more, those around the ends of two pages, and some
-// between.
+// All positions up to a little beyond the end of two blocks, those around the ends of two pages,
+// and some between.
 std::vector<std::size_t> positions(const ElementType& type1, const ElementType& type2) {
     std::set<std::size_t> chosen;
     const auto choose = [&chosen](const std::size_t first, const std::size_t last,
@@ -85,7 +85,7 @@ std::vector<std::size_t> positions(const ElementType& type1, const ElementType& 
     return {chosen.begin(), chosen.end()};
 }
 
-// Room for the longest arrays of the widest type, and for as much after them.
+// Room for the longest arrays of the widest type, and for two more pages of elements.
 class TwoMemories {
   public:
     // The ends of the arrays' last elements.
@@ -120,7 +120,8 @@ class TwoMemories {
     ProtectedMemory memory2_{bytes};
 };
 
-// All under which the elements are the same; emulated, those of neighbouring steps take turns.
+// All tolerances under which the elements are the same; where only some steps are made,
+// neighbouring ones take turns.
 std::vector<double> tolerances_of_step(const Filling& filling, const std::size_t step) {
     const std::vector<double>& all = filling.same_under;
     const std::size_t stride = std::min(emulated_stride, all.size());
@@ -154,8 +155,8 @@ struct After {
     std::size_t elements1, elements2;
 };
 
-// All but the last few end in one of the arrays within the page in which that pair is. In the
-// course of the runs it gets to every place in a page.
+// In at least one of the arrays, what can be read ends within the page of that pair. In the course
+// of the runs the pair gets to every place in a page.
 std::vector<After> readable_after(const ElementType& type1, const ElementType& type2,
                                   const std::size_t run) {
     const std::size_t in_page1 = page / type1.size;
@@ -167,7 +168,7 @@ std::vector<After> readable_after(const ElementType& type1, const ElementType& t
     return {{0, 0}, {0, more2}, {more1, 0}, {some1, some2}, {some1, more2}, {more1, some2}};
 }
 
-// The arrays go on after the readable memory.
+// By their counts, the arrays go on after the readable memory.
 void expect_to_stop_at(const std::size_t position, const ElementType& type1,
                        const ElementType& type2, const TwoMemories::Ends& ends,
                        const Filling& filling, const After& readable) {
@@ -213,7 +214,7 @@ TEST(Reading, StopsAtTheFirstPairThatIsNotTheSame) {
     EXPECT_EQ(pairs_with_a_loop, 136);
 }
 
-// Sevens everywhere, except for one eight: an element that is taken from another place is a seven.
+// Sevens everywhere, except for one eight: an element taken from a wrong place is a seven.
 TEST(Reading, FindsEachElementOfShortArraysAcrossPages) {
     constexpr talint longest = 16;
     constexpr std::size_t in_page = page / sizeof(float);
@@ -268,7 +269,7 @@ TEST(Reading, WritesNothing) {
     });
 }
 
-// Answers that need no element read none, and none that needs no dimension reads any.
+// Answers that need no element read none, and those that need no dimension read no dimension.
 TEST(Reading, LooksAtNothingThatIsNotNeeded) {
     const ProtectedMemory memory(1);
     auto* const unreadable = static_cast<unsigned char*>(memory.before_end(0));

@@ -89,7 +89,7 @@ TEST(Flushed, AnswersFollowTheRule) {
     expect_no_mismatch([] { return FlushingScope(); });
 }
 
-// Unless bits are compared.
+// Except where bits are compared.
 TEST(Flushed, SubnormalNumbersCountAsZero) {
     if (flushing == 0) {
         GTEST_SKIP() << "NOT TESTED: this processor takes no subnormal number for zero";

@@ -97,8 +97,8 @@ TEST(MixedComparison, IntegerAgainstSingleHasTheDigitsOfASingle) {
 }
 
 TEST(MixedComparison, IntegerGoesToSingleInOneRounding) {
-    // Through double, the first would round to even at 2^53 and again down to 2^60; in one step it
-    // is above the middle of two singles.
+    // By way of a double, the first number would become the middle of two singles and then 2^60; in
+    // one step it is above the middle.
     const std::int64_t above_the_middle = (std::int64_t{1} << 60) + (std::int64_t{1} << 36) + 1;
     EXPECT_EQ(compare(0.0, above_the_middle, 0x1.000002p60F), 0);
     EXPECT_EQ(compare(0.0, above_the_middle, 0x1p60F), 1);

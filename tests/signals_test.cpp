@@ -1,9 +1,9 @@
-// A comparison may be interrupted anywhere by a signal handler that compares too, under whatever
-// tolerance, and may be left by it for good: every answer is as if undisturbed.
+// A signal handler that compares too, under whatever tolerance, may interrupt a comparison anywhere
+// and may leave it for good: every answer is as if undisturbed.
 //
-// On x86-64 the processor traps after each instruction of the interrupted comparison; everywhere a
-// timer interrupts it now and again. What is called is bound when the program starts,
-// as the dynamic linker is not the subject.
+// On x86-64 the processor traps after each instruction of the interrupted comparison; on every
+// platform a timer interrupts it now and again. Functions are bound when the program starts, as the
+// dynamic linker is not the subject.
 
 #include "support/arrays.h"
 #include "support/child_process.h"
@@ -46,7 +46,7 @@ bool is_answered_right(const Question& question) {
            == question.same;
 }
 
-// Tolerances so far from each other that no question is answered right by the factor of two.
+// Tolerances so far apart that no two of their factors answer the same question right.
 const std::vector<double> every_kind = {4, 8.5, 17, NAN};
 
 // For each tolerance two questions, about numbers well within its limit and well beyond it. The
@@ -66,8 +66,8 @@ class Questions {
     std::size_t size() const { return questions_.size(); }
 
   private:
-    // The first and the last pair need the factor; the last one decides. Numbers above 1 are judged
-    // in another way than those below.
+    // The first and the last pair need the factor; the last one decides. Numbers of at least 1 are
+    // judged in another way than smaller ones.
     void add(const double tol, const std::size_t count, const double share_of_limit) {
         const double limit =
             std::isnan(tol) ? 0.125 : std::exp2(tol - std::numeric_limits<T>::digits);
@@ -86,13 +86,13 @@ class Questions {
         questions_.push_back({tol, array1.handle(), array2.handle(), same ? 1 : 0});
     }
 
-    std::deque<Array<T>> arrays_; // which are not moved
+    std::deque<Array<T>> arrays_; // a deque does not move them
     std::vector<Question> questions_;
 };
 
 // ---- The handler
 
-// What it asks, from one interruption to the next and then over again: nothing where it is null.
+// What the handler asks, an entry for each interruption and then over again; a null asks nothing.
 using Script = std::vector<const Question*>;
 
 using Ask = bool (*)(const Question& question);
@@ -102,10 +102,10 @@ struct Handler {
     std::size_t next = 0;
     std::atomic<long> interruptions{0};
     std::atomic<long> wrong_answers{0};
-    // Where a child goes that is forked at each interruption.
+    // Whether each interruption forks a child, and where the child goes.
     bool leaves_in_child = false;
     sigjmp_buf target = {};
-    // How it asks, and what a handler asks by which it is interrupted meanwhile.
+    // How the handler asks, and what another asks that interrupts it meanwhile.
     Ask ask = is_answered_right;
     const Question* innermost = nullptr;
     int depth = 0;
@@ -174,7 +174,8 @@ class ScriptScope {
     ~ScriptScope() { handler.script = nullptr; }
 };
 
-// Always the other question; it and the interrupted one in turn; the same with random pauses.
+// Three scripts: always the other question; it and the interrupted one in turn; both at random,
+// with pauses.
 std::vector<Script> scripts(const Question& interrupted, const Question& other) {
     constexpr std::uint64_t seed = 1;
     oracle::Random random(seed);
@@ -192,7 +193,7 @@ struct Tally {
     long wrong_answers_afterwards = 0;
 };
 
-// What is remembered by then has to be a tolerance and its own factor.
+// By then the thread has to remember a tolerance with its own factor.
 void ask_afterwards(Tally& tally, const Question& first, const Question& second) {
     for (const Question* question : {&first, &second, &first}) {
         tally.wrong_answers_afterwards += is_answered_right(*question) ? 0 : 1;
@@ -208,8 +209,8 @@ void expect_all_right(const Tally& tally) {
     EXPECT_EQ(tally.wrong_answers_afterwards, 0);
 }
 
-// Each question is interrupted by one of the others under each other tolerance, whose two take
-// turns. `ask` may be interrupted.
+// Each question is interrupted by one question under each other tolerance, about numbers on the
+// same side of the limit. `ask` may be interrupted.
 template <typename Interrupted, typename Other>
 void ask_all(Tally& tally, const Questions<Interrupted>& questions, const Questions<Other>& others,
              const Ask ask) {
@@ -247,7 +248,7 @@ class Stepped : public testing::Test {
     }
 };
 
-// The kernel takes the trap flag away from a handler, and gives it back afterwards.
+// The kernel clears the trap flag for a handler, and restores it afterwards.
 bool is_answered_right_in_steps(const Question& question) {
 #if defined(__x86_64__)
     constexpr unsigned long long trap_flag = 0x100;
@@ -338,7 +339,7 @@ TEST_F(Stepped, ComparisonsMayBeLeftForGood) {
     expect_all_right(tally);
 }
 
-// A factor goes on being remembered in a thread of which a handler has left a comparison for good.
+// A thread still remembers factors after a handler has left one of its comparisons for good.
 TEST_F(Stepped, ComparisonsThatAreLeftDoNotKeepFactorsFromBeingRemembered) {
     const Questions<double> questions(1, {4, 17.5});
     const Array<double> one({1}, {1.0});

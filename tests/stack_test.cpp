@@ -1,6 +1,6 @@
 // How much stack a comparison takes: the stack of a thread is painted, all kinds of comparisons are
-// made on it, and the paint that is left shows how deep they went. What the program itself calls is
-// bound before, as the dynamic linker would need more than the comparisons do.
+// made on it, and the paint that is left shows how deep they went. Functions are bound beforehand,
+// as the dynamic linker would need more than the comparisons do.
 
 #include "support/prepared_calls.h"
 #include "support/sanitizers.h"
@@ -16,8 +16,8 @@
 
 namespace {
 
-// Bytes below the frame of the function that calls, the power function of the C library included.
-// Without optimisation every vector that is computed with has a place on the stack of its own.
+// Bytes below the caller's frame, including those of the C library's power function. Without
+// optimisation every vector in a computation has its own place on the stack.
 #if defined(__OPTIMIZE__)
 constexpr std::ptrdiff_t limit = 2048;
 #else
@@ -39,19 +39,19 @@ class PaintedStack {
         ASSERT_EQ(::pthread_attr_destroy(&attributes), 0);
     }
 
-    // All below the caller except what this function takes, which calls nothing: on 32-bit ARM all
-    // comparisons take but little more.
+    // Paints the stack below the caller, except for the frame of this function, which calls nothing
+    // so that its frame is small: on 32-bit ARM the comparisons themselves take little more.
     [[gnu::noinline]] void paint_below_caller() {
         constexpr std::ptrdiff_t own_frame = 128;
         const auto* const here = static_cast<unsigned char*>(__builtin_frame_address(0));
         const std::ptrdiff_t size_below = here - own_frame - lowest();
-        volatile unsigned char* const bytes = memory_->bytes; // or a call of memset might be made
+        volatile unsigned char* const bytes = memory_->bytes; // else memset might be called
         for (std::ptrdiff_t i = 0; i < size_below; ++i) {
             bytes[i] = paint;
         }
     }
 
-    // How far below `top` the lowest byte is that is no longer painted.
+    // How far below `top` the lowest byte lies that has lost its paint.
     std::ptrdiff_t depth_below(const unsigned char* top) const {
         return top - std::find_if(lowest(), top, [](unsigned char byte) { return byte != paint; });
     }

@@ -29,7 +29,7 @@ template <typename T1, typename T2>
     return same;
 }
 
-// And a loop that is compiled as the module's own are.
+// A loop that is compiled as the module's own are.
 NESK_STRICT_SINGLES_BEGIN
 template <typename T1, typename T2>
 [[gnu::noinline]] std::size_t tests_that_answer_same(const talreal tol, const T1* data1,

@@ -19,7 +19,7 @@ namespace {
 constexpr int wrong_answer = 1;
 constexpr int strict_mode_refused = 2;
 
-// Not by _exit, which ends all threads by another call.
+// Not with _exit, which ends all threads by another system call.
 [[noreturn]] void leave_strict_mode(const int status) {
     for (;;) {
         ::syscall(SYS_exit, status);
@@ -52,7 +52,7 @@ TEST_F(SystemCalls, AreSeenWhereThereAreAny) {
     EXPECT_EQ(in_strict_mode([] { return ::getppid() == 0 ? 1 : 0; }), killed_by(SIGKILL));
 }
 
-// The child is the first to compare: its parent has asked the oracle alone.
+// The child is the first to compare: its parent has asked only the oracle.
 TEST_F(SystemCalls, AreMadeByNoComparison) {
     const PreparedCalls prepared;
     EXPECT_EQ(in_strict_mode([&] { return prepared.wrong_answers() == 0 ? 0 : wrong_answer; }),

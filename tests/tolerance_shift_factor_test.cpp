@@ -90,12 +90,12 @@ TEST(ToleranceShiftFactor, ExistsForRealsOnly) {
     EXPECT_FALSE(has_factor<unsigned char>::value);
 }
 
-// The library's functions, reached so that no compiler can put another in their place.
+// The library's functions, called in a way that no compiler can replace.
 double (*volatile library_pow)(double, double) = std::pow;
 double (*volatile library_exp2)(double) = std::exp2;
 
 // Every factor is made with the library's pow, whatever the compiler: exp2, which a compiler may
-// put in its place, gives other factors for some of the same tolerances.
+// use instead, gives other factors for some of the same tolerances.
 TEST(ToleranceShiftFactor, IsMadeWithPow) {
     constexpr int samples = 100000;
     int where_exp2_differs = 0;

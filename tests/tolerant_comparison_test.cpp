@@ -36,7 +36,7 @@ TEST(DoubleComparison, HasTheSameResultsWithTheFactorRemembered) {
     }
 }
 
-// The result under every tolerance; 99 where that is not one result.
+// The result under every tolerance, or 99 if it is not always the same.
 int compare_under_all(const double x, const double y) {
     return under_every_tolerance([&](const double tol) { return compare_impl(tol, x, y); });
 }
@@ -136,8 +136,7 @@ TEST(RememberedFactor, OfSingles) {
     });
 }
 
-// Whether a thread that has compared nothing yet recalls a factor for `tol`, and then which; -1 if
-// it recalls none.
+// The factor that a thread which has compared nothing recalls for `tol`; -1 if it recalls none.
 template <typename T>
 T recalled_in_a_new_thread(const T tol) {
     T factor = -1;
@@ -150,7 +149,7 @@ T recalled_in_a_new_thread(const T tol) {
     return factor;
 }
 
-// No comparison can show which it is, as none looks it up.
+// No comparison can show that factor, as none looks it up.
 template <typename T>
 void expect_a_true_factor_at_first() {
     constexpr int bits = std::numeric_limits<T>::digits;

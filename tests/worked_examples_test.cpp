@@ -11,7 +11,8 @@
 
 namespace {
 
-// In a thread for each, so that what one of them makes the thread remember is not seen by others.
+// In a thread for each, so that what one of them makes its thread remember does not reach the
+// others.
 TEST(WorkedExamples, OfElementsHaveTheirAnswers) {
     std::size_t index = 0;
     for (const ExampleOfElements& example : examples_of_elements()) {
@@ -34,8 +35,8 @@ TEST(WorkedExamples, OfElementsHaveTheirAnswers) {
     }
 }
 
-// Real parts that differ in their leading digit leave the imaginary parts, and what they would make
-// the comparison remember, alone.
+// Where the real parts differ in their leading digit, the imaginary parts are not compared, and so
+// change nothing that is remembered.
 TEST(ComplexAgainstComplex, ImaginaryPartsComeSecond) {
     using Complex = std::complex<double>;
     in_new_thread([] {

@@ -1,5 +1,5 @@
 // The divisor by which the loops find near reals: large enough in every direction of rounding, and
-// only given where no factor has to be computed for it.
+// given only where no factor has to be computed for it.
 
 #include "support/module_templates.h"
 
@@ -37,7 +37,7 @@ TEST(CertainDivisor, IsLargeEnoughInEveryDirectionOfRounding) {
     expect_divisors_large_enough<double>();
 }
 
-// The factor of 20 is.
+// Only the factor of 20 is remembered.
 template <typename T>
 void expect_divisors_only_without_need_of_another_factor() {
     constexpr int bits = std::numeric_limits<T>::digits;

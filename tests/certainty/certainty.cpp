@@ -1,5 +1,6 @@
-// What vectors of every instruction set, and the test without vectors, call certainly the same:
-// only pairs that the element test finds the same, and all of these that are beyond doubt.
+// Which pairs the vectors of every instruction set, and the test without vectors, call certainly
+// the same: only those that the element test finds the same, and all of those that are beyond
+// doubt.
 
 #include "support/module_templates.h"
 
@@ -18,7 +19,7 @@
 
 namespace {
 
-// Pairs that are the same, for one drawn pair to be put among them.
+// Equal pairs, among which one drawn pair is put.
 template <typename T1, typename T2>
 class Sevens {
   public:
@@ -44,18 +45,20 @@ class Sevens {
     const T2* data2() const { return data2_; }
 
   private:
-    // In one page.
+    // Each in one page.
     alignas(2048) T1 data1_[most] = {};
     alignas(2048) T2 data2_[most] = {};
 };
 
-// Whether a pair is the same by the element rule, and whether it may not be in doubt if it is.
+// Whether a pair is the same by the element rule, and if so, whether every set must be certain of
+// it.
 struct Ruling {
     bool same;
     bool beyond_doubt;
 };
 
-// Whether a set said what it may; compiled once, where the loops are for each pair of types.
+// Whether the ruling allows a set to be certain, or in doubt, as it was. Compiled once, unlike the
+// loops, which are compiled for each pair of types.
 bool follows_rule(const Ruling& ruling, const char* const set, const bool certain) {
     const bool follows = certain ? ruling.same : !(ruling.same && ruling.beyond_doubt);
     EXPECT_TRUE(follows) << set << " is " << (certain ? "certain" : "in doubt")
@@ -63,12 +66,12 @@ bool follows_rule(const Ruling& ruling, const char* const set, const bool certai
     return follows;
 }
 
-// Where a pair is drawn among `count` others.
+// The index of the drawn pair among `count` pairs.
 struct Place {
     std::size_t index, count;
 };
 
-// Integers are passed over by vectors alone.
+// Integers are passed over only by vectors.
 template <typename Set, typename Bound, typename T1, typename T2>
 bool as_ruled_by(const Ruling& ruling, const Bound bound, const Sevens<T1, T2>& sevens,
                  const Place& place) {
@@ -91,8 +94,8 @@ bool as_ruled(type_list<Sets...> /*sets*/, const Ruling& ruling, const Bound bou
            && (... && as_ruled_by<Sets>(ruling, bound, sevens, place));
 }
 
-// Two finite numbers, of which one is no further from the other than a quarter of the tolerance's
-// factor: rounding plays no part.
+// Whether two finite numbers of one sign are no further from each other than a quarter of the
+// tolerance's limit, so that rounding plays no part.
 template <typename T>
 bool clearly_near(const T x, const T y, const double factor) {
     return std::isfinite(x) && std::isfinite(y) && (x < 0) == (y < 0)
@@ -121,7 +124,7 @@ class CertaintyRuns {
   public:
     explicit CertaintyRuns(oracle::Random& random) : random_(random) {}
 
-    // The number of pairs that were drawn.
+    // Returns how many pairs were drawn, or 0 after a failure.
     std::uint64_t run_all() {
         constexpr std::uint64_t tolerances = 100;
         constexpr std::uint64_t draws = 600;
@@ -146,7 +149,7 @@ class CertaintyRuns {
     static constexpr int bits = std::numeric_limits<T>::digits;
 
     bool run(const double tol, const double share) {
-        // The most are enough for a vector of every set, and no part of them is left to the rule.
+        // `most` pairs fill the vectors of every set, and leave none to the element rule.
         const std::size_t most = Sevens<T1, T2>::most;
         const std::size_t count = random_.one_in(2) ? most : 1 + random_.below(most);
         const Place place = {random_.below(static_cast<std::uint32_t>(count)), count};
@@ -156,7 +159,7 @@ class CertaintyRuns {
         const auto x = static_cast<T>(element1);
         const auto y = static_cast<T>(reinterpret_cast<const to_real_type_t<T2>&>(element2));
         const bool equal = sameQ_test(-1.0, element1, element2);
-        // Vectors that know bits alone are in doubt of infinities and of zeros of both signs.
+        // Vectors that compare only bits may be in doubt about infinities and zeros.
         const bool bits_alone = x == 0 || std::isinf(static_cast<double>(x));
         bool followed =
             as_ruled(talnumericarray::instruction_sets{}, {equal, !bits_alone && count == most},
@@ -192,8 +195,8 @@ struct Drawn {
     std::uint64_t doubles = 0;
 };
 
-// The order of the two does not matter, and complex numbers are only seen as reals in the second
-// place.
+// The order of the two types does not matter, and complex numbers are only seen as reals when they
+// come second.
 template <typename T1, typename T2>
 constexpr bool is_run =
     have_loop<T1, T2>&& element_type_id<T1> <= element_type_id<T2> && !is_complex_v<T1>;

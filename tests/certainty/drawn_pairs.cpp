@@ -60,7 +60,7 @@ TEST(Loops, AnswerAsTheElementLoopInEveryDirectionOfRounding) {
     });
 }
 
-// Results, operands or both.
+// Every part of `flushing`: for results, operands or both.
 std::vector<std::uint64_t> parts_of_flushing() {
     std::vector<std::uint64_t> parts = {flushing};
     for (std::uint64_t part = flushing & (flushing - 1); part != 0; part = (part - 1) & flushing) {
@@ -88,7 +88,7 @@ TEST(Loops, AnswerAsTheElementLoopWhereSubnormalNumbersAreTakenForZero) {
     });
 }
 
-// Of small numbers of either sign, and zeros, the drawn pairs are few.
+// Few of the drawn pairs are of small numbers of either sign, or of zeros.
 TEST(Loops, TellSubnormalNumbersApartWhateverIsTakenForZero) {
     for_each_pair_with_a_loop([&](const Pair& pair) {
         if (pair.type1.is_integer || pair.type2.is_integer) {

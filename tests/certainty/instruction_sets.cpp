@@ -30,7 +30,7 @@ TEST(InstructionSets, AreListedBestFirst) {
     }
 }
 
-// Otherwise skipped, which CTest reports after all tests.
+// Skipped where a set is not supported, which CTest reports after all tests.
 TEST(InstructionSets, AreAllTested) {
     std::string untested;
     for (const InstructionSet& set : instruction_sets_of_build()) {

@@ -18,7 +18,7 @@ namespace {
 constexpr double infinity = std::numeric_limits<double>::infinity();
 constexpr double nan = std::numeric_limits<double>::quiet_NaN();
 
-// A greater number than 7, by the share `share` of it or, if that is nothing, the next one.
+// Exceeds 7 by `share` of it, and is at least the next real.
 double above_seven(const int digits, const double share) {
     if (digits == std::numeric_limits<float>::digits) {
         constexpr float seven = 7;
@@ -32,12 +32,12 @@ Planted seven_and(const char* name, const Pair& pair, const double other) {
     return {name, {value1, 0}, {value2, 0}};
 }
 
-// The share of the larger number by which two may differ.
+// The share of the larger number by which two numbers may differ.
 double allowed_share(const Pair& pair, const double tol) {
     return tol > 0 ? std::exp2(std::min<double>(tol, pair.digits) - pair.digits) : 0;
 }
 
-// Where there are no reals in between, the pair is one of different integers.
+// Types that are compared as integers get two different integers.
 Planted near_pair(const Pair& pair, const double tol) {
     const double share = allowed_share(pair, tol) / 2;
     return seven_and("near", pair, pair.digits == 0 ? 6 : above_seven(pair.digits, share));
@@ -83,7 +83,7 @@ class Elements {
         side_.store(elements_.data() + index * side_.size, element.real, element.imaginary);
     }
 
-    // The first `count` elements in the `place`-th place of a page, `planted` being among them.
+    // The first `count` elements, with `planted` at `index`, in the `place`-th place of a page.
     void* placed(const std::size_t place, const std::size_t count, const std::size_t index,
                  const Element& planted) {
         const auto to_page = (page - reinterpret_cast<std::uintptr_t>(memory_.data()) % page);
@@ -101,8 +101,8 @@ class Elements {
     std::vector<unsigned char> memory_;
 };
 
-// One pair of types under one tolerance. Any `step` tolerances in a row have all lengths and the
-// planted pair at every place of the longest arrays, each of them at another share of these.
+// One pair of types under one tolerance. Any `step` tolerances in a row cover all lengths and, in
+// the longest arrays, every place of the planted pair; each tolerance covers another share of them.
 class PlantedRuns {
   public:
     PlantedRuns(const Pair& pair, const double tol, const std::size_t turn, const std::size_t step)
@@ -129,7 +129,7 @@ class PlantedRuns {
     int near_fills() const { return near_fills_; }
 
   private:
-    // Multiples of the pair by powers of two, which are as near to each other as the pair is.
+    // Multiples of the pair by powers of two, in which the two numbers are as near as in the pair.
     void fill(const Planted& pair) {
         for (std::size_t i = 0; i < longest; ++i) {
             const bool negative = i % 2 == 1 && pair_.type1.is_signed && pair_.type2.is_signed;
@@ -209,8 +209,8 @@ TEST(Loops, AnswerAndRememberAsTheElementLoop) {
             near_fills += runs.near_fills();
         }
     });
-    // 80 pairs of types are compared as reals. Near each other are 7 and the next real, or more,
-    // under eight of the tolerances.
+    // 80 pairs of types are compared as reals. Under eight of the tolerances 7 is the same as the
+    // number that is planted near it.
     EXPECT_EQ(near_fills, 80 * 8);
 }
 

@@ -21,7 +21,7 @@ void set_poisoned([[maybe_unused]] const bool poisoned, [[maybe_unused]] unsigne
 #endif
 }
 
-// Elements after a pair that differs, which a sanitizer forbids to read.
+// Elements after a pair that differs, which a sanitizer forbids reading.
 class Poison {
   public:
     Poison(unsigned char* const begin, unsigned char* const end)

@@ -1,9 +1,9 @@
-"""Fails where a branch of the module is not taken in any of the functions that a template makes.
+"""Fails where a branch of the module is taken in none of the functions that a template makes.
 
     branches.py BUILD_FOLDER SOURCE_FOLDER...
 
-Reads what an instrumented build has counted. A branch that one element type takes and another cannot
-take is one branch of the source, and so is that of a function that is inlined in many places. Branches
+Reads what an instrumented build has counted. A branch of the source counts once, even if one
+element type takes it and another cannot, or if its function is inlined in many places. Branches
 that depend on the processor are left out.
 """
 
@@ -13,7 +13,7 @@ import re
 import subprocess
 import sys
 
-# What only another processor would answer otherwise.
+# Conditions that only another processor would decide otherwise.
 OF_PROCESSOR = re.compile(r"supported\(\)|cpu_supports|ask\(type_tag")
 
 

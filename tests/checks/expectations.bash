@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# What the checks share that are scripts; they source it.
+# What the checks share that are written as scripts; they source this file.
 
 fail() {
     echo "FAILED: $*" >&2
@@ -13,7 +13,7 @@ expect_same() {
     fail "$1"
 }
 
-# Of the names on standard input, those that neither the module nor a compiler may call.
+# Prints the names on standard input that neither the module nor a compiler may call.
 unexpected_calls() {
     # Memory and mathematics; bcmp is Clang's memcmp for equality.
     local calls='memcmp|bcmp|modf|modff|pow|powf|ldexp|ldexpf'

@@ -3,9 +3,9 @@
 
     lint.py BUILD_FOLDER SOURCE...
 
-A check examines all that a source includes, so that nearly all its time goes to the standard
-library. Sources that are compiled alike are put together in one file. Where clang-tidy complains of
-that, its sources are linted one by one, which shows what is wrong and where.
+clang-tidy examines all that a source includes, so nearly all its time goes to the standard library.
+Sources that are compiled alike are therefore put together in one file. Where clang-tidy complains
+of that file, its sources are linted one by one, which shows what is wrong and where.
 """
 
 import json
@@ -27,7 +27,7 @@ TOGETHER = 9  # sources
 @dataclass(frozen=True)
 class Source:
     path: Path
-    defined: tuple  # -D and -I, of which sources that are put together may have different ones
+    defined: tuple  # -D and -I, which may differ between sources that are put together
     others: tuple
 
     def text(self):
@@ -38,7 +38,7 @@ class Source:
                     if (folder / ".clang-tidy").exists())
 
     def stands_alone(self):
-        """Functions with C's names can only be there once, and may be declared by headers."""
+        """Functions with C's names can only be defined once, and may be declared by headers."""
         return re.search(r'^extern "C"|^int main\(', self.text(), flags=re.MULTILINE)
 
 
@@ -64,7 +64,7 @@ def groups_of(sources):
 
 
 def without(text, included):
-    """The lines of `text` without the headers in `included`, which then has its own, too."""
+    """The lines of `text` without the headers in `included`, to which its own are added."""
     own, depth = set(), 0
     for line in text.splitlines():
         depth += bool(re.match(r"#\s*if", line)) - bool(re.match(r"#\s*endif", line))
@@ -77,8 +77,8 @@ def without(text, included):
 
 
 def put_together(group):
-    """The lines. A source without a namespace that has a name is given one of its own, so that
-    different things in different sources may have the same name. Not one with a header: what the
+    """The lines. A source without a named namespace is given one of its own, so that different
+    things in different sources may have the same name. A source with a header is not: what the
     header declares would be declared twice."""
     included = set()
     for number, source in enumerate(group):

@@ -3,8 +3,8 @@
 
     talcmp_options.py ROOT TALCMP...
 
-TALCMP is the command, after its emulator if there is one. Every option of its help has to be in
-the manual page and in the completions of all shells, and none that the help does not have.
+TALCMP is the command, after its emulator if there is one. Every option of its help has to be in the
+manual page and in the completions of all shells, and they may list no others.
 """
 
 import re

@@ -74,18 +74,18 @@ PARTS = (
 )
 SIGNALS = Program("signals_test", (), ("tests/signals_test.cpp", *SUPPORT), link=("-Wl,-z,now",))
 READING = Program("reading_test", (), ("tests/reading_test.cpp",), module_level="-O1")
-# What takes larger steps without optimisation is built like what sees the mutant.
+# Sources that take larger steps without optimisation are built as those that see the mutant are.
 CERTAINTY = Program("certainty_test",
                     tuple(f"tests/{name}.cpp" for name in
                           ("certainty/certain_divisor", "certainty/certainty",
                            "certainty/drawn_pairs", "certainty/planted_pairs", "support/loops")),
                     (*(f"tests/certainty/{name}.cpp"
                        for name in ("instruction_sets", "reading_without_vectors")), *SUPPORT))
-# Of all sets, and so without the longest of the tests, which says no more of them than of one.
+# With all sets, and so without the longest of the tests, which says no more of them than of one.
 CERTAINTY_OF_SETS = replace(CERTAINTY,
                             run=("--gtest_filter=-Loops.AnswerAndRememberAsTheElementLoop",))
 
-# With plain code for the instructions, which takes its time without optimisation.
+# With plain code for the instructions, which is slow without optimisation.
 CERTAINTY_OF_AVX512 = replace(CERTAINTY, name="certainty_of_avx512_test",
                               level="-O1 -Wno-psabi -DTALNUMERICARRAY_EMULATED"
                                     " -DAVX512_IN_PLAIN_CODE")
@@ -102,7 +102,8 @@ BOUNDS = {"<": "<=", "<=": "<", ">": ">=", ">=": ">"}
 
 
 def rank(mutant):
-    """Bounds before other operators and numbers, names last; among equals, a choice that stays."""
+    """Bounds before other operators and numbers, names last; equals in the order of their
+    hashes."""
     before, _, after = mutant.name[mutant.name.rindex("[") + 1 : -1].partition(" -> ")
     by_name = before[0].isalpha() and before not in ("true", "false")
     return by_name, BOUNDS.get(before, "") != after.split(" (")[0], mutant.chance
@@ -126,12 +127,12 @@ def sets_for(path):
 
 
 class Tree(steps.Tree):
-    """The module with one file at a time another."""
+    """A copy of the module in which one file at a time is changed."""
 
     folders = includes = FOLDERS
 
     def sees(self, source):
-        """So they do: a program's other sources are compiled in the copy without a mutant alone."""
+        """Always: sources that see no mutant are compiled only in the copy without one."""
         return True
 
     def _options(self, source, flags):

@@ -1,4 +1,4 @@
-"""Makes mutants of C++ sources from their text: one small change each, with a name that holds."""
+"""Makes mutants of C++ sources from their text: one small change each, with a stable name."""
 
 import bisect
 import hashlib
@@ -63,7 +63,7 @@ def without_assertions(tokens):
 
 
 def without_heads(tokens):
-    """Without the parameters of templates, almost no change of which compiles."""
+    """Without template parameters, as almost no change to one compiles."""
     kept, depth, begins = [], 0, False
     for token in tokens:
         begins = begins or token.text == "template"
@@ -227,7 +227,7 @@ class Source:
         if token.text in OPERATORS and self._spaced(token):
             yield from map(token.replaced, OPERATORS[token.text])
         elif token.text in ("!", "-", "~") and not self.text[token.end].isspace():
-            # Of one operand: taken away.
+            # An operator of one operand is taken away.
             yield token.replaced("")
         elif token.text == "++":
             yield token.replaced("--")

@@ -40,7 +40,7 @@ class Bodies:
             index += 1
 
     def _braces(self, head, opening, last):
-        """Goes through what is in them, and returns where the next declaration begins."""
+        """Goes through what is in the braces, and returns where the next declaration begins."""
         words = [token.text for token in self.tokens[head:opening]]
         if any(word in SCOPES for word in words[:2]) and "(" not in words:
             self._scope(opening + 1, last)
@@ -113,7 +113,8 @@ class Bodies:
         return last + 1
 
     def _is_action(self, begin):
-        """A declaration, which has two words or a type and a word side by side, is none."""
+        """Whether it is more than a declaration, which has two words or a type and a word side by
+        side."""
         first = self._text(begin)
         if first in (*LEAVES, "return") or first in DECLARES:
             return first not in DECLARES

@@ -49,7 +49,7 @@ def command(words, seconds=300, patience=20, **options):
 
 
 def run_test(words, seconds, patience=20, **variables):
-    """Raises Killed where a test fails. The variables are the folder and others of Popen."""
+    """Raises Killed where a test fails. `variables` are the folder and other arguments of Popen."""
     environment = {**os.environ, "TALNUMERICARRAY_SEED": "1", "GTEST_BREAK_ON_FAILURE": "1",
                    "GTEST_FAIL_FAST": "1", **variables.pop("env", {})}
     status, text = command(words, seconds, patience, env=environment, **variables)
@@ -60,7 +60,7 @@ def run_test(words, seconds, patience=20, **variables):
 
 
 def failing_test(text):
-    """The first that says so, else the one in which the program ended."""
+    """The first test that is said to fail, else the one in which the program ended."""
     failed = (re.search(r"^\[  FAILED  \] (\S+)", text, flags=re.MULTILINE)
               or re.search(r"^(?:FAIL|ERROR): (\S+)", text, flags=re.MULTILINE))
     begun = re.findall(r"^\[ RUN      \] (\S+)", text, flags=re.MULTILINE)
@@ -79,8 +79,8 @@ def digest(*parts):
 # ---- Copies, and what they are built with
 
 class Tree:
-    """A copy of some of the project's folders in which one file at a time is another. Of what does
-    not see that, the objects of the copy without a mutant are taken."""
+    """A copy of some of the project's folders in which one file at a time is changed. Sources that
+    do not see the change share the objects of the copy without a mutant."""
 
     folders, includes = (), ()
 
@@ -107,7 +107,7 @@ class Tree:
         self.changed = None
 
     def sees(self, source):
-        """Whether it is, or includes, what is changed here."""
+        """Whether `source` is, or includes, the file that is changed here."""
         return self.changed is not None and self.changed in self.original.needs(source)
 
     def object(self, source, *flags):
@@ -174,7 +174,7 @@ class Tree:
 
 
 def temporary_folder(folder):
-    """For what a test that is ended leaves."""
+    """A folder for what a test leaves when it is ended."""
     return tempfile.TemporaryDirectory(dir=folder, prefix="run")
 
 
@@ -186,7 +186,7 @@ def link(target, *words):
 
 
 def precompile(name, headers, *flags_of_variants):
-    """Makes a header of these, which takes the compiler a good part of its time, once for all."""
+    """Precompiles these headers, which take the compiler a good part of its time, once for all."""
     text = "".join(f"#include <{header}>\n" for header in headers)
     header, folder = WORK / name, WORK / f"{name}.gch"
     if folder.exists() and header.read_text(encoding="utf-8") == text:
@@ -201,7 +201,7 @@ def precompile(name, headers, *flags_of_variants):
 class Bench:
     """What all copies of a target share; `tree` is the copy without a mutant."""
 
-    spare = 10  # seconds that a program may take longer than three times as long
+    spare = 10  # seconds that a program may take beyond three times its usual time
 
     def __init__(self, memory, tree):
         precompile("gtest.h", ["gtest/gtest.h"], ["-O0"], ["-O1"])
@@ -210,7 +210,7 @@ class Bench:
         self.lock = threading.RLock()
 
     def sources(self, program):
-        """What the finding depends on apart from the target."""
+        """What a program's finding depends on apart from the target."""
         names = {name for source in program.sources for name in self.needs(program, source)}
         return digest(repr(program), *((ROOT / name).read_text(encoding="utf-8")
                                        for name in sorted(names) if name.startswith("tests/")))

@@ -20,7 +20,7 @@ RUN_TALCMP = f"{TESTS}/support/run_talcmp.cpp"
 # Counts calls by an option of the linker, and so is no part of the program that has the other tests.
 COUNTED = f"{TESTS}/questions_test.cpp"
 MODULE = [module_steps.MODULE, module_steps.TABLE]
-# Of the module's support, what draws numbers.
+# The part of the module's test support that draws numbers.
 ORACLE = [f"tests/support/{name}.cpp" for name in ("oracle", "random_arrays")]
 STANDARD_HEADERS = ["algorithm", "array", "atomic", "charconv", "cmath", "complex", "filesystem",
                     "functional", "future", "map", "memory", "mutex", "numeric", "optional",
@@ -37,7 +37,7 @@ def rank(mutant):
 
 
 def share(change):
-    """How many are tried: all conditions, and of the many other lines some."""
+    """How large a part is tried: all conditions, and some of the many other lines."""
     return 1 if is_condition(change) else 1 / 4 if change.whole else 1 / 12
 
 
@@ -52,7 +52,7 @@ def chosen(found):
 # ---- Copies of talcmp, and what is built from them
 
 class Tree(steps.Tree):
-    """talcmp with one file at a time another."""
+    """A copy of talcmp in which one file at a time is changed."""
 
     folders, includes = FOLDERS, INCLUDES
 
@@ -88,7 +88,8 @@ class Program:
 
 
 def test_programs():
-    """Those of parts as one program; each that runs talcmp alone; in Python, all at once."""
+    """The tests of parts as one program; each source that runs talcmp, and each in Python, as its
+    own."""
     paths = [str(path.relative_to(ROOT)) for path in sorted((ROOT / TESTS).glob("*_test.*"))]
     sources = [path for path in paths if path.endswith(".cpp") and path != COUNTED]
     whole = [path for path in sources if "run_talcmp.h" in (ROOT / path).read_text()]

@@ -1,4 +1,4 @@
-// The program of another project: it asks both predicates, and includes a template of the headers.
+// The program of another project: it calls both predicates, and includes a template of the headers.
 
 #include "compare.h"
 #include "talnumericarray.h"

@@ -1,4 +1,5 @@
-// Records over dimensions and elements that are somewhere else, for tests, benchmarks and fuzzers.
+// Array records that point to dimensions and elements kept elsewhere, for tests, benchmarks and
+// fuzzers.
 
 #pragma once
 
@@ -7,7 +8,7 @@
 #include <cstddef>
 #include <vector>
 
-// Of rank 1, and of `length` elements.
+// A record of rank 1 with `length` elements.
 inline st_TalDataArray record_of(const type_t type, void* const data, talint& length) {
     st_TalDataArray record = {};
     record.dims = &length;
@@ -18,7 +19,7 @@ inline st_TalDataArray record_of(const type_t type, void* const data, talint& le
     return record;
 }
 
-// Of any rank.
+// A record of any rank.
 inline st_TalDataArray record_of(const type_t type, void* const data,
                                  std::vector<talint>& dimensions, const talint count) {
     talint length = count;

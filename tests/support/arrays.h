@@ -29,7 +29,7 @@ class Array {
     Array& operator=(const Array&) = delete;
     ~Array() = default;
 
-    // To be changed by tests that need a record that is not as it should be.
+    // For tests that need a malformed record.
     st_TalDataArray& record() { return record_; }
 
     TalNumericArray handle() const { return const_cast<TalNumericArray>(&record_); }
@@ -40,7 +40,7 @@ class Array {
     st_TalDataArray record_{};
 };
 
-// Rank 1, of a type that is chosen at run time.
+// An array of rank 1, of a type chosen at run time.
 class AnyArray {
   public:
     AnyArray(const ElementType& type, const std::vector<int>& values)
@@ -70,15 +70,15 @@ int sameQ_of(const talreal tol, const T1 element1, const T2 element2) {
     return sameQ(tol, Array<T1>{element1}, Array<T2>{element2});
 }
 
-// The answer for them under every tolerance; 99 where that is not one answer.
+// The answer under every tolerance, or 99 if it is not always the same.
 template <typename T1, typename T2>
 int sameQ_under_all(const T1 element1, const T2 element2) {
     return under_every_tolerance(
         [&](const talreal tol) { return sameQ_of(tol, element1, element2); });
 }
 
-// Runs `check` in a thread of its own, which has compared nothing yet: what it remembers of
-// tolerances is as at the start of a program.
+// Runs `check` in a new thread, which has compared nothing and so remembers what a program
+// remembers at its start.
 template <typename Check>
 void in_new_thread(const Check& check) {
     std::thread(check).join();

@@ -1,9 +1,9 @@
-// The module's loops for AVX-512 once more, as an instruction set of their own: with plain code in
-// place of the instructions, so that any processor with AVX2 can run them.
+// The module's AVX-512 loops again, as a separate instruction set: plain code replaces the
+// instructions, so that any processor with AVX2 can run them.
 //
-// The files of the operations and of the loops are included in a namespace where the names of the
-// intrinsics are functions written here, which are found before the compiler's. An intrinsic that
-// is missing here is the compiler's, which refuses it under a target without AVX-512.
+// The files of operations and loops are included in a namespace where functions written here bear
+// the names of the intrinsics and are found before the compiler's. An intrinsic that is missing
+// here is the compiler's own, which the compiler refuses under a target without AVX-512.
 
 #pragma once
 
@@ -25,7 +25,8 @@ struct avx512_in_plain_code;
 #include <cstdlib>
 #include <cstring>
 
-// Compilers have macros for those that take a constant, some without optimisation only.
+// Compilers define intrinsics that take a constant as macros, some of them only without
+// optimisation.
 #undef _mm512_insertf32x8
 #undef _mm512_mask_cmp_pd_mask
 #undef _mm512_mask_cmp_ps_mask
@@ -75,7 +76,7 @@ inline Vector filled_with(const T number) noexcept {
     return vector_of<Vector, T>(lanes);
 }
 
-// Above the half, where the instruction leaves anything, is what no test accepts as right.
+// The upper part, which the instruction leaves undefined, gets bits that no test accepts as right.
 template <typename Vector, typename Half>
 inline Vector with_anything_above(const Half& half) noexcept {
     auto vector = filled_with<Vector, unsigned char>(0xa5);
@@ -94,7 +95,7 @@ inline Vector with_half(const Vector& vector, const Half& half, const int place)
     return vector_of<Vector, T>(lanes);
 }
 
-// All numbers, or the first ones of 16 bytes. Widened if the types are integers.
+// Converts all numbers, or the first ones of 16 bytes; integers are widened.
 template <typename To, typename From, typename Result, typename Vector>
 inline Result converted(const Vector& vector) noexcept {
     const auto numbers = lanes_of<From>(vector);
@@ -106,7 +107,7 @@ inline Result converted(const Vector& vector) noexcept {
     return vector_of<Result, To>(results);
 }
 
-// Of integers, which are in half of a vector or in the least one.
+// Widens integers, which fill half a vector or only some of the 16 bytes of the shortest one.
 template <typename To, typename From>
 constexpr auto widened() noexcept {
     if constexpr (sizeof(To) == 2 * sizeof(From)) {
@@ -221,7 +222,7 @@ inline constexpr auto _mm512_test_epi64_mask =
 inline constexpr auto _mm512_mask_cmp_ps_mask = plain::compared<float, __mmask16, __m512>;
 inline constexpr auto _mm512_mask_cmp_pd_mask = plain::compared<double, __mmask8, __m512d>;
 
-// From the last lane to the first.
+// The arguments go from the last lane to the first.
 template <typename... Numbers>
 inline __m512i _mm512_set_epi64(const Numbers... numbers) noexcept {
     std::array<std::int64_t, 8> lanes = {numbers...};

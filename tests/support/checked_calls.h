@@ -1,4 +1,4 @@
-// Random calls of the module, each of them checked against the oracle.
+// Random calls of the module, each checked against the oracle.
 
 #pragma once
 
@@ -7,9 +7,9 @@
 
 namespace oracle {
 
-// From the environment, TALNUMERICARRAY_RANDOM_CALLS and TALNUMERICARRAY_SEED; otherwise the number
-// that the build was configured with, and a new seed. They throw
-// where that is no number.
+// The environment variables TALNUMERICARRAY_RANDOM_CALLS and TALNUMERICARRAY_SEED; where they are
+// unset, the number that the build was configured with, and a new seed. They throw where a variable
+// is not a number.
 std::uint64_t requested_calls();
 std::uint64_t requested_seed();
 

@@ -29,8 +29,8 @@ constexpr ChildEnd killed_by(const int signal) {
     return {-1, signal};
 }
 
-// Runs `body` in a forked child, whose exit status is what `body` returns. A child that waits for
-// ever is killed by SIGALRM.
+// Runs `body` in a forked child, whose exit status is what `body` returns. A child that hangs is
+// killed by SIGALRM.
 template <typename Body>
 ChildEnd in_child(const Body& body) {
     constexpr unsigned seconds = 60;

@@ -1,4 +1,5 @@
-// Random numbers that are hard to compare, for tests, fuzzers and all else that draws elements.
+// Random numbers that are hard to compare, for tests, fuzzers and anything else that draws
+// elements.
 
 #pragma once
 
@@ -14,7 +15,7 @@
 
 namespace oracle {
 
-// Where the draws come from. They are the same with every standard library, unlike those of its
+// A source of draws, which are the same with every standard library, unlike those of its
 // distributions.
 class Draws {
   public:
@@ -72,13 +73,14 @@ Real moved(Real value, const int ulps) {
     return value;
 }
 
-// To either side. Draws after its argument, so that a seed means the same to every compiler.
+// Moves a number up or down. Being a function, it draws after its arguments are evaluated, so that
+// a seed gives the same numbers with every compiler.
 template <typename Real>
 Real nudged(Draws& draws, const Real value, const int most_ulps) {
     return moved(value, draws.between(-most_ulps, most_ulps));
 }
 
-// Zero, infinity and NaN among others. Random bits have a sign of their own.
+// Zero, infinity and NaN among others. Where all bits are random, so is the sign.
 template <typename Real>
 Real random_magnitude(Draws& draws) {
     using Limits = std::numeric_limits<Real>;

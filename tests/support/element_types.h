@@ -1,5 +1,5 @@
-// The element types at run time, made from the one list, and a check for every ordered pair of
-// them.
+// The element types at run time, made from the module's list, and a function that visits every
+// ordered pair of them.
 
 #pragma once
 
@@ -20,7 +20,7 @@
 struct ElementType {
     type_t id;
     std::size_t size;      // bytes
-    std::size_t part_size; // bytes of a real or imaginary part; those of the element without parts
+    std::size_t part_size; // bytes of a real or imaginary part, or of an element that has none
     std::size_t alignment;
     bool is_integer;
     bool is_signed;
@@ -29,7 +29,7 @@ struct ElementType {
     bool is_complex() const { return size != part_size; }
     bool holds_doubles() const { return !is_integer && part_size == sizeof(double); }
 
-    // An integer holds no fraction, and 1 for what is no finite number.
+    // An integer drops the fraction, and stores 1 for an infinity or a NaN.
     void store(void* element, const double real, const double imaginary = 0) const {
         store_parts(element, real, imaginary);
     }
@@ -92,7 +92,7 @@ struct Values {
     double value1, value2;
 };
 
-// A usual number and another, which goes to a side that holds every real that is compared.
+// A usual number and another, which goes to a side whose type holds every real that is compared.
 inline Values usual_and(const ElementType& type1, const ElementType& type2, const double usual,
                         const double other) {
     const bool doubles = type1.holds_doubles() || type2.holds_doubles();

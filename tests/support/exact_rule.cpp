@@ -8,11 +8,11 @@
 namespace exact_rule {
 namespace {
 
-// Digits enough for the difference of any two doubles or integers of 64 bits, which lie between
+// Enough digits for the difference of any two doubles or integers of 64 bits, which lie between
 // 2^-1074 and 2^1024, and for that of a double and a small integer.
 constexpr mpfr_prec_t all_digits = 2304;
 
-// Digits enough for a value of which the first 64 are wanted.
+// Enough digits for a value whose first 64 are wanted.
 constexpr mpfr_prec_t many_digits = 256;
 
 class Real {
@@ -44,7 +44,7 @@ void must_be_exact(int rounding) {
     }
 }
 
-// Of two finite numbers.
+// Made from two finite numbers.
 struct Pair {
     Real larger = Real(all_digits); // its magnitude
     Real difference = Real(all_digits);

@@ -1,4 +1,4 @@
-// Where the steps of the tolerant comparison and its meaning part over random pairs, and how far
+// Where the steps of the tolerant comparison and its meaning disagree on random pairs, and how far
 // from the limit they may.
 
 #pragma once
@@ -20,7 +20,7 @@ namespace exactness {
 
 // ---- The meaning, quickly
 
-// The exact rule, asked only where `Wide` cannot.
+// The exact rule, evaluated exactly only where `Wide` cannot decide.
 //
 // Where `Wide` holds both numbers and the exponents of all results, the limit is rounded twice and
 // the difference once, each by at most half of epsilon: if they are computed to be further apart
@@ -105,26 +105,26 @@ struct Bounds {
 // Let u be 2^-digits, M the larger magnitude, d the difference, L the exact factor and f the
 // computed one.
 //
-// The difference: below M/2 it is exact, by Sterbenz. From M/2 on it may be rounded, by u d, but
-// not to less than M/2: that is a number of the type, or else M is subnormal and d exact. Hence the
-// early exit decides exactly, and under an f of at most 1/2 no pair from M/2 on is the same, as
-// should be. Where the smaller number vanishes it is at most u M, and no limit below M is as near
-// to M as that.
+// The difference: below M/2 it is exact, by Sterbenz. At M/2 or above it may be rounded, by u d,
+// but not to below M/2: M/2 is a number of the type, or else M is subnormal and d exact. Hence the
+// early exit decides exactly, and under an f of at most 1/2 no pair that differs by M/2 or more is
+// the same, as it should be. A smaller number that vanishes is at most u M, and no limit below M is
+// that near to M.
 //
-// Whole tolerances: f is L, a power of two. A magnitude of at least 1 times f, like a difference
-// below 1 divided by f, stays within the range in which such a scaling is exact. The steps and the
-// meaning agree.
+// Whole tolerances: f is L, a power of two. A magnitude of at least 1 is multiplied by f, or a
+// difference below 1 divided by f; both stay within the range in which such a scaling is exact. The
+// steps and the meaning agree.
 //
-// Fractional ones: f is L(1 + e) with e at most 2u, as pow is within 1 ulp of a power between 1 and
-// 2, and shifting that is exact. The product f M, or the quotient d / f, is rounded, though never
-// across the number of the type that it is compared with, so that this can only make a pair
-// different. It does so within u of the limit or, as the quotient of a subnormal M is subnormal
-// too, within half the smallest number. Together: laxer by at most 2u of L; stricter by at most 3u
-// or, of a subnormal M, 2u and half the smallest number as a share of M. From `digits` - 1 on, the
-// rounding of d adds u to both.
+// Fractional tolerances: f is L(1 + e) with e at most 2u, as pow is within 1 ulp of a power between
+// 1 and 2, and shifting that power is exact. The product f M, or the quotient d / f, is rounded,
+// but never across the number of the type that it is compared with, so rounding can only make a
+// pair different. It does so within u of the limit or, as the quotient of a subnormal M is
+// subnormal too, within half the smallest number. Together: laxer by at most 2u of L; stricter by
+// at most 3u or, for a subnormal M, 2u and half the smallest number as a share of M. From a
+// tolerance of `digits` - 1 on, the rounding of d adds u to both.
 //
-// A tolerance that is rounded first moves L. An integer that is rounded moves d - L M by no more
-// than itself, and that is at most u M.
+// Rounding the tolerance first moves L. Rounding an integer moves d - L M by no more than it moves
+// the integer, which is at most u M.
 template <typename T, typename X>
 Bounds bounds(const double tolerance, const double limit, const T larger) {
     constexpr double u = std::numeric_limits<T>::epsilon() / 2;
@@ -154,14 +154,14 @@ struct Tally {
     // Beyond or within the limit; see `Survey`.
     double furthest_stricter = 0;
     double furthest_laxer = 0;
-    // What the bounds do not allow, and the first such pair.
+    // Disagreements that the bounds do not allow, and the first such pair.
     std::uint64_t unexplained = 0;
     std::string first_unexplained;
 };
 
 // The pairs of an `X`, which is a `T` or an integer, and a `T`, under one tolerance. How far from
-// the limit the steps and the meaning differ is counted as a share of the limit and, for integers,
-// which a tolerance of none leaves without a limit, of the larger magnitude.
+// the limit the steps and the meaning disagree is counted as a share of the limit or, for integers,
+// of the larger magnitude: they may disagree under a tolerance of none too, which sets no limit.
 template <typename X, typename T>
 class Survey {
   public:
@@ -196,7 +196,7 @@ class Survey {
     static constexpr int digits = std::numeric_limits<T>::digits;
     using Wide = std::conditional_t<std::is_same_v<X, float>, double, long double>;
 
-    // Twice the smaller is exact, or infinite.
+    // Doubling the smaller number is exact, or gives infinity.
     bool leaves_early(const T x, const T y) const {
         const T larger = std::max(std::fabs(x), std::fabs(y));
         const T smaller = std::min(std::fabs(x), std::fabs(y));

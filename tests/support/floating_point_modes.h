@@ -45,7 +45,7 @@ class RoundingScope {
 #if defined(__SSE2__)
 
 inline constexpr std::uint64_t status_flags = 0x3F;
-// Subnormal results, and subnormal operands.
+// One bit for subnormal results, one for subnormal operands.
 inline constexpr std::uint64_t flushing = 0x8040;
 
 inline std::uint64_t control_word() {
@@ -73,7 +73,7 @@ inline void set_control_word(const std::uint64_t word) {
 
 #elif defined(__arm__)
 
-// Among them what comparisons leave for branches.
+// Including the condition flags, which comparisons set for branches.
 inline constexpr std::uint64_t status_flags = 0xF800009F;
 inline constexpr std::uint64_t flushing = 1 << 24;
 
@@ -89,7 +89,7 @@ inline void set_control_word(const std::uint64_t word) {
 
 #elif defined(__s390x__)
 
-// And the cause of the last trap.
+// Including the cause of the last trap.
 inline constexpr std::uint64_t status_flags = 0x00F8FF00;
 inline constexpr std::uint64_t flushing = 0; // there is no such mode
 
@@ -107,8 +107,8 @@ inline void set_control_word(const std::uint64_t word) {
 #    error "this processor's control word of floating point is not known here"
 #endif
 
-// Takes subnormal numbers for zero for as long as it lives, if the processor can: all, or a part of
-// `flushing`.
+// Treats subnormal numbers as zero for as long as it lives, if the processor can: in all ways, or
+// only in a part of `flushing`.
 class FlushingScope {
   public:
     explicit FlushingScope(const std::uint64_t part = flushing)

@@ -123,7 +123,7 @@ class Calls {
     oracle::RandomTolerances tolerances_;
 };
 
-// 64-bit FNV-1a, of what the calls are as text.
+// 64-bit FNV-1a of the text of the calls.
 std::string digest_of(const std::vector<Call>& calls) {
     std::uint64_t digest = 0xcbf29ce484222325;
     for (const Call& call : calls) {
@@ -142,7 +142,7 @@ int oracle_answer_to(const Call& call, oracle::State& state) {
     return same ? 1 : 0;
 }
 
-// Four answers a digit.
+// Four answers to a digit.
 std::string answers_to(std::vector<Call>& block, oracle::State& state) {
     std::string answers;
     std::size_t four_answers = 0;

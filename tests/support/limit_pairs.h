@@ -15,12 +15,11 @@ namespace exactness {
 
 // ---- Tolerances
 
-// By what the rule makes of them. `last_digit` is between `digits` - 1 and `digits`, `fractional`
-// below.
+// The kinds that the rule treats differently. `last_digit` is between `digits` - 1 and `digits`;
+// `fractional` is a fraction below that.
 enum class Kind { none, whole, fractional, last_digit, all };
 
-// Where pairs are drawn, and the tolerances for them: anywhere, or where the steps come to their
-// limits.
+// Where pairs and their tolerances are drawn: anywhere, or at the limits of the steps.
 enum class Place { random, at_limit };
 
 template <typename T>
@@ -90,7 +89,7 @@ T random_tolerance(oracle::Random& random, const Kind kind, const Place place) {
 // ---- Pairs
 
 // Finite and above zero: every magnitude from the smallest subnormal number to the largest finite
-// one, more often than not where the arithmetic changes.
+// one, mostly where the arithmetic changes.
 template <typename T>
 T random_finite_magnitude(oracle::Random& random) {
     using limits = std::numeric_limits<T>;
@@ -112,7 +111,7 @@ T random_finite_magnitude(oracle::Random& random) {
 
 // The two differ by `share` of the larger, give or take some ulps. A difference of few digits is
 // drawn first and the larger number after it, as otherwise the ulps of a large difference would be
-// too coarse to come near to the limit.
+// too coarse to come near the limit.
 template <typename T>
 std::pair<T, T> pair_of_difference(oracle::Random& random, const T magnitude, const T share,
                                    const int most_ulps) {
@@ -122,7 +121,7 @@ std::pair<T, T> pair_of_difference(oracle::Random& random, const T magnitude, co
     return {larger, larger - difference};
 }
 
-// One of them, which is not zero, is given.
+// One of the two is the magnitude, which is not zero, or their difference is made from its ulps.
 template <typename T>
 std::pair<T, T> pair_at_limit(oracle::Random& random, const T magnitude, const T share,
                               const int most_ulps) {
@@ -155,7 +154,8 @@ std::pair<T, T> with_random_order_and_sign(oracle::Random& random, std::pair<T, 
     return random.one_in(2) ? std::pair<T, T>{-pair.first, -pair.second} : pair;
 }
 
-// Two reals, no NaN. One has the magnitude; at the limit they are at most so many ulps off it.
+// Two reals, neither a NaN. One is made from the magnitude; at the limit they are at most
+// `most_ulps` off it.
 template <typename T>
 std::pair<T, T> random_pair(oracle::Random& random, const Place place, const T share,
                             const T magnitude, const int most_ulps) {

@@ -1,6 +1,6 @@
-// The loops over the pairs of elements, by vectors of every instruction set of the build and one by
-// one, as functions that are chosen at run time, and the plain loop over the element test, which
-// each of them has to answer and remember as.
+// The loops over the pairs of elements, as functions that are chosen at run time: by vectors of
+// every instruction set of the build, and one by one. Each has to answer and remember as the plain
+// loop over the element test, which is here too.
 
 #pragma once
 
@@ -36,7 +36,7 @@ void remember(const Remembered& factors);
 // Those of one tolerance, or of none.
 Remembered factors_of(double tol);
 
-// The factor where reals of that many digits are compared.
+// The factor for comparing reals of that many digits.
 double factor_of_reals(int digits, const Remembered& factors);
 
 bool same_factors(const Remembered& factors1, const Remembered& factors2);

@@ -102,7 +102,7 @@ double load_real(const unsigned char* at, std::size_t size) {
     return size == 4 ? static_cast<double>(load<float>(at)) : load<double>(at);
 }
 
-// What is not complex gets an imaginary part of zero.
+// An element that is not complex gets an imaginary part of zero.
 Element decode(ElementType type, const unsigned char* at) {
     const std::size_t size = type.part_size;
     const Number zero = real_number(0);
@@ -125,15 +125,15 @@ Element element_at(const Array& array, std::int32_t index) {
 }
 
 // 32-bit ARM has no instruction that converts an integer of 64 bits, and the routine that does it
-// rounds to nearest in every direction of rounding.
+// rounds to nearest whatever the direction of rounding.
 #if defined(__arm__)
 constexpr std::size_t widest_converted_by_instruction = 4;
 #else
 constexpr std::size_t widest_converted_by_instruction = 8;
 #endif
 
-// Whether a magnitude between two reals goes to the greater one, as the direction of rounding says;
-// to nearest, from midway to the even one.
+// Whether the direction of rounding takes a magnitude between two reals to the greater one; to
+// nearest, a magnitude midway goes to the even one.
 bool goes_up(const Number& integer, std::uint64_t kept, std::uint64_t rest, std::uint64_t half) {
     const bool by_instruction = integer.size <= widest_converted_by_instruction;
     switch (by_instruction ? std::fegetround() : FE_TONEAREST) {
@@ -148,8 +148,8 @@ bool goes_up(const Number& integer, std::uint64_t kept, std::uint64_t rest, std:
     }
 }
 
-// Rounds to `digits` binary digits in whole numbers: a single thus comes from an integer in one
-// rounding, whatever conversion the compiler would choose.
+// Rounds to `digits` binary digits in integer arithmetic, so that an integer becomes a single in
+// one rounding, whatever conversion the compiler would choose.
 double rounded(const Number& integer, int digits) {
     const std::uint64_t magnitude = integer.magnitude;
     int dropped = 0;
@@ -175,8 +175,8 @@ double value_of(const Number& number, int digits) {
 
 // ---- Tolerant comparison
 
-// Called through volatile pointers, because a compiler may put exp2(x) in the place of pow(2, x),
-// and the two differ in the last digit.
+// Called through volatile pointers, because a compiler may replace pow(2, x) by exp2(x), and the
+// two differ in the last digit.
 double (*volatile power_of_doubles)(double, double) = std::pow;
 float (*volatile power_of_singles)(float, float) = std::pow;
 
@@ -202,7 +202,7 @@ int compare_reals(FactorCache& cache, Real (*factor_of)(Real), Real tolerance, R
         return 0;
     }
     const Real larger = std::max(std::fabs(x), std::fabs(y));
-    // Not the magnitude of any difference, as a negative one may be rounded otherwise.
+    // Not the absolute value of x - y, as a negative difference may be rounded differently.
     const Real difference = x > y ? x - y : y - x;
     if (difference == larger) {
         return order;

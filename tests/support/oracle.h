@@ -1,4 +1,4 @@
-// The rule of both predicates, written a second time and as naively as it can be: every element is
+// The rule of both predicates, written a second time and as naively as possible: every element is
 // decoded at run time into a plain number, and nothing is shared with the module under test.
 
 #ifndef TALNUMERICARRAY_TESTS_ORACLE_H
@@ -10,7 +10,7 @@
 
 namespace oracle {
 
-// The one tolerance whose factor is held. The values of single width are exact in a double.
+// The one tolerance whose factor is held, and that factor. Singles are exact in a double.
 struct FactorCache {
     double last_tolerance;
     double factor;

@@ -1,5 +1,5 @@
-// Calls of every kind, with their arrays and answers made ready, for tests that watch what happens
-// during calls and nothing else.
+// Calls of every kind, with arrays and answers prepared, for tests that watch what happens during
+// the calls alone.
 
 #pragma once
 
@@ -26,10 +26,10 @@ inline int wrong_answers_to(const PreparedCall& call) noexcept {
     return (same == call.same ? 0 : 1) + (equivalent == call.equivalent ? 0 : 1);
 }
 
-// All pairs of element types, under tolerances that need no factor, a factor of either kind, one
-// that depends on what is remembered, and none again; short arrays and those that are compared in
-// blocks, of equal pairs, of near pairs, and with one pair in the middle that is unlike the others.
-// No answer depends on what the thread has compared before.
+// Calls for all pairs of element types, under tolerances that need no factor, a factor of either
+// kind, one that depends on what is remembered, and none again. Arrays are short, or long enough to
+// be compared in blocks; they hold equal pairs or near pairs, with or without an unlike pair in the
+// middle. No answer depends on what the thread has compared before.
 class PreparedCalls {
   public:
     PreparedCalls() {
@@ -40,7 +40,7 @@ class PreparedCalls {
         });
     }
 
-    // Nothing but the calls.
+    // Makes the calls and does nothing else.
     int wrong_answers() const noexcept {
         int wrong = 0;
         for (const PreparedCall& call : calls_) {
@@ -97,6 +97,6 @@ class PreparedCalls {
         }
     }
 
-    std::deque<AnyArray> arrays_; // which are not moved
+    std::deque<AnyArray> arrays_; // a deque does not move them
     std::vector<PreparedCall> calls_;
 };

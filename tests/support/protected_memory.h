@@ -1,4 +1,4 @@
-// Memory that ends where nothing can be read, or that cannot be written.
+// Memory that ends at an unreadable page, or that cannot be written.
 
 #pragma once
 
@@ -10,8 +10,8 @@
 #include <sys/mman.h>
 #include <unistd.h>
 
-// Readable pages with an unreadable page after them. They end at an odd number of pages, which is
-// the end of nothing that is larger than a page.
+// Readable pages with an unreadable page after them. They end at an odd multiple of the page size,
+// where no aligned block larger than a page ends.
 class ProtectedMemory {
   public:
     explicit ProtectedMemory(const std::size_t bytes)

@@ -12,7 +12,8 @@ namespace {
 
 // ---- Reals
 
-// Bits, as a register may change those of a signalling NaN. Of random ones few are an infinity.
+// Returns bits, as a register may change those of a signalling NaN. Few random patterns give an
+// infinity.
 template <typename Real>
 BitsOf<Real> nan_bits(const std::uint64_t pattern) {
     constexpr int stored_digits = std::numeric_limits<Real>::digits - 1;
@@ -32,7 +33,7 @@ std::uint64_t low_bits(Integer value) {
     return value.negative ? 0 - value.magnitude : value.magnitude;
 }
 
-// How a number is stored; a complex one is two of these.
+// How a number is stored; a complex number is stored as two of these.
 struct Part {
     bool is_real;
     bool is_signed;
@@ -62,7 +63,7 @@ Integer fitted(Integer value, Part part) {
     return {negative, value.magnitude};
 }
 
-// Midway between two reals of that many digits.
+// Midway between two reals of `digits` digits.
 std::uint64_t random_tie(Draws& draws, int digits) {
     const std::uint64_t leading = std::uint64_t{1} << digits;
     const std::uint64_t tie = (draws.bits() >> (63 - digits)) | leading | 1;
@@ -96,7 +97,7 @@ Integer random_integer(Draws& draws, Part part) {
     return fitted({draws.one_in(2), random_integer_magnitude(draws)}, part);
 }
 
-// A pattern that is near to the first, or looks like it.
+// A pattern that is near the first, or looks like it.
 std::uint64_t hard_pattern(Draws& draws, std::uint64_t first, std::uint32_t first_bits) {
     switch (draws.below(6)) {
     case 0:
@@ -207,8 +208,8 @@ class PairWriter {
         return value.negative ? -magnitude : magnitude;
     }
 
-    // What arithmetic makes of a NaN's bits differs between platforms, so they are drawn. NaNs of
-    // an easy pair have the same.
+    // Platforms differ in what arithmetic makes of a NaN's bits, so these are drawn. The NaNs of an
+    // easy pair have the same bits.
     template <typename Real>
     void store_real(void* at, const Real value, const bool hard) {
         if (!std::isnan(value)) {
@@ -253,8 +254,8 @@ class PairWriter {
         }
     }
 
-    // With a large difference the partner is small and its last place is too fine to matter, so
-    // that the difference is nudged as well.
+    // With a large difference the partner is small and its last place is too fine to matter, so the
+    // difference is nudged as well.
     template <typename Real>
     Real limit_partner(const Real anchor) {
         if (draws_.one_in(2)) {
@@ -263,13 +264,13 @@ class PairWriter {
         return nudged(draws_, scaled(anchor, share<Real>()), 3);
     }
 
-    // A number that differs by that share of the larger of the two.
+    // A number that differs by `share` of the larger of the two.
     template <typename Real>
     Real scaled(const Real anchor, const Real share) {
         return draws_.one_in(3) ? anchor / (1 - share) : anchor - anchor * share;
     }
 
-    // Here the answer depends on the cache.
+    // A share at which the answer depends on the cache.
     template <typename Real>
     Real between_half_and_share() {
         return Real{0.5} + (share<Real>() - Real{0.5}) * static_cast<Real>(draws_.unit());

@@ -1,4 +1,4 @@
-// The factor of a tolerance, in integer arithmetic: every platform has the same, whatever its pow.
+// The factor of a tolerance, in integer arithmetic: the same on every platform, whatever its pow.
 
 #pragma once
 
@@ -17,8 +17,8 @@ constexpr std::uint64_t high_product(const std::uint64_t a, const std::uint64_t 
     return (a >> 32) * (b >> 32) + (middle >> 32) + (other_middle >> 32);
 }
 
-// 2^(tolerance - digits), rounded to nearest; of 1000 factors one may be rounded the wrong way. The
-// tolerance is between 0 and the digits.
+// 2^(tolerance - digits), rounded to nearest; one factor in 1000 may be rounded the wrong way. The
+// tolerance is between 0 and `digits`.
 template <typename Real>
 Real rounded_factor(const Real tolerance) {
     constexpr int digits = std::numeric_limits<Real>::digits;

@@ -16,7 +16,8 @@
 
 namespace exactness {
 
-// How many pairs, and one of how many the exact rule judges as well as the quick one.
+// How many pairs are judged, and one in how many of them by the exact rule as well as by the quick
+// one.
 struct Extent {
     std::uint64_t pairs;
     std::uint32_t verify_one_in;
@@ -29,11 +30,11 @@ inline constexpr Kind kinds[] = {Kind::none, Kind::whole, Kind::fractional, Kind
 inline constexpr Factor factors[] = {Factor::remembered, Factor::forgotten};
 inline constexpr Place places[] = {Place::random, Place::at_limit};
 
-// From half a unit in the last place of 24 below it, a tolerance is rounded to 24.
+// From here on, half a unit in the last place below 24, a tolerance is rounded to 24.
 inline constexpr double first_rounded_up = 24 - 0x1p-20;
 
-// The share of the larger number by which pairs differ at the limit, or at some number where there
-// is none.
+// The share of the larger number by which pairs at the limit differ, or a stand-in where there is
+// no limit.
 template <typename T>
 T share_at_limit(const double tolerance, const double limit) {
     const bool has_limit = limit > 0;
@@ -42,7 +43,7 @@ T share_at_limit(const double tolerance, const double limit) {
                            : std::numeric_limits<T>::epsilon() / 2;
 }
 
-// Where the larger magnitude is subnormal, the steps are further from the meaning.
+// Counted apart, as the steps are further from the meaning where the larger magnitude is subnormal.
 struct Tallies {
     Tally normal;
     Tally subnormal;
@@ -86,8 +87,8 @@ Tallies survey_reals(oracle::Random& random, const Kind kind, const Factor facto
 
 // ---- Singles under a tolerance that is no single
 
-// Of a magnitude that no rounding of the quotient disturbs. At the limit, they are as far around it
-// as a rounded tolerance moves it.
+// The magnitude is one that no rounding of the quotient disturbs. At the limit, pairs are as far
+// around it as rounding the tolerance moves it.
 inline std::pair<float, float> pair_under_rounded_tolerance(oracle::Random& random,
                                                             const Place place, const float share) {
     const auto significand = static_cast<float>(1 + random.unit());
@@ -108,7 +109,8 @@ inline Tally survey_rounded_tolerances(oracle::Random& random, const double low,
 
 // ---- Integers
 
-// Of more than `digits` digits: half of them near the middle of two reals of that many digits.
+// An integer of more than `digits` digits; half of them are near the midpoint of two reals of
+// `digits` digits.
 inline std::uint64_t random_long_integer(oracle::Random& random, const int digits,
                                          const int most_digits) {
     const int length = random.between(digits + 1, most_digits);

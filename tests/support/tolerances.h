@@ -7,7 +7,7 @@
 inline constexpr double every_tolerance[] = {
     0, -0.0, -1, 1e-300, 0.5, 1, 10, 23.5, 24, 30, 52.5, 53, 60, 1e300, HUGE_VAL, -HUGE_VAL, NAN};
 
-// What `ask(tol)` answers under every tolerance; 99 where that is not one answer.
+// The answer of `ask(tol)` under every tolerance, or 99 if it is not always the same.
 template <typename Ask>
 int under_every_tolerance(const Ask& ask) {
     const int answer = ask(every_tolerance[0]);

@@ -1,4 +1,4 @@
-// Calls for every element type of the one list, and for every ordered pair of them.
+// Calls an action for every element type of the module's list, and for every ordered pair of them.
 
 #pragma once
 

@@ -1,5 +1,5 @@
-// Worked examples of the rule, by which a reader can trust the oracle before it judges the module,
-// and the module by itself. No answer depends on what has been compared before.
+// Worked examples of the rule. They let a reader trust the oracle before it judges the module, and
+// they test the module directly. No answer depends on what has been compared before.
 
 #pragma once
 
@@ -116,7 +116,7 @@ inline std::vector<ExampleOfElements> examples_of_elements() {
     constexpr float single_nan = std::numeric_limits<float>::quiet_NaN();
     constexpr UBIT64 largest = std::numeric_limits<UBIT64>::max();
     const std::vector<double> all(std::begin(every_tolerance), std::end(every_tolerance));
-    // Rounded by way of a double it would be midway between two singles and go to the even one.
+    // Rounded first to a double it would be midway between two singles and go to the even one.
     constexpr BIT64 above_midway = (BIT64{1} << 60) + (BIT64{1} << 36) + 1;
     return {
         // Integers, by value.

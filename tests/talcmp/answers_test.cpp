@@ -40,7 +40,7 @@ const auto f64 = npy::row<double>;
 const auto c64 = npy::row<std::complex<float>>;
 const auto c128 = npy::row<std::complex<double>>;
 
-// Writes both files and expects the answer: nothing where `difference` is empty.
+// Writes both files and expects the answer, which is nothing where `difference` is empty.
 void expect_answer(const TemporaryFolder& folder, Options arguments, const std::string& first,
                    const std::string& second, const std::string& difference) {
     const std::string path1 = folder.write("a.npy", first);
@@ -63,7 +63,7 @@ struct Answer {
     std::string option = {};
 };
 
-// An array of one element, of which the bits are given.
+// An array of one element that is given by its bits.
 template <typename T, typename Bits>
 std::string of_bits(const Bits bits) {
     return npy::header(npy::dictionary(npy::descr<T>(), "False", "(1,)")) + npy::element(bits);
@@ -201,7 +201,7 @@ const Answer types_and_shapes[] = {
      "[]: 1 and 2 (no digit in common)"},
 };
 
-// The array [1. 2.] with a dictionary of its element type and what is around that.
+// The array [1. 2.], with the text before and after its element type in the dictionary.
 std::string spelled(const std::string& before, const std::string& after) {
     const std::string descr = npy::native + std::string("f8");
     return npy::header(before + descr + after) + npy::elements<double>({1, 2});
@@ -283,7 +283,8 @@ TEST(Parts, MayBeOfArraysOfDifferentShapes) {
 
 // ---- All types, versions, places and alignments
 
-// talcmp starts slowly in an emulator. Seven leaves out no version of the format and no type.
+// talcmp starts slowly in an emulator. A stride of seven leaves out no version of the format and no
+// type.
 constexpr std::size_t stride = std::min<std::size_t>(emulated_stride, 7);
 
 const std::string type_names[] = {"int8",    "uint8",   "int16",     "uint16",
@@ -294,7 +295,7 @@ const std::string& name_of_type(const type_t id) {
     return type_names[id - 1];
 }
 
-// The array [1, 100] of each type, with as many spaces after the dictionary.
+// The array [1, 100] of each type, with `spaces` spaces after the dictionary.
 template <typename... Types>
 std::vector<std::string> files_of(type_list<Types...> /*types*/, const int version,
                                   const std::size_t spaces, const char byte_order = npy::native) {
@@ -362,7 +363,7 @@ TEST(EveryType, IsComparedByValueWithEveryOther) {
     });
 }
 
-// Far more than are compared at once, at an offset that is a multiple of 8 or is not.
+// Far more elements than are compared at once, at an offset that is or is not a multiple of 8.
 class Slices : public testing::TestWithParam<std::size_t> {
   protected:
     static std::string file(const Reals& elements) {
@@ -387,7 +388,8 @@ TEST_P(Slices, DifferWhereTheArraysDo) {
     }
 }
 
-// What is compared before a pair has no influence on it, even under such a tolerance.
+// The answer about a pair does not depend on earlier pairs, even under a tolerance that leaves less
+// than one digit.
 TEST_P(Slices, DoNotDependOnEachOther) {
     const TemporaryFolder folder;
     const Reals ones(131072, 1.0);

@@ -46,7 +46,7 @@ std::string with_shape(const std::string& shape) {
     return file(npy::dictionary(real, "False", shape));
 }
 
-// A good file, except for its version and what its header says of the length of the dictionary.
+// A good file, except for its version and the length that its header gives the dictionary.
 std::string with_beginning(const int major, const int minor, const std::string& length) {
     return npy::magic + npy::version(major, minor) + length + good_dictionary + two_reals;
 }
@@ -82,7 +82,7 @@ struct BrokenFile {
     const char* name;
     std::string bytes;
     std::string message;     // after the name of the file
-    std::string member = {}; // in brackets, where the message is of one
+    std::string member = {}; // in brackets, if the message is about one
 };
 
 std::string short_header(const std::string& there) {
@@ -108,7 +108,7 @@ std::string surplus(const int bytes) {
            + "); save one array per file";
 }
 
-// Of a type with its quotes.
+// The message about a type, which is given with its quotes.
 std::string unsupported_type(const std::string& type, const std::string& kind = "") {
     return "has elements of type " + type + kind
            + ", which is not supported; save them as integers of 8 to 64 bits, float32, float64, "
@@ -271,7 +271,7 @@ const std::string two_of_one_name = "has two members of the name 'a'";
 
 const BrokenFile archives[] = {
     {"TwoMembersOfOneName", zipped::archive({{"a.npy"}, {"b.npy"}, {"a.npy"}}), two_of_one_name},
-    // NumPy calls both arrays so.
+    // NumPy gives both arrays this name.
     {"NamesWithAndWithoutSuffix", zipped::archive({{"a"}, {"a.npy"}}), two_of_one_name},
     {"UnknownMethod", zipped::archive({{"a.npy", file(good_dictionary), 0, 97}}),
      "cannot be opened: Compression method not supported", "[a]"},

@@ -97,7 +97,7 @@ talcmp::RegularFile opened(const std::string& path, const std::uint64_t size) {
     return {path, talcmp::Descriptor(::open(path.c_str(), O_RDONLY | O_CLOEXEC)), size};
 }
 
-// The beginning, of 4096 bytes, is read once and kept.
+// The first 4096 bytes are read once and kept.
 TEST(Files, AreReadAnywhere) {
     const TemporaryFolder folder;
     for (const std::size_t size : {0U, 1000U, 4095U, 4096U, 4097U, 10000U}) {
@@ -125,7 +125,7 @@ TEST(Files, KeepTheirBeginning) {
     EXPECT_EQ(read(file, 4090, 7), "bbbbbbb");
 }
 
-// Or it would be closed twice, and in between its number given to another file.
+// Otherwise a descriptor would be closed twice, and another file could get its number in between.
 TEST(Files, OfArchivesAreLeftToTheArchive) {
     const TemporaryFolder folder;
     const std::string bytes = zipped::archive({{"a.npy", npy::row<double>({1, 2})}});

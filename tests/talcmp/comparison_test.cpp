@@ -41,7 +41,7 @@ Source zeros_and_one(const std::uint64_t one) {
                        std::int8_t* elements) { read_zeros_and_one(one, first, count, elements); });
 }
 
-// Not for ever, as there may be no other thread.
+// Gives up in the end, as there may be no other thread.
 template <typename Event>
 void wait_for(const Event& has_come) {
     for (int patience = 200; !has_come() && patience > 0; --patience) {
@@ -53,8 +53,8 @@ void wait_for(const Event& has_come) {
     throw talcmp::Trouble("broken.npy", "cannot be read from " + std::to_string(first) + " on");
 }
 
-// Zeros, of which those from `broken` on cannot be read. The first are handed out only after the
-// others have failed, if anybody asks for those meanwhile.
+// Zeros that cannot be read from `broken` on. The first are handed out only after others have
+// failed, if any are read meanwhile.
 Source broken_array(const std::uint64_t broken, std::atomic<int>& failures) {
     return bytes([broken, &failures](const std::uint64_t first, const std::uint64_t count,
                                      std::int8_t* elements) {
@@ -67,7 +67,7 @@ Source broken_array(const std::uint64_t broken, std::atomic<int>& failures) {
     });
 }
 
-// Can be read only once, by columns, and fails.
+// A source that can be read only once, by columns, and fails.
 Source broken_pipe(const std::string& name) {
     const auto fail = [name](std::uint64_t /*first*/, std::uint64_t /*count*/,
                              std::int8_t* /*elements*/) {
@@ -106,7 +106,7 @@ TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceThatFails) {
               "broken.npy: cannot be read from 0 on");
 }
 
-// Of what several threads read at once the first elements fail first.
+// Several threads read at once, and the first elements fail first.
 TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceWhateverFailsLater) {
     std::atomic<bool> others_begun = false;
     std::atomic<bool> first_failed = false;
@@ -118,7 +118,7 @@ TEST_P(BrokenFiles, AreTroubleAtTheFirstPlaceWhateverFailsLater) {
         } else {
             others_begun = true;
             wait_for([&] { return first_failed.load(); });
-            std::this_thread::sleep_for(20ms); // until that is known
+            std::this_thread::sleep_for(20ms); // until the failure is known
         }
         fail_from(first);
     };
@@ -258,7 +258,7 @@ void expect_first_places(const talcmp::Question& question, const std::size_t row
     }
 }
 
-// Where boxes are cut off at the edges.
+// At these sizes boxes are cut off at the edges.
 TEST_P(Comparisons, ListPlacesInRowMajorOrderHoweverArraysAreStored) {
     const Indices indices = {{2, 1499},    {3, 3},    {1447, 1448}, {1448, 2},
                              {1448, 1447}, {1499, 0}, {1499, 1499}};
@@ -363,12 +363,12 @@ TEST_P(Comparisons, ReadNoFurtherThanToThePlacesThatAreListed) {
 
 // ---- Threads
 
-// Of threads that read at once.
+// A meeting of threads that read at once.
 class Meeting {
   public:
     explicit Meeting(const unsigned expected) : expected_(expected) {}
 
-    // Waits until as many are there as are expected, or in vain.
+    // Waits until all that are expected are there, or gives up.
     void attend() {
         std::unique_lock<std::mutex> lock(mutex_);
         most_ = std::max(most_, ++present_);

@@ -1,4 +1,4 @@
-// The digits that talcmp finds pairs to differ in, against the answers of the module on each.
+// The digits in which talcmp finds that pairs differ, against the module's answers about each pair.
 
 #include "digits.h"
 
@@ -16,7 +16,7 @@ namespace {
 using talcmp::DigitSearch;
 using talcmp::Sameness;
 
-// Of which the limits of all whole tolerances are as likely.
+// Pairs near the limits of random whole tolerances.
 class DrawnPairs {
   public:
     DrawnPairs(const ElementType& type1, const ElementType& type2, const std::size_t count)
@@ -44,7 +44,7 @@ class DrawnPairs {
     std::vector<unsigned char> elements2_;
 };
 
-// From one whole tolerance to the next no pair that is the same stops being so.
+// A pair that is the same under one whole tolerance stays so under the next.
 bool is_sameness_of(const talcmp::Pairs& pairs, const std::size_t i, const Sameness sameness) {
     const int from_one = sameness.from_one();
     return pairs.same(0, i) == sameness.at_zero() && (from_one == 1 || !pairs.same(from_one - 1, i))

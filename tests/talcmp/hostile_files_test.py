@@ -13,7 +13,7 @@ from support.talcmp_command import Folder, read_bytes, run, run_tests, summary
 
 
 class TwoFolders(Folder):
-    """That hold a file which is the same."""
+    """Two folders that hold the same file."""
 
     def setUp(self):
         super().setUp()
@@ -26,7 +26,7 @@ class TwoFolders(Folder):
 
 
 class StandardDescriptors(Folder):
-    """Closed by whoever starts talcmp: no file may take the place of one."""
+    """Whoever starts talcmp has closed them: no file may take the place of one."""
 
     def expect_closed(self, redirection, status, output, errors, *arguments):
         self.expect(status, output, errors, *arguments,
@@ -97,7 +97,7 @@ class FoldersThatCannotBeRead(TwoFolders):
     def check(self, locked, mode, output, errors, first):
         self.addCleanup(os.chmod, locked, 0o700)
         os.chmod(locked, mode)
-        # As root without what makes permissions mean nothing.
+        # Root, without the capabilities that override permissions.
         prefix = ["setpriv", "--bounding-set=-dac_override,-dac_read_search"]
         self.expect(2, output, f"talcmp: {errors}\n", first, self.two,
                     prefix=prefix if os.geteuid() == 0 else ())
@@ -254,10 +254,10 @@ class EntriesOfFolders(Folder):
 
 
 class PipesAndFiles(Folder):
-    """The same bytes have the same answer from both."""
+    """The same bytes get the same answer from a pipe as from a file."""
 
     def check(self, status, contents, other, *options, trouble=None):
-        """The trouble is that of the pipe."""
+        """`trouble` is what is wrong with the pipe."""
         file = self.write("contents.npy", contents)
         self.assertEqual(run(*options, file, other)[0], status)
         from_pipe, _, errors = run(*options, "-", other, input=contents)

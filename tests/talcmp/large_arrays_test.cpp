@@ -21,7 +21,7 @@ using Words = std::vector<std::string>;
 
 constexpr std::uint64_t GiB = std::uint64_t{1} << 30U;
 
-// Of talcmp and the libraries that it uses, in KiB.
+// The memory of talcmp and the libraries that it uses, in KiB.
 constexpr long most_memory = 64L * 1024;
 
 class ExhaustiveLargeArrays : public testing::Test {
@@ -93,7 +93,8 @@ std::size_t lines_with(const std::string& text, const std::string& words) {
     return count;
 }
 
-// Each place is held by every thread, and by what puts them together; its text is not held at all.
+// Each place is held by every thread, and by the code that merges them; its text is not held at
+// all.
 TEST(ExhaustiveManyPlaces, TakeTheMemoryThatIsDocumented) {
     constexpr std::size_t count = 300000;
     constexpr long bytes_of_place = 48;

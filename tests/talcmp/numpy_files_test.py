@@ -115,7 +115,7 @@ def random_values(rng, dtype, shape):
 
 
 def near_values(rng, values):
-    """Of the same type; most elements as they are, or a few digits away."""
+    """Values of the same type, most of them equal or a few digits away."""
     other = values.copy()
     if values.dtype.kind in "iu":
         changed = rng.random(values.shape) < 0.1

@@ -17,8 +17,8 @@ namespace {
 
 using Words = std::vector<std::string>;
 
-// What the spaces of a text separate; or words that are given one by one, as one is empty or has a
-// space in it.
+// The words of a text, which spaces separate; or words given one by one, where one is empty or has
+// a space in it.
 struct Arguments : Words {
     using Words::Words;
     Arguments(const char* const text) {

@@ -49,7 +49,7 @@ TYPED_TEST(PairSearch, FindsTheFirstDifferenceAndReadsNothingPastTheElements) {
     }
 }
 
-// What is the same under such a tolerance depends on whether its factor is remembered.
+// The answer under such a tolerance depends on whether its factor is remembered.
 template <typename Real>
 void expect_factor_is_remembered() {
     const double tolerance = std::numeric_limits<Real>::digits - 0.5;

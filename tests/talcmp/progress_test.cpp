@@ -1,4 +1,4 @@
-// What the bar says that shows how far a comparison is.
+// The bar that shows how far a comparison is: what it says, and when it is drawn.
 
 #include "progress_bar.h"
 #include "status_line.h"

@@ -23,7 +23,7 @@ namespace {
 
 int questions = 0;
 
-// A hundred sums, of which two of three differ, in one to four digits.
+// A hundred sums, two of three of which differ, in one to four digits.
 talcmp::Comparison compare_sums(const bool report, const std::size_t differences) {
     std::vector<double> forward(100);
     std::vector<double> backward(forward.size());
@@ -50,7 +50,7 @@ TEST(Questions, AreFewWhereAReportIsAskedFor) {
     EXPECT_LE(questions, 45);
 }
 
-// One to two to find each, and few for all to find how much they differ.
+// One or two questions find each place, and a few more in all how much the pairs differ.
 TEST(Questions, AreFewWherePlacesAreListed) {
     EXPECT_EQ(compare_sums(false, 100).places.size(), 66U);
     EXPECT_LE(questions, 2 * 66 + 45);

@@ -90,7 +90,7 @@ class OnlyWhether : public testing::TestWithParam<unsigned> {
     static constexpr std::uint64_t length = 1000;
     static constexpr std::uint64_t size = length * length;
 
-    // Of two arrays in Fortran order.
+    // Compares two arrays in Fortran order.
     static talcmp::Difference difference(const std::uint64_t one, const std::uint64_t broken,
                                          Reads& reads, const bool only_whether = true) {
         talcmp::Question question = question_of(GetParam());

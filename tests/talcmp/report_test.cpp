@@ -1,4 +1,4 @@
-// What is counted of pairs, and which of them are listed.
+// What is counted about pairs, and which of them are listed.
 
 #include "pair_counter.h"
 
@@ -129,7 +129,7 @@ talcmp::Pairs pairs_of(const Reals& first, const Reals& second) {
     return {type, first.data(), type, second.data(), first.size()};
 }
 
-// 1 and another number that differ in so many digits.
+// 1 and another number that differ in `digits` digits.
 double with_digits(const int digits) {
     return 1 - std::ldexp(digits == 1 ? 0.5 : 0.75, digits - 53);
 }
@@ -194,7 +194,8 @@ TEST_P(Reports, CountAllPairsAndListTheFirst) {
 
 INSTANTIATE_TEST_SUITE_P(Tolerance, Reports, named_cases(counted), name_of_case);
 
-// Stretches come in any order, and those of arrays in column-major order with any numbers in them.
+// Stretches come in any order, and those of arrays in column-major order may have any numbers in
+// them.
 TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {
     const struct {
         const char* name;
@@ -264,7 +265,7 @@ TEST(Report, KnowsTheSmallestToleranceForAll) {
     EXPECT_EQ(smallest_tolerance(totals_of({1, -1}, 0), 53), std::nullopt);
 }
 
-// That of all digits is one that says nothing.
+// A smallest tolerance of all digits would say nothing.
 TEST(Report, KnowsNoSmallestToleranceWhereNoDigitIsInCommon) {
     EXPECT_EQ(smallest_tolerance(totals_of({with_digits(53), with_digits(7)}, 0), 53),
               std::nullopt);

@@ -30,7 +30,8 @@ class Summaries : public testing::Test {
         }
     }
 
-    // Of the files `name`0.npy, `name`1.npy...; of none where the bytes are empty.
+    // Writes the files `name`0.npy, `name`1.npy... in each folder, but none where the bytes are
+    // empty.
     void write_pairs(const std::string& name, const int count, const std::string& first,
                      const std::string& second) const {
         for (int i = 0; i < count; ++i) {
@@ -44,7 +45,7 @@ class Summaries : public testing::Test {
         }
     }
 
-    // The line with each number below `count` for its '#'s.
+    // Copies of the line, with each number below `count` in place of its '#'s.
     static std::string lines(const std::string& line, const int count) {
         std::string text;
         for (int i = 0; i < count; ++i) {
@@ -66,7 +67,7 @@ const std::string no_npy =
     "talcmp: first/e0.npy: is not an .npy file: it does not begin with \\x93NUMPY\n";
 
 TEST_F(Summaries, CountEachKind) {
-    // Each count is another one.
+    // No two counts are equal.
     write_pairs("a", 5, one, one);
     write_pairs("b", 4, one, two);
     write_pairs("c", 3, one, "");

@@ -103,7 +103,7 @@ TEST_F(TemporaryCopies, AreTroubleWhereTheyDoNotFit) {
     const auto old_action = std::signal(SIGXFSZ, SIG_IGN);
     struct rlimit old_limit = {};
     ::getrlimit(RLIMIT_FSIZE, &old_limit);
-    // The first piece fits, of the second a part.
+    // The first piece fits, and a part of the second.
     const struct rlimit limit = {20000, old_limit.rlim_max};
     ::setrlimit(RLIMIT_FSIZE, &limit);
     const std::string trouble = trouble_in_taking();

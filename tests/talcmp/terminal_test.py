@@ -24,7 +24,7 @@ ESCAPE = "\x1b["
 
 
 def read_some(terminal):
-    """Nothing at the end, and none within a minute."""
+    """What can be read; nothing at the end, or if none comes within a minute."""
     ready, _, _ = select.select([terminal], [], [], 60)
     try:
         return os.read(terminal, 65536) if ready else b""
@@ -59,13 +59,13 @@ def run_on_terminal(*arguments, columns=80, errors=True, stdin=subprocess.DEVNUL
 
 
 def accept_signals():
-    """What nohup or a shell's & has started ignores some of them, and so would talcmp."""
+    """A program started by nohup or a shell's & ignores some signals, and so would talcmp."""
     for number in (signal.SIGINT, signal.SIGTERM, signal.SIGHUP):
         signal.signal(number, signal.SIG_DFL)
 
 
 class Answers(Folder):
-    """Whole texts, with `{red}` and its like where colours begin."""
+    """Whole texts, with `{red}`, say, where a colour begins and `{end}` where it ends."""
 
     COLOURS = {"red": ESCAPE + "31m", "green": ESCAPE + "32m", "blue": ESCAPE + "34m",
                "end": ESCAPE + "0m"}
@@ -227,10 +227,10 @@ class Help(Folder):
 
 
 class Progress(Folder):
-    """The other array comes from standard input, as slowly as is wanted."""
+    """One array comes from standard input, as slowly as the test wants."""
 
     def contents(self, order="C"):
-        """Of the slow array; the other is in other.npy."""
+        """The bytes of the slow array; the other is in other.npy."""
         values = np.arange(200000.0).reshape(400, 500)
         self.other = self.save("other.npy", values, order=order)
         return read_bytes(self.save("values.npy", values))
@@ -264,7 +264,7 @@ class Progress(Folder):
     BAR = r"\r\[(=*)( *)\] +(\d+) %  \d+\.\d\d [GM]B/s  \d+:\d\d left\x1b\[K"
 
     def shares(self, text):
-        """What the bars show; expects nothing but bars in the text, and the last to be removed."""
+        """What the bars show; expects only bars in the text, and the last one to be removed."""
         self.assertRegex(text, f"^({self.BAR})*\r\x1b\\[K$")
         shares = []
         for full, empty, share in re.findall(self.BAR, text):
@@ -285,7 +285,7 @@ class Progress(Folder):
             self.assertEqual(self.run_slowly(1, TERM=name), (0, ""))
 
     def send_signals(self, *numbers, before=accept_signals):
-        """While the bar is shown."""
+        """Sends the signals while the bar is shown."""
         sent = []
 
         def notice(process, text):

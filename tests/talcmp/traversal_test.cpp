@@ -42,7 +42,7 @@ std::vector<std::uint64_t> numbers_of(const Shape& shape, const Order order) {
     return numbers;
 }
 
-// The element that stands for a number; those of few bits stand for several.
+// The element that stands for a number; in narrow types one stands for several.
 template <typename T>
 T element_of(const std::uint64_t number) {
     return static_cast<T>(static_cast<to_real_type_t<T>>(number));

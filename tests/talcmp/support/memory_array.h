@@ -38,7 +38,7 @@ class TypedArray : public talcmp::ArraySource {
     Access access_;
 };
 
-// Its elements are what a function makes of their positions.
+// An array whose elements a function computes from their positions.
 template <typename T>
 class FunctionArray : public TypedArray<T> {
   public:
@@ -66,7 +66,7 @@ void read_zeros_and_one(const std::uint64_t one, const std::uint64_t first,
     }
 }
 
-// Elements in the order in which they are stored. What the contract of sources forbids is thrown.
+// Elements in the order in which they are stored. Throws if the contract of sources is broken.
 template <typename T>
 class MemoryArray : public TypedArray<T> {
   public:

@@ -1,4 +1,4 @@
-// Parameterised tests of a table, in which each case has a member `name`: the test is called that.
+// Parameterised tests of a table, in which each case has a member `name` that names its test.
 
 #pragma once
 

@@ -40,7 +40,7 @@ inline std::string version(const int major, const int minor) {
     return {static_cast<char>(major), static_cast<char>(minor)};
 }
 
-// What stands in front of the elements.
+// Everything before the elements.
 inline std::string header(const std::string& dictionary, const int major = 1) {
     return magic + version(major, 0) + little_endian(dictionary.size(), major == 1 ? 2 : 4)
            + dictionary;

@@ -15,7 +15,7 @@
 namespace {
 
 constexpr unsigned longest_run = 300; // seconds
-constexpr int not_started = 127;      // the exit status for that of a shell
+constexpr int not_started = 127;      // the exit status that a shell has for it
 
 // A file without a name, which is gone with this object.
 class Capture {

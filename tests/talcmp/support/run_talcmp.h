@@ -15,7 +15,7 @@ struct ProcessResult {
 // Where the child's standard output goes; `with_errors` is to the same file as standard error.
 enum class Output { captured, closed, full, with_errors };
 
-// Fails the test when the child is ended by a signal, which it is too when it takes too long.
+// Fails the test if a signal ends the child, as one does when the child takes too long.
 ProcessResult run_talcmp(const std::vector<std::string>& arguments,
                          Output output = Output::captured);
 

@@ -1,4 +1,4 @@
-"""The talcmp that is tested, and what its tests in Python share. They are started as
+"""The talcmp under test, and what its tests in Python share. They are started as
 
     SOMETHING_test.py TALCMP... [-- unittest options]
 
@@ -61,7 +61,7 @@ class Folder(unittest.TestCase):
         self.folder = folder.name
 
     def path(self, name):
-        """Of a file or folder; the folder that it is in is made."""
+        """The path of a file or folder; makes the folder that it is in."""
         path = os.path.join(self.folder, name)
         os.makedirs(os.path.dirname(path), exist_ok=True)
         return path

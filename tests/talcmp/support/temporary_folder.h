@@ -40,7 +40,7 @@ class TemporaryFolder {
     std::string path_;
 };
 
-// Is the current folder as long as it lives.
+// A folder that is the current one for as long as it lives.
 class CurrentFolder : public TemporaryFolder {
   public:
     CurrentFolder() { std::filesystem::current_path(path_of("")); }
