@@ -1,6 +1,6 @@
-// The table of element sizes, for programs whose runtime does not define it. It is an archive
-// member of its own, so the linker leaves it out if the runtime's table is there. It is weak, so it
-// gives way even if the linker has to take all members.
+// The table of element sizes, for programs whose runtime does not define it. It has an archive
+// member to itself, so the linker leaves it out if the runtime has a table. It is weak, so it gives
+// way even if the linker has to take all members.
 
 #include "taldata_array_element_types.h"
 

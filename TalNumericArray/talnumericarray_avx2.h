@@ -1,7 +1,7 @@
-// The operations on vectors of 32 bytes, by AVX2 and FMA, and what AVX2 adds for shorter ones.
+// The operations on vectors of 32 bytes, with AVX2 and FMA, and what AVX2 adds for shorter ones.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
-// set.
+// `talnumericarray_instruction_sets.h` includes this in the set's namespace, compiled for the set's
+// target.
 
 template <std::size_t bytes>
 struct operations;

@@ -1,7 +1,7 @@
-// The operations on vectors of 64 bytes, by AVX-512.
+// The operations on vectors of 64 bytes, with AVX-512.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
-// set.
+// `talnumericarray_instruction_sets.h` includes this in the set's namespace, compiled for the set's
+// target.
 
 template <std::size_t bytes>
 struct operations : for_avx2::operations<bytes> {};
@@ -108,7 +108,7 @@ struct operations<64> {
         return _mm512_test_epi64_mask(bits, bits) == 0;
     }
 
-    // Reals are compared into masks: of the lanes in a mask, those for which the comparison holds.
+    // A comparison of reals takes a mask and keeps in it only the lanes for which it holds.
     static constexpr bool has_masks = true;
 
     static __mmask16 if_equal(const __mmask16 mask, const __m512 x, const __m512 y) noexcept {

@@ -9,7 +9,7 @@ int TalNumericArray_sameQ(const talreal tol, const int compare_different_types, 
     if (rank != na2->rank || EquivalentDimensions(rank, na1->dims, na2->dims) == 0) {
         return 0;
     }
-    // Before the types are compared: empty arrays of one shape are the same whatever their types.
+    // Tested before the types: empty arrays of one shape are the same whatever their types.
     const talint len = na1->nelems;
     if (len == 0) {
         return 1;

@@ -3,14 +3,14 @@
 // dimensions.
 //
 // This header is the contract. The rule of comparison is written out in `compare.h` (scalars), in
-// `talnumericarray_sameq_elements.h` (elements) and in `talnumericarray_sameq_impl.h` (what is
-// compared as bytes).
+// `talnumericarray_sameq_elements.h` (elements) and in `talnumericarray_sameq_impl.h` (which arrays
+// are compared as bytes).
 //
 // For both functions:
 //
-// - They only read the records and what these point to, and take no reference. The caller keeps
-//   these alive and unchanged during a call. Any number of threads may compare the same records at
-//   once.
+// - They only read the records and what the records point to, and take no reference. The caller
+//   keeps all of this alive and unchanged during a call. Any number of threads may compare the same
+//   records at once.
 // - They do not allocate, throw, lock, log or make system calls. Compiled with optimisation, they
 //   take at most 2 KiB of stack, including what they call in the C library.
 // - A signal handler may interrupt a call anywhere, call either function, and leave the interrupted
@@ -49,10 +49,10 @@
 // `tol` of `bits` or more it is the same as every NaN and every positive number.
 //
 // Two arrays of the same shape without elements are the same whatever their types. Otherwise an
-// array whose `data_type` is not in 1 to 12 is the same as none.
+// array whose `data_type` is not one of 1 to 12 is the same as no array.
 //
-// Each thread remembers, for each real type, the last factor 2^(tol - bits) that it needed. An
-// answer shows this only if `tol` is between `bits` - 1 and `bits`. Then two numbers that differ by
+// Each thread remembers, for each real type, the last factor 2^(tol - bits) that it needed. This
+// affects answers only if `tol` is between `bits` - 1 and `bits`. Then two numbers that differ by
 // half the larger or more are the same only if the factor is remembered already, from an earlier
 // pair of the same arrays or from an earlier call. A signal handler that compares leaves its own
 // factor.
@@ -61,25 +61,25 @@
 // aligned for its elements, a negative count, and an `nelems` of the first array that is not the
 // product of its dimensions. The second array's `nelems` is not read.
 //
-// An element after the first pair that is not the same may be read in two cases: if it lies in one
-// page of 4096 bytes with an element that is not after that pair, or if the arrays are compared as
-// bytes. Built without vectors, for lack of them or with TALNUMERICARRAY_INSTRUCTION_SETS set to
-// `none`, only the second case remains.
+// An element after the first differing pair may be read in two cases: if it shares a page of 4096
+// bytes with an element in or before that pair, or if the arrays are compared as bytes. In a build
+// without vectors, because there are none or because TALNUMERICARRAY_INSTRUCTION_SETS is `none`,
+// only the second case remains.
 //
 // errno, the rounding direction, traps and other floating-point modes stay as they are, and no
 // status flag is cleared. Comparing reals may raise flags: invalid if an element is a NaN or an
-// infinity or `tol` is a NaN; overflow by a `tol` too large for a single and by elements far apart;
-// underflow by a `tol` or elements of about the least normal number; inexact by anything; division
-// by zero never. A program that traps on these has to mask them for the call. The answer is that of
-// the rule in the current rounding direction. Where the processor takes subnormal numbers for zero,
-// they count as zero unless bits are compared.
+// infinity or `tol` is a NaN; overflow if `tol` is too large for a single or elements are far
+// apart; underflow if `tol` or an element is about as small as the least normal number, or smaller;
+// inexact with any values; division by zero never. A program that traps on these has to mask them
+// for the call. The answer is that of the rule in the current rounding direction. Where the
+// processor takes subnormal numbers for zero, they count as zero unless bits are compared.
 extern "C" [[gnu::visibility("hidden")]] int TalNumericArray_sameQ(talreal tol,
                                                                    int compare_different_types,
                                                                    TalNumericArray na1,
                                                                    TalNumericArray na2) noexcept;
 
 // Returns 1 when the two arrays have the same rank, the same `data_type` (whatever int it is) and
-// the same dimensions; else 0. Neither the elements nor their number are read.
+// the same dimensions; else 0. Neither the elements nor their number is read.
 [[gnu::visibility("hidden")]] int TalNumericArray_equivalentQ(TalNumericArray na1,
                                                               TalNumericArray na2) noexcept;
 

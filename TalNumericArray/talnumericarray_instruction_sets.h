@@ -1,7 +1,7 @@
-// The instruction sets that there are loops for, and what decides between them.
+// The instruction sets that have loops, and the choice between them.
 //
-// The walk takes the first set in `instruction_sets` that the processor supports and of which a
-// full vector fits before the end of the page.
+// The walk takes the first set in `instruction_sets` that the processor supports and whose full
+// vector fits before the end of the page.
 
 #ifndef TALNUMERICARRAY_INSTRUCTION_SETS_H
 #define TALNUMERICARRAY_INSTRUCTION_SETS_H
@@ -31,8 +31,8 @@ namespace talnumericarray {
 
 // ---- The sets
 //
-// The loops of a set, `talnumericarray_sameq_vectors.h`, are compiled in a namespace and for a
-// target of their own.
+// The loops of each set (`talnumericarray_sameq_vectors.h`) are compiled in a namespace of their
+// own, for the set's target.
 
 // No vectors: the elements one by one.
 struct none {
@@ -56,15 +56,15 @@ inline constexpr std::size_t vector_bytes = 16;
 #    include "talnumericarray_sameq_vectors.h"
 } // namespace for_baseline
 
-// What the compiler may use everywhere.
+// The instructions that the compiler may use everywhere.
 struct baseline : for_baseline::loops {
     static constexpr const char* name = "baseline";
 
     static bool supported() noexcept { return true; }
 
 #    if defined(__arm__)
-    // On 32-bit ARM, NEON takes subnormal numbers for zero and has no doubles. It may only compare
-    // the bits of reals.
+    // On 32-bit ARM, NEON takes subnormal numbers for zero and has no doubles. So it may compare
+    // only the bits of reals.
     template <typename Bound, typename T1, typename T2>
     static constexpr bool has_loop =
         std::is_integral_v<

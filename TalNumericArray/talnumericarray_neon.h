@@ -1,8 +1,8 @@
-// The operations on vectors of 16 bytes, by NEON: mostly written with the compilers' vector
+// The operations on vectors of 16 bytes, with NEON. Most are written with the compilers' vector
 // extensions, each of which becomes one instruction.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
-// set.
+// `talnumericarray_instruction_sets.h` includes this in the set's namespace, compiled for the set's
+// target.
 
 template <std::size_t bytes>
 struct operations;
@@ -50,7 +50,7 @@ struct operations<16> {
                                        vector<double, 2>);
     }
 
-    // Whether there is one instruction that converts integers `From`.
+    // Whether a single instruction converts integers of type `From`.
     template <typename T, typename From>
 #if defined(__aarch64__)
     static constexpr bool can_load_converted = sizeof(From) == sizeof(T);
@@ -96,7 +96,7 @@ struct operations<16> {
         return (bits[0] & bits[1]) == std::numeric_limits<std::uint64_t>::max();
     }
 
-    // The first half of the `From` in a vector, widened to twice their size.
+    // The first half of the integers of type `From` in a vector, widened to twice their size.
     template <typename From>
     static Bits twice_as_wide(const Bits numbers) noexcept {
         using Wide = vector<twice_as_wide_t<From>, 8 / sizeof(From)>;
@@ -118,8 +118,8 @@ struct operations<16> {
 
 #if defined(__arm__)
 
-// Doubts about reals by their bits: there are none if the bits are equal and no number is a NaN or
-// an infinity.
+// Doubts about reals, judged by their bits: there are none if the bits are equal and no number is a
+// NaN or an infinity.
 template <typename T>
 class DoubtsAboutBits {
   public:

@@ -1,4 +1,4 @@
-// Fast tests whether two elements are certainly the same.
+// Fast tests of whether two elements are certainly the same.
 //
 // If such a test passes, the rule would find the pair the same and leave the remembered factor as
 // it is, so the pair can be passed over. If it fails, the pair is in doubt, and the rule decides.
@@ -56,9 +56,9 @@ inline bool ftz_without_daz() noexcept {
 // The divisor under which pairs are certainly the same, or 0 if there is none (yet).
 //
 // Let d be |x - y| and m be |y|, as the test computes them, max the larger of |x| and |y|, and D
-// the divisor. The test is m - D * d >= d, where D * d is rounded before it is subtracted or not.
-// If x or y is a NaN or an infinity, the left side is a NaN or minus infinity, and the pair is in
-// doubt.
+// the divisor. The test is m - D * d >= d, where D * d may or may not be rounded before it is
+// subtracted. If x or y is a NaN or an infinity, the left side is a NaN or minus infinity, and the
+// pair is in doubt.
 //
 // If d is 0, x and y are equal numbers. Where subnormal numbers are taken for zero, they may also
 // be of one sign and so near that the rule finds them the same. Where only subnormal results are
@@ -71,12 +71,12 @@ inline bool ftz_without_daz() noexcept {
 //
 // If `tol` is `bits` or more, that is all the rule asks, and 1 is a sufficient divisor.
 //
-// If a factor f is remembered, let e be epsilon. However its operations are rounded, D is at least
-// ((1/f)(1 + 8e)(1 - e)^2 + 1)(1 - e). So D is at least (1/f)(1 + 4e) and, as 1/f is 1 or more, at
-// least 1/f + 1. Rounding changes a result by less than the share e of it, or by less than the
-// least positive number s if the result is subnormal; a subnormal difference is exact. The rule's
-// difference may be taken in the other order, and so rounded the opposite way. It is at most
-// d (1 + e)/(1 - e).
+// If a factor f is remembered, let e be epsilon. However the operations that compute D are rounded,
+// D is at least ((1/f)(1 + 8e)(1 - e)^2 + 1)(1 - e). So D is at least (1/f)(1 + 4e) and, as 1/f is
+// 1 or more, at least 1/f + 1. Rounding changes a result by less than e times that result, or by
+// less than the least positive number s if the result is subnormal; a subnormal difference is
+// exact. The rule's difference may be taken in the other order, and so rounded the opposite way. It
+// is at most d (1 + e)/(1 - e).
 //
 // - For max >= 1 it has to be below max * f, rounded. That is at least max * f (1 - e), which is
 //   above d (1 + 4e)(1 - e).
@@ -132,7 +132,7 @@ inline T by_halves(const From number) noexcept {
     }
 }
 
-// The number as a cast to the type of comparison gives it.
+// Gives the result of a cast to the type of comparison.
 template <typename T, typename From>
 inline T converted(const From number) noexcept {
 #if defined(__arm__) && !defined(__OPTIMIZE_SIZE__)
@@ -159,8 +159,8 @@ inline bool certainly_same_reals(const nearness<T> bound, const T x, const T y) 
     return magnitude(y) - bound.divisor * difference >= difference;
 }
 
-// An integer or a real beside an integer or a real, or beside a complex number, whose imaginary
-// part then has to be zero.
+// An integer or a real beside an integer, a real or a complex number, whose imaginary part has to
+// be zero.
 template <typename Bound, typename T1, typename T2>
 inline bool certainly_same(const Bound bound, const T1& data1, const T2& data2) noexcept {
     using T = comparison_t<T1, T2>;

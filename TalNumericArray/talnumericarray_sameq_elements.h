@@ -1,4 +1,4 @@
-// The element tests: whether one element of each array are the same.
+// The element tests: whether an element of one array and one of the other are the same.
 //
 // The two parts of a complex number are compared separately, each under the full tolerance. An
 // integer or a real counts as a complex number whose imaginary part is zero.

@@ -1,7 +1,7 @@
 // Dispatch from two records of the same shape to the routine for their pair of element types.
 //
 // `TalNumericArray_sameQ_impl` has three levels: by the first array's type, by the second array's
-// type, and the pair routine, which compares bytes where that is the rule and otherwise walks the
+// type, and the pair routine, which compares bytes where the rule says so and otherwise walks the
 // elements.
 
 #ifndef TALNUMERICARRAY_SAMEQ_IMPL_H

@@ -1,7 +1,7 @@
-// The loops that find, by vectors, the certain prefix of two arrays: the leading elements that are
-// certainly the same.
+// The loops that find, with vectors, the certain prefix of two arrays: the leading elements that
+// are certainly the same.
 //
-// Each instruction set includes this once, in a namespace and for a target of its own, so the sets
+// Each instruction set includes this once, in its own namespace and for its own target, so the sets
 // share no templates. Before that it defines `vector_bytes`, the length of its longest vectors, and
 // `operations<bytes>` on those and on vectors of half that length. `talnumericarray_sse2.h`
 // describes the operations. A set whose comparisons give masks has, instead of `all_ones`,
@@ -193,8 +193,8 @@ using Doubts = std::conditional_t<std::is_integral_v<comparison_t<T1, T2>>,
                                   DoubtsAboutIntegers<comparison_t<T1, T2>, lanes, T1, T2>,
                                   DoubtsAboutReals<comparison_t<T1, T2>, lanes>>;
 
-// Adds one vector of each array. Beside complex numbers, a real is one whose imaginary part is
-// zero.
+// Adds one vector of each array. Beside complex numbers, a real counts as one whose imaginary part
+// is zero.
 template <std::size_t lanes, typename Bound, typename T1, typename T2>
 inline void add_doubts(Doubts<T1, T2, lanes>& doubts, const Bound bound, const T1* const data1,
                        const T2* const data2) noexcept {
@@ -250,9 +250,9 @@ struct loops {
     // The certain prefix of two arrays of `len`, of which `end` elements lie before the first end
     // of a page: enough for a full vector.
     //
-    // A block never extends past the page of its first unjudged element, so nothing on a page
-    // beyond the first differing pair is read. The last vector before the end of a page may begin
-    // with elements that have been judged already.
+    // A block never extends past the page of its first unjudged element, so no page that lies
+    // wholly after the first differing pair is read. The last vector before the end of a page may
+    // begin with elements that have been judged already.
     template <typename Bound, typename T1, typename T2>
     [[gnu::noinline]] static std::size_t certain_prefix(const Bound bound, const T1* const data1,
                                                         const T2* const data2, std::size_t end,

@@ -1,7 +1,7 @@
 // The walk over the elements of two arrays that are not compared as bytes.
 //
 // The element test decides, in order, up to the first pair that is not the same. Elements that are
-// certainly the same are passed over, by vectors where there are any: this changes neither the
+// certainly the same are passed over, with vectors where there are any: this changes neither the
 // answer nor the factor that is remembered afterwards.
 
 #ifndef TALNUMERICARRAY_SAMEQ_WALK_H
@@ -137,8 +137,8 @@ inline int each_sameQ(const talreal& tol, const T1* data1, const T2* data2,
     return 1;
 }
 
-// From a pair in doubt on: in turn, a stretch for the element test and a certain prefix of the
-// rest.
+// Walks on from a pair in doubt: alternately a stretch for the element test and a certain prefix of
+// the rest.
 template <typename Sets, typename T1, typename T2>
 [[gnu::noinline]] int doubtful_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                                      const talint len) noexcept {
@@ -159,11 +159,11 @@ template <typename Sets, typename T1, typename T2>
     return 1;
 }
 
-// The answer of `each_sameQ`, and the same factor remembered afterwards.
+// Gives the answer of `each_sameQ`, and leaves the same factor remembered.
 //
 // The first pair gets the element test: most different arrays differ there, and it may put the
-// factor in the cache. What follows it with vectors is out of line, so a call that ends there has
-// little to set up.
+// factor in the cache. The walk with vectors that follows is out of line, so a call that ends at
+// the first pair has little to set up.
 template <typename Sets, typename T1, typename T2>
 inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
                           const talint len) noexcept {
@@ -178,7 +178,7 @@ inline int elements_sameQ(const talreal& tol, const T1* data1, const T2* data2,
         if (passed == len) {
             return 1;
         }
-        // As in `certain_prefix`, a pair of types and its reverse share what is left.
+        // As in `certain_prefix`, a pair of types and its reverse share the loop.
         if constexpr (element_type_id<T1> <= element_type_id<T2>) {
             return doubtful_sameQ<Sets>(tol, data1 + passed, data2 + passed, len - passed);
         } else {

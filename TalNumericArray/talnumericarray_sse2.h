@@ -1,7 +1,7 @@
-// The operations on vectors of 16 bytes, by SSE2.
+// The operations on vectors of 16 bytes, with SSE2.
 //
-// `talnumericarray_instruction_sets.h` includes this in the namespace and for the target of its
-// set.
+// `talnumericarray_instruction_sets.h` includes this in the set's namespace, compiled for the set's
+// target.
 
 template <std::size_t bytes>
 struct operations;
@@ -44,7 +44,7 @@ struct operations<16> {
         return _mm_cvtps_pd(_mm_castsi128_ps(load<lanes * sizeof(float)>(from)));
     }
 
-    // Whether there is one instruction that converts integers `From`.
+    // Whether a single instruction converts integers of type `From`.
     template <typename T, typename From>
     static constexpr bool can_load_converted = false;
 
@@ -71,7 +71,7 @@ struct operations<16> {
 
     static bool all_ones(const __m128i bits) noexcept { return _mm_movemask_epi8(bits) == 0xffff; }
 
-    // The first half of the `From` in a vector, widened to twice their size.
+    // The first half of the integers of type `From` in a vector, widened to twice their size.
     template <typename From>
     static __m128i twice_as_wide(const __m128i numbers) noexcept {
         if constexpr (sizeof(From) == 1) {

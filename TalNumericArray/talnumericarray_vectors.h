@@ -30,7 +30,7 @@ inline std::size_t elements_before_page_end(const T* const data) noexcept {
     return (page_bytes - offset) / sizeof(T);
 }
 
-// The least of that for two arrays and `len`.
+// The least of `len` and that number for each of two arrays.
 template <typename T1, typename T2>
 inline std::size_t elements_before_page_end(const T1* const data1, const T2* const data2,
                                             const std::size_t len) noexcept {
@@ -65,11 +65,11 @@ struct vector_of {
 template <typename T, std::size_t lanes>
 using vector = typename vector_of<T, lanes>::type;
 
-// A vector of `bytes` for whole `T`.
+// A vector of `bytes` bytes that holds whole `T`.
 template <typename T, std::size_t bytes>
 using vector_of_bytes = vector<T, bytes / sizeof(T)>;
 
-// The vectors of a block, which has one test for all of them. On 32-bit ARM a test takes as long as
+// How many vectors a block has; one test judges them all. On 32-bit ARM a test takes as long as
 // comparing two vectors.
 #if defined(__arm__)
 inline constexpr std::size_t vectors_per_block = 8;

@@ -16,7 +16,7 @@
 #include <cstdio>
 #include <cstdlib>
 
-// C names, which are found among the program's symbols.
+// C names, so that they can be found among the program's symbols.
 extern "C" {
 [[gnu::noinline]] void counting_begins() {
     asm volatile("" : : : "memory");

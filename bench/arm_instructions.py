@@ -4,7 +4,7 @@
 Compiles the module and arm_instructions.cpp with -O2, for VFP and for NEON, in FOLDER, runs each
 under QEMU, which logs the address of each instruction, and prints JSON: for each pair of types and
 workload the instructions and divisions that a pair of elements takes beyond the first 256, and the
-instructions of the call's beginning. The C library, asked at a call's beginning, is left out.
+instructions of the call's beginning. The C library, called at the beginning, is left out.
 """
 
 import json
@@ -49,7 +49,7 @@ def symbols(program):
 
 
 def counted_ranges(program, map_text):
-    """Where the module's code is, and what the compiler's library has for it, as conversions."""
+    """Where the code is: the module's, and that of the compiler's library, such as conversions."""
     section = r"^ \.text\S*\s+0x([0-9a-f]+)\s+0x([0-9a-f]+) \S*?(module\.o|libgcc\.a\(\S+\))$"
     known = symbols(program)
     needed = run(f"{TRIPLE}-nm", "-u", program.parent / "module.o").split()
@@ -69,7 +69,7 @@ def divisions(program):
 
 
 def executed(program, map_text):
-    """Of each call, by its types, workload and length, instructions and divisions."""
+    """Instructions and divisions of each call, by its types, workload and length."""
     known = symbols(program)
     begin_mark, end_mark = known["counting_begins"], known["counting_ends"]
     ranges = [*counted_ranges(program, map_text), (begin_mark, 2), (end_mark, 2)]

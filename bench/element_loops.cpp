@@ -1,9 +1,9 @@
 // Whole calls over long arrays of every pair of element types that has a loop, each next to memcmp
-// over as many bytes of memory like theirs.
+// over as many bytes of similar memory.
 //
 //   element_loops [--quick]
 //
-// Writes an object of JSON.
+// Writes a JSON object.
 
 #include "array_record.h"
 #include "filled_arrays.h"
@@ -78,7 +78,7 @@ class Block {
 
 // ---- The two measurements
 
-// The length makes the second array aligned too.
+// The length keeps the second array aligned too.
 template <typename T1, typename T2>
 constexpr std::size_t length(const std::size_t bytes) {
     constexpr std::size_t granule = 64;

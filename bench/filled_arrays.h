@@ -1,4 +1,4 @@
-// Pairs of arrays to be compared, of every pair of element types, in memory of the caller.
+// Pairs of arrays to be compared, of every pair of element types, in the caller's memory.
 
 #pragma once
 
@@ -18,7 +18,7 @@
 
 // ---- The pairs of element types
 
-// As NumPy calls it.
+// NumPy's name.
 template <typename T>
 std::string type_name() {
     const std::string bits = std::to_string(8 * sizeof(T));
@@ -42,12 +42,12 @@ inline constexpr talreal fractional_tolerance = 10.5;
 
 enum class Contents {
     identical,
-    near, // within `whole_tolerance`, but not equal; integers, which it does not touch, are equal
+    near, // within `whole_tolerance`, but not equal; integers are equal
     first_differs,
     last_differs,
 };
 
-// A pair of parts. Both types hold the numbers of identical contents.
+// A pair of parts. Identical contents are numbers that both types hold.
 template <typename R1, typename R2>
 void draw(const Contents contents, std::mt19937_64& random, R1& part1, R2& part2) {
     using R = type_common_t<R1, R2>;
@@ -58,14 +58,14 @@ void draw(const Contents contents, std::mt19937_64& random, R1& part1, R2& part2
     part1 = static_cast<R1>(number);
     part2 = static_cast<R2>(number);
     if constexpr (std::is_floating_point_v<R1> && std::is_floating_point_v<R2>) {
-        // Of either sign, and on either side of 1, where the rule goes different ways.
+        // Of both signs, and on both sides of 1, where the rule goes different ways.
         const int sign = random() % 2 == 0 ? 1 : -1;
         part1 = std::ldexp(static_cast<R1>(sign) * part1, 2 - digits);
         part2 = std::ldexp(static_cast<R2>(sign) * part2, 2 - digits);
     }
     if constexpr (std::is_floating_point_v<R>) {
         if (contents == Contents::near) {
-            // The tolerance is 512 epsilons of the larger.
+            // The tolerance is 512 epsilons times the larger.
             const R epsilons = static_cast<R>(1 + random() % 256);
             const R factor = 1 + epsilons * std::numeric_limits<R>::epsilon();
             if constexpr (std::is_same_v<R2, R>) {
@@ -81,7 +81,7 @@ void draw(const Contents contents, std::mt19937_64& random, R1& part1, R2& part2
 template <typename T1, typename T2>
 void fill(const Contents contents, void* const memory1, void* const memory2,
           const std::size_t len) {
-    // Drawing is slow, and more elements than these no branch predictor remembers.
+    // Drawing is slow, and no branch predictor remembers more elements than these.
     constexpr std::size_t most_drawn = 16384;
     constexpr std::mt19937_64::result_type seed = 20240229;
 

@@ -13,7 +13,7 @@ TOLERANCE = 10
 
 
 def arrays(dtype):
-    """An array of reals and one that is near it and nowhere equal."""
+    """An array of reals, and one that is near it but equal nowhere."""
     random = np.random.default_rng(20240229)
     count = BYTES // 2 // np.dtype(dtype).itemsize
     signs = random.choice([-1, 1], count)
@@ -24,7 +24,7 @@ def arrays(dtype):
 
 def nanoseconds(function, repetitions):
     assert function(), "the answer is wrong"
-    # Of a processor, as for the other libraries.
+    # Processor time: the other libraries use one processor.
     return min(timeit.repeat(function, timer=time.process_time, number=1, repeat=repetitions)) * 1e9
 
 

@@ -2,8 +2,8 @@
 //
 //   peers [--quick]
 //
-// Writes an object of JSON. The other libraries are templates, which take the instructions that
-// this file is compiled for: all of the processor's.
+// Writes a JSON object. The other libraries are templates, which use the instructions that this
+// file is compiled for: all of the processor's.
 
 #include "array_record.h"
 #include "filled_arrays.h"
@@ -107,7 +107,7 @@ void measure(const std::size_t len, std::vector<Contender> contenders,
     }
 }
 
-// All of them, over arrays that fit the cache.
+// All of them, over arrays that fit into the cache.
 template <typename T>
 void measure_sizes(const Effort& effort, JsonRows& rows) {
     for (const std::size_t size : sizes) {

@@ -1,8 +1,8 @@
-"""Pictures as text of SVG: heat maps of pairs of types, and charts of lines on logarithmic axes."""
+"""Pictures as SVG text: heat maps of pairs of types, and charts of lines on logarithmic axes."""
 
 import math
 
-# Of three lines, which colour-blind readers can distinguish too.
+# For three lines; colour-blind readers can tell them apart too.
 LINE_COLOURS = ("#0072b2", "#d55e00", "#7f7f7f")
 
 

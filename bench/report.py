@@ -1,9 +1,9 @@
 #!/usr/bin/python3
 """Turns what the benchmarks wrote into tables and pictures: report.py [--arm] RESULTS DOCUMENTS.
 
-Reads the files of JSON in the folder RESULTS, writes pictures into the folder DOCUMENTS, renews what
-is between marks in its performance.md, and prints each bar with what was measured. With --arm these
-are the instructions on 32-bit ARM, and without it all else.
+Reads the JSON files in the folder RESULTS, writes pictures into the folder DOCUMENTS, renews what is
+between marks in its performance.md, and prints each bar with what was measured. With --arm these are
+the instructions on 32-bit ARM, otherwise everything else.
 """
 
 import json
@@ -52,7 +52,7 @@ ARM_IDENTICAL_BARS = {("VFP", "float64"): 8, ("VFP", "float32"): 8,
 
 REALS = ("float32", "float64", "complex64", "complex128")
 
-# These answer another question than element by element under a tolerance.
+# These do not compare element by element under a tolerance.
 NOT_ELEMENTWISE = {"Eigen isApprox", "NumPy array_equal"}
 
 # How calls over short arrays are drawn, and whether near.
@@ -88,7 +88,7 @@ def pair_of(row):
 
 
 def types_of(rows):
-    """All types, in the order of those that come first in a pair."""
+    """All types, in the order in which they first begin a pair."""
     types = dict.fromkeys(row["type2"] for row in rows)
     return sorted(types, key=[row["type1"] for row in rows].index)
 
@@ -103,7 +103,7 @@ def where(row):
 
 
 def check_pairs(pairs, workload, place):
-    """All that have a loop or, where near, all except those of integers."""
+    """All pairs that have a loop or, if near, all of these except pairs of integers."""
     expected = 144 - 8 * 8 if workload.startswith("near") else 144 - 8
     if len(set(pairs)) != expected:
         sys.exit(f"report: {place}, {workload}: {len(set(pairs))} pairs instead of {expected}")
@@ -133,7 +133,7 @@ class Loops:
         return list(self.ratios[size, "identical"])
 
     def all_pairs(self, size, workload):
-        """With the integers, which have no tolerance, as they are when identical."""
+        """Integers, which have no tolerance, have their times when identical."""
         return {**self.ratios[size, "identical"], **self.ratios[size, workload]}
 
     def fractional(self, size):
@@ -167,7 +167,7 @@ class ShortCalls:
                 if row["len"] == length and row["type1"] == row["type2"] and row["type1"] in REALS]
 
     def greatest_drop(self):
-        """A call's time as a multiple of that of a longer one, and both."""
+        """A call's time as a multiple of a longer call's, and both calls."""
         return max(
             ((row["library"] / longer["library"], row, longer)
              for rows in self.by_call.values()
@@ -191,7 +191,7 @@ class Peers:
 
     @staticmethod
     def least_ratio(times):
-        """The fastest elementwise one's time as a multiple of ours, and its name."""
+        """The time of the fastest elementwise function as a multiple of ours, and its name."""
         return min(
             (time / times["sameQ"], name)
             for name, time in times.items()
@@ -397,7 +397,7 @@ ARM_ROWS = [("float64", "float64"), ("float32", "float32"), ("int32", "float64")
 
 
 def group_of(pair):
-    """What takes about as many instructions."""
+    """The group of pairs that take about as many instructions."""
     integers = [name for name in pair if "int" in name]
     complexes = [name for name in pair if name.startswith("complex")]
     if len(integers) == 2:

@@ -1,10 +1,10 @@
-// Whole calls over short arrays of every pair of element types that has a loop, each next to what
-// else a program could call: a plain loop of its own, the rule one by one, or memcmp. And calls
-// over arrays that begin at different places of a page.
+// Whole calls over short arrays of every pair of element types that has a loop, each next to what a
+// program could call instead: a plain loop of its own, the rule one by one, or memcmp. Also calls
+// over arrays that begin at different places in a page.
 //
 //   small_arrays [--quick]
 //
-// Writes an object of JSON.
+// Writes a JSON object.
 
 #include "array_record.h"
 #include "filled_arrays.h"
@@ -27,7 +27,7 @@
 #include <limits>
 #include <vector>
 
-// Of the module built once more, with the rule one by one and no vectors; see
+// From the module built once more, with the rule one by one and no vectors; see
 // `TalNumericArray_sameQ`.
 extern "C" int one_by_one_sameQ(talreal tol, int compare_different_types, TalNumericArray na1,
                                 TalNumericArray na2) noexcept;
@@ -67,7 +67,7 @@ Memory filled2;
 
 // ---- The contenders
 
-// One question, put to each of them.
+// One question, put to each contender.
 class Question {
   public:
     Question(const type_t id1, void* const data1, const type_t id2, void* const data2,
@@ -117,7 +117,7 @@ class Question {
     int right_answer_;
 };
 
-// They stay where they are, as contenders refer to them.
+// They stay in place, as contenders refer to them.
 using Questions = std::deque<Question>;
 
 // ---- Measurements, a list of rows each
@@ -191,7 +191,7 @@ void measure_bytes(const Effort& effort, JsonRows& rows) {
         rows);
 }
 
-// Somewhere in each line of a page, and at each place of a line that alignment allows.
+// Somewhere in each cache line of a page, and at each place in a line that alignment allows.
 template <typename T>
 std::size_t place_in_page(const std::size_t place) {
     constexpr std::size_t line = page / places;

@@ -26,7 +26,7 @@ print(time.perf_counter() - begin)
 def write_files(folder, count):
     """Doubles, a copy of them, and some that differ in a few digits."""
     paths = [os.path.join(folder, name + ".npy") for name in ("one", "same", "near")]
-    # By another process, as a child begins with the memory of its parent.
+    # In another process, as a child begins with the memory of its parent.
     writer = os.fork()
     if writer == 0:
         save_arrays(count, *paths)
@@ -51,7 +51,7 @@ def seconds_of(command):
 
 
 def memory_of(command):
-    """The greatest resident memory in bytes, as it is seen while the command runs."""
+    """The greatest resident memory in bytes, as seen while the command runs."""
     most = 0
     with subprocess.Popen(command, stdout=subprocess.DEVNULL) as process:
         while process.poll() is None:
@@ -78,7 +78,7 @@ def main():
             "NumPy allclose of loaded arrays, near": [sys.executable, "-c", ALLCLOSE, one, near],
         }
         memory = {name: memory_of(command) for name, command in commands.items()}
-        # In turns, so that what else the machine does is shared.
+        # In turns, so that other work of the machine affects all of them.
         seconds = {name: [] for name in commands}
         for _ in range(repetitions):
             for name, command in commands.items():

@@ -1,5 +1,5 @@
-// Contenders take turns in short batches of calls, so that what else the machine does is shared,
-// and the shortest time of each counts.
+// Contenders take turns in short batches of calls, so that other work of the machine affects all of
+// them, and the shortest time of each counts.
 
 #pragma once
 
@@ -24,7 +24,8 @@ class Contender {
     explicit Contender(const Ask& ask)
         : batch_([ask](const int calls) { return nanoseconds(ask, calls); }) {}
 
-    // As many as make every batch long enough for the clock: one that was interrupted says little.
+    // As many as make every batch long enough for the clock: a batch that was interrupted says
+    // little.
     void choose_calls(const double batch) {
         while (batch > 0 && shortest_batch() < batch) {
             calls_ *= 2;
@@ -52,7 +53,7 @@ class Contender {
         const auto start = std::chrono::steady_clock::now();
         for (int i = 0; i < calls; ++i) {
             right &= ask();
-            // So that no call is found to answer what the one before it did.
+            // So that the compiler cannot reuse the answer of the call before.
             asm volatile("" : : : "memory");
         }
         const std::chrono::duration<double, std::nano> time =
@@ -69,7 +70,7 @@ class Contender {
     double best_ = std::numeric_limits<double>::infinity();
 };
 
-// Whether the program is called with --quick; ends it where it is called otherwise than that.
+// Whether the program is called with --quick; ends the program if it is called in any other way.
 inline bool is_quick(const int count, char** const arguments) {
     const bool quick = count == 2 && std::strcmp(arguments[1], "--quick") == 0;
     if (count > 1 && !quick) {

@@ -1,4 +1,4 @@
-// Compiled twice: USER_LOOP is the name of the function, by the flags in force.
+// Compiled twice: USER_LOOP is the name of the function under the flags in force.
 
 #include "user_loops.h"
 
@@ -12,8 +12,8 @@
 #include <cmath>
 #include <type_traits>
 
-// What is compiled twice has to have two names, or the linker would keep one of them: all that has
-// a part in the loops is in here, where each file has its own, or inlined.
+// What is compiled twice needs two names, or the linker would keep only one copy: all code of the
+// loops is in this namespace, of which each file has its own, or inlined.
 namespace {
 
 template <typename T>
@@ -37,7 +37,7 @@ bool same_parts([[maybe_unused]] const double relative, const R1 part1, const R2
 
 template <typename T1, typename T2>
 bool same_elements(const double relative, const T1* const element1, const T2* const element2) {
-    // Not by the functions of the standard library, whose names are the same in both files.
+    // Not with functions of the standard library, whose names are the same in both files.
     const auto* const parts1 = reinterpret_cast<const to_real_type_t<T1>*>(element1);
     const auto* const parts2 = reinterpret_cast<const to_real_type_t<T2>*>(element2);
     if (!same_parts(relative, parts1[0], parts2[0])) {

@@ -42,8 +42,8 @@ set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME talcmp)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION math)
 if(CMAKE_CROSSCOMPILING)
-  # dpkg-shlibdeps would name the packages of the cross compiler, which the architecture itself has
-  # not. These are Debian 12's, to which the cross compiler links.
+  # dpkg-shlibdeps would name the packages of the cross compiler, which the architecture itself
+  # lacks. These are Debian 12's, which the cross compiler links to.
   set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS
       "libc6 (>= 2.36), libgcc-s1 (>= 12), libstdc++6 (>= 12), libzip4 (>= 1.7)")
 else()

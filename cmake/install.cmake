@@ -1,5 +1,5 @@
 # What `cmake --install` lays down: the library, in the component Development, and talcmp, in the
-# component Runtime. Nothing of it knows the prefix, which may be moved afterwards, unless
+# component Runtime. None of it contains the prefix, which may be moved afterwards, unless
 # CMAKE_INSTALL_LIBDIR is absolute.
 
 option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
@@ -12,7 +12,8 @@ endif()
 include(CMakePackageConfigHelpers)
 include(GNUInstallDirs)
 
-# The headers include each other by bare name and have names like compare.h: a folder of their own.
+# The headers include each other by bare name and have names like compare.h, so they get a folder of
+# their own.
 set(header_folder ${CMAKE_INSTALL_INCLUDEDIR}/talnumericarray)
 set(config_folder ${CMAKE_INSTALL_LIBDIR}/cmake/TalNumericArray)
 set(generated ${PROJECT_BINARY_DIR}/install)
@@ -43,7 +44,7 @@ configure_package_config_file(
   ${generated}/TalNumericArrayConfig.cmake
   INSTALL_DESTINATION ${config_folder}
   NO_SET_AND_CHECK_MACRO)
-# Before version 1 a new minor version may break what is built on the last.
+# Before version 1 a new minor version may break what was built with the last.
 write_basic_package_version_file(${generated}/TalNumericArrayConfigVersion.cmake
                                  COMPATIBILITY SameMinorVersion)
 talnumericarray_install(Development ${config_folder} ${generated}/TalNumericArrayConfig.cmake

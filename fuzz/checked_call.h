@@ -33,7 +33,7 @@ class Operand {
     unsigned char* element(const std::size_t index) { return data() + index * element_size_; }
     std::size_t element_size() const { return element_size_; }
 
-    // To be changed before the first call.
+    // May be changed only before the first call.
     st_TalDataArray& record() { return record_; }
 
     const oracle::Array& array() const { return array_; }
@@ -62,8 +62,8 @@ class Operand {
 // Makes the module remember the factors of one tolerance, and returns a state that does too.
 oracle::State known_state();
 
-// Asks both predicates and the oracle; ends the program where they do not agree, or where anything
-// but the state is changed.
+// Asks both predicates and the oracle; ends the program if they disagree, or if anything but the
+// state is changed.
 void check_call(oracle::State& state, double tolerance, int compare_different_types, Operand& first,
                 Operand& second);
 

@@ -1,4 +1,4 @@
-// Draws from the bytes of an input. Bytes of zero draw what is plainest, as does an input that is
+// Draws from the bytes of an input. Zero bytes draw the plainest choice, as does an input that is
 // used up.
 
 #pragma once
@@ -27,7 +27,7 @@ class InputDraws final : public oracle::Draws {
         return bytes_.ConsumeIntegralInRange<std::size_t>(0, size - 1);
     }
 
-    // Of bytes of zero this is false, unlike `one_in`.
+    // Zero bytes make this false, unlike `one_in`.
     bool rarely(const std::uint32_t bound) { return below(bound) == bound - 1; }
 
     bool used_up() { return bytes_.remaining_bytes() == 0; }

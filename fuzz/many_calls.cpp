@@ -13,7 +13,7 @@ namespace {
 using fuzz::InputDraws;
 using fuzz::Operand;
 
-// Mostly one of late, or one that may become the same single.
+// Mostly a recent one, or one that may become the same single.
 double next_tolerance(InputDraws& draws, oracle::RandomTolerances& tolerances) {
     const double tolerance = tolerances.next(draws);
     return draws.rarely(8) ? tolerance + 0x1p-22 * draws.between(0, 15) : tolerance;

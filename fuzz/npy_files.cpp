@@ -1,6 +1,6 @@
-// An input is an .npy file as it is, or, where a second one seems to begin in it, two files: what
-// is refused is refused with a message of one line, and what is read is compared as the oracle
-// would. An input that begins as a zip archive does is read as one.
+// An input is an .npy file as it is, or, where a second one seems to begin in it, two files: a
+// refusal has a message of one line, and what is read is compared as the oracle would compare it.
+// An input that begins like a zip archive is read as one.
 
 #include "checked_call.h"
 
@@ -133,7 +133,7 @@ HeaderOrRefusal read_header(const std::string_view bytes) {
 
 // ---- The file
 
-// In memory, and yet with a path.
+// In memory, but with a path.
 class MemoryFile {
   public:
     MemoryFile() : descriptor_(::memfd_create("npy", MFD_CLOEXEC)) {
@@ -171,7 +171,7 @@ oracle::Array at(const OpenedArray& array, const std::uint64_t position) {
     return {array.source->type().id, {}, 1, element(array, position)};
 }
 
-// Where the element lies that comes at `order` in row-major order.
+// The position of the element that is at `order` in row-major order.
 std::uint64_t position_of(const OpenedArray& array, const std::uint64_t order) {
     if (!array.source->fortran_order()) {
         return order;
@@ -231,7 +231,7 @@ void read_archive(const MemoryFile& file) {
     }
 }
 
-// Nothing where the file is refused.
+// Nothing if the file is refused.
 std::optional<OpenedArray> opened(const MemoryFile& file, const std::string_view bytes) {
     file.write(bytes);
     if (bytes.substr(0, 2) == "PK") {

@@ -1,4 +1,4 @@
-// One call of each predicate with any two records, over arrays short or long, against the oracle.
+// One call of each predicate with any two records, over short or long arrays, against the oracle.
 
 #include "checked_call.h"
 #include "input_draws.h"
@@ -87,7 +87,7 @@ std::vector<talint> drawn_other_dimensions(InputDraws& draws, std::vector<talint
     return dimensions;
 }
 
-// Where blocks begin, and the elements between them, as often as anywhere.
+// At the beginnings of blocks and between blocks as often as anywhere.
 std::size_t drawn_place(InputDraws& draws, const std::size_t count) {
     if (draws.one_in(2)) {
         return draws.index(count);
@@ -96,7 +96,7 @@ std::size_t drawn_place(InputDraws& draws, const std::size_t count) {
     return std::min(block + draws.index(3), count - 1);
 }
 
-// A few pairs of elements over and over, and then single ones at any place.
+// A few pairs of elements over and over, then single ones anywhere.
 void fill(InputDraws& draws, const double tolerance, Operand& first, Operand& second,
           const std::size_t count) {
     struct Pair {

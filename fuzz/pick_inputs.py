@@ -1,8 +1,8 @@
 #!/usr/bin/python3
-"""Adds to corpus/FUZZER what reaches most: pick_inputs.py FUZZER [FILES].
+"""Adds to corpus/FUZZER the inputs that reach most: pick_inputs.py FUZZER [FILES].
 
-Of the inputs that scripts/fuzz has left in build/fuzz/corpus those are taken, up to FILES files in
-corpus/FUZZER, that add most to the code that is reached, and then to how it is reached.
+From the inputs that scripts/fuzz has left in build/fuzz/corpus, takes those that add most to the code
+that is reached, and then to how it is reached, until corpus/FUZZER has FILES files.
 """
 
 import shutil

@@ -1,4 +1,4 @@
-; Operations of which nothing is known but what a proof assumes.
+; Operations about which only what a proof assumes is known.
 (declare-fun minus (T T) T)
 (declare-fun plus (T T) T)
 (declare-fun times (T T) T)

@@ -1,4 +1,4 @@
-; The operations as IEEE 754 has them, in one direction of rounding.
+; The operations as IEEE 754 defines them, in one direction of rounding.
 (define-fun minus ((a T) (b T)) T (fp.sub $direction a b))
 (define-fun plus ((a T) (b T)) T (fp.add $direction a b))
 (define-fun times ((a T) (b T)) T (fp.mul $direction a b))

@@ -1,5 +1,5 @@
-; Proves: what nearness.smt2 uses of the difference of two reals, and of the test where it is zero,
-;   infinite or NaN.
+; Proves: what nearness.smt2 uses about the difference of two reals, and about the test where that
+;   difference is zero, infinite or NaN.
 ; Models: certainly_same_reals (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add for
 ;   nearness (talnumericarray_sameq_vectors.h).
 ; for: rounded single, rounded double

@@ -1,5 +1,5 @@
-; Proves: one unsigned comparison of id - 1 with 11 finds the ids from 1 to 12, no negative one among
-;   them, and so does a chain of equalities.
+; Proves: one unsigned comparison of id - 1 with 11 accepts exactly the ids from 1 to 12, so no
+;   negative ones, and so does a chain of equalities.
 ; Models: with_element_type (talnumericarray_sameq_impl.h).
 ; for: any
 ; with: type_ids

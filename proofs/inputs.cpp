@@ -1,6 +1,5 @@
-// Prints the table of inputs on which the formulas of the proofs have to have the values of the
-// code: a line each, the instance of a family and, after a tab, an equation with what the code
-// answers.
+// Prints the table of inputs on which the formulas of the proofs must have the values that the code
+// has. Each line is the instance of a family and, after a tab, an equation with the code's answer.
 
 #include "compare.h"
 #include "factor_cache.h"
@@ -66,7 +65,7 @@ void print_equation(const std::string& instance, const char* formula, const std:
     std::puts((row + ") " + value + ")").c_str());
 }
 
-// ---- What vectors say of a pair
+// ---- What vectors answer for a pair
 
 template <typename Set, typename Bound, typename T1, typename T2>
 bool certain_by(const Bound bound, const T1& x, const T2& y) {
@@ -76,7 +75,7 @@ bool certain_by(const Bound bound, const T1& x, const T2& y) {
     return Set::certain_prefix(bound, xs.data(), ys.data(), count, count) == count;
 }
 
-// Calls `print` with every answer, and whether it is one of fused operations.
+// Calls `print` with every answer, and with whether fused operations gave it.
 template <typename Bound, typename T1, typename T2, typename Print, typename... Sets>
 void for_each_answer(const Bound bound, const T1& x, const T2& y, const Print& print,
                      type_list<Sets...> /*sets*/) {
@@ -111,7 +110,7 @@ std::string name_of_reals(const Direction& direction) {
     return std::string(sizeof(T) == sizeof(float) ? "single " : "double ") + direction.name;
 }
 
-// Those at which a step of the rule decides otherwise.
+// Those at which a step of the rule changes its decision.
 template <typename T>
 std::vector<T> numbers() {
     using limits = std::numeric_limits<T>;
@@ -202,7 +201,7 @@ void print_reals(const std::string& instance, const std::vector<T>& tolerances) 
             print_certainty_at_limit(instance, divisor);
         }
         for_each_pair_of_reals(factor, [&](const T x, const T y) {
-            // What a NaN tolerance makes is no factor of a table.
+            // The table has no factors of NaN tolerances.
             if (!std::isnan(tol)) {
                 print_comparisons(instance, tol, factor, x, y);
             }
@@ -215,7 +214,7 @@ void print_reals(const std::string& instance, const std::vector<T>& tolerances) 
     }
 }
 
-// Of other directions than to nearest those tolerances are enough whose factor is rounded.
+// For directions other than to nearest, the tolerances with a rounded factor are enough.
 template <typename T>
 void print_reals(const Direction& direction) {
     constexpr int bits = std::numeric_limits<T>::digits;

@@ -3,7 +3,7 @@
 (define-sort Y () (_ BitVec $y_width))
 (define-fun x_signed () Bool $x_signed)
 (define-fun y_signed () Bool $y_signed)
-; Converted to the width of the wider one: the digits in front are signs or zeros.
+; Converted to the width of the wider one: the digits put in front are signs or zeros.
 (define-fun wide_x ((x X)) (_ BitVec $width) ((_ $x_extend $x_to_width) x))
 (define-fun wide_y ((y Y)) (_ BitVec $width) ((_ $y_extend $y_to_width) y))
 

@@ -10,9 +10,9 @@ proves and which code it models. The lines after that say
     ; fault: TEXT => OTHER, a change somewhere in all this after which a claim must not hold
 
 Every function whose name begins with "claim" is proved: cvc5 has to find nothing that contradicts
-it. It also has to find something that agrees with it, as a proof from assumptions that contradict
-each other would prove anything, and for every fault something that contradicts a claim. Last the
-formulas are evaluated on the table of inputs that INPUTS prints with what the code makes of them.
+it. It also has to find something that agrees with it, as assumptions that contradict each other would
+prove anything, and for every fault something that contradicts a claim. Finally the formulas are
+evaluated on the table of inputs that INPUTS prints with the answers of the code.
 """
 
 import concurrent.futures
@@ -83,7 +83,7 @@ FAMILIES = {
     "double": {"double": DOUBLE},
     "rounded single": rounded_family("single", SINGLE),
     "rounded double": rounded_family("double", DOUBLE),
-    # Of so few digits that a solver can multiply and divide them.
+    # With so few digits that a solver can multiply and divide them.
     "rounded small": rounded_family("small", real_family(4, 6)),
     "directions": rounded_family("any", {}),
     "any": {"any": {}},
@@ -98,7 +98,7 @@ def solve(text):
     """Returns "sat", "unsat" or what else cvc5 says, and the seconds that it took."""
     start = time.monotonic()
     try:
-        # Other reals than singles and doubles are an experiment of the solver's.
+        # Reals other than singles and doubles are experimental in the solver.
         done = subprocess.run(["cvc5", "--fp-exp", "--lang=smt2", "-"], input=text, text=True,
                               capture_output=True, timeout=SECONDS, check=False)
     except subprocess.TimeoutExpired:
@@ -143,7 +143,7 @@ def query(assembled, values, goal):
 
 
 def tables(inputs):
-    """The rows of the program's table, by the instance that they are of."""
+    """The rows of the program's table, by their instance."""
     rows = {}
     for line in subprocess.run([inputs], capture_output=True, text=True, check=True).stdout.splitlines():
         instance, row = line.split("\t")

@@ -1,8 +1,9 @@
-; Proves: what the other proofs use of rounding, in any direction: it keeps the order, it does not
-;   bring an exact result past a number, and it is off by less than the numbers there are apart.
-; Models: every operation of compare.h and talnumericarray_sameq_certainty.h, as IEEE 754
-;   defines them: of the numbers of the type on the side that is asked for, the result is one nearest
-;   to the exact one.
+; Proves: what the other proofs use about rounding, in any direction: it keeps the order, it does
+;   not bring an exact result past a number, and its error is less than the spacing of the numbers
+;   there.
+; Models: every operation of compare.h and talnumericarray_sameq_certainty.h, as IEEE 754 defines
+;   them: of the type's numbers on the side that the direction allows, the result is one nearest to
+;   the exact result.
 ; for: directions
 ; with:
 ; fault: (=> (= v w) (= rounded_v rounded_w)) => true
@@ -27,7 +28,7 @@
 (declare-const rounded_w Real)
 (assert (=> (= v w) (= rounded_v rounded_w)))
 (assert (and (rounds v rounded_v rounded_w) (rounds w rounded_w rounded_v)))
-; Zero is a number, and here is any other.
+; Zero is a number, and this is any other.
 (declare-const z Real)
 (assert (and (rounds v rounded_v 0.0) (rounds w rounded_w 0.0) (rounds w rounded_w z)))
 ; Two numbers with w between them.

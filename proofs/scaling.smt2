@@ -11,13 +11,14 @@
 ; fault: (<= f 1.0) => (<= f 2.0)
 ; fault: (< (* divisor d) (* m f)) => (< d (* m f))
 
-; The factor, at least 2^-bits as of any tolerance above zero, and the epsilon of the type: by less
-; than that share of it a result is changed by rounding, unless it is subnormal.
+; The factor, at least 2^-bits as for any tolerance above zero, and the epsilon of the type:
+; rounding changes a result by less than epsilon times that result, unless it is subnormal.
 (declare-const f Real)
 (define-fun e () Real $epsilon)
 (assert (and (> f 0.0) (<= f 1.0)))
 
-; Times the factor: its inverse, that times 1 + 8 epsilon, and the divisor, all of them rounded.
+; Each times the factor: the factor's inverse, that inverse times 1 + 8 epsilon, and the divisor,
+; all rounded.
 (declare-const inverse Real)
 (declare-const product Real)
 (declare-const divisor Real)
@@ -29,9 +30,9 @@
   (and (>= divisor (+ 1.0 (* 4.0 e))) (>= divisor (+ 1.0 f))))
 (define-fun claim_divisor () Bool (=> divisor_is_rounded divisor_is_more))
 
-; The exact difference, and as the test and the rule have it: the one takes it in the order of the
-; arguments and the other from the larger, which is not rounded alike in all directions. A subnormal
-; one is exact.
+; The exact difference, and those of the test and of the rule: the test subtracts in the order of
+; the arguments and the rule from the larger, which some directions round differently. A subnormal
+; difference is exact.
 (declare-const exact Real)
 (declare-const d Real)
 (declare-const diff Real)
@@ -44,8 +45,9 @@
   (=> (and divisor_is_more (< (* divisor d) (* m f)) (>= scaled_m (* (- 1.0 e) m f)))
       (< diff scaled_m)))
 
-; Below 1 the difference is divided by it. Times the factor here is the quotient, rounded: if it is
-; subnormal, so that the difference is exact, it is off by less than the least number above zero.
+; Below 1 the difference is divided by the factor. This is the rounded quotient times the factor: if
+; the quotient is subnormal, so that the difference is exact, its error is less than the least
+; number above zero.
 (declare-const quotient Real)
 (declare-const least Real)
 (define-fun quotient_is_rounded () Bool

@@ -1,4 +1,4 @@
-; Proves: what nearness.smt2 does, at one go and without its lemmas, for reals of six digits.
+; Proves: what nearness.smt2 proves, in one step and without its lemmas, for reals of six digits.
 ; Models: compare_impl (compare.h), certain_divisor and certainly_same_reals
 ;   (talnumericarray_sameq_certainty.h), and DoubtsAboutReals::add (talnumericarray_sameq_vectors.h).
 ; for: rounded small

@@ -1,5 +1,5 @@
 ; Proves: two reals in either order are the same, and a factor is made for them in either order; and
-;   where both are numbers, what is above in one order is below in the other.
+;   if neither is a NaN, what is above in one order is below in the other.
 ; Models: compare_impl (compare.h); that a pair of element types and its reverse share a loop
 ;   (elements_sameQ in talnumericarray_sameq_walk.h).
 ; for: single, double
@@ -11,7 +11,7 @@
 (declare-const tol T)
 (declare-const factor T)
 (declare-const remembered Bool)
-; Of the operations: NaN in, NaN out.
+; About the operations: NaN in, NaN out.
 (assert (=> (or (fp.isNaN x) (fp.isNaN y)) (and (fp.isNaN (minus x y)) (fp.isNaN (minus y x)))))
 (define-fun nan_stays ((factor T) (d T) (m T)) Bool
   (and (=> (fp.isNaN d) (and (fp.isNaN (plus d d)) (fp.isNaN (over d factor))))

@@ -1,5 +1,6 @@
 #!/bin/sh
-# Compares all results with what is expected; of those that differ it says which tolerance would do.
+# Compares all results with what is expected, and says which tolerance would do for those that
+# differ.
 digits=${DIGITS:-10}
 status=0
 talcmp --tol "$digits" expected results >comparison.txt || status=$?

@@ -1,10 +1,10 @@
 #!/bin/sh
 # shellcheck disable=SC2016 # git expands what is in single quotes
-# Has git show how a changed array in this repository differs.
+# Makes git show how a changed array in this repository differs.
 echo '*.npy diff=npy' >>.gitattributes
 
-# git diff, git show, git log --patch: what a report says of each array alone, line by line, and a sum
-# that differs whenever the array does.
+# git diff, git show, git log --patch: what a report says about each array alone, line by line, and
+# a checksum that differs whenever the array does.
 git config diff.npy.textconv 'f() { talcmp --report "$1" "$1" | tail -n +2; cksum <"$1"; }; f'
 
 # git difftool: how the old array and the new one differ.

@@ -1,6 +1,6 @@
 // The questions of both programs, with their answers. The threads ask about numbers so close to the
-// limits of their tolerances that the factor of one thread would change the answers of another; but
-// for the first, whose tolerance of zero needs none.
+// limits of their tolerances that the factor of one thread would change the answers of another;
+// except for the first thread, whose tolerance of zero needs no factor.
 
 #include "questions.h"
 
@@ -42,7 +42,7 @@ st_TalDataArray array_of(T (&elements)[2], talint& dimension) {
     return array;
 }
 
-// The number of wrong answers to one round of questions.
+// The number of wrong answers in one round of questions.
 int wrong_answers(BytesToStore bytes_to_store, const Limit& limit) {
     talint two = 2;
     BIT8 integers[] = {1, 1};

@@ -6,7 +6,7 @@
 
 namespace talcmp {
 
-// Keeps SIGHUP, SIGINT and SIGTERM from this thread as long as it lives.
+// Keeps SIGHUP, SIGINT and SIGTERM from this thread while the object lives.
 class BlockedSignals {
   public:
     BlockedSignals() {

@@ -13,7 +13,7 @@ namespace talcmp {
 
 struct CommandLine {
     Question question;
-    NameFilter filter; // of members of archives; what is excluded also of files of folders
+    NameFilter filter; // for members of archives; exclusions also for files in folders
     bool json = false;
     bool quiet = false;
     bool verbose = false;
@@ -22,7 +22,7 @@ struct CommandLine {
     std::string second;
 };
 
-// Returns what is asked; nothing where that was help or the version, which are printed already.
+// Returns what is asked; nothing if that was the help or the version, which has then been printed.
 // Throws UsageError.
 std::optional<CommandLine> read_command_line(int argc, const char* const* argv);
 

@@ -33,7 +33,7 @@ class OperandComparison {
     }
 
   private:
-    // None where there was trouble, which is reported.
+    // None if there was trouble, which is then reported.
     std::vector<NamedPair> file_pairs() {
         const std::string& first = command_line_.first;
         const std::string& second = command_line_.second;
@@ -48,7 +48,7 @@ class OperandComparison {
         }
     }
 
-    // Trouble with these two does not keep the others from being compared.
+    // Trouble with these two does not stop the comparison of the others.
     template <typename Action>
     void guarded(const std::string& first, const std::string& second, const Action& action) {
         try {

@@ -15,7 +15,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// What every name of a folder, its own and those of links, has in common.
+// What all names of a folder, its own and those of links to it, have in common.
 using Identity = std::pair<dev_t, ino_t>;
 
 std::optional<Identity> identity_of(const fs::path& folder) {
@@ -51,8 +51,8 @@ class Walk {
         }
         open_.push_back(identity.value_or(Identity()));
         std::error_code error;
-        // Read to its end before the next is opened: there may be more levels than files that a
-        // program may have open.
+        // Read to its end before the next is opened: there may be more levels than a program may
+        // have files open.
         for (const fs::path& path : entries_of(folder, error)) {
             visit(path);
         }

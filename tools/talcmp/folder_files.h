@@ -10,7 +10,7 @@ namespace talcmp {
 
 struct FolderFile {
     std::string path;
-    std::optional<std::string> trouble = {}; // why it is not to be opened
+    std::optional<std::string> trouble = {}; // why it must not be opened
 };
 
 using FilesByName = std::map<std::string, FolderFile>;
@@ -22,8 +22,8 @@ using FilesByName = std::map<std::string, FolderFile>;
 // folder without permission, a link that leads nowhere or back to a folder that it is in.
 FilesByName files_in(const std::string& folder);
 
-// Why a file that was not named by itself is not to be opened; nothing where it may be. Whoever
-// opens a pipe waits for its writer, who may never come.
+// Why a file that was not named itself must not be opened; nothing if it may be. Opening a pipe
+// waits for a writer, which may never come.
 std::optional<std::string> reason_not_to_open(const std::string& path);
 
 } // namespace talcmp

@@ -33,7 +33,7 @@ int run(const int argc, const char* const* argv) {
             talcmp::ProgressBar progress(!command_line->quiet);
             summary = compare_operands(*command_line, *answers_for(*command_line), progress);
         }
-        // A line too long for the buffer may have failed before the flush.
+        // Output of a line too long for the buffer may have failed before the flush.
         if (std::fflush(stdout) != 0 || std::ferror(stdout) != 0) {
             throw talcmp::Trouble("standard output", "cannot be written");
         }

@@ -18,7 +18,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// Takes out of `pairs` what is below a name with trouble: nothing is known of it.
+// Removes from `pairs` what is below a name with trouble, as nothing is known about it.
 void leave_to_trouble(std::map<std::string, NamedPair>& pairs) {
     for (auto pair = pairs.begin(); pair != pairs.end(); ++pair) {
         if (pair->second.trouble) {
@@ -95,7 +95,7 @@ FilesByName files_that_match(const std::string& pattern) {
     return files;
 }
 
-// What an operand stands for, which is found out once.
+// What an operand stands for, determined once.
 enum class OperandKind { file, standard_input, folder, pattern };
 
 OperandKind kind_of(const std::string& operand) {

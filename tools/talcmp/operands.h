@@ -8,7 +8,7 @@
 
 namespace talcmp {
 
-// Two things of one name, or one that has no counterpart.
+// Two paths with one name, or a path that has no counterpart.
 struct NamedPair {
     std::string name;
     std::optional<std::string> first;
@@ -31,7 +31,7 @@ struct FilePairs {
 FilePairs match_files(const std::string& first, const std::string& second,
                       const std::vector<std::string>& exclude);
 
-// Patterns for names, as of a shell; `include` without patterns stands for all names.
+// Patterns for names, as in a shell; `include` without patterns stands for all names.
 struct NameFilter {
     std::vector<std::string> include;
     std::vector<std::string> exclude;

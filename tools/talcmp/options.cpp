@@ -16,7 +16,7 @@ bool begins_with(const std::string& text, const std::string& beginning) {
 
 // ---- What to say about an unknown option
 
-// How many characters have to be changed, put in or left out to make one word of the other.
+// How many characters have to be changed, inserted or removed to turn one word into the other.
 std::size_t distance(const std::string& one, const std::string& other) {
     std::vector<std::size_t> row(other.size() + 1);
     std::iota(row.begin(), row.end(), std::size_t{0});
@@ -35,7 +35,7 @@ std::string hint_of(const Option& option) {
     return option.hint.empty() ? "did you mean " + option.name + "?" : option.hint;
 }
 
-// Empty where no option has a name that is like `word`.
+// Empty if no option has a name like `word`.
 std::string hint_for(const std::vector<Option>& options, const std::string& word) {
     constexpr std::size_t shortest_beginning = 4; // "--st"
     std::size_t nearest = std::max<std::size_t>(word.size() / 3, 1) + 1;
@@ -165,7 +165,7 @@ class Sorter {
         if (takes_value(option) && value.empty()) {
             throw UsageError(name + ": empty value");
         }
-        // In a word of its own, which is likely to have been meant as what it looks like.
+        // A value in a word of its own that looks like an option was probably meant as one.
         const bool own_word =
             takes_value(option) && ::optarg == arguments_[static_cast<std::size_t>(::optind - 1)];
         if (own_word && is_option(value)) {
@@ -178,7 +178,7 @@ class Sorter {
     std::vector<std::string> words_;
     std::vector<char*> arguments_;
     std::vector<::option> long_options_;
-    // Operands are returned in their places, and missing values apart from unknown options.
+    // "-" returns operands in their places; ":" tells missing values from unknown options.
     std::string letters_ = "-:";
     Words sorted_;
 };

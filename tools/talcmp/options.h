@@ -18,12 +18,12 @@ struct UsageError : std::runtime_error {
 };
 
 struct Option {
-    enum class Kind { flag, value, values }; // those of `values` may be repeated
+    enum class Kind { flag, value, values }; // options of kind `values` may be repeated
     std::string name;                        // "--tol"
     Kind kind = Kind::flag;
-    char letter = '\0'; // of its short form, where there is one
+    char letter = '\0'; // of its short form, if it has one
 
-    // What a user may take for the name of this option, and what to say of it then.
+    // Names that a user may take for this option's, and what to say then.
     std::vector<std::string> other_names = {};
     std::string hint = {};
 };
@@ -40,7 +40,7 @@ inline bool has(const Words& words, const std::string& option) {
 // All values that the option was given.
 std::vector<std::string> values_of(const Words& words, const std::string& option);
 
-// Its only value; `otherwise` where it was not given.
+// The option's only value; `otherwise` if the option was not given.
 std::string value_of(const Words& words, const std::string& option, const std::string& otherwise);
 
 // `--name value`, `--name=value`, `-nvalue`, `-n value`; several flags in one word, `-qv`. After

@@ -1,4 +1,4 @@
-// The outcome for each two arrays that belong together, and the totals.
+// The outcome for each pair of arrays that belong together, and the totals.
 
 #pragma once
 
@@ -12,12 +12,12 @@ namespace talcmp {
 struct Outcome {
     enum class Kind { same, different, only_in_first, only_in_second, trouble };
     Kind kind = Kind::same;
-    // What the two arrays are called. Where one has no counterpart: where that would be.
+    // What the two arrays are called. For a missing counterpart: where it would be.
     std::string first;
     std::string second;
     std::string name;      // of an array that has no counterpart, in a folder or an archive
-    Comparison comparison; // where the kind is same or different
-    std::string message;   // where there was trouble
+    Comparison comparison; // if the kind is same or different
+    std::string message;   // if there was trouble
 };
 
 // How many outcomes there were of each kind.

@@ -27,7 +27,7 @@ std::unique_ptr<ArrayFile> open_npy(std::unique_ptr<RegularFile> file) {
     return std::make_unique<NpyFile>(std::move(path), std::move(file));
 }
 
-// What begins like none of them is read as an .npy file, which says what is wrong with it.
+// A file that begins like none of them is read as an .npy file; that reader says what is wrong.
 constexpr Format formats[] = {
     {"PK\x03\x04", open_npz},
     {"PK\x05\x06", open_npz}, // without members

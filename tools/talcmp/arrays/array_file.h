@@ -11,7 +11,7 @@
 namespace talcmp {
 
 // A file with one array or several. A format is a class that implements this, and a line of
-// `formats` in array_file.cpp, before the last one, which takes every file.
+// `formats` in array_file.cpp before the last, which takes every file.
 class ArrayFile {
   public:
     ArrayFile() = default;
@@ -32,8 +32,8 @@ class ArrayFile {
 // The path that stands for standard input.
 inline constexpr const char* standard_input_path = "-";
 
-// Opens a file, once, and recognises its format by its first bytes. A pipe, which is waited for
-// until somebody writes to it, and standard input are read as .npy files. Throws Trouble when the
+// Opens a file, once, and recognises its format by its first bytes. A pipe and standard input are
+// read as .npy files; opening a pipe waits until somebody writes to it. Throws Trouble when the
 // file cannot be opened or is of no known format.
 std::unique_ptr<ArrayFile> open_array_file(const std::string& path);
 

@@ -34,7 +34,7 @@ class ArraySource {
     virtual const Shape& shape() const = 0;
 
     // Whether the first index varies fastest from position to position, as in Fortran; otherwise
-    // the last one does, as in C.
+    // the last index does, as in C.
     virtual bool fortran_order() const = 0;
 
     // Whether elements may be read in any order, by several threads at once. Otherwise `first` may
@@ -45,8 +45,8 @@ class ArraySource {
     // `elements`. Throws Trouble.
     virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
 
-    // Reads the rest, where only the end shows whether what was read is right. No answer can be
-    // trusted until this has returned. Throws Trouble.
+    // Reads the rest if only the end shows whether what was read is right. No answer can be trusted
+    // until this has returned. Throws Trouble.
     virtual void check_to_end() {}
 };
 

@@ -19,10 +19,10 @@ class ByteSource {
     // never be below what has been read, and only one thread reads.
     virtual bool random_access() const = 0;
 
-    // In bytes; nothing where it is not known before the end.
+    // In bytes; nothing if the size is not known before the end.
     virtual std::optional<std::uint64_t> size() const = 0;
 
-    // Reads up to `count` bytes from `offset` on to `bytes` and returns how many, fewer only at the
+    // Reads up to `count` bytes from `offset` into `bytes` and returns how many, fewer only at the
     // end. Throws Trouble.
     virtual std::size_t read(std::uint64_t offset, void* bytes, std::size_t count) = 0;
 };

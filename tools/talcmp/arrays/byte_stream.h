@@ -13,7 +13,7 @@ class ByteStream : public ByteSource {
     std::size_t read(std::uint64_t offset, void* bytes, std::size_t count) final;
 
   private:
-    // Reads up to `count` bytes to `bytes` and returns how many; 0 at the end. Throws Trouble.
+    // Reads up to `count` bytes into `bytes` and returns how many; 0 at the end. Throws Trouble.
     virtual std::size_t read_next(void* bytes, std::size_t count) = 0;
 
     // Reads until `count` bytes or the end.

@@ -1,4 +1,4 @@
-// File descriptors: closed at the end, read from, and the error when that fails.
+// File descriptors: closing them, reading from them, and the error when reading fails.
 
 #pragma once
 
@@ -29,7 +29,7 @@ class Descriptor {
     }
     int number() const { return number_; }
 
-    // Leaves it to the caller to close it.
+    // Leaves closing it to the caller.
     int release() { return std::exchange(number_, -1); }
 
   private:
@@ -41,8 +41,8 @@ class Descriptor {
     throw Trouble(path, std::string(what_failed) + ": " + std::generic_category().message(errno));
 }
 
-// Reads up to `count` bytes of a file on disk from `offset` on and returns how many, fewer only at
-// the end. Throws Trouble, which names `path`.
+// Reads up to `count` bytes of a file on disk from `offset` and returns how many, fewer only at the
+// end. Throws Trouble, which names `path`.
 inline std::size_t read_at(const int file, const std::string& path, const std::uint64_t offset,
                            void* const bytes, const std::size_t count) {
     std::size_t done = 0;

@@ -1,4 +1,4 @@
-// What talcmp knows about an element type: its size, its name and how a value of it is written.
+// What talcmp knows about an element type: its size, its name and how its values are written.
 
 #pragma once
 
@@ -17,10 +17,11 @@ struct ElementType {
     std::size_t size;      // bytes
     std::size_t part_size; // bytes of a real or imaginary part; those of an element without parts
     std::size_t alignment; // bytes
-    std::string name;      // as NumPy says it: int8, float64, complex128
+    std::string name;      // NumPy's name: int8, float64, complex128
 
     // Writes the element at `element` in the fewest digits that read back as the same value; a NaN
-    // with its bits. `as_doubles` does so for the double of the same value, if it is of singles.
+    // with its bits. With `as_doubles`, a value of singles is written as the double of the same
+    // value.
     std::string (*text)(const void* element, bool as_doubles);
 
     // The real and the imaginary part, rounded to doubles: signs, zeros and NaNs stay what they

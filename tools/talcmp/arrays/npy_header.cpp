@@ -199,7 +199,7 @@ class DictionaryReader {
 
 // ---- What the dictionary means
 
-// What NumPy calls the element types that talcmp does not read.
+// NumPy's names for the element types that talcmp does not read.
 std::string kind_name(const std::string& code) {
     if (code == "f2") {
         return " (half precision)";
@@ -295,7 +295,7 @@ void check_countable(const std::optional<std::uint64_t> count) {
     }
 }
 
-// ---- The bytes up to the dictionary, and those of it
+// ---- The bytes up to the dictionary, and its own
 
 constexpr std::string_view magic = "\x93NUMPY";
 

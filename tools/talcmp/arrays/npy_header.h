@@ -20,10 +20,10 @@ struct NpyHeader {
     std::uint64_t element_count = 0; // the product of `shape`
     std::uint64_t data_offset = 0;   // bytes from the beginning of the file to the first element
     bool fortran_order = false;      // whether the first index varies fastest
-    bool bytes_swapped = false;      // whether the elements are in the other byte order than ours
+    bool bytes_swapped = false;      // whether the elements are not in our byte order
 };
 
-// What is wrong with a header, or not supported, as a sentence without its subject, the file.
+// What is wrong with a header or not supported in it: a sentence without its subject, the file.
 struct NpyError : std::runtime_error {
     using std::runtime_error::runtime_error;
 };

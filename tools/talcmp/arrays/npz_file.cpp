@@ -74,7 +74,7 @@ NpzFile::NpzFile(RegularFile& file) : path_(file.path()), archive_(open_archive(
         }
         std::string member = name;
         if (ends_with(member, "/")) {
-            continue; // a folder, as zip writes one in front of what is in it
+            continue; // a folder: zip writes an entry for it before its contents
         }
         if (ends_with(member, suffix)) {
             member.resize(member.size() - suffix.size());

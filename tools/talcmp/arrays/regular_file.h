@@ -11,7 +11,7 @@
 namespace talcmp {
 
 // It is read, not mapped into memory: if a file is cut short while it is read, a message says so,
-// where a mapped one would end the program. Nor does the address space limit its size.
+// whereas a mapped file would end the program. Nor does the address space limit its size.
 class RegularFile : public ByteSource {
   public:
     // `file` is a regular file of `size` bytes, and `path` what messages call it. Throws Trouble.

@@ -20,12 +20,12 @@ constexpr Character broken = {replacement, 1};
 struct Lead {
     unsigned char first, last; // bytes
     std::size_t length;
-    char32_t smallest; // that is not to be written in fewer bytes
+    char32_t smallest; // code that takes so many bytes
 };
 
 constexpr Lead leads[] = {{0xC2, 0xDF, 2, 0x80}, {0xE0, 0xEF, 3, 0x800}, {0xF0, 0xF4, 4, 0x10000}};
 
-// The character that `text`, which is not empty, begins with.
+// The first character of `text`, which is not empty.
 Character first_character(const std::string_view text) {
     const auto byte = [text](const std::size_t i) { return static_cast<unsigned char>(text[i]); };
     if (byte(0) < 0x80) {
@@ -67,7 +67,7 @@ bool is_shown(const char32_t code) {
     });
 }
 
-// Of the one that the byte `position` of a text of UTF-8 belongs to.
+// Where the character begins that the byte at `position` of a UTF-8 text belongs to.
 std::size_t beginning_of_character(const std::string_view text, std::size_t position) {
     while ((static_cast<unsigned char>(text[position]) & 0xC0U) == 0x80) {
         --position;

@@ -13,7 +13,7 @@ namespace {
 
 int open_without_name(const std::string& folder) {
     std::string path = folder + "/talcmp-XXXXXX";
-    const BlockedSignals blocked; // or a signal might leave the file there
+    const BlockedSignals blocked; // otherwise a signal might leave the file behind
     const int file = ::mkostemp(path.data(), O_CLOEXEC);
     if (file >= 0) {
         ::unlink(path.c_str());

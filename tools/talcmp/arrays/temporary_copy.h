@@ -1,4 +1,4 @@
-// A copy of an array that can be read only once, from which it is read in any order.
+// A copy, readable in any order, of an array that can be read only once.
 
 #pragma once
 
@@ -28,7 +28,7 @@ class TemporaryCopy : public ArraySource {
     void copy_all(const std::function<void(std::uint64_t)>& copied);
     void append(const char* bytes, std::size_t count);
 
-    std::unique_ptr<ArraySource> source_; // which has been read
+    std::unique_ptr<ArraySource> source_; // already read
     std::string folder_;
     Descriptor file_;
 };

@@ -59,7 +59,7 @@ void BoxComparer::read(const Box& box) {
     const auto read_second = [&] {
         traversal.read(Side::second, plan_.second(), box, buffer2_.get());
     };
-    // What can be read only once may have to be decompressed: a thread for each side.
+    // A side that can be read only once may have to be decompressed: each side gets a thread.
     const bool side_by_side = !plan_.first().random_access() && !plan_.second().random_access();
     auto second = std::async(side_by_side ? std::launch::async | std::launch::deferred
                                           : std::launch::deferred,

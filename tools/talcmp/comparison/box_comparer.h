@@ -1,5 +1,5 @@
-// The comparison of two arrays box by box: what all boxes have in common, and what finds the pairs
-// that differ in one.
+// The comparison of two arrays box by box: what all boxes have in common, and what finds the
+// differing pairs in a box.
 
 #pragma once
 
@@ -14,10 +14,11 @@
 
 namespace talcmp {
 
-// Whether boxes, and the pairs in them, are in column-major order; if not, in row-major order.
+// Whether boxes, and the pairs in them, are in column-major order; otherwise they are in row-major
+// order.
 bool column_major(const ArraySource& first, const ArraySource& second);
 
-// What all boxes of a comparison have in common. It refers to what it is made of.
+// What all boxes of a comparison have in common. Keeps references to what it is constructed from.
 class BoxPlan {
   public:
     BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second,
@@ -31,10 +32,11 @@ class BoxPlan {
     // Whether the numbers of pairs ascend from each to the next, in a box and from box to box.
     bool in_order() const { return in_order_; }
 
-    // Of a pair of a box, for `FoundPair`. In the order of storage where any place will do.
+    // The number of the pair `i` of a box, for `FoundPair`; in the order of storage if any place
+    // will do.
     std::uint64_t number_of(const Box& box, std::size_t i) const;
 
-    // The index of the first array's element of that number.
+    // The index of the first array's element with that number.
     Shape index_of(std::uint64_t number) const;
 
     // Whether all pairs of the box come after those wanted, whose numbers are below `bound`.
@@ -60,8 +62,8 @@ class BoxComparer {
   public:
     explicit BoxComparer(const BoxPlan& plan);
 
-    // Reads the box and adds what it finds. Returns the number from which on no pair of any box is
-    // wanted any more. Throws Trouble.
+    // Reads the box and adds what it finds. Returns the number from which no more pairs of any box
+    // are wanted. Throws Trouble.
     std::uint64_t compare(const Box& box);
 
     const Findings& findings() const { return findings_; }

@@ -48,7 +48,7 @@ void for_each_step(const BoxAxis* const begin, const BoxAxis* const end,
 
 class BoxReader {
   public:
-    // Of `axes`, those of long strides come first.
+    // In `axes`, long strides come first.
     BoxReader(ArraySource& source, const std::vector<BoxAxis>& axes, unsigned char* const buffer)
         : source_(source), element_size_(source.type().size), buffer_(buffer), begin_(axes.data()),
           end_(axes.data() + axes.size()) {}
@@ -68,7 +68,7 @@ class BoxReader {
     static constexpr std::size_t longest_stretch = std::size_t{256} * 1024; // bytes with gaps
     static constexpr std::size_t longest_gap = 256;                         // bytes read in vain
 
-    // The first axis from which on all elements are stored without gaps.
+    // The first axis from which all elements are stored without gaps.
     const BoxAxis* first_packed() const {
         const BoxAxis* axis = end_;
         std::uint64_t length = 1;
@@ -99,7 +99,7 @@ class BoxReader {
         });
     }
 
-    // Along the last axis, where something else is stored between the elements.
+    // Reads along the last axis, where other elements are stored between those of the box.
     void read_with_gaps(const std::uint64_t position, const std::size_t slot) {
         const BoxAxis& last = end_[-1];
         const bool one_by_one = last.stride > longest_gap / element_size_;

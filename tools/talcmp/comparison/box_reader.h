@@ -1,4 +1,4 @@
-// Reads a box of elements that are stored in another order than they are wanted, or with gaps.
+// Reads a box of elements that are not stored in the order wanted, or have gaps between them.
 
 #pragma once
 
@@ -10,7 +10,7 @@
 
 namespace talcmp {
 
-// An axis of a box, both in the source and in the buffer that the box is read to.
+// An axis of a box, both in the source and in the buffer that the box is read into.
 struct BoxAxis {
     std::size_t extent;
     std::uint64_t stride;    // in positions of the source

@@ -13,7 +13,7 @@
 namespace talcmp {
 namespace {
 
-// What the threads share: which box is next, from which number on no pair is wanted, what failed.
+// What the threads share: the next box, the number from which no pair is wanted, what failed.
 class BoxQueue {
   public:
     explicit BoxQueue(const std::uint64_t box_count) : box_count_(box_count) {}
@@ -24,7 +24,8 @@ class BoxQueue {
         return box < box_count_ && !stopped_ ? std::optional(box) : std::nullopt;
     }
 
-    // All boxes before it have been given out, so that of several failures the first is known.
+    // All boxes before it have been given out, so the first of several failures is known in the
+    // end.
     void fail(const std::uint64_t box, const std::exception_ptr& failure) {
         const std::lock_guard<std::mutex> lock(mutex_);
         if (!failure_ || box < failed_box_) {
@@ -41,7 +42,8 @@ class BoxQueue {
     }
     std::uint64_t bound() const { return bound_; }
 
-    // When all threads have ended. One thread alone would not have come to a box beyond `bound`.
+    // Called when all threads have ended. A single thread would not have reached a box beyond
+    // `bound`.
     void rethrow_failure_before(const std::uint64_t bound, const BoxPlan& plan) const {
         if (failure_ && !plan.is_beyond(plan.traversal().box(failed_box_), bound)) {
             std::rethrow_exception(failure_);
@@ -58,7 +60,7 @@ class BoxQueue {
     std::uint64_t failed_box_ = 0;
 };
 
-// What each thread does.
+// The work of each thread.
 void take_boxes(const BoxPlan& plan, BoxQueue& queue, BoxComparer& comparer,
                 ProgressListener& progress) {
     remember_factor_of(plan.question().tolerance);
@@ -99,7 +101,7 @@ unsigned thread_count(const BoxPlan& plan) {
     if (!plan.random_access()) {
         return 1;
     }
-    constexpr unsigned most = 8; // a few MiB each; more hardly read faster
+    constexpr unsigned most = 8; // a few MiB each; more are hardly faster
     const unsigned allowed = plan.question().threads;
     const unsigned wanted =
         allowed != 0 ? allowed : std::clamp(std::thread::hardware_concurrency(), 1U, most);

@@ -10,8 +10,8 @@ namespace talcmp {
 // How many threads are worthwhile, up to as many as the question allows.
 unsigned thread_count(const BoxPlan& plan);
 
-// The findings are those of one thread alone. Throws Trouble where one alone would have come to a
-// box that cannot be read, and std::bad_alloc.
+// The findings are those of a single thread. Throws Trouble if a single thread would have reached a
+// box that cannot be read; throws std::bad_alloc.
 Findings compare_boxes(const BoxPlan& plan, unsigned threads, ProgressListener& progress);
 
 } // namespace talcmp

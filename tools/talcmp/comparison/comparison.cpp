@@ -26,9 +26,9 @@ ArrayFacts facts_of(const NamedArray& array, const View& view) {
             array.source->fortran_order()};
 }
 
-// ---- From what was found to what is said of it
+// ---- From what was found to what is reported
 
-// Asks about many pairs at once, where no report has done so before.
+// Asks about many pairs at once, if no report has done so before.
 void find_samenesses(const BoxPlan& plan, std::vector<FoundPair>& pairs) {
     const ElementType& type1 = plan.first().type();
     const ElementType& type2 = plan.second().type();
@@ -90,7 +90,8 @@ void make_readable_in_any_order(NamedArray& array, ProgressListener& progress) {
     }
 }
 
-// The size of the copy of an array that can be read only once, and not in the order wanted.
+// The size of the copy of an array that can be read only once, in an order that is not the one
+// wanted.
 std::uint64_t bytes_to_copy(const Traversal& traversal, const ArraySource& source) {
     return traversal.is_linear() || source.random_access()
                ? 0
@@ -136,7 +137,7 @@ void compare_elements(NamedArray& first, NamedArray& second, const View& view1, 
     }
 }
 
-// Of arrays of one shape.
+// For arrays of one shape.
 void compare_contents(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
                       const Question& question, ProgressListener& progress, Comparison& result) {
     if (question.report) {

@@ -17,7 +17,7 @@ namespace talcmp {
 
 enum class Difference { none, shape, type, elements };
 
-// What is reported of an array.
+// What is reported about an array.
 struct ArrayFacts {
     std::string name;
     const ElementType* type = nullptr;
@@ -26,21 +26,21 @@ struct ArrayFacts {
     bool fortran_order = false;
 };
 
-// A place in both arrays, and what is to be said of the elements there.
+// A place in both arrays, and what to say about the elements there.
 struct Place {
     Shape index; // in the first array
     Element element1, element2;
     Verdict verdict;
 };
 
-// Of all pairs together.
+// For all pairs together.
 struct Report {
     Totals totals;
     std::optional<Place> worst_place; // the first that differs in the most digits, if any does
-    int all_digits = 0;               // of the reals as which elements are compared
+    int all_digits = 0;               // of the type of real that is compared
 
-    // The smallest whole tolerance, from 0 on, under which the arrays are the same; nothing where
-    // that is none or one of all digits, which says nothing of them.
+    // The smallest whole tolerance, from 0, under which the arrays are the same; nothing if there
+    // is none, or only one of all digits, which says nothing about the arrays.
     std::optional<int> smallest_tolerance = 0;
 };
 
@@ -49,7 +49,7 @@ struct Comparison {
     bool has_elements = true; // whether there was any pair to compare
     Difference difference = Difference::none;
     std::vector<Place> places;    // the first that differ, in row-major order
-    std::optional<Report> report; // where asked for and the shapes are the same
+    std::optional<Report> report; // if asked for and the shapes are the same
 };
 
 // An array, and what messages call it.
@@ -58,11 +58,11 @@ struct NamedArray {
     std::unique_ptr<ArraySource> source;
 };
 
-// Compares what `question` selects of both arrays. The answer is what `TalNumericArray_sameQ` says
-// of them in a thread that remembers the factor of the tolerance; but under `strict_type` arrays of
-// different types differ even where they have no elements. The answer does not depend on how the
+// Compares what `question` selects of both arrays. The answer is that of `TalNumericArray_sameQ`
+// for them in a thread that remembers the factor of the tolerance; but under `strict_type` arrays
+// of different types differ even if they have no elements. The answer depends neither on how the
 // arrays are stored nor on the number of threads. What can be read only once is read to its end,
-// whatever was found before, as only there a damaged archive shows. Throws Trouble.
+// whatever was found before, as only the end shows that an archive is damaged. Throws Trouble.
 Comparison compare(NamedArray first, NamedArray second, const Question& question,
                    ProgressListener& progress);
 

@@ -44,7 +44,7 @@ template <typename Real>
     const Real magnitude2 = std::fabs(y);
     const Real quotient = std::fabs(x - y) / (magnitude1 < magnitude2 ? magnitude2 : magnitude1);
     const Bits exponent = bits_of(quotient) >> significand_bits;
-    const Real power = real_of<Real>(exponent << significand_bits); // of two, not above
+    const Real power = real_of<Real>(exponent << significand_bits); // of two, not above `quotient`
     const Bits two_signs = (bits_of(x) ^ bits_of(y)) >> (8 * sizeof(Real) - 1);
     Bits group =
         ((quotient < 1) & (quotient != power)) ? exponent - first : Bits{DigitGroups::doubtful};
@@ -64,7 +64,7 @@ template <typename Real>
 
 #if defined(__x86_64__)
 
-// Four times as fast as with the instructions that every such processor has.
+// Four times as fast as with the instructions that every x86-64 processor has.
 template <typename Real>
 [[gnu::target("avx2")]] void sort_parts_by_avx2(const Real* const x, const Real* const y,
                                                 const std::size_t count, Group* const groups) {

@@ -1,4 +1,4 @@
-// Pairs of elements in groups of which the module has to be asked about one pair only.
+// Groups of pairs of elements: the module has to be asked about only one pair of each.
 
 #pragma once
 
@@ -23,7 +23,7 @@ class DigitGroups {
 
     // Pairs of equal values, with the same signs.
     static constexpr Group equal = 0;
-    // Pairs of equal values of which some are zeros of two signs.
+    // Pairs of equal values, some of them zeros of different signs.
     static constexpr Group equal_except_signs_of_zeros = 1;
     // Between, in ascending order, the pairs whose quotients are between two powers of two.
     static constexpr Group smallest_quotient = 2;
@@ -33,8 +33,8 @@ class DigitGroups {
     static constexpr Group unlike = doubtful + 1;
     static constexpr int count = unlike + 1;
 
-    // Writes the group of each pair to `groups`; of a pair of complex numbers, the last of those of
-    // its parts. Returns false, and writes nothing, where both types are integers.
+    // Writes the group of each pair to `groups`; for a pair of complex numbers, the later of the
+    // groups of its parts. Returns false, and writes nothing, if both types are integers.
     bool sort(const Pairs& pairs, Group* groups);
 
   private:

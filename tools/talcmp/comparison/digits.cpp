@@ -6,7 +6,7 @@
 namespace talcmp {
 namespace {
 
-// Shorter ones are asked about pair by pair.
+// Shorter stretches are asked about pair by pair.
 constexpr std::size_t shortest_stretch = 32;
 
 // Classes of pairs are their groups and, after those, one for each sameness.
@@ -23,7 +23,7 @@ bool has_singles(const ElementType& type) {
     return !is_integer(type) && type.part_size == sizeof(float);
 }
 
-// Whether the elements are equal and no NaNs, and so the same under every tolerance.
+// Whether the elements are equal and not NaNs, and so the same under every tolerance.
 bool all_same(const Pairs& pairs, const std::size_t begin, const std::size_t count) {
     return pairs.same(0, begin, count) && pairs.same(1, begin, count);
 }
@@ -36,8 +36,8 @@ int all_digits(const ElementType& type1, const ElementType& type2) {
     return as_singles ? std::numeric_limits<float>::digits : most_digits;
 }
 
-// From one whole tolerance to the next no pair that is the same stops being so. Usual answers
-// first: equal, the same under no tolerance, or under all digits alone.
+// From one whole tolerance to the next, no pair stops being the same. The usual answers come first:
+// equal, the same under no tolerance, or the same only under all digits.
 Sameness sameness_of(const Pairs& pairs, const std::size_t i) {
     const bool at_zero = pairs.same(0, i);
     if (at_zero && pairs.same(1, i)) {
@@ -104,7 +104,7 @@ void DigitSearch::ask_about_groups(const Pairs& pairs) {
     }
 }
 
-// Halves it until all of a part are the same.
+// Halves the stretch until all pairs of a part are the same.
 void DigitSearch::ask_about_stretch(const Pairs& pairs, const std::size_t begin,
                                     const std::size_t count) {
     if (all_same(pairs, begin, count)) {

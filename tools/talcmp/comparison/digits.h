@@ -1,4 +1,4 @@
-// In how many binary digits the elements of pairs differ.
+// How many binary digits the elements of pairs differ in.
 
 #pragma once
 
@@ -11,7 +11,7 @@
 
 namespace talcmp {
 
-// The largest whole tolerance that differs from the next one: from 53 on all answer alike.
+// The largest whole tolerance that matters: all above it answer alike.
 inline constexpr int most_digits = 53;
 
 // Stands for the digits of a pair that is the same under no tolerance.
@@ -20,12 +20,13 @@ inline constexpr int more_than_all_digits = most_digits + 1;
 // How many pairs differ in 0, 1, ... 53 digits, and in more than all.
 using DigitCounts = std::array<std::uint64_t, more_than_all_digits + 1>;
 
-// The binary digits of the reals as which two elements are compared. A tolerance of all digits
-// takes any two numbers of one sign for the same, and NaNs too: it says nothing of the pair.
+// The binary digits of the type of real in which two elements are compared. A tolerance of all
+// digits takes any two numbers of one sign for the same, and NaNs too: it says nothing about the
+// pair.
 int all_digits(const ElementType& type1, const ElementType& type2);
 
-// Under which whole tolerances from 0 on a pair is the same: perhaps under 0, and from some
-// tolerance on. NaNs of the same bits are the same under 0, and yet not under 1.
+// Under which whole tolerances a pair is the same: perhaps under 0, and from some tolerance
+// upwards. NaNs of the same bits are the same under 0, and yet not under 1.
 class Sameness {
   public:
     Sameness() = default;
@@ -34,7 +35,7 @@ class Sameness {
 
     constexpr bool at_zero() const { return at_zero_; }
 
-    // The smallest whole tolerance from 1 on; `more_than_all_digits` where there is none.
+    // The smallest whole tolerance from 1 upwards; `more_than_all_digits` if there is none.
     constexpr int from_one() const { return from_one_; }
 
     constexpr int digits() const { return at_zero_ ? 0 : from_one_; }
@@ -48,7 +49,7 @@ class Sameness {
     std::uint8_t from_one_ = 0;
 };
 
-// Of a pair that is the same under every tolerance.
+// The sameness of a pair that is the same under every tolerance.
 inline constexpr Sameness same_under_all(true, 1);
 
 // Asks the module about one pair.
@@ -81,7 +82,7 @@ class DigitSearch {
     DigitGroups groups_;
 };
 
-// Of the pair `i` of those that were searched.
+// The sameness of the pair `i` of those searched.
 inline Sameness sameness_of(const DigitSearch::Result& found, const std::size_t i) {
     return found.sameness_of[found.class_of[i]];
 }

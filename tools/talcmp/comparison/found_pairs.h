@@ -22,7 +22,7 @@ struct FoundPair {
     std::uint64_t number = 0; // of the element in the first array, in row-major order
     Element element1 = {};
     Element element2 = {};
-    std::optional<Sameness> sameness = {}; // where it is already known
+    std::optional<Sameness> sameness = {}; // if it is already known
 };
 
 inline FoundPair found_pair(const Pairs& pairs, const std::size_t i, const std::uint64_t number) {
@@ -38,7 +38,7 @@ class FirstPairs {
   public:
     explicit FirstPairs(const std::size_t limit) : limit_(limit) {}
 
-    // Only pairs with numbers below it can still be among the first.
+    // Only pairs with numbers below this can still be among the first.
     std::uint64_t bound() const {
         return pairs_.size() < limit_ ? std::numeric_limits<std::uint64_t>::max()
                : limit_ == 0          ? 0

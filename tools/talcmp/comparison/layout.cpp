@@ -19,7 +19,7 @@ std::vector<std::uint64_t> whole_strides(const Shape& shape, const bool fortran_
     return strides;
 }
 
-// As Python does it: negative numbers count from the end, what is outside is cut off.
+// As in Python: negative numbers count from the end, and what is outside is cut off.
 std::uint64_t clipped(const std::int64_t number, const std::uint64_t dimension) {
     if (number >= 0) {
         return std::min(static_cast<std::uint64_t>(number), dimension);
@@ -51,7 +51,7 @@ void append(View& view, const AxisRange& range, const std::size_t axis,
     const std::uint64_t count = stop > start ? (stop - start - 1) / step + 1 : 0;
     view.offset += start * stride;
     view.shape.push_back(count);
-    // Nothing has a second element where the product might not be a position.
+    // With fewer than two elements the stride is not used, and the product might not be a position.
     view.strides.push_back(count > 1 ? step * stride : 0);
 }
 

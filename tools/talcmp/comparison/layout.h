@@ -17,20 +17,20 @@ struct View {
     std::vector<std::uint64_t> strides; // positions from index to index, for each axis of `shape`
 };
 
-// Throws std::invalid_argument, which says why the array has no such part.
+// Throws std::invalid_argument, whose text says why the array has no such part.
 View select(const ArraySource& source, const Selection& selection);
 
 // The index of the element that is stored at `position`.
 Shape index_of(const Shape& shape, bool fortran_order, std::uint64_t position);
 
-// Numbers the elements of an array from 0 on in row-major order, whatever order they are stored in.
+// Numbers the elements of an array from 0 in row-major order, whatever order they are stored in.
 class RowMajorNumbers {
   public:
-    // Of an array that is stored in C order.
+    // For an array that is stored in C order.
     RowMajorNumbers() = default;
     explicit RowMajorNumbers(const ArraySource& source);
 
-    // Of the element that is stored at `position`.
+    // The number of the element that is stored at `position`.
     std::uint64_t of(std::uint64_t position) const;
 
   private:

@@ -67,8 +67,8 @@ void PairCounter::add(const Pairs& pairs, const Numbering& number, const bool in
     add_worst(pairs, found, number, in_order, totals);
 }
 
-// Whether pairs of such a sameness are the same under the tolerance. A pair that is the same under
-// one tolerance from 1 on is the same under every larger one. A pair that is the same under none of
+// Whether pairs of this sameness are the same under the tolerance. A pair that is the same under a
+// tolerance of 1 or more is the same under every larger one. A pair that is the same under none of
 // these can be the same only under 0.
 PairCounter::Answer PairCounter::answer_on(const Sameness sameness) const {
     if (tolerance_ == 0) {

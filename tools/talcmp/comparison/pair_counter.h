@@ -16,7 +16,7 @@ class PairCounter {
     // Finds the number, in row-major order, of a pair.
     using Numbering = std::function<std::uint64_t(std::size_t)>;
 
-    // Adds what all pairs amount to. `in_order` says that their numbers ascend, and that those of
+    // Adds the totals of all pairs. `in_order` says that their numbers ascend, and that those of
     // pairs added later are higher still.
     void add(const Pairs& pairs, const Numbering& number, bool in_order, Findings& findings);
 

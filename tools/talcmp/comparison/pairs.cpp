@@ -37,7 +37,7 @@ bool Pairs::same(const talreal tolerance, const std::size_t begin, const std::si
 }
 
 std::size_t Pairs::find_different(const talreal tolerance, std::size_t begin) const {
-    // In growing steps, so that a pair is found in a time like that of reading up to it.
+    // In growing steps, so that finding a pair takes about as long as reading up to it.
     std::size_t step = 1;
     while (begin < count_ && same(tolerance, begin, std::min(step, count_ - begin))) {
         begin += std::min(step, count_ - begin);

@@ -1,4 +1,4 @@
-// Pairs of elements, as the module is asked about them.
+// Pairs of elements, in the form in which the module is asked about them.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace talcmp {
 
-// A stretch of elements of two arrays, side by side, below 2^31 of them.
+// A stretch of elements of two arrays, side by side; fewer than 2^31.
 class Pairs {
   public:
     Pairs(const ElementType& type1, const void* data1, const ElementType& type2, const void* data2,
@@ -28,7 +28,7 @@ class Pairs {
 
     bool same(const talreal tolerance, const std::size_t i) const { return same(tolerance, i, 1); }
 
-    // The first pair from `begin` on that is not the same; `count()` where all are.
+    // The first pair from `begin` that is not the same; `count()` if all are the same.
     std::size_t find_different(talreal tolerance, std::size_t begin) const;
 
   private:
@@ -41,10 +41,10 @@ class Pairs {
 
 // Makes this thread remember the factor of a tolerance, until it compares under another one.
 //
-// Between 52 and 53 (23 and 24 for singles) what the module answers of some pairs depends on
-// whether it remembers the factor. talcmp always asks with the factor remembered: two numbers are
-// then the same exactly when they differ by less than 2^(tolerance - bits) times the larger, and
-// the answer depends neither on the order of the pairs nor on the number of threads.
+// Between 52 and 53 (23 and 24 for singles) the module's answer for some pairs depends on whether
+// it remembers the factor. talcmp always asks with the factor remembered: two numbers are then the
+// same exactly when they differ by less than 2^(tolerance - bits) times the larger, and the answer
+// depends neither on the order of the pairs nor on the number of threads.
 void remember_factor_of(talreal tolerance);
 
 } // namespace talcmp

@@ -1,4 +1,4 @@
-// Who wants to know how far a comparison is.
+// An object that is told how far a comparison has come.
 
 #pragma once
 
@@ -13,10 +13,10 @@ class ProgressListener {
     ProgressListener& operator=(const ProgressListener&) = delete;
     virtual ~ProgressListener() = default;
 
-    // Before anything is read, with what will be read at most.
+    // Called before anything is read, with the most that will be read.
     virtual void begin(std::uint64_t total_bytes) = 0;
 
-    // By any thread, with what has been read since the last call.
+    // Called by any thread, with what has been read since the last call.
     virtual void advance(std::uint64_t bytes) = 0;
 };
 

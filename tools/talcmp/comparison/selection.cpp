@@ -24,7 +24,7 @@ std::string_view trimmed(std::string_view text) {
     return text.substr(0, text.find_last_not_of(' ') + 1);
 }
 
-// Nothing where there is nothing.
+// Nothing if there is only blank space.
 std::optional<std::int64_t> number_from(const std::string_view part) {
     const std::string_view text = trimmed(part);
     if (text.empty()) {

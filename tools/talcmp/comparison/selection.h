@@ -9,8 +9,8 @@
 
 namespace talcmp {
 
-// What is taken of one axis, as in Python: start:stop:step, of which each may be missing, or one
-// index. Negative numbers count from the end.
+// What is taken of one axis, as in Python: start:stop:step, each of them optional, or one index.
+// Negative numbers count from the end.
 struct AxisRange {
     std::optional<std::int64_t> start;
     std::optional<std::int64_t> stop;
@@ -21,7 +21,7 @@ struct AxisRange {
 // For the first axes of an array; the others are taken whole.
 using Selection = std::vector<AxisRange>;
 
-// Reads "0:10,:,3". Throws std::invalid_argument, which says what is wrong.
+// Reads "0:10,:,3". Throws std::invalid_argument, whose text says what is wrong.
 Selection read_selection(const std::string& text);
 
 } // namespace talcmp

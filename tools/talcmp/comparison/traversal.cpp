@@ -10,7 +10,7 @@
 namespace talcmp {
 namespace {
 
-// So that both sides are in the second level of the cache when they are compared.
+// So that both sides are in the second-level cache when they are compared.
 constexpr std::size_t bytes_of_stretch = std::size_t{256} * 1024;
 
 // So that 512 x 512 doubles are read in stretches of a page.
@@ -62,7 +62,7 @@ void Traversal::choose_boxes(const std::size_t element_size) {
     }
 }
 
-// Lets boxes reach farther along the axes by which one side is stored, the fastest first, until it
+// Extends boxes along the axes in one side's order of storage, the fastest first, until that side
 // is read in runs of `length` positions or boxes have `room` pairs.
 void Traversal::lengthen_runs(const Side side, const std::uint64_t length,
                               const std::uint64_t room) {

@@ -1,4 +1,4 @@
-// Two arrays of one shape, taken apart into boxes.
+// Two arrays of one shape, divided into boxes.
 
 #pragma once
 
@@ -21,12 +21,12 @@ struct Box {
 };
 
 // All pairs of elements of two views, in boxes that take a few MiB at most. Where both arrays are
-// stored in one order and without gaps, a box is a stretch of both; otherwise its extents are such
-// that both are read in runs of some length.
+// stored in one order and without gaps, a box is a stretch of both; otherwise its extents are
+// chosen so that both are read in runs of some length.
 class Traversal {
   public:
     // `first` and `second` have one shape, which has elements. Boxes and the pairs in them are in
-    // column-major order where both arrays are stored so, else in row-major order.
+    // column-major order if both arrays are stored that way, else in row-major order.
     Traversal(const View& first, const View& second, bool column_major, std::size_t element_size);
 
     // Whether each array is read once from its lower positions to its higher ones.
@@ -35,13 +35,13 @@ class Traversal {
     std::uint64_t pair_count() const { return pair_count_; }
     std::uint64_t box_count() const { return box_count_; }
 
-    // Of the number `index`, from 0 on.
+    // The box with the number `index`, from 0.
     Box box(std::uint64_t index) const;
 
     // The position in the first array of the pair `local` of the box.
     std::uint64_t first_position(const Box& box, std::size_t local) const;
 
-    // Reads the elements of one side, in the order of the box, to `elements`, which has room for
+    // Reads the elements of one side, in the order of the box, into `elements`, which has room for
     // `largest_box()` of them.
     void read(Side side, ArraySource& source, const Box& box, void* elements) const;
 

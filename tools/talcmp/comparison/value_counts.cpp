@@ -22,7 +22,7 @@ bool is_negative_zero(const T part) {
     return part == 0 && std::signbit(part);
 }
 
-// Whether all are finite and no zeros, and so nothing is to be counted.
+// Whether all are finite and nonzero, so that nothing is to be counted.
 template <typename T>
 bool all_ordinary(const T* const parts, const std::size_t count) {
     // Numbers side by side, so that compilers make vector instructions of them.

@@ -9,7 +9,7 @@
 
 namespace talcmp {
 
-// Numbers of elements; a complex one counts where either part is such.
+// Numbers of elements; a complex one counts if either part does.
 struct ValueCounts {
     std::uint64_t nans = 0;
     std::uint64_t infinities = 0;
@@ -22,7 +22,7 @@ inline void add(ValueCounts& sum, const ValueCounts& counts) {
     sum.negative_zeros += counts.negative_zeros;
 }
 
-// Of `count` elements of the type of the id `type`.
+// Counts in `count` elements of the type with the id `type`.
 ValueCounts count_values(type_t type, const void* elements, std::size_t count);
 
 } // namespace talcmp

@@ -1,5 +1,5 @@
-// What is said of a pair of elements: from which tolerance on they are the same, or why they are
-// not.
+// What is said about a pair of elements: the tolerance from which they are the same, or why they
+// are not.
 
 #pragma once
 
@@ -8,7 +8,7 @@
 namespace talcmp {
 
 enum class Reason {
-    digits,                // the same from some tolerance on that is below all digits
+    digits,                // the same from some tolerance below all digits
     nans_of_the_same_bits, // the same under the tolerance 0 only
     different_integers,
     one_nan,
@@ -18,7 +18,7 @@ enum class Reason {
     no_digit // in common
 };
 
-// Of complex numbers.
+// The parts of complex numbers.
 enum class Part { whole, real, imaginary };
 
 struct Verdict {
@@ -27,7 +27,7 @@ struct Verdict {
     Part part = Part::whole; // to which the reason applies
 };
 
-// Of the pair `i`, of which `sameness` is already known.
+// The verdict on the pair `i`, whose `sameness` is already known.
 Verdict verdict_on(const Pairs& pairs, std::size_t i, Sameness sameness);
 
 } // namespace talcmp

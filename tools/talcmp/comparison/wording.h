@@ -11,8 +11,8 @@ namespace talcmp {
 // As NumPy writes a shape: "()", "(3,)", "(2, 3)".
 std::string shape_text(const Shape& shape);
 
-// A value in digits that read back as the same value, a NaN as its bits. Where the types differ a
-// single is written as a double, or 0.1 in singles and 0.1 in doubles would look alike.
+// A value in digits that read back as the same value, a NaN as its bits. If the types differ, a
+// single is written as a double; otherwise 0.1 in singles and 0.1 in doubles would look alike.
 std::string first_value_text(const Comparison& comparison, const Place& place);
 std::string second_value_text(const Comparison& comparison, const Place& place);
 
@@ -22,8 +22,8 @@ std::string reason_text(const Verdict& verdict);
 // "[1, 2]: 0.5 and 0.75 (the same from --tol 52 on)"
 std::string place_text(const Comparison& comparison, const Place& place);
 
-// How two arrays that differ do: "shape (2, 3) and (3, 2)", "type int32 and float64", or the first
-// place that differs.
+// How two different arrays differ: "shape (2, 3) and (3, 2)", "type int32 and float64", or the
+// first place that differs.
 std::string difference_text(const Comparison& comparison);
 
 // Why a report has no smallest tolerance.

@@ -12,7 +12,7 @@ namespace {
 
 constexpr int indentation = 2;
 
-// Characters from 0x7F on are only in strings.
+// Characters from 0x7F upwards occur only in strings.
 std::string escaped(const char32_t code) {
     if (code < 0x7F) {
         return {static_cast<char>(code)};

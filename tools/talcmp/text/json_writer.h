@@ -10,10 +10,10 @@
 
 namespace talcmp {
 
-// Lays the document out as if it were written at once, an entry in each line, so that no more than
-// a piece of it is ever in memory. Keys are for entries of objects only. What is not UTF-8 is
-// replaced, as JSON is; characters that a terminal might take for commands are written as their
-// numbers.
+// Lays the document out as if it were written at once, an entry in each line, though no more than a
+// piece of it is ever in memory. Keys are for entries of objects only. What is not UTF-8 is
+// replaced, as JSON has to be UTF-8; characters that a terminal might take for commands are written
+// as their numbers.
 class JsonWriter {
   public:
     using Json = nlohmann::ordered_json;
@@ -26,7 +26,7 @@ class JsonWriter {
     void add(const std::string& key, const Json& value);
     void add(const Json& value) { add("", value); }
 
-    // Of the object or array that began last and has not ended; the document ends with the first.
+    // Ends the object or array that began last and has not ended; the document ends with the first.
     void end();
 
   private:

@@ -1,4 +1,4 @@
-// A bar on the terminal for comparisons that take long.
+// A progress bar on the terminal for long comparisons.
 
 #pragma once
 
@@ -16,9 +16,9 @@ namespace talcmp {
 // fewer than `columns` characters, and without a bar where there is no room for it.
 std::string progress_text(std::uint64_t done, std::uint64_t total, double seconds, int columns);
 
-// Shows itself half a second after a comparison began, where standard error is a terminal that
-// takes escape sequences, and is gone at the end, even one by a signal. Shows what part of the
-// bytes has been read, how fast, and how long the rest will take.
+// Appears half a second after a comparison begins, if standard error is a terminal that takes
+// escape sequences, and is gone at the end, even if a signal ends the program. Shows what part of
+// the bytes has been read, how fast, and how long the rest will take.
 class ProgressBar : public ProgressListener {
   public:
     explicit ProgressBar(bool wanted);

@@ -9,7 +9,7 @@
 
 namespace talcmp {
 
-// Lines of names and figures, and a bar for each number of digits that pairs differ in.
+// Lines of names and figures, and a bar for each number of digits in which pairs differ.
 std::string report_text(const Comparison& comparison, const Question& question,
                         const Terminal& terminal);
 

@@ -19,13 +19,14 @@ std::atomic<bool> is_shown = false;
 std::atomic<bool> is_written = false; // at the moment
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler uses them");
 
-// In one piece, so that nothing else comes between. If the terminal takes nothing, nobody sees it.
+// In one piece, so that no other output comes between. Failure is ignored: nobody would see a
+// message.
 void write_to_terminal(const std::string_view text) {
     [[maybe_unused]] const ssize_t ignored = ::write(STDERR_FILENO, text.data(), text.size());
 }
 
-// Waits until no thread is writing, and keeps all from writing. Returns false if that takes too
-// long: the terminal may have been stopped.
+// Waits until no thread is writing, and keeps all threads from writing. Returns false if that takes
+// too long: the terminal may have been stopped.
 bool stop_writing() {
     constexpr int most_tries = 100;
     constexpr struct timespec millisecond = {0, 1000000};
@@ -48,7 +49,7 @@ void end_by_signal(const int signal) {
 }
 
 void write_status(const std::string& text, const bool shown) {
-    // Their handler would wait for what it has interrupted.
+    // The handler of these signals would wait for the write that it has interrupted.
     const BlockedSignals blocked;
     if (!is_written.exchange(true)) {
         is_shown = shown;

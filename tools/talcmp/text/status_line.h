@@ -1,4 +1,4 @@
-// A line at the end of what is on the terminal, which is gone when something else is written there.
+// A last line on the terminal that disappears when something else is written there.
 
 #pragma once
 
@@ -6,7 +6,7 @@
 
 namespace talcmp {
 
-// Shows `text`, of less than a line, on standard error instead of what was shown before.
+// Shows `text`, shorter than a line, on standard error in place of what was shown before.
 void show_status(const std::string& text);
 
 // Takes the line off the terminal, if it is there.

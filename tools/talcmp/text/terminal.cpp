@@ -8,7 +8,7 @@
 namespace talcmp {
 namespace {
 
-// Empty where the variable is not set.
+// Empty if the variable is not set.
 std::string environment(const char* const variable) {
     // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing changes the environment.
     const char* const value = std::getenv(variable);

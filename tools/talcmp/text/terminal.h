@@ -1,4 +1,4 @@
-// What a terminal needs that a file or a pipe does not.
+// What output to a terminal needs that output to a file or a pipe does not.
 
 #pragma once
 
@@ -27,11 +27,11 @@ class Terminal {
     int columns_;
 };
 
-// Whether a terminal takes escape sequences: the environment variable TERM names it, and not as
+// Whether a terminal takes escape sequences: the environment variable TERM names one other than
 // "dumb".
 bool takes_escapes();
 
-// Characters in a line of the terminal `descriptor`; 80 where it is none.
+// Characters in a line of the terminal `descriptor`; 80 if it is not a terminal.
 int columns_of(int descriptor);
 
 } // namespace talcmp

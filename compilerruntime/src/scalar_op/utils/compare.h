@@ -11,15 +11,15 @@
 #include <limits>
 #include <type_traits>
 
-// The comparison is fast when it is inlined into the element loops. GCC does not always do so by
-// itself. Clang does, and would reject the attribute in code with NEON.
+// The comparison is fast when it is inlined into the element loops. GCC does not always inline it
+// by itself. Clang does, and would reject the attribute in code with NEON.
 #if defined(__OPTIMIZE__) && !defined(__OPTIMIZE_SIZE__) && !defined(__clang__)
 #    define NESK_FORCE_INLINE [[gnu::always_inline]] inline
 #else
 #    define NESK_FORCE_INLINE inline
 #endif
 
-// In a build for size, the comparison of reals is one function.
+// In a build for size, the comparison of reals is not inlined.
 #if defined(__OPTIMIZE_SIZE__)
 #    define NESK_INLINE_UNLESS_SMALL [[gnu::noinline]] inline
 #else
@@ -140,8 +140,8 @@ NESK_INLINE_UNLESS_SMALL int compare_impl(const T& tol, const T& x, const T y) n
     T tolfactor = 0;
     if (!recall_factor(tol, tolfactor)) {
         // A pair that differs in its leading binary digit needs no factor. For tolerances up to
-        // `bits` - 1 the factor is at most 1/2, and this changes no answer. Above that, it is part
-        // of the rule: such a pair is the same only if the factor is remembered already.
+        // `bits` - 1 the factor is at most 1/2, and this changes no answer. Above that, this exit
+        // is part of the rule: such a pair is the same only if the factor is remembered already.
         const bool far_apart = max >= 1 ? diff >= max * T(0.5) : max <= diff + diff;
         if (far_apart) {
             return s;
@@ -170,10 +170,10 @@ inline int compare(const Ttol& /*tol*/, const T1& arg1, const T2& arg2) noexcept
 }
 
 // Two reals, or a real and an integer: both values, and the tolerance in binary digits, are
-// converted to the common type of the two values in the current rounding direction, and compared
-// there. (On 32-bit ARM, the function that converts 64-bit integers always rounds to nearest.) An
-// integer beside a single is compared as a single, whatever its width. Returns 0 when they are the
-// same, else -1 or +1.
+// converted to the common type of the two values in the current rounding direction, and compared in
+// that type. (On 32-bit ARM, the function that converts 64-bit integers always rounds to nearest.)
+// An integer beside a single is compared as a single, whatever its width. Returns 0 when they are
+// the same, else -1 or +1.
 template <typename Ttol, typename T1, typename T2,
           std::enable_if_t<detail::either_floating_v<T1, T2>, int> = 0>
 NESK_FORCE_INLINE int compare(const Ttol& tol_, const T1& arg1_, const T2& arg2_) noexcept {

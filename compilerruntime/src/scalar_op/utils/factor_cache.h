@@ -71,7 +71,7 @@ inline factor_cache<T>& factor_cache_of_thread() noexcept {
     return cache;
 }
 
-// Returns whether the thread remembers the factor of `tol`; only then `factor` is that factor.
+// Returns whether the thread remembers the factor of `tol`; only then is `factor` that factor.
 template <typename T>
 inline bool recall_factor(const T tol, T& factor) noexcept {
     const factor_cache<T>& cache = factor_cache_of_thread<T>();

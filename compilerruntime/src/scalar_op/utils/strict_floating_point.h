@@ -1,9 +1,9 @@
 // Stops builds without IEEE arithmetic, and keeps NEON out of the comparison of singles.
 //
-// The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width.
-// Compilers that may assume that there are no NaNs, reassociate, use reciprocals or keep excess
-// precision can silently change answers. GCC has a macro for each of these from version 12 on;
-// earlier versions and Clang only for -ffast-math and -ffinite-math-only.
+// The comparison of reals is defined step by step in IEEE arithmetic of the operands' own width. A
+// compiler that is allowed to assume that there are no NaNs, to reassociate, to use reciprocals or
+// to keep excess precision can silently change answers. GCC has had a macro for each of these since
+// version 12; earlier versions and Clang have them only for -ffast-math and -ffinite-math-only.
 
 #ifndef NESK_STRICT_FLOATING_POINT_H
 #define NESK_STRICT_FLOATING_POINT_H
@@ -21,7 +21,7 @@
         "array comparison needs arithmetic without excess precision (FLT_EVAL_METHOD 0): on x86 build with -msse2 -mfpmath=sse"
 #endif
 
-// Functions between NESK_STRICT_SINGLES_BEGIN and NESK_STRICT_SINGLES_END compare singles by IEEE
+// Functions between NESK_STRICT_SINGLES_BEGIN and NESK_STRICT_SINGLES_END compare singles in IEEE
 // arithmetic on 32-bit ARM too.
 //
 // There NEON takes subnormal numbers for zero. GCC leaves floating point to VFP for that reason.
