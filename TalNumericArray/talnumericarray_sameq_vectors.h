@@ -250,9 +250,9 @@ struct loops {
     // The certain prefix of two arrays of `len`, of which `end` elements lie before the first end
     // of a page: enough for a full vector.
     //
-    // A block never extends past the page of its first unjudged element, so no page that lies
-    // wholly after the first differing pair is read. The last vector before the end of a page may
-    // begin with elements that have been judged already.
+    // A block never extends past the page of its first unjudged element, so nothing on a page
+    // beyond the first differing pair is read. The last vector before the end of a page may begin
+    // with elements that have been judged already.
     template <typename Bound, typename T1, typename T2>
     [[gnu::noinline]] static std::size_t certain_prefix(const Bound bound, const T1* const data1,
                                                         const T2* const data2, std::size_t end,
