@@ -49,6 +49,7 @@ const int hooks_installed = __sanitizer_install_malloc_and_free_hooks(
 #else
 
 // The C library's own names for the functions that are replaced.
+// NOLINTBEGIN(clang-diagnostic-reserved-identifier,readability-inconsistent-declaration-parameter-name)
 extern "C" void* __libc_malloc(std::size_t size);
 extern "C" void* __libc_calloc(std::size_t count, std::size_t size);
 extern "C" void* __libc_realloc(void* block, std::size_t size);
