@@ -43,7 +43,7 @@ constexpr std::size_t largest_size(type_list<Types...> /*types*/) {
 }
 
 // The size in bytes of the largest element type.
-inline constexpr std::size_t largest_element = largest_size(element_type_list{});
+inline constexpr std::size_t largest_element_size = largest_size(element_type_list{});
 
 // All element types, in the order of their ids.
 const std::array<ElementType, element_type_list::size>& element_types();

@@ -39,7 +39,8 @@ std::uint64_t reversed64(const std::uint64_t bits) {
 
 void reverse_each(unsigned char* const parts, const std::size_t bytes,
                   const std::size_t part_size) {
-    static_assert(largest_element == 2 * sizeof(std::uint64_t), "there is a case for each size");
+    static_assert(largest_element_size == 2 * sizeof(std::uint64_t),
+                  "there is a case for each size");
     switch (part_size) {
     case sizeof(std::uint16_t):
         return reverse_each_as<std::uint16_t, reversed16>(parts, bytes);

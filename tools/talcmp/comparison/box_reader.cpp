@@ -17,7 +17,7 @@ void scatter(unsigned char* to, const std::size_t to_stride, const unsigned char
 
 void scatter(const std::size_t size, unsigned char* to, const std::size_t to_stride,
              const unsigned char* from, const std::size_t from_stride, const std::size_t count) {
-    static_assert(largest_element == 16, "there is a case for each size");
+    static_assert(largest_element_size == 16, "there is a case for each size");
     switch (size) {
     case 1:
         return scatter<1>(to, to_stride, from, from_stride, count);

@@ -15,7 +15,7 @@
 namespace talcmp {
 
 // Room for an element of any type.
-using Element = std::array<unsigned char, largest_element>;
+using Element = std::array<unsigned char, largest_element_size>;
 
 // The values are kept, as an array may be readable only once.
 struct FoundPair {
