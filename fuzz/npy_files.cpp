@@ -1,8 +1,9 @@
 // An input is an .npy file as it is, or, where a second one seems to begin in it, two files: a
 // refusal has a message of one line, and what is read is compared as the oracle would compare it.
-// An input that begins like a zip archive is read as one.
+// An input that begins like a file of another format is read as one.
 
 #include "checked_call.h"
+#include "requirements.h"
 
 #include "array_file.h"
 #include "comparison.h"
@@ -28,24 +29,11 @@
 
 namespace {
 
-using fuzz::fail;
+using fuzz::require;
+using fuzz::require_line;
 using talcmp::ArraySource;
 using talcmp::Difference;
 using talcmp::NpyHeader;
-
-void require(const bool holds, const char* what_has_to_hold) {
-    if (!holds) {
-        fail(std::string("it does not hold that ") + what_has_to_hold);
-    }
-}
-
-void require_line(const std::string& text) {
-    const bool line =
-        std::all_of(text.begin(), text.end(), [](const char c) { return c >= ' ' && c <= '~'; });
-    if (!line || text.empty()) {
-        fail("not one line of printable characters: " + text);
-    }
-}
 
 // ---- The header
 
@@ -89,22 +77,28 @@ void check_against_text(const NpyHeader& header, const std::string_view dictiona
         dimensions.push_back(std::to_string(dimension));
     }
     require(dimensions == written_dimensions(dictionary), "the shape is the one that is written");
-    const talcmp::ElementType& type = *header.type;
-    const std::size_t code = dictionary.find(type.kind + std::to_string(type.size));
+    const talcmp::StoredType& type = header.type;
+    const std::string kind(1, type.name == "bool" ? 'b' : type.type->kind);
+    const std::size_t long_code = dictionary.find(kind + std::to_string(type.size));
+    const std::size_t code =
+        long_code != std::string_view::npos || kind != "b" ? long_code : dictionary.find('?');
     require(code != std::string_view::npos && code > 0, "the type is the one that is written");
-    require(header.bytes_swapped == (dictionary[code - 1] == '>' && type.size > 1),
+    require(type.bytes_swapped == (dictionary[code - 1] == '>' && type.size > 1),
             "the byte order is the one that is written");
     require(header.fortran_order == (dictionary.find("True") != std::string_view::npos),
             "the order is the one that is written");
 }
 
 void check_header(const NpyHeader& header, const std::size_t file_size) {
-    require(header.type != nullptr, "the element type is known");
+    require(header.type.type != nullptr, "the element type is known");
     require(header.shape.size() <= 64, "there are at most 64 dimensions");
     require(is_product(header.element_count, header.shape), "the count is that of the shape");
     require(header.data_offset <= file_size, "the data begins in the file");
     const std::uint64_t bytes = file_size - header.data_offset;
-    const std::uint64_t size = oracle::element_size(header.type->id);
+    const std::uint64_t size = header.type.name == "bool" ? 1
+                               : header.type.name == "float16"
+                                   ? 2
+                                   : oracle::element_size(header.type.type->id);
     require(bytes % size == 0 && bytes / size == header.element_count,
             "the elements fill the file");
 }
@@ -188,17 +182,46 @@ std::uint64_t position_of(const OpenedArray& array, const std::uint64_t order) {
     return position;
 }
 
+// What elements in the byte order of this machine are compared as: booleans as 0 and 1, halves as
+// singles.
+std::string as_compared(const std::string& type, std::string elements) {
+    if (type == "bool") {
+        std::replace_if(
+            elements.begin(), elements.end(), [](const char byte) { return byte != 0; }, '\1');
+    }
+    if (type != "float16") {
+        return elements;
+    }
+    std::string singles;
+    for (std::size_t i = 0; i < elements.size(); i += 2) {
+        std::uint16_t half = 0;
+        std::memcpy(&half, &elements[i], sizeof half);
+        const auto exponent = static_cast<int>(half >> 10U & 0x1FU);
+        const auto significand = static_cast<float>(half & 0x3FFU);
+        float single = exponent == 0 ? std::ldexp(significand, -24)
+                                     : std::ldexp(significand + 1024, exponent - 25);
+        std::uint32_t bits = 0x7F800000U | (half & 0x3FFU) << 13U; // an infinity or a NaN
+        if (exponent != 0x1F) {
+            std::memcpy(&bits, &single, sizeof bits);
+        }
+        bits |= (half & 0x8000U) << 16U;
+        singles.append(reinterpret_cast<const char*>(&bits), sizeof bits);
+    }
+    return singles;
+}
+
 // The elements are those in the file, each part in the byte order of this machine.
 void check_elements(const OpenedArray& array, const NpyHeader& header,
                     const std::string_view bytes) {
-    const talcmp::ElementType& type = *header.type;
+    const std::size_t part_size = std::min(header.type.type->part_size, header.type.size);
     std::string expected(bytes.substr(static_cast<std::size_t>(header.data_offset)));
-    if (header.bytes_swapped) {
-        for (std::size_t i = 0; i < expected.size(); i += type.part_size) {
+    if (header.type.bytes_swapped) {
+        for (std::size_t i = 0; i < expected.size(); i += part_size) {
             const auto part = expected.begin() + static_cast<std::ptrdiff_t>(i);
-            std::reverse(part, part + static_cast<std::ptrdiff_t>(type.part_size));
+            std::reverse(part, part + static_cast<std::ptrdiff_t>(part_size));
         }
     }
+    expected = as_compared(header.type.name, std::move(expected));
     require(std::memcmp(array.elements.data(), expected.data(), expected.size()) == 0,
             "the elements are those in the file");
 }
@@ -231,10 +254,23 @@ void read_archive(const MemoryFile& file) {
     }
 }
 
+// Archives, netCDF files, and those that are compressed as a whole.
+bool is_of_other_format(const std::string_view bytes) {
+    constexpr std::string_view beginnings[] = {"PK",  "CDF",         "\x1F\x8B",
+                                               "BZh", "\xFD\x37zXZ", "\x28\xB5\x2F\xFD"};
+    return std::any_of(std::begin(beginnings), std::end(beginnings),
+                       [bytes](const std::string_view beginning) {
+                           return bytes.substr(0, beginning.size()) == beginning;
+                       });
+}
+
 // Nothing if the file is refused.
 std::optional<OpenedArray> opened(const MemoryFile& file, const std::string_view bytes) {
     file.write(bytes);
-    if (bytes.substr(0, 2) == "PK") {
+    if (bytes.find("\x89HDF") != std::string_view::npos) {
+        return std::nullopt; // what the HDF5 library makes of it is not ours
+    }
+    if (is_of_other_format(bytes)) {
         read_archive(file);
         return std::nullopt;
     }
@@ -242,7 +278,7 @@ std::optional<OpenedArray> opened(const MemoryFile& file, const std::string_view
     try {
         OpenedArray array = read_all(file);
         require(read.header.has_value(), "the file is refused as its bytes are");
-        require(&array.source->type() == read.header->type
+        require(&array.source->type() == read.header->type.type
                     && array.source->shape() == read.header->shape
                     && array.source->fortran_order() == read.header->fortran_order,
                 "the file has the header of its bytes");
@@ -390,7 +426,7 @@ void check_question(const Operand& first, const Operand& second, const talcmp::Q
     const Expected expected = expected_answer(first.array, second.array, question);
     NoProgress progress;
     const auto comparison =
-        talcmp::compare(named(first.file), named(second.file), question, progress);
+        talcmp::compare(named(first.file), named(second.file), {}, question, progress);
     require(comparison.difference == expected.difference, "the arrays differ as is expected");
     if (comparison.difference != Difference::none) {
         check_text(talcmp::difference_text(comparison), expected, first.array, second.array);
