@@ -1,0 +1,23 @@
+// What is in the groups of an HDF5 file.
+
+#pragma once
+
+#include "hdf5_handles.h"
+
+#include <map>
+#include <string>
+
+namespace talcmp::hdf5 {
+
+struct Member {
+    enum class Kind { array, element_type, lost_link, broken };
+    Kind kind = Kind::array;
+    std::string reason; // why the link is lost or the member broken, in the words of the library
+};
+
+// All members by their names: the paths from the root, without the first slash. See Hdf5File for
+// which names there are. Dimensions of netCDF without values are left out. Throws Trouble, which
+// calls the file `path`.
+std::map<std::string, Member> members_of(hid_t file, const std::string& path);
+
+} // namespace talcmp::hdf5
