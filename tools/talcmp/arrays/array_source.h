@@ -5,10 +5,12 @@
 #include "element_type.h"
 
 #include <algorithm>
+#include <cassert>
 #include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <numeric>
+#include <string>
 #include <vector>
 
 namespace talcmp {
@@ -20,6 +22,16 @@ inline bool has_elements(const Shape& shape) {
     return std::find(shape.begin(), shape.end(), 0U) == shape.end();
 }
 
+// A part of an array in C order: on each axis `extent` indices from `begin`, `step` apart.
+struct Slab {
+    struct Axis {
+        std::uint64_t begin = 0;
+        std::uint64_t extent = 1;
+        std::uint64_t step = 1;
+    };
+    std::vector<Axis> axes; // one for each dimension, the outermost first
+};
+
 // An array that is read piece by piece. Its elements have positions, 0 to the product of its shape
 // - 1, in the order in which they are stored.
 class ArraySource {
@@ -30,6 +42,9 @@ class ArraySource {
     virtual ~ArraySource() = default;
 
     virtual const ElementType& type() const = 0;
+
+    // The name of the type as which the elements are stored; they may be compared as another one.
+    virtual std::string type_name() const { return type().name; }
 
     virtual const Shape& shape() const = 0;
 
@@ -44,6 +59,17 @@ class ArraySource {
     // Reads the elements at the positions `first` to `first + count - 1`, which the array has, to
     // `elements`. Throws Trouble.
     virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
+
+    // The extents of the blocks, one after another from index 0, that have to be read whole, such
+    // as compressed chunks; empty if elements can be read by their positions. An array in blocks is
+    // in C order, may be read in any order, and is read by `read_slab` alone.
+    virtual const Shape& block() const {
+        static const Shape none;
+        return none;
+    }
+
+    // Reads the elements of a slab, in C order, to `elements`. Throws Trouble.
+    virtual void read_slab(const Slab& /*slab*/, void* /*elements*/) { assert(!"not in blocks"); }
 
     // Reads the rest if only the end shows whether what was read is right. No answer can be trusted
     // until this has returned. Throws Trouble.

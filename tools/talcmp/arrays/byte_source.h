@@ -25,6 +25,10 @@ class ByteSource {
     // Reads up to `count` bytes from `offset` into `bytes` and returns how many, fewer only at the
     // end. Throws Trouble.
     virtual std::size_t read(std::uint64_t offset, void* bytes, std::size_t count) = 0;
+
+    // Where bytes may be read in any order, reads those that were not if only all of them show
+    // whether they were right. Throws Trouble.
+    virtual void check_to_end() {}
 };
 
 } // namespace talcmp

@@ -16,11 +16,18 @@ class Pipe : public ByteStream {
 
     std::optional<std::uint64_t> size() const override { return std::nullopt; }
 
+    // The first bytes, enough to recognise a format by; they are still to be read. Must be called
+    // before anything is read. Throws Trouble.
+    const std::string& beginning();
+
   private:
     std::size_t read_next(void* bytes, std::size_t count) override;
+    std::size_t read_from_system(void* bytes, std::size_t count);
 
     std::string name_;
     Descriptor pipe_;
+    std::optional<std::string> beginning_;
+    std::size_t taken_ = 0; // bytes of the beginning
 };
 
 } // namespace talcmp

@@ -26,8 +26,8 @@ class RegularFile : public ByteSource {
     // The first bytes: enough to recognise a format by, and usually the header.
     std::string_view beginning() const { return beginning_; }
 
-    // The file itself, for a library that reads it. This object reads no more from it.
-    Descriptor& descriptor() { return file_; }
+    // Stays open as long as this object lives.
+    int descriptor() const { return file_.number(); }
 
   private:
     std::string path_;

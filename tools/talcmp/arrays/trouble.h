@@ -17,4 +17,10 @@ class Trouble : public std::runtime_error {
         : std::runtime_error(shown(file) + ": " + shown(what_is_wrong)) {}
 };
 
+// An array that can be read but holds no numbers that talcmp compares, such as text.
+class NotNumbers : public Trouble {
+  public:
+    using Trouble::Trouble;
+};
+
 } // namespace talcmp

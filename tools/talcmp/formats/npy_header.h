@@ -8,6 +8,7 @@
 
 #include "array_source.h"
 #include "byte_source.h"
+#include "stored_type.h"
 
 #include <cstdint>
 #include <stdexcept>
@@ -15,17 +16,21 @@
 namespace talcmp {
 
 struct NpyHeader {
-    const ElementType* type = nullptr;
+    StoredType type;
     Shape shape;                     // outermost dimension first
     std::uint64_t element_count = 0; // the product of `shape`
     std::uint64_t data_offset = 0;   // bytes from the beginning of the file to the first element
     bool fortran_order = false;      // whether the first index varies fastest
-    bool bytes_swapped = false;      // whether the elements are not in our byte order
 };
 
 // What is wrong with a header or not supported in it: a sentence without its subject, the file.
 struct NpyError : std::runtime_error {
     using std::runtime_error::runtime_error;
+};
+
+// Elements of a type that is not supported.
+struct NpyTypeError : NpyError {
+    using NpyError::NpyError;
 };
 
 // Reads the header of an .npy file and checks, where the size of the file is known, that the

@@ -101,7 +101,7 @@ class DictionaryReader {
     std::string_view element_type_code() {
         skip_space();
         if (peek() == '[' || peek() == '(' || peek() == '{') {
-            throw NpyError("has structured elements; save each field as an array of its own");
+            throw NpyTypeError("has structured elements; save each field as an array of its own");
         }
         return string();
     }
@@ -201,16 +201,10 @@ class DictionaryReader {
 
 // NumPy's names for the element types that talcmp does not read.
 std::string kind_name(const std::string& code) {
-    if (code == "f2") {
-        return " (half precision)";
-    }
     if (code == "f12" || code == "f16" || code == "c24" || code == "c32") {
         return " (extended precision)";
     }
     switch (code.empty() ? '\0' : code[0]) {
-    case 'b':
-    case '?':
-        return " (boolean)";
     case 'O':
         return " (Python objects)";
     case 'S':
@@ -229,31 +223,36 @@ std::string kind_name(const std::string& code) {
 
 constexpr char native_byte_order = __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '<' : '>';
 
-struct Elements {
-    const ElementType& type;
-    bool bytes_swapped;
-};
+// The letter of the kind and the number of bytes; '?' is NumPy's short name of booleans.
+std::optional<StoredType> type_of(const std::string& code, const bool bytes_swapped) {
+    if (code == "?") {
+        return stored_type('b', 1, bytes_swapped);
+    }
+    for (const std::size_t size : {1U, 2U, 4U, 8U, 16U}) {
+        if (!code.empty() && code.substr(1) == std::to_string(size)) {
+            return stored_type(code[0], size, bytes_swapped);
+        }
+    }
+    return std::nullopt;
+}
 
-Elements elements_of(const std::string_view descr) {
+StoredType elements_of(const std::string_view descr) {
     const std::string what = "has elements of type " + printable(descr);
     if (descr.empty() || std::string_view("<>|").find(descr[0]) == std::string_view::npos) {
         throw NpyError(what + " without a byte order; save the array with NumPy");
     }
     const char byte_order = descr[0];
     const std::string code(descr.substr(1));
-    const auto& types = element_types();
-    const auto type = std::find_if(types.begin(), types.end(), [&code](const ElementType& each) {
-        return code == each.kind + std::to_string(each.size);
-    });
-    if (type == types.end()) {
-        throw NpyError(what + kind_name(code)
-                       + ", which is not supported; save them as integers of 8 to 64 bits, "
-                         "float32, float64, complex64 or complex128");
+    const auto type = type_of(code, byte_order != native_byte_order);
+    if (!type) {
+        throw NpyTypeError(what + kind_name(code)
+                           + ", which is not supported; save them as booleans, integers of 8 to 64 "
+                             "bits, float16 to float64, complex64 or complex128");
     }
     if (type->size != 1 && byte_order == '|') {
         throw NpyError(what + " without a byte order; save the array with NumPy");
     }
-    return {*type, type->size != 1 && byte_order != native_byte_order};
+    return *type;
 }
 
 // The product of `shape`; nothing where it is 2^64 or more. One zero makes it zero.
@@ -370,7 +369,7 @@ NpyHeader read_npy_header(ByteSource& file) {
     const std::string text = bytes.take(length, "dictionary");
     const Dictionary dictionary = DictionaryReader(text).read();
 
-    const auto [type, bytes_swapped] = elements_of(dictionary.descr);
+    const StoredType type = elements_of(dictionary.descr);
     const std::optional<std::uint64_t> count = product(dictionary.shape);
     const std::optional<std::uint64_t> file_size = file.size();
     if (file_size.has_value()) {
@@ -378,8 +377,7 @@ NpyHeader read_npy_header(ByteSource& file) {
     } else {
         check_countable(count);
     }
-    return {&type,        dictionary.shape, *count, bytes.position(), dictionary.fortran_order,
-            bytes_swapped};
+    return {type, dictionary.shape, *count, bytes.position(), dictionary.fortran_order};
 }
 
 } // namespace talcmp

@@ -16,7 +16,8 @@ class NpyArray : public ArraySource {
     // `name` is what messages call the file. Throws Trouble when it is broken or not supported.
     NpyArray(std::string name, std::unique_ptr<ByteSource> file);
 
-    const ElementType& type() const override { return *header_.type; }
+    const ElementType& type() const override { return *header_.type.type; }
+    std::string type_name() const override { return header_.type.name; }
     const Shape& shape() const override { return header_.shape; }
     bool fortran_order() const override { return header_.fortran_order; }
     bool random_access() const override { return file_->random_access(); }

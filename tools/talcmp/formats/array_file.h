@@ -6,6 +6,7 @@
 
 #include <memory>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace talcmp {
@@ -22,19 +23,27 @@ class ArrayFile {
     // Whether the arrays have names.
     virtual bool is_archive() const = 0;
 
-    // The names of the arrays, each once; one empty name where they have none.
+    // What messages write before the names of arrays: "/" where arrays are in groups.
+    virtual const char* root() const { return ""; }
+
+    // The names of the arrays, without the root, each once; one empty name where they have none.
     virtual std::vector<std::string> members() const = 0;
 
-    // Opens an array. Each may be opened only once. Throws Trouble.
+    // Opens an array. Each may be opened only once. Throws Trouble; NotNumbers if it is not an
+    // array of numbers.
     virtual std::unique_ptr<ArraySource> open(const std::string& member) = 0;
 };
 
 // The path that stands for standard input.
 inline constexpr const char* standard_input_path = "-";
 
-// Opens a file, once, and recognises its format by its first bytes. A pipe and standard input are
-// read as .npy files; opening a pipe waits until somebody writes to it. Throws Trouble when the
-// file cannot be opened or is of no known format.
+// Opens a file, once, and recognises its format by its first bytes. Of a pipe, such as standard
+// input, an .npy file is read as it comes, and any other is first copied to a temporary file;
+// opening a pipe waits until somebody writes to it. Throws Trouble when the file cannot be opened
+// or is of no known format.
 std::unique_ptr<ArrayFile> open_array_file(const std::string& path);
+
+// The names of the formats that can be read.
+std::vector<std::string_view> format_names();
 
 } // namespace talcmp
