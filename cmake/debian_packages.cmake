@@ -45,7 +45,8 @@ if(CMAKE_CROSSCOMPILING)
   # dpkg-shlibdeps would name the packages of the cross compiler, which the architecture itself
   # lacks. These are Debian 12's, which the cross compiler links to.
   set(CPACK_DEBIAN_RUNTIME_PACKAGE_DEPENDS
-      "libc6 (>= 2.36), libgcc-s1 (>= 12), libstdc++6 (>= 12), libzip4 (>= 1.7)")
+      "libc6 (>= 2.36), libdeflate0 (>= 1.14), libgcc-s1 (>= 12), libhdf5-103-1 (>= 1.10.8),\
+ libpng16-16 (>= 1.6), libstdc++6 (>= 12), libzip4 (>= 1.7), zlib1g (>= 1:1.2)")
 else()
   set(CPACK_DEBIAN_RUNTIME_PACKAGE_SHLIBDEPS ON)
 endif()

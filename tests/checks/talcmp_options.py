@@ -32,7 +32,8 @@ def main():
     fish_options |= {"-" + name for name in re.findall(r" -s (\w)", fish)}
     found = {
         "manual page": options_in(manual),
-        "zsh": options_in("\n".join(line for line in zsh.splitlines() if "_files" not in line and "_arguments" not in line)),
+        "zsh": options_in("\n".join(line.replace("_files -g", "") for line in zsh.splitlines()
+                                    if "_arguments" not in line)),
         "fish": fish_options,
         "bash": options_in(re.search(r'compgen -W "(.*?)"', bash, re.DOTALL).group(1)) | (
             expected - long_ones),

@@ -13,7 +13,13 @@ from steps import ROOT, SURVIVES, TIME_OUT, WORK, command, precompile, run_test
 
 TOOL = "tools/talcmp"
 FOLDERS = [*module_steps.FOLDERS, TOOL]
-INCLUDES = [*FOLDERS, *(f"{TOOL}/{name}" for name in ("arrays", "comparison", "text"))]
+INCLUDES = [*FOLDERS, *(f"{TOOL}/{name}" for name in ("arrays", "comparison", "formats", "picture",
+                                                      "text"))]
+LIBRARIES = ["-lzip", "-ldeflate", "-lz", "-lpng", "-lhdf5_serial"]
+SETTINGS = ["-isystem", "/usr/include/hdf5/serial", "-DTALCMP_HAS_HDF5", "-DTALCMP_HAS_PNG",
+            "-DH5_USE_18_API"]
+# Parts of builds that lack a library.
+OTHER_BUILDS = {f"{TOOL}/picture/png_picture_missing.cpp", "tests/talcmp/hdf5_absent_test.cpp"}
 MAIN = f"{TOOL}/main.cpp"
 TESTS = "tests/talcmp"
 RUN_TALCMP = f"{TESTS}/support/run_talcmp.cpp"
@@ -67,12 +73,12 @@ class Tree(steps.Tree):
     def _options(self, source, flags):
         if source.startswith("tests/"):
             return ["-O1" if source in ORACLE else "-O0", "-include", str(WORK / "gtest.h"),
-                    f"-I{ROOT}/tests", f"-I{ROOT}/{TESTS}",
+                    f"-I{ROOT}/tests", f"-I{ROOT}/{TESTS}", *SETTINGS,
                     f'-DTALCMP_COMMAND="{self.command}"',
                     f"-DDEFAULT_RANDOM_CALLS={module_steps.RANDOM_CALLS}"]
         if source in MODULE:
             return ["-O1", f"-D{module_steps.ONE_SET}"]
-        return ["-O0", "-include", str(WORK / "talcmp.h"), '-DTALCMP_VERSION="0.0.0"']
+        return ["-O0", "-include", str(WORK / "talcmp.h"), '-DTALCMP_VERSION="0.0.0"', *SETTINGS]
 
 
 # ---- The tests
@@ -90,7 +96,8 @@ class Program:
 def test_programs():
     """The tests of parts as one program; each source that runs talcmp, and each in Python, as its
     own."""
-    paths = [str(path.relative_to(ROOT)) for path in sorted((ROOT / TESTS).glob("*_test.*"))]
+    found = (str(path.relative_to(ROOT)) for path in sorted((ROOT / TESTS).glob("*_test.*")))
+    paths = [path for path in found if path not in OTHER_BUILDS]
     sources = [path for path in paths if path.endswith(".cpp") and path != COUNTED]
     whole = [path for path in sources if "run_talcmp.h" in (ROOT / path).read_text()]
     parts = [path for path in sources if path not in whole]
@@ -112,7 +119,8 @@ class Bench(steps.Bench):
         precompile("talcmp.h", STANDARD_HEADERS, ["-O0"])
         super().__init__(memory, Tree(WORK / "talcmp"))
         self.sources_of_core = [path for path in self.tree.texts if path.startswith(TOOL)
-                                and path.endswith(".cpp") and path != MAIN]
+                                and path.endswith(".cpp") and path != MAIN
+                                and path not in OTHER_BUILDS]
         self.programs = list(test_programs())
         self.core = WORK / "talcmp" / "core.a"
         self.core.unlink(missing_ok=True)
@@ -150,11 +158,12 @@ class Bench(steps.Bench):
     def _link(self, tree, objects, target, *libraries):
         """Objects that see the mutant come first, so that the archive's are not taken."""
         changed = [tree.object(path) for path in self.sources_of_core if tree.sees(path)]
-        steps.link(target, *objects, *changed, self.core, *libraries, "-lzip")
+        steps.link(target, *objects, *changed, self.core, *libraries, *LIBRARIES)
 
     def steps(self, mutant, tree):
         """Name, sources and action of each step; the parts first where the mutant is in one."""
-        of_part = mutant.path.startswith((f"{TOOL}/arrays", f"{TOOL}/comparison"))
+        of_part = mutant.path.startswith(tuple(
+            f"{TOOL}/{name}/" for name in ("arrays", "comparison", "formats", "picture")))
         for program in sorted(self.programs, key=lambda each: self._order(each, of_part)):
             yield (program.name, self.sources(program),
                    lambda program=program: self.run(program, tree, self.limit(program)))

@@ -3,7 +3,6 @@
 
 #include "array_file.h"
 #include "descriptor.h"
-#include "npz_file.h"
 #include "pipe.h"
 #include "regular_file.h"
 
@@ -12,7 +11,6 @@
 #include "support/npy_bytes.h"
 #include "support/temporary_folder.h"
 #include "support/thrown_message.h"
-#include "support/zip_bytes.h"
 
 #include <gtest/gtest.h>
 
@@ -123,16 +121,6 @@ TEST(Files, KeepTheirBeginning) {
     folder.write("file", std::string(5000, 'b'));
     EXPECT_EQ(read(file, 4090, 6), "aaaaaa");
     EXPECT_EQ(read(file, 4090, 7), "bbbbbbb");
-}
-
-// Otherwise a descriptor would be closed twice, and another file could get its number in between.
-TEST(Files, OfArchivesAreLeftToTheArchive) {
-    const TemporaryFolder folder;
-    const std::string bytes = zipped::archive({{"a.npy", npy::row<double>({1, 2})}});
-    talcmp::RegularFile file = opened(folder.write("a.npz", bytes), bytes.size());
-    talcmp::NpzFile archive(file);
-    EXPECT_EQ(file.descriptor().number(), -1);
-    EXPECT_EQ(archive.open("a")->shape(), talcmp::Shape{2});
 }
 
 TEST(Files, OfOneArrayHaveOneMemberWithoutAName) {

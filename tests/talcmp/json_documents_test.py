@@ -61,7 +61,9 @@ class Documents(Folder):
         self.make_folder("two")
         self.check_trouble("a.npy", "b.npy", "b.npy: cannot be opened: No such file or directory")
         self.check_trouble("one", "two",
-                           "one: holds no .npy or .npz file to compare, nor does two")
+                           "one: holds no file of arrays to compare, nor does two; in folders, these are "
+                           "the files named *.npy, *.npz, *.h5, *.hdf5, *.he5, *.nc, *.nc4 and "
+                           "*.cdf")
         self.check_trouble("a*.npy", "b*.npy",
                            "b*.npy: there is no such file, and no file matches it as a pattern")
         self.check_trouble("b*.npy", "a.npy", "b*.npy: there is no such file; a pattern can be "

@@ -8,6 +8,7 @@ and TALNUMERICARRAY_ROUNDS how often each kind of array is drawn.
 
 import fractions
 import glob
+import math
 import os
 import random
 import subprocess
@@ -102,6 +103,26 @@ def same_under(tolerance, x, y):
 
 # ---- Arrays
 
+def largest_differences(pairs):
+    """The largest absolute and relative differences of parts; NaNs have none."""
+    absolute = relative = 0.0
+    for x, y in pairs:
+        for one, other in ((x.real, y.real), (x.imag, y.imag)):
+            one, other = one.item(), other.item()
+            if math.isnan(one) or math.isnan(other) or one == other:
+                continue
+            if math.isinf(one) or math.isinf(other):
+                return np.inf, np.inf
+            exact = abs(fractions.Fraction(one) - fractions.Fraction(other))
+            try:
+                difference = float(exact)
+            except OverflowError:
+                return np.inf, np.inf
+            absolute = max(absolute, difference)
+            relative = max(relative, difference / max(abs(float(one)), abs(float(other))))
+    return absolute, relative
+
+
 def random_values(rng, dtype, shape):
     if dtype.kind in "iu":
         info = np.iinfo(dtype)
@@ -153,6 +174,16 @@ def count_special(values):
 SHAPES = [(), (1,), (7,), (0,), (3, 0, 2), (2, 3), (5, 1, 4), (2, 3, 4, 5), (40, 30), (1, 1000)]
 
 
+def note_of(arguments):
+    """What is said of a tolerance that may be meant as an error."""
+    for argument in map(str, arguments):
+        text = argument[len("--tol="):] if argument.startswith("--tol=") else "0"
+        if 0 < float(text) < 1:
+            return (f"talcmp: note: --tol {text} means {text} binary digits; a relative error is "
+                    f"--relative {text}\n")
+    return ""
+
+
 class NumpyFiles(Folder):
     def setUp(self):
         super().setUp()
@@ -161,7 +192,7 @@ class NumpyFiles(Folder):
     def only_comparison(self, *arguments):
         status, output, errors = run("--json", *arguments)
         document = document_of(output)
-        self.assertEqual((document["exit_status"], errors), (status, ""))
+        self.assertEqual((document["exit_status"], errors), (status, note_of(arguments)))
         self.assertEqual(len(document["comparisons"]), 1)
         return document["comparisons"][0]
 
@@ -169,22 +200,31 @@ class NumpyFiles(Folder):
 # ---- One file and another
 
 class EveryTypeAndShape(NumpyFiles):
-    def check(self, ours, theirs, options=(), slices=Ellipsis):
-        a = self.save("a.npy", stored(self.rng, ours))
-        b = self.save("b.npy", stored(self.rng, theirs))
+    def check(self, ours, theirs, options=(), slices=Ellipsis, types=None):
+        """`types` are those that the arrays are stored as, if not as they are."""
+        type1, type2 = types or (ours.dtype, theirs.dtype)
+        a = self.save("a.npy", stored(self.rng, ours.astype(type1)))
+        b = self.save("b.npy", stored(self.rng, theirs.astype(type2)))
         found = self.only_comparison("-n", 10000, *options, a, b)
         indices = [list(index) for index in np.ndindex(ours.shape)]
         places = np.arange(ours.size).reshape(ours.shape)
-        chosen = [indices[place] for place in np.ravel(places[slices])]
-        part1, part2 = np.ravel(ours[slices]), np.ravel(theirs[slices])
+        # In row-major order, whatever the sign of the steps is.
+        chosen_places = np.sort(np.ravel(places[slices]))
+        chosen = [indices[place] for place in chosen_places]
+        part1, part2 = np.ravel(ours)[chosen_places], np.ravel(theirs)[chosen_places]
         pairs = list(zip(part1, part2))
         digits = [digits_of(x, y) for x, y in pairs]
         printed = [None if digit == NEVER else digit for digit in digits]
         expected = [place for place in zip(chosen, printed) if place[1] != 0]
         self.assertEqual([(place["index"], place["digits"]) for place in found["differences"]],
                          expected)
+        self.assertEqual([found[side]["stored_type"] for side in ("first", "second")],
+                         [np.dtype(each).name for each in (type1, type2)])
         report = found["report"]
         self.assertEqual(report["pairs"], len(digits))
+        largest = largest_differences(pairs)
+        self.assertEqual(float(report["largest_absolute_difference"]), largest[0])
+        self.assertEqual(float(report["largest_relative_difference"]), largest[1])
         self.assertEqual(report["differing"], len(expected))
         self.assertEqual({bar["digits"]: bar["pairs"] for bar in report["histogram"]},
                          {digit: printed.count(digit) for digit in printed})
@@ -235,19 +275,57 @@ class EveryTypeAndShape(NumpyFiles):
                     self.assertEqual((status, len(output.splitlines())),
                                      (1 if expected else 0, len(expected)))
 
+    def test_booleans_and_halves(self):
+        booleans = self.rng.random(1000) < 0.5
+        halves = np.arange(0x10000, dtype="u2").view("f2")
+        with np.errstate(invalid="ignore"):
+            # Of signalling NaNs, NumPy's conversion sets a bit.
+            singles = halves[~(np.isnan(halves) & (halves.view("u2") & 0x200 == 0))].astype("f4")
+        for ours, type1 in ((booleans.astype("u1"), "?"), (singles, "f2")):
+            for theirs, type2 in ((ours, type1), (ours, ours.dtype), (ours.astype("f8"), "f8")):
+                with self.subTest(types=(type1, type2), seed=SEED):
+                    self.check(ours, theirs, types=(type1, type2))
+        other = booleans ^ (self.rng.random(1000) < 0.1)
+        self.check(booleans.astype("u1"), other.astype("u1"), types=("?", "?"))
+        self.check(booleans.astype("u1"), other.astype("i8"), types=("?", "i8"))
+        a = self.save("a.npy", booleans)
+        b = self.write("b.npy", read_bytes(a).replace(b"\x01", b"\xff").replace(b"Y\xff", b"Y\x01"))
+        self.expect(0, "", "", a, b)
+        self.expect(1, f"{a} {a}.u1 differ: type bool and uint8\n", "", "--strict-type", a,
+                    self.save_as(f"{a}.u1", booleans.astype("u1")))
+
+    def test_halves_of_every_bits(self):
+        """Every half is the single of the same value, and every NaN keeps its bits."""
+        bits = np.arange(0x10000, dtype="u4")
+        with np.errstate(invalid="ignore"):
+            singles = bits.astype("u2").view("f2").astype("f4").view("u4")
+        nans = (bits & 0x7FFF) > 0x7C00
+        expected = np.where(nans, (bits & 0x8000) << 16 | 0x7F800000 | (bits & 0x3FF) << 13, singles)
+        a = self.save("a.npy", bits.astype("u2").view("f2"))
+        b = self.save("b.npy", expected.astype("u4").view("f4"))
+        self.expect(0, "", "", a, b)
+
     def test_slices(self):
         for _ in range(15 * ROUNDS):
             shape = tuple(self.rng.integers(1, 9, size=self.rng.integers(1, 5)))
             values = random_values(self.rng, np.dtype(self.rng.choice(["f8", "i2", "c8"])), shape)
             texts, slices = [], []
-            for dimension in shape[:self.rng.integers(1, len(shape) + 1)]:
+            first = self.rng.integers(1, len(shape) + 1)
+            last = self.rng.integers(0, len(shape) - first + 1)
+            for dimension in shape[:first] + shape[len(shape) - last:]:
                 if self.rng.random() < 0.3:
                     slices.append(self.rng.integers(-dimension, dimension))
                     texts.append(str(slices[-1]))
                 else:
                     start, stop = self.rng.integers(-dimension - 2, dimension + 3, size=2)
-                    slices.append(slice(start, stop, self.rng.integers(1, 4)))
-                    texts.append(f"{start}:{stop}:{slices[-1].step}")
+                    step = self.rng.choice([-3, -2, -1, 1, 2, 3])
+                    start, stop = (None if self.rng.random() < 0.2 else end for end in (start, stop))
+                    slices.append(slice(start, stop, step))
+                    texts.append(":".join("" if part is None else str(part)
+                                          for part in (start, stop, step)))
+            if last != 0 or self.rng.random() < 0.3:
+                slices.insert(first, Ellipsis)
+                texts.insert(first, "...")
             with self.subTest(shape=shape, texts=texts, seed=SEED):
                 self.check(values, near_values(self.rng, values),
                            ["--slice=" + ",".join(texts)], tuple(slices))
@@ -364,8 +442,11 @@ class Archives(NumpyFiles):
         arrays = {"x": np.arange(200000.0), "y": np.zeros((3, 4), order="F"), "z": np.array(1)}
         uncompressed = self.save_archive("a.npz", **arrays)
         compressed = self.save_archive("b.npz", np.savez_compressed, **arrays)
-        self.expect(0, "", "", uncompressed, compressed)
-        self.expect(0, "", "", compressed, compressed)
+        self.expect(0, summary(same=3), "", uncompressed, compressed)
+        self.expect(0, summary(same=3), "", compressed, compressed)
+        self.expect(0, "".join(f"{compressed}[{name}] {compressed}[{name}] are the same\n"
+                               for name in "xyz") + summary(same=3), "", "-v", compressed,
+                    compressed)
 
     def test_members_that_differ(self):
         a = self.save_archive("a.npz", x=np.arange(5), y=np.zeros(2), only_a=np.zeros(1))
@@ -375,11 +456,15 @@ class Archives(NumpyFiles):
         only_b = f"{a} {b} differ: only in {b}: only_b\n"
         x = f"{a}[x] {b}[x] differ: [2]: 2 and 3 (different integers)\n"
         y = f"{a}[y] {b}[y] differ: shape (2,) and (2, 1)\n"
-        self.expect(1, only_a + only_b + x + y, "", a, b)
-        self.expect(1, x, "", a, b, "--include", "x")
-        self.expect(1, x, "", "--include", "z", "--include", "x", a, b)
-        self.expect(1, x + y, "", a, b, "--exclude", "only*")
-        self.expect(1, only_a + only_b + y, "", a, b, "--include=only*", "--include=y")
+        self.expect(1, only_a + only_b + x + y
+                    + summary(different=2, only_in_first=1, only_in_second=1), "", a, b)
+        one = summary(different=1)
+        self.expect(1, x + one, "", a, b, "--include", "x")
+        self.expect(1, x + one, "", "--include", "z", "--include", "x", a, b)
+        self.expect(1, x + y + summary(different=2), "", a, b, "--exclude", "only*")
+        self.expect(1, only_a + only_b + y
+                    + summary(different=1, only_in_first=1, only_in_second=1), "", a, b,
+                    "--include=only*", "--include=y")
         for options, second in (("--include", "x*", "--exclude=x"), b), (
                 ("--exclude", "only*", "--exclude", "[xy]"), a):
             self.expect(2, "", f"talcmp: {a}: has no array that --include and --exclude leave, nor "
@@ -392,14 +477,15 @@ class Archives(NumpyFiles):
         self.expect(0, "", "", b, a, "--include=x")
         status, _, errors = run(a, b)
         self.assertEqual(status, 2)
-        self.assertIn("has 2 arrays, the other file one; choose one with --include", errors)
+        self.assertEqual(errors, f"talcmp: {a}: has 2 arrays, the other operand one; choose one, such "
+                                 f"as {a}[x]\n")
 
     def test_orders(self):
         values = self.rng.standard_normal((200, 300))
         a = self.save_archive("a.npz", np.savez_compressed, x=values)
         b = self.save_archive("b.npz", x=np.asfortranarray(values))
-        self.expect(0, "", "", a, b)
-        self.expect(0, "", "", a, b, "--slice=3:5,::2")
+        self.expect(0, summary(same=1), "", a, b)
+        self.expect(0, summary(same=1), "", a, b, "--slice=3:5,::2")
 
     def test_members_that_are_no_arrays(self):
         a = self.save_archive("a.npz", x=np.zeros(3))
@@ -408,12 +494,12 @@ class Archives(NumpyFiles):
         self.expect(2, f"{a}[x] {a}[x] are the same\n" + summary(same=1, trouble=1),
                     f"talcmp: {a}[notes.txt]: is not an .npy file: it does not begin with "
                     "\\x93NUMPY\n", a, a, "-v")
-        self.expect(0, "", "", a, a, "--exclude=*.txt")
+        self.expect(0, summary(same=1), "", a, a, "--exclude=*.txt")
 
     def test_no_members(self):
         a = self.save_archive("a.npz")
-        self.expect(0, "", "", a, a)
-        self.expect(0, summary(), "", "-v", a, a)
+        self.expect(0, summary(), "", a, a)
+        self.expect(0, "", "", "-q", a, a)
 
 
 class FoldersAndPatterns(NumpyFiles):
@@ -430,10 +516,10 @@ class FoldersAndPatterns(NumpyFiles):
     def test_folders(self):
         one, two = self.make_folders()
         self.expect(1, f"{one} {two} differ: only in {one}: mine.npy\n"
-                       f"{one}/same.npy {two}/same.npy are the same\n"
                        f"{one}/sub/other.npy {two}/sub/other.npy differ: [0]: 0 and 1 (different "
                        f"integers)\n{one} {two} differ: only in {two}: yours.npy\n"
-                    + summary(same=1, different=1, only_in_first=1, only_in_second=1), "", one, two)
+                    + summary(same=1, different=1, only_in_first=1, only_in_second=1,
+                              rest="; 1 other file"), "", one, two)
         self.expect(1, "", "", "-q", one, two)
 
     def test_archives_in_folders(self):
@@ -442,18 +528,19 @@ class FoldersAndPatterns(NumpyFiles):
         one, two = self.path("one"), self.path("two")
         self.expect(0, f"{one}/a.npz[x] {two}/a.npz[x] are the same\n"
                        f"{one}/a.npz[y] {two}/a.npz[y] are the same\n" + summary(same=2), "",
-                    one, two)
+                    "-v", one, two)
 
     def test_files_that_are_left_out(self):
         one, two = self.make_folders()
-        self.expect(2, "", f"talcmp: {one}: holds no .npy or .npz file to compare, nor does "
-                           f"{two}\n", one, two, "--exclude=*")
+        self.expect(2, "", f"talcmp: {one}: holds no file of arrays to compare, nor does "
+                           f"{two}; in folders, these are the files named *.npy, *.npz, *.h5, "
+                           "*.hdf5, *.he5, *.nc, *.nc4 and *.cdf\n", one, two, "--exclude=*")
         self.expect(0, "", "", "-q", one, two, "--exclude=sub/*", "--exclude=mine*",
                     "--exclude=yours*")
 
     def test_patterns(self):
         one, two = self.make_folders()
-        self.expect(0, f"{one}/same.npy {two}/same.npy are the same\n" + summary(same=1), "",
+        self.expect(0, f"{one}/same.npy {two}/same.npy are the same\n" + summary(same=1), "", "-v",
                     f"{one}/s*.npy", f"{two}/[s]*.npy")
         self.expect(2, "", f"talcmp: {one}/no*.npy: there is no such file, and no file matches it "
                            "as a pattern\n", f"{one}/no*.npy", two)
@@ -468,9 +555,7 @@ class KindsThatAreNotCompared(NumpyFiles):
     def test_each_is_named(self):
         good = self.save("good.npy", np.zeros(2))
         for values, message in [
-                (np.zeros(2, dtype="f2"), "half precision"),
                 (np.zeros(2, dtype=np.longdouble), "extended precision"),
-                (np.zeros(2, dtype="?"), "boolean"),
                 (np.zeros(2, dtype="U3"), "text"),
                 (np.zeros(2, dtype="S3"), "text"),
                 (np.zeros(2, dtype="M8[s]"), "dates or times"),

@@ -55,17 +55,19 @@ const BadUsage operands[] = {
     {"Three", "a b c", too_many},
     {"ThirdAfterAPattern", "a b --exclude x c", too_many},
     {"ThirdAfterDashes", "a -- -b --tol", too_many},
-    {"TwoStandardInputs", "- -", "standard input can be only one of the two arrays"},
+    {"TwoStandardInputs", "- -", "standard input can be only one of the arrays"},
     {"QuietAndVerbose", "-q -v a b", not_quiet},
     {"QuietAndVerboseInOneWord", "-qv a b", not_quiet},
     {"QuietReport", "-q --report a b", not_quiet},
     {"QuietJson", "--quiet --json a b", not_quiet},
 };
 
-const std::string by_tol = "'; reals are tolerated by --tol DIGITS, in binary digits";
+const std::string by_tol =
+    "'; reals are tolerated by --tol DIGITS, in binary digits, or by --relative ERROR";
+const std::string by_relative = "'; did you mean --relative?";
 
 const BadUsage unknown[] = {
-    {"Long", "--fast a b", "there is no option '--fast'"},
+    {"Long", "--swiftly a b", "there is no option '--swiftly'"},
     {"Short", "-t a b", "there is no option '-t'"},
     {"ShortAfterAFlag", "-vt a b", "there is no option '-vt'"},
     {"Number", "-5 a", "there is no option '-5'"},
@@ -79,9 +81,9 @@ const BadUsage unknown[] = {
      "there is no option '--thraeds'; did you mean --threads?"},
     {"InCapitals", "--TOL 3 a b", "there is no option '--TOL'"},
     {"OneDash", "-tol 3 a b", "there is no option '-tol'; did you mean --tol?"},
-    {"RelativeTolerance", "--rtol 1e-5 a b", "there is no option '--rtol" + by_tol},
-    {"RelativeToleranceWithEquals", "--rtol=1e-5 a b", "there is no option '--rtol" + by_tol},
-    {"AbsoluteTolerance", "--atol 0 a b", "there is no option '--atol" + by_tol},
+    {"RelativeTolerance", "--rtol 1e-5 a b", "there is no option '--rtol" + by_relative},
+    {"RelativeToleranceWithEquals", "--rtol=1e-5 a b", "there is no option '--rtol" + by_relative},
+    {"AbsoluteTolerance", "--atol 0 a b", "there is no option '--atol'; did you mean --absolute?"},
     {"Tolerance", "--tolerance 3 a b", "there is no option '--tolerance" + by_tol},
     {"ToleranceMisspelt", "--tolerence 3 a b", "there is no option '--tolerence" + by_tol},
     {"Epsilon", "--eps 1e-5 a b", "there is no option '--eps" + by_tol},
@@ -90,6 +92,24 @@ const BadUsage unknown[] = {
 };
 
 const BadUsage values[] = {
+    {"RelativeOfOne", "--relative 1 a b",
+     "--relative takes an error between 0 and 1, such as 1e-9, not '1'"},
+    {"RelativeOfZero", "--relative=0 a b",
+     "--relative takes an error between 0 and 1, such as 1e-9, not '0'"},
+    {"RelativeNaN", "--relative=nan a b",
+     "--relative takes an error between 0 and 1, such as 1e-9, not 'nan'"},
+    {"RelativeTooSmall", "--relative=1e-999 a b",
+     "--relative 1e-999 is too large or too small for a double"},
+    {"RelativeBesideTol", "--relative=.1 --tol=3 a b",
+     "--tol and --relative both say how much reals may differ; give one"},
+    {"AbsoluteNegative", "--absolute=-1 a b",
+     "--absolute takes an error from 0 to 1e300, such as 1e-12, not '-1'"},
+    {"AbsoluteTooLarge", "--absolute 1.1e300 a b",
+     "--absolute takes an error from 0 to 1e300, such as 1e-12, not '1.1e300'"},
+    {"AbsoluteText", "--absolute=x a b",
+     "--absolute takes an error from 0 to 1e300, such as 1e-12, not 'x'"},
+    {"PictureOfNoKind", "--picture a.jpg a b",
+     "--picture takes a file named *.png or *.svg, not 'a.jpg'"},
     {"Missing", "a b --tol", "--tol needs a value"},
     {"MissingAfterALetter", "a b -n", "-n needs a value"},
     {"MissingBeforeAnOption", "--include --json a b",

@@ -10,6 +10,11 @@ import unittest
 
 import numpy as np
 
+try:
+    import h5py
+except ImportError:
+    h5py = None
+
 from support.talcmp_command import COMMAND, ROOT, Folder, read_bytes, run_program, run_tests
 
 RECIPES = ROOT / "examples" / "recipes"
@@ -48,6 +53,38 @@ class CTest(Recipe):
         status, output, _ = self.results(np.arange(5.0) * (1 + 2.0**-35))
         self.assertNotEqual(status, 0)
         self.assertIn("(the same from --tol 18 on)", output)
+
+
+@unittest.skipUnless(h5py, "NOT TESTED: h5py is not installed")
+class CTestOfHdf5Files(Recipe):
+    def write_hdf5(self, name, noise=0.0, scale=1.0):
+        with h5py.File(self.path(name), "w") as file:
+            file["/fields/pressure"] = np.linspace(0, 1, 1000) * scale + noise
+            file["note"] = "text is listed, and no trouble"
+
+    def results(self, **difference):
+        shutil.copy(RECIPES / "hdf5_results" / "CMakeLists.txt", self.folder)
+        for name in ("first.h5", "second.h5"):
+            self.write_hdf5(f"expected/{name}")
+            self.write_hdf5(f"computed/{name}", **(difference if name == "second.h5" else {}))
+        self.add_program("simulate", f'mkdir -p "$1" && cp {self.folder}/computed/* "$1"')
+        status, output, errors = self.run_in_folder("cmake", "-B", "build")
+        self.assertEqual(status, 0, output + errors)
+        return self.run_in_folder("ctest", "--test-dir", "build", "--output-on-failure")
+
+    def test_results_within_the_errors(self):
+        status, output, _ = self.results(noise=1e-13, scale=1 + 1e-10)
+        self.assertEqual(status, 0, output)
+        self.assertIn("100% tests passed, 0 tests failed out of 3", output)
+
+    def test_results_outside_the_errors(self):
+        status, output, _ = self.results(scale=1 + 1e-8)
+        self.assertNotEqual(status, 0)
+        self.assertIn("second.h5[/fields/pressure] differ: [1]: 0.001001001001001001 and "
+                      "0.001001001011011011 (the same from --tol 27 on)", output)
+        self.assertIn("0 the same, 1 different, 0 only in the first, 0 only in the second, 0 in "
+                      "trouble, 1 skipped", output)
+        self.assertIn("1 tests failed out of 3", output)
 
 
 class ShellScript(Recipe):

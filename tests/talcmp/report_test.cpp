@@ -183,10 +183,10 @@ TEST_P(Reports, CountAllPairsAndListTheFirst) {
     for (const bool in_order : {true, false}) {
         SCOPED_TRACE(in_order);
         Findings findings = {talcmp::FirstPairs(3), {}};
+        const talcmp::Pairs pairs = pairs_of(GetParam().first, GetParam().second);
         talcmp::PairCounter(GetParam().tolerance)
             .add(
-                pairs_of(GetParam().first, GetParam().second),
-                [](const std::size_t i) { return i; }, in_order, findings);
+                pairs, pairs, [](const std::size_t i) { return i; }, in_order, findings);
         EXPECT_EQ(text_of(findings.totals), GetParam().report);
         EXPECT_EQ(text_of(findings.first), GetParam().listed);
     }
@@ -218,7 +218,8 @@ TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {
                 return begin + (each.in_order ? i : 2 - i);
             };
             // The worst pair is the last one either way.
-            counter.add(pairs_of(first, second), number, each.in_order, findings);
+            counter.add(pairs_of(first, second), pairs_of(first, second), number, each.in_order,
+                        findings);
         }
         EXPECT_EQ(text_of(*findings.totals.worst), each.worst);
         EXPECT_EQ(text_of(findings.first), each.first);
@@ -229,9 +230,9 @@ TEST(Report, HasTheFirstOfTheWorstPairsInWhateverOrderTheyCome) {
 Totals totals_of(const Reals& second, const std::uint64_t begin) {
     Findings findings = {talcmp::FirstPairs(1), {}};
     const Reals first(second.size(), 1.0);
+    const talcmp::Pairs pairs = pairs_of(first, second);
     talcmp::PairCounter(0).add(
-        pairs_of(first, second), [begin](const std::size_t i) { return begin + i; }, true,
-        findings);
+        pairs, pairs, [begin](const std::size_t i) { return begin + i; }, true, findings);
     return findings.totals;
 }
 

@@ -40,6 +40,11 @@ const Range ranges[] = {
     {"LastIndex", "-1", " [-1]"},
     {"SeveralAxes", "0:10,:,3", " 0:10:1 ::1 [3]"},
     {"Spaces", "  1 : 2  ,   7 ", " 1:2:1 [7]"},
+    {"Backwards", "::-1, 5:2:-2", " ::-1 5:2:-2"},
+    {"Ellipsis", "...", ""},
+    {"EllipsisAtTheFront", "...,3,::2", " ... [3] ::2"},
+    {"EllipsisBetween", "1:2, ... ,3", " 1:2:1 ... [3]"},
+    {"EllipsisAtTheEnd", "3,...", " [3]"},
     {"Limits", "-9223372036854775808:9223372036854775807:9223372036854775807",
      " -9223372036854775808:9223372036854775807:9223372036854775807"},
 };
@@ -48,14 +53,20 @@ std::string text_of(const std::optional<std::int64_t>& number) {
     return number ? std::to_string(*number) : "";
 }
 
-std::string meaning_of(const talcmp::Selection& selection) {
+std::string meaning_of(const std::vector<talcmp::AxisRange>& axes) {
     std::string text;
-    for (const talcmp::AxisRange& range : selection) {
+    for (const talcmp::AxisRange& range : axes) {
         text += range.one_index ? " [" + text_of(range.start) + "]"
                                 : " " + text_of(range.start) + ":" + text_of(range.stop) + ":"
                                       + std::to_string(range.step);
     }
     return text;
+}
+
+// The ranges of the first axes and, after three dots, those of the last.
+std::string meaning_of(const talcmp::Selection& selection) {
+    return meaning_of(selection.first)
+           + (selection.last.empty() ? "" : " ..." + meaning_of(selection.last));
 }
 
 class Ranges : public NamedCaseTest<Range> {};
@@ -79,8 +90,10 @@ const Range bad_ranges[] = {
     {"ThreeColons", "1:2:3:4", "'1:2:3:4' has more than two colons"},
     {"ThreeColonsLater", "::,1:2:3:4", "'1:2:3:4' has more than two colons"},
     {"Brackets", "[1]", "'[1]' is no index"},
-    {"StepZero", "::0", "the step 0 is not positive"},
-    {"Backwards", "::-1", "the step -1 is not positive"},
+    {"StepZero", "::0", "a step is 0"},
+    {"TwoEllipses", "...,1,...", "there is more than one '...'"},
+    {"TwoDots", "..", "'..' is no index"},
+    {"FourDots", "....", "'....' is no index"},
 };
 
 class BadRanges : public NamedCaseTest<Range> {};
@@ -122,7 +135,19 @@ const Part parts[] = {
     {"FromTheEnd", {9}, Order::c, "-4:-1", 5, {3}, {1}},
     {"CutOff", {9}, Order::c, "-100:100", 0, {9}, {1}},
     {"PastTheEnd", {9}, Order::c, "100:", 9, {0}, {0}},
-    {"Backwards", {9}, Order::c, "5:5", 5, {0}, {0}},
+    {"NothingBetween", {9}, Order::c, "5:5", 5, {0}, {0}},
+    {"LastAxis", {4, 5, 6}, Order::c, "...,2", 2, {4, 5}, {30, 6}},
+    {"FirstAndLastAxis", {4, 5, 6}, Order::c, "1,...,2", 32, {5}, {6}},
+    {"EllipsisForNothing", {4, 5}, Order::c, "1:,...,2:", 7, {3, 3}, {5, 1}},
+    {"Reversed", {9}, Order::c, "::-1", 0, {9}, {1}},
+    {"EverySecondFromTheEnd", {10}, Order::c, "::-2", 1, {5}, {2}},
+    {"BackwardsBetween", {10}, Order::c, "7:2:-2", 3, {3}, {2}},
+    {"BackwardsFromTheEnd", {10}, Order::c, "-1:-4:-1", 7, {3}, {1}},
+    {"BackwardsCutOff", {10}, Order::c, "100:-100:-3", 0, {4}, {3}},
+    {"BackwardsOverNothing", {10}, Order::c, "2:5:-1", 0, {0}, {0}},
+    {"BackwardsFromBeforeTheStart", {10}, Order::c, "-11::-1", 0, {0}, {0}},
+    {"BackwardsInAnEmptyAxis", {0}, Order::c, "::-1", 0, {0}, {0}},
+    {"FarthestStepBack", {10}, Order::c, "::-9223372036854775808", 9, {1}, {0}},
     {"FarthestStart", {9}, Order::c, "-9223372036854775808:", 0, {9}, {1}},
     {"OneElement", {9}, Order::c, "8:", 8, {1}, {0}},
     {"Longest", {1, UINT64_MAX}, Order::c, ":,1:", 1, {1, UINT64_MAX - 1}, {0, 1}},
@@ -160,8 +185,8 @@ TEST(NoPart, IsSelectedWhereThereIsNone) {
 TEST(Positions, AreThoseOfIndices) {
     const Shape shape = {3, 1, 4, 2};
     const auto indices = indices_of(shape);
-    const talcmp::RowMajorNumbers by_rows(array_of(shape, Order::c));
-    const talcmp::RowMajorNumbers by_columns(array_of(shape, Order::fortran));
+    const talcmp::RowMajorNumbers by_rows(shape, false);
+    const talcmp::RowMajorNumbers by_columns(shape, true);
     for (std::size_t number = 0; number < indices.size(); ++number) {
         const Shape& index = indices[number];
         const std::uint64_t in_columns = index[0] + 3 * (index[2] + 4 * index[3]);

@@ -38,7 +38,8 @@ def run_on_terminal(*arguments, columns=80, errors=True, stdin=subprocess.DEVNUL
     the exit status and what is on the terminal, and after that what is on another standard error.
     `notice` is called with the process and the text so far, at the start and whenever there is
     more. A variable that is None is not set."""
-    environment = {**os.environ, "NO_COLOR": None, "TERM": "xterm", **variables}
+    environment = {**os.environ, "NO_COLOR": None, "TERM": "xterm", "LC_ALL": "C.UTF-8",
+                   **variables}
     environment = {name: value for name, value in environment.items() if value is not None}
     controller, device = pty.openpty()
     fcntl.ioctl(device, termios.TIOCSWINSZ, struct.pack("HHHH", 24, columns, 0, 0))
@@ -71,17 +72,19 @@ class Answers(Folder):
                "end": ESCAPE + "0m"}
     NO_COLOURS = {"NO_COLOR": "1"}, {"TERM": "dumb"}, {"TERM": ""}, {"TERM": None}
 
-    def check(self, expected, *arguments, status=1, columns=80):
+    def check(self, expected, *arguments, status=1, columns=80, difference_map=""):
+        """`difference_map` is what a report ends with on a terminal alone."""
         def expect(text, **variables):
             self.assertEqual(
                 run_on_terminal(*arguments, columns=columns, folder=self.folder, **variables),
                 (status, text.replace("\n", "\r\n")))
 
-        expect(expected.format(**self.COLOURS))
-        plain = expected.format(**dict.fromkeys(self.COLOURS, ""))
+        expect((expected + difference_map).format(**self.COLOURS))
+        without = dict.fromkeys(self.COLOURS, "")
+        plain = expected.format(**without)
         for variables in self.NO_COLOURS:
             with self.subTest(variables=variables):
-                expect(plain, **variables)
+                expect(plain + difference_map.format(**without), **variables)
         if columns == 80:  # which is the width elsewhere, whatever the variable says
             self.expect(status, plain, "", *arguments, cwd=self.folder,
                         env={**os.environ, "TERM": "xterm", "COLUMNS": "40"})
@@ -120,6 +123,8 @@ a.npy b.npy {red}differ{end}: [1, 0]: inf and 1e+308 (no digit in common)
   first place           [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
   worst place           [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
   largest difference    53 binary digits
+  absolute difference   infinite
+  relative difference   infinite
   smallest tolerance    none below all 53 digits; [0, 0]: nan(0x7ff8000000000000) and 1 (a NaN)
   NaNs                  1 and 0
   infinities            3 and 2
@@ -130,7 +135,29 @@ a.npy b.npy {red}differ{end}: [1, 0]: inf and 1e+308 (no digit in common)
                 expected += f"  {digits:13} {count} {{blue}}{'#' * length}{{end}}\n"
             with self.subTest(columns=columns):
                 self.check(expected, "--report", "-n2", "--tol=1.5", "a.npy", "b.npy",
-                           columns=columns)
+                           columns=columns, difference_map=self.MAPS[columns])
+
+    MAP = """\
+  0 {red}N{end}{blue}░{end}···
+  1 {red}█{end}{blue}░░░{end}·
+    0
+"""
+    WIDE_MAP = "  differences; down: axis 0, right: axis 1\n  each character: one element\n" + MAP + (
+        "  · equal  {blue}░{end} 1 to 18 digits  {red}█{end} no digit in common  {red}N{end} a NaN\n")
+    MAPS = {
+        200: WIDE_MAP,
+        80: WIDE_MAP,
+        40: "  differences; down: axis 0, right:\n  axis 1\n  each character: one element\n" + MAP + (
+            "  · equal  {blue}░{end} 1 to 18 digits\n"
+            "  {red}█{end} no digit in common  {red}N{end} a NaN\n"),
+        20: "  differences;\n  down: axis 0,\n  right: axis 1\n  each character:\n  one element\n" + MAP + (
+            "  · equal\n  {blue}░{end} 1 to 18 digits\n  {red}█{end} no digit in common\n"
+            "  {red}N{end} a NaN\n"),
+        5: "  " + "\n  ".join("differences; down: axis 0, right: axis 1 each character: the worst of "
+                             "1 x 5 elements".split()) + (
+            "\n  0 {red}N{end}\n  1 {red}█{end}\n    0\n  {red}█{end} no digit in common\n"
+            "  {red}N{end} a NaN\n"),
+    }
 
     def test_report_of_numbers_of_two_widths(self):
         self.save("a.npy", np.arange(12), "i2")
@@ -145,6 +172,8 @@ a.npy b.npy {red}differ{end}: [7]: 7 and 8 (the same from --tol 22 on)
   first place           [7]: 7 and 8 (the same from --tol 22 on)
   worst place           [7]: 7 and 8 (the same from --tol 22 on)
   largest difference    22 binary digits
+  absolute difference   at most 1
+  relative difference   at most 0.125
   smallest tolerance    --tol 22
   NaNs                  0 and 0
   infinities            0 and 0
@@ -152,7 +181,13 @@ a.npy b.npy {red}differ{end}: [7]: 7 and 8 (the same from --tol 22 on)
   digits that differ, number of pairs
               0 10 {blue}##########{end}
              22  1 {blue}#{end}
-""", "--report", "--slice=1:", "a.npy", "b.npy", columns=30)
+""", "--report", "--slice=1:", "a.npy", "b.npy", columns=30, difference_map="""\
+  differences; right: axis 0
+  each character: one element
+  ······{blue}▓{end}····
+  0    5
+  · equal  {blue}▓{end} 17 to 23 digits
+""")
 
     def test_report_of_arrays_that_are_the_same(self):
         self.save("a.npy", np.arange(100.0))
@@ -164,13 +199,22 @@ a.npy a.npy {green}are the same{end}
   pairs                 100
   differing             0 (0 %)
   largest difference    0 binary digits
+  absolute difference   at most 0
+  relative difference   at most 0
   smallest tolerance    --tol 0
   NaNs                  0 and 0
   infinities            0 and 0
   negative zeros        0 and 0
   digits that differ, number of pairs
               0 100 {blue}###################{end}
-""", "--report", "a.npy", "a.npy", status=0, columns=40)
+""", "--report", "a.npy", "a.npy", status=0, columns=40, difference_map="""\
+  differences; right: axis 0
+  each character: the worst of 3
+  elements
+  ··································
+  0     20     40     60    80
+  · equal
+""")
 
     def test_report_of_pairs_that_are_the_same_under_no_tolerance(self):
         self.save("a.npy", [1.0, 2.0])
@@ -185,6 +229,8 @@ a.npy b.npy {red}differ{end}: [0]: 1 and -1 (opposite signs)
   first place           [0]: 1 and -1 (opposite signs)
   worst place           [0]: 1 and -1 (opposite signs)
   largest difference    more than all binary digits
+  absolute difference   at most 2
+  relative difference   at most 2
   smallest tolerance    none; [0]: 1 and -1 (opposite signs)
   NaNs                  0 and 0
   infinities            0 and 0
@@ -192,7 +238,13 @@ a.npy b.npy {red}differ{end}: [0]: 1 and -1 (opposite signs)
   digits that differ, number of pairs
               0 1 {blue}#####################{end}
   more than all 1 {blue}#####################{end}
-""", "--report", "a.npy", "b.npy", columns=40)
+""", "--report", "a.npy", "b.npy", columns=40, difference_map="""\
+  differences; right: axis 0
+  each character: one element
+  {red}█{end}·
+  0
+  · equal  {red}█{end} no digit in common
+""")
 
     def test_report_of_nans_that_are_the_same_bit_by_bit_only(self):
         self.save("a.npy", [np.nan, 1], "f4")
@@ -207,6 +259,8 @@ a.npy b.npy {red}differ{end}: [1]: 1 and 1.0000001 (the same from --tol 1 on)
   first place           [1]: 1 and 1.0000001 (the same from --tol 1 on)
   worst place           [1]: 1 and 1.0000001 (the same from --tol 1 on)
   largest difference    1 binary digits
+  absolute difference   at most 1.1920928955078125e-07
+  relative difference   at most 1.1920927533992823e-07
   smallest tolerance    none below all 24 digits; pairs of NaNs are the same under the tolerance 0 only
   NaNs                  1 and 1
   infinities            0 and 0
@@ -214,15 +268,21 @@ a.npy b.npy {red}differ{end}: [1]: 1 and 1.0000001 (the same from --tol 1 on)
   digits that differ, number of pairs
               0 1 {blue}#####################{end}
               1 1 {blue}#####################{end}
-""", "--report", "a.npy", "b.npy", columns=40)
+""", "--report", "a.npy", "b.npy", columns=40, difference_map="""\
+  differences; right: axis 0
+  each character: one element
+  {red}N{end}{blue}░{end}
+  0
+  {blue}░{end} 1 to 8 digits  {red}N{end} a NaN
+""")
 
 
 class Help(Folder):
-    def test_fits_a_screen(self):
+    def test_fits_a_tall_window(self):
         status, text = run_on_terminal("--help")
         self.assertEqual(status, 0)
         lines = text.splitlines()
-        self.assertLessEqual(len(lines), 24)
+        self.assertLessEqual(len(lines), 48)
         self.assertLessEqual(max(map(len, lines)), 80)
 
 

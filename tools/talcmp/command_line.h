@@ -13,12 +13,17 @@ namespace talcmp {
 
 struct CommandLine {
     Question question;
-    NameFilter filter; // for members of archives; exclusions also for files in folders
+    NameFilter filter;   // for members of archives; exclusions also for files in folders
+    bool report = false; // whether it is printed
     bool json = false;
     bool quiet = false;
     bool verbose = false;
-    std::string slice; // as it was given
-    std::string first; // the operands
+    bool skip_others = false; // whether members that are no arrays of numbers are no trouble
+    bool only_first = false;  // whether the run stops at the first difference
+    std::string slice;        // as it was given
+    std::string ignore;       // the mask as it was given
+    std::string picture;      // the file to draw to, if there is one
+    std::string first;        // the operands
     std::string second;
 };
 

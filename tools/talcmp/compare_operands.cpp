@@ -2,11 +2,15 @@
 
 #include "array_file.h"
 #include "operands.h"
+#include "picture.h"
+#include "shown.h"
 #include "status_line.h"
 #include "trouble.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <new>
+#include <tuple>
 
 namespace talcmp {
 namespace {
@@ -17,15 +21,20 @@ class OperandComparison {
         : command_line_(command_line), answers_(answers), progress_(progress) {}
 
     Summary compare_all() {
-        for (const NamedPair& pair : file_pairs()) {
+        const FilePairs files = file_pairs();
+        for (const NamedPair& pair : files.pairs) {
+            if (summary_.stopped) {
+                break;
+            }
             if (pair.trouble) {
                 report_trouble(pair.first.value_or(command_line_.first),
                                pair.second.value_or(command_line_.second), *pair.trouble);
             } else if (pair.first && pair.second) {
-                guarded(*pair.first, *pair.second,
-                        [&] { compare_files(*pair.first, *pair.second); });
+                guarded(*pair.first, *pair.second, [&] {
+                    compare_files({*pair.first, files.member1}, {*pair.second, files.member2});
+                });
             } else {
-                report_single(pair, command_line_.first, command_line_.second);
+                report_single(pair, pair.name, command_line_.first, command_line_.second);
             }
         }
         answers_.finish(summary_);
@@ -34,15 +43,19 @@ class OperandComparison {
 
   private:
     // None if there was trouble, which is then reported.
-    std::vector<NamedPair> file_pairs() {
+    FilePairs file_pairs() {
         const std::string& first = command_line_.first;
         const std::string& second = command_line_.second;
+        answers_.begin();
         try {
             FilePairs files = match_files(first, second, command_line_.filter.exclude);
-            answers_.begin(files.many);
-            return std::move(files.pairs);
+            if (files.many) {
+                check_picture_of_many();
+            }
+            summary_.many = files.many;
+            summary_.other_files = files.others;
+            return files;
         } catch (const Trouble& trouble) {
-            answers_.begin(false);
             report_trouble(first, second, trouble.what());
             return {};
         }
@@ -72,74 +85,185 @@ class OperandComparison {
         report(outcome);
     }
 
-    void compare_files(const std::string& path1, const std::string& path2) {
-        const auto file1 = open_array_file(path1);
-        const auto file2 = open_array_file(path2);
-        if (file1->is_archive() && file2->is_archive()) {
-            compare_members(path1, *file1, path2, *file2);
-        } else {
-            compare_arrays(path1, *file1, only_member(path1, *file1), path2, *file2,
-                           only_member(path2, *file2));
+    void check_picture_of_many() const {
+        if (!command_line_.picture.empty()) {
+            throw Trouble(command_line_.picture, "cannot show several arrays; compare two, such as "
+                                                 "a.npz[x] and b.npz[x]");
         }
     }
 
-    void compare_members(const std::string& path1, ArrayFile& file1, const std::string& path2,
-                         ArrayFile& file2) {
-        const auto pairs = match_names(file1.members(), file2.members(), command_line_.filter);
-        if (pairs.empty() && !(file1.members().empty() && file2.members().empty())) {
-            throw Trouble(path1,
-                          "has no array that --include and --exclude leave, nor has " + path2);
+    // An open file, and which of its arrays the operand named, if it did.
+    struct Operand {
+        std::string path;
+        std::optional<std::string> member;
+        std::unique_ptr<ArrayFile> file = {};
+    };
+
+    // The name of one of its arrays, in messages and as an operand.
+    static std::string name_of(const Operand& operand, const std::string& array) {
+        return operand.file->is_archive() ? operand.path + "[" + operand.file->root() + array + "]"
+                                          : operand.path;
+    }
+
+    void compare_files(Operand first, Operand second) {
+        open(first);
+        open(second);
+        if (first.file->is_archive() && second.file->is_archive() && !first.member
+            && !second.member) {
+            compare_members(first, second);
+        } else {
+            const std::string member1 = chosen_member(first, second);
+            compare_arrays(first, member1, second, chosen_member(second, first));
         }
+    }
+
+    static void open(Operand& operand) {
+        operand.file = open_array_file(operand.path);
+        if (operand.member && !operand.file->is_archive()) {
+            throw Trouble(operand.path,
+                          "holds one array, without a name; leave out [" + *operand.member + "]");
+        }
+    }
+
+    void compare_members(const Operand& first, const Operand& second) {
+        const auto members1 = first.file->members();
+        const auto members2 = second.file->members();
+        const auto pairs = match_names(members1, members2, command_line_.filter);
+        if (pairs.empty() && !(members1.empty() && members2.empty())) {
+            throw Trouble(first.path, "has no array that --include and --exclude leave, nor has "
+                                          + second.path);
+        }
+        check_picture_of_many();
+        summary_.many = true;
         for (const NamedPair& pair : pairs) {
+            if (summary_.stopped) {
+                return;
+            }
             if (pair.first && pair.second) {
-                guarded(member_name(path1, pair.name), member_name(path2, pair.name),
-                        [&] { compare_arrays(path1, file1, pair.name, path2, file2, pair.name); });
+                guarded(name_of(first, pair.name), name_of(second, pair.name),
+                        [&] { compare_arrays(first, pair.name, second, pair.name); });
             } else {
-                report_single(pair, path1, path2);
+                const Operand& owner = pair.first ? first : second;
+                report_single(pair, owner.file->root() + pair.name, first.path, second.path);
             }
         }
     }
 
-    // The member to be compared with a file of one array.
-    std::string only_member(const std::string& path, const ArrayFile& file) const {
-        if (!file.is_archive()) {
+    // The array of the operand that is compared with one of the other operand.
+    std::string chosen_member(const Operand& operand, const Operand& other) const {
+        if (!operand.file->is_archive()) {
             return "";
         }
-        const auto members = match_names(file.members(), {}, command_line_.filter);
-        if (members.size() != 1) {
-            throw Trouble(path, "has " + std::to_string(members.size())
-                                    + " arrays, the other file one; choose one with --include");
+        const auto names = operand.file->members();
+        const auto has = [&names](const std::string& name) {
+            return std::find(names.begin(), names.end(), name) != names.end();
+        };
+        if (operand.member) {
+            if (!has(*operand.member)) {
+                throw Trouble(operand.path, "has no array '" + *operand.member + "'" + some(names));
+            }
+            return *operand.member;
         }
-        return members.front().name;
+        const auto members = match_names(names, {}, command_line_.filter);
+        if (members.size() == 1) {
+            return members.front().name;
+        }
+        if (other.member && has(*other.member)) {
+            return *other.member;
+        }
+        throw Trouble(operand.path, "has " + std::to_string(members.size())
+                                        + " arrays, the other operand one; choose one, such as "
+                                        + operand.path + "[" + operand.file->root()
+                                        + (names.empty() ? "NAME" : names.front()) + "]");
     }
 
-    static std::string member_name(const std::string& path, const std::string& member) {
-        return path + "[" + member + "]";
+    // Some of the arrays that a file has, for a message.
+    static std::string some(const std::vector<std::string>& names) {
+        constexpr std::size_t most = 5;
+        std::string text;
+        for (std::size_t i = 0; i < std::min(most, names.size()); ++i) {
+            text += (i == 0 ? "; it has " : ", ") + names[i];
+        }
+        return text + (names.size() > most ? ", ..." : "");
     }
 
-    void compare_arrays(const std::string& path1, ArrayFile& file1, const std::string& member1,
-                        const std::string& path2, ArrayFile& file2, const std::string& member2) {
-        NamedArray first{file1.is_archive() ? member_name(path1, member1) : path1, nullptr};
-        NamedArray second{file2.is_archive() ? member_name(path2, member2) : path2, nullptr};
-        first.source = file1.open(member1);
-        second.source = file2.open(member2);
+    // An array, or why it is none of numbers.
+    struct OpenedArray {
+        NamedArray array;
+        std::optional<std::string> not_numbers;
+    };
+
+    static OpenedArray open_array(const Operand& operand, const std::string& member) {
+        OpenedArray opened;
+        opened.array.name = name_of(operand, member);
+        try {
+            opened.array.source = operand.file->open(member);
+        } catch (const NotNumbers& reason) {
+            opened.not_numbers = reason.what();
+        }
+        return opened;
+    }
+
+    NamedArray open_mask() const {
+        NamedArray mask;
+        if (!command_line_.ignore.empty()) {
+            Operand operand;
+            std::tie(operand.path, operand.member) = split_member(command_line_.ignore);
+            open(operand);
+            const std::string member = chosen_member(operand, {});
+            mask.name = name_of(operand, member);
+            mask.source = operand.file->open(member);
+        }
+        return mask;
+    }
+
+    void compare_arrays(const Operand& operand1, const std::string& member1,
+                        const Operand& operand2, const std::string& member2) {
+        OpenedArray first = open_array(operand1, member1);
+        OpenedArray second = open_array(operand2, member2);
         Outcome outcome;
-        outcome.first = first.name;
-        outcome.second = second.name;
-        outcome.comparison =
-            compare(std::move(first), std::move(second), command_line_.question, progress_);
+        outcome.first = first.array.name;
+        outcome.second = second.array.name;
+        if (first.not_numbers || second.not_numbers) {
+            // One that is and one that is not are never the same.
+            const bool both = first.not_numbers && second.not_numbers;
+            outcome.kind =
+                command_line_.skip_others && both ? Outcome::Kind::skipped : Outcome::Kind::trouble;
+            outcome.message = *(first.not_numbers ? first.not_numbers : second.not_numbers);
+            report(outcome);
+            return;
+        }
+        outcome.comparison = compare(std::move(first.array), std::move(second.array), open_mask(),
+                                     command_line_.question, progress_);
         if (outcome.comparison.difference != Difference::none) {
             outcome.kind = Outcome::Kind::different;
         }
         report(outcome);
+        draw(outcome.comparison);
     }
 
-    void report_single(const NamedPair& pair, const std::string& first, const std::string& second) {
+    // The last map is the one of the picture.
+    void draw(const Comparison& comparison) const {
+        const std::string& path = command_line_.picture;
+        if (path.empty()) {
+            return;
+        }
+        if (comparison.maps.empty()) {
+            std::fprintf(stderr, "talcmp: note: %s: not drawn, as there are no pairs of elements\n",
+                         shown(path).c_str());
+            return;
+        }
+        write_picture(comparison, *comparison.maps.back(), path);
+    }
+
+    // `name` is that of the array or file, as messages have it.
+    void report_single(const NamedPair& pair, const std::string& name, const std::string& first,
+                       const std::string& second) {
         Outcome outcome;
         outcome.kind = pair.first ? Outcome::Kind::only_in_first : Outcome::Kind::only_in_second;
         outcome.first = first;
         outcome.second = second;
-        outcome.name = pair.name;
+        outcome.name = name;
         report(outcome);
     }
 
@@ -151,6 +275,10 @@ class OperandComparison {
             std::fprintf(stderr, "talcmp: %s\n", outcome.message.c_str());
         }
         answers_.print(outcome);
+        const bool differs = outcome.kind == Outcome::Kind::different
+                             || outcome.kind == Outcome::Kind::only_in_first
+                             || outcome.kind == Outcome::Kind::only_in_second;
+        summary_.stopped = command_line_.only_first && differs;
     }
 
     const CommandLine& command_line_;

@@ -4,6 +4,8 @@
 
 #include <algorithm>
 #include <filesystem>
+#include <iterator>
+#include <string_view>
 #include <system_error>
 #include <utility>
 #include <vector>
@@ -26,8 +28,11 @@ std::optional<Identity> identity_of(const fs::path& folder) {
 }
 
 bool is_called_like_an_array(const fs::path& path) {
-    const fs::path extension = path.extension();
-    return extension == ".npy" || extension == ".npz";
+    constexpr std::string_view extensions[] = {".npy", ".npz", ".h5",  ".hdf5",
+                                               ".he5", ".nc",  ".nc4", ".cdf"};
+    const std::string extension = path.extension().string();
+    return std::find(std::begin(extensions), std::end(extensions), extension)
+           != std::end(extensions);
 }
 
 // Whether nothing has this name; a link that leads nowhere is something.
@@ -40,7 +45,7 @@ class Walk {
   public:
     explicit Walk(const fs::path& folder) : top_(folder) { enter(folder); }
 
-    FilesByName files() && { return std::move(files_); }
+    FolderFiles files() && { return std::move(found_); }
 
   private:
     void enter(const fs::path& folder) {
@@ -79,6 +84,8 @@ class Walk {
         } else if (fs::exists(status)) {
             if (is_called_like_an_array(path)) {
                 add(path, reason_not_to_open(path.string()));
+            } else {
+                found_.others.insert(name_of(path));
             }
         } else if (!is_gone(path)) {
             add(path, "cannot be followed: " + error.message());
@@ -94,17 +101,21 @@ class Walk {
     }
 
     void add(const fs::path& path, std::optional<std::string> trouble) {
-        files_[path.lexically_relative(top_).string()] = {path.string(), std::move(trouble)};
+        found_.files[name_of(path)] = {path.string(), std::move(trouble)};
+    }
+
+    std::string name_of(const fs::path& path) const {
+        return path.lexically_relative(top_).string();
     }
 
     fs::path top_;
-    FilesByName files_;
+    FolderFiles found_;
     std::vector<Identity> open_; // the folders that the walk is in
 };
 
 } // namespace
 
-FilesByName files_in(const std::string& folder) {
+FolderFiles files_in(const std::string& folder) {
     return Walk(folder).files();
 }
 

@@ -4,6 +4,7 @@
 
 #include <map>
 #include <optional>
+#include <set>
 #include <string>
 
 namespace talcmp {
@@ -15,12 +16,18 @@ struct FolderFile {
 
 using FilesByName = std::map<std::string, FolderFile>;
 
-// All .npy and .npz files in a folder and in those below it, by their paths in the folder. Links to
-// folders are followed. Throws Trouble when the folder itself cannot be read.
+struct FolderFiles {
+    FilesByName files;
+    std::set<std::string> others; // the names of files that are not called like arrays
+};
+
+// All files in a folder and in those below it that are called like files of arrays, by their paths
+// in the folder. Links to folders are followed. Throws Trouble when the folder itself cannot be
+// read.
 //
 // What cannot be read is listed with its trouble, whatever its name, as it may hide arrays: a
 // folder without permission, a link that leads nowhere or back to a folder that it is in.
-FilesByName files_in(const std::string& folder);
+FolderFiles files_in(const std::string& folder);
 
 // Why a file that was not named itself must not be opened; nothing if it may be. Opening a pipe
 // waits for a writer, which may never come.

@@ -8,6 +8,7 @@
 #include <filesystem>
 #include <iterator>
 #include <map>
+#include <set>
 #include <system_error>
 
 #include <fnmatch.h>
@@ -96,11 +97,12 @@ FilesByName files_that_match(const std::string& pattern) {
 }
 
 // What an operand stands for, determined once.
-enum class OperandKind { file, standard_input, folder, pattern };
+enum class OperandKind { file, member, standard_input, folder, pattern };
 
 OperandKind kind_of(const std::string& operand) {
     return operand == standard_input_path ? OperandKind::standard_input
            : is_folder(operand)           ? OperandKind::folder
+           : split_member(operand).second ? OperandKind::member
            : is_pattern(operand)          ? OperandKind::pattern
                                           : OperandKind::file;
 }
@@ -109,8 +111,9 @@ bool stands_for_many(const OperandKind kind) {
     return kind == OperandKind::folder || kind == OperandKind::pattern;
 }
 
-FilesByName files_of(const std::string& operand, const OperandKind kind) {
-    return kind == OperandKind::folder ? files_in(operand) : files_that_match(operand);
+FolderFiles files_of(const std::string& operand, const OperandKind kind) {
+    return kind == OperandKind::folder ? files_in(operand)
+                                       : FolderFiles{files_that_match(operand), {}};
 }
 
 // The file of the same name in the folder. Throws Trouble.
@@ -120,6 +123,16 @@ std::string in_folder(const std::string& folder, const std::string& file) {
         throw Trouble(path, *trouble);
     }
     return path;
+}
+
+bool is_file(const std::string& path) {
+    std::error_code error;
+    return path == standard_input_path || fs::is_regular_file(path, error);
+}
+
+// A pattern of members, or the name of one, without the root.
+std::string without_root(const std::string& name) {
+    return name.substr(name.size() > 1 && name.front() == '/' ? 1 : 0);
 }
 
 bool matches_any(const std::vector<std::string>& patterns, const std::string& name) {
@@ -133,29 +146,62 @@ bool accepts(const NameFilter& filter, const std::string& name) {
            && !matches_any(filter.exclude, name);
 }
 
-FilesByName without(FilesByName files, const std::vector<std::string>& exclude) {
-    for (auto file = files.begin(); file != files.end();) {
-        file = matches_any(exclude, file->first) ? files.erase(file) : std::next(file);
-    }
-    return files;
+// Without names that match a pattern.
+FolderFiles without(FolderFiles folder, const std::vector<std::string>& exclude) {
+    const auto remove_from = [&exclude](auto& entries, const auto& name_of) {
+        for (auto entry = entries.begin(); entry != entries.end();) {
+            entry = matches_any(exclude, name_of(*entry)) ? entries.erase(entry) : std::next(entry);
+        }
+    };
+    remove_from(folder.files, [](const auto& file) { return file.first; });
+    remove_from(folder.others, [](const std::string& name) { return name; });
+    return folder;
+}
+
+FilePairs match_many(const FolderFiles& first, const FolderFiles& second) {
+    std::set<std::string> others = first.others;
+    others.insert(second.others.begin(), second.others.end());
+    return {true, matched(first.files, second.files), others.size()};
 }
 
 } // namespace
+
+std::pair<std::string, std::optional<std::string>> split_member(const std::string& operand) {
+    if (operand.empty() || operand.back() != ']' || exists(operand)) {
+        return {operand, std::nullopt};
+    }
+    // Names of files and of members may have brackets too.
+    for (std::size_t bracket = operand.find('['); bracket != std::string::npos;
+         bracket = operand.find('[', bracket + 1)) {
+        std::string path = operand.substr(0, bracket);
+        if (is_file(path)) {
+            const std::string member = operand.substr(bracket + 1, operand.size() - bracket - 2);
+            return {std::move(path), without_root(member)};
+        }
+    }
+    return {operand, std::nullopt};
+}
 
 FilePairs match_files(const std::string& first, const std::string& second,
                       const std::vector<std::string>& exclude) {
     const OperandKind kind1 = kind_of(first);
     const OperandKind kind2 = kind_of(second);
     if (stands_for_many(kind1) && stands_for_many(kind2)) {
-        FilePairs files{true, matched(without(files_of(first, kind1), exclude),
-                                      without(files_of(second, kind2), exclude))};
+        FilePairs files = match_many(without(files_of(first, kind1), exclude),
+                                     without(files_of(second, kind2), exclude));
         if (files.pairs.empty()) {
-            throw Trouble(first, "holds no .npy or .npz file to compare, nor does " + second);
+            throw Trouble(first,
+                          "holds no file of arrays to compare, nor does " + second
+                              + "; in folders, these are the files named *.npy, *.npz, *.h5, "
+                                "*.hdf5, *.he5, *.nc, *.nc4 and *.cdf");
         }
         return files;
     }
-    if (kind1 == OperandKind::standard_input || kind2 == OperandKind::standard_input) {
-        return {false, {{"", first, second}}};
+    if (kind1 == OperandKind::standard_input || kind2 == OperandKind::standard_input
+        || kind1 == OperandKind::member || kind2 == OperandKind::member) {
+        auto [path1, member1] = split_member(first);
+        auto [path2, member2] = split_member(second);
+        return {false, {{"", path1, path2}}, 0, member1, member2};
     }
     if (kind1 == OperandKind::pattern || kind2 == OperandKind::pattern) {
         throw Trouble(kind1 == OperandKind::pattern ? first : second,
@@ -170,10 +216,16 @@ FilePairs match_files(const std::string& first, const std::string& second,
 std::vector<NamedPair> match_names(const std::vector<std::string>& first,
                                    const std::vector<std::string>& second,
                                    const NameFilter& filter) {
-    const auto accepted = [&filter](const std::vector<std::string>& names) {
+    NameFilter of_names;
+    for (const auto list : {&NameFilter::include, &NameFilter::exclude}) {
+        for (const std::string& pattern : filter.*list) {
+            (of_names.*list).push_back(without_root(pattern));
+        }
+    }
+    const auto accepted = [&of_names](const std::vector<std::string>& names) {
         FilesByName result;
         for (const std::string& name : names) {
-            if (accepts(filter, name)) {
+            if (accepts(of_names, name)) {
                 result[name] = {name};
             }
         }

@@ -2,8 +2,10 @@
 
 #pragma once
 
+#include <cstdint>
 #include <optional>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace talcmp {
@@ -17,12 +19,19 @@ struct NamedPair {
 };
 
 struct FilePairs {
-    bool many = false;            // whether folders or patterns were matched by name
-    std::vector<NamedPair> pairs; // of paths
+    bool many = false;                       // whether folders or patterns were matched by name
+    std::vector<NamedPair> pairs;            // of paths
+    std::uint64_t others = 0;                // files in folders whose names are not those of arrays
+    std::optional<std::string> member1 = {}; // the arrays that were named in a pair of files
+    std::optional<std::string> member2 = {};
 };
 
-// Two files; or all .npy and .npz files in two folders, by their paths in the folders; or what
-// matches two patterns, by the names of the files. Throws Trouble.
+// The path of a file and, if the operand is "file[member]" and no file has this name, the member,
+// without the root that messages write before it.
+std::pair<std::string, std::optional<std::string>> split_member(const std::string& operand);
+
+// Two files, or members of them; or all files of arrays in two folders, by their paths in the
+// folders; or what matches two patterns, by the names of the files. Throws Trouble.
 // Names that match a pattern of `exclude` are left out.
 //
 // Links to folders are followed. What may hide arrays and cannot be read is a pair with trouble: a
@@ -37,7 +46,8 @@ struct NameFilter {
     std::vector<std::string> exclude;
 };
 
-// All names of both lists that the filter accepts, in order.
+// All names of both lists that the filter accepts, in order. A pattern may begin with the root that
+// messages write before names.
 std::vector<NamedPair> match_names(const std::vector<std::string>& first,
                                    const std::vector<std::string>& second,
                                    const NameFilter& filter);

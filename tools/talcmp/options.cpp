@@ -66,6 +66,7 @@ std::string hint_for(const std::vector<Option>& options, const std::string& word
 
 // What getopt_long returns.
 constexpr int is_operand = 1;
+constexpr int is_member = '['; // of standard input: -[name]
 constexpr int is_unknown = '?';
 constexpr int lacks_value = ':';
 constexpr int first_long_option = 256; // after all letters
@@ -117,6 +118,8 @@ class Sorter {
                                         letters_.c_str(), long_options_.data(), nullptr);
         if (found == is_operand) {
             sorted_.operands.emplace_back(::optarg);
+        } else if (found == is_member) {
+            sorted_.operands.push_back(std::string("-[") + (::optarg == nullptr ? "" : ::optarg));
         } else if (found >= 0) {
             take_option(word, found);
         }
@@ -179,7 +182,7 @@ class Sorter {
     std::vector<char*> arguments_;
     std::vector<::option> long_options_;
     // "-" returns operands in their places; ":" tells missing values from unknown options.
-    std::string letters_ = "-:";
+    std::string letters_ = "-:[::";
     Words sorted_;
 };
 

@@ -19,12 +19,15 @@ void count(Summary& summary, const Outcome::Kind kind) {
     case Outcome::Kind::trouble:
         ++summary.trouble;
         break;
+    case Outcome::Kind::skipped:
+        ++summary.skipped;
+        break;
     }
 }
 
 std::uint64_t total(const Summary& summary) {
     return summary.same + summary.different + summary.only_in_first + summary.only_in_second
-           + summary.trouble;
+           + summary.trouble + summary.skipped;
 }
 
 int exit_status(const Summary& summary) {

@@ -44,10 +44,10 @@ def read_bytes(path):
     return pathlib.Path(path).read_bytes()
 
 
-def summary(same=0, different=0, only_in_first=0, only_in_second=0, trouble=0):
+def summary(same=0, different=0, only_in_first=0, only_in_second=0, trouble=0, rest=""):
     """The last line about many arrays."""
     return (f"{same} the same, {different} different, {only_in_first} only in the first, "
-            f"{only_in_second} only in the second, {trouble} in trouble\n")
+            f"{only_in_second} only in the second, {trouble} in trouble{rest}\n")
 
 
 class Folder(unittest.TestCase):
@@ -78,6 +78,12 @@ class Folder(unittest.TestCase):
     def save(self, name, values, dtype=None, order=None):
         path = self.path(name)
         np.save(path, np.asarray(values, dtype=dtype, order=order))
+        return path
+
+    def save_as(self, path, values):
+        """Under a name that need not end in .npy."""
+        with open(path, "wb") as file:
+            np.save(file, values)
         return path
 
     def save_archive(self, name, save=np.savez, **arrays):

@@ -1,5 +1,6 @@
 #include "box_comparer.h"
 
+#include <algorithm>
 #include <future>
 
 namespace talcmp {
@@ -11,11 +12,13 @@ bool column_major(const ArraySource& first, const ArraySource& second) {
 // ---- BoxPlan
 
 BoxPlan::BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second,
-                 const Question& question)
-    : traversal_(traversal), first_(first), second_(second), question_(question),
+                 ArraySource* const mask, const Question& question, const DifferenceMaps& maps)
+    : traversal_(traversal), first_(first), second_(second), mask_(mask), question_(question),
+      maps_(maps), tolerance_(tolerance_for(question, first.type(), second.type())),
       as_stored_(question.only_whether && column_major(first, second)),
       in_order_(as_stored_ || !column_major(first, second)),
-      numbers_(as_stored_ ? RowMajorNumbers() : RowMajorNumbers(first)) {}
+      numbers_(as_stored_ ? RowMajorNumbers()
+                          : RowMajorNumbers(first.shape(), first.fortran_order())) {}
 
 std::uint64_t BoxPlan::number_of(const Box& box, const std::size_t i) const {
     return numbers_.of(traversal_.first_position(box, i));
@@ -39,19 +42,37 @@ BoxComparer::BoxComparer(const BoxPlan& plan)
     : plan_(plan),
       buffer1_(new unsigned char[plan.traversal().largest_box() * plan.first().type().size]),
       buffer2_(new unsigned char[plan.traversal().largest_box() * plan.second().type().size]),
-      counter_(plan.question().tolerance), findings_{FirstPairs(plan.question().differences), {}} {}
+      mask_(plan.mask() == nullptr ? nullptr : new unsigned char[plan.traversal().largest_box()]),
+      chosen_(plan.question()), counter_(plan.tolerance()),
+      maps_(plan.maps(), plan.traversal(), column_major(plan.first(), plan.second())),
+      findings_{FirstPairs(plan.question().differences), {}} {}
 
 std::uint64_t BoxComparer::compare(const Box& box) {
+    // So few that what is chosen stays in the first cache.
+    constexpr std::size_t at_once = 2048;
     read(box);
     const Pairs pairs(plan_.first().type(), buffer1_.get(), plan_.second().type(), buffer2_.get(),
                       box.count);
-    if (plan_.question().report) {
-        const auto number = [&](const std::size_t i) { return plan_.number_of(box, i); };
-        counter_.add(pairs, number, plan_.in_order(), findings_);
-    } else {
-        find_different(pairs, box);
+    const std::size_t length = plan_.chooses() ? at_once : box.count;
+    for (std::size_t begin = 0; begin < box.count; begin += length) {
+        chosen_.choose(pairs, begin, std::min(length, box.count - begin), mask_.get());
+        compare(chosen_.asked(), chosen_.stored(), box);
     }
     return findings_.first.bound();
+}
+
+void BoxComparer::compare(const Pairs& asked, const Pairs& stored, const Box& box) {
+    findings_.totals.ignored += chosen_.left_out();
+    if (stored.count() == 0) {
+        return;
+    }
+    if (plan_.question().report) {
+        const auto number = [&](const std::size_t i) { return number_of(box, i); };
+        const auto& found = counter_.add(asked, stored, number, plan_.in_order(), findings_);
+        maps_.add(box, chosen_, found);
+    } else {
+        find_different(asked, stored, box);
+    }
 }
 
 void BoxComparer::read(const Box& box) {
@@ -66,13 +87,16 @@ void BoxComparer::read(const Box& box) {
                              read_second);
     traversal.read(Side::first, plan_.first(), box, buffer1_.get());
     second.get();
+    if (plan_.mask() != nullptr) {
+        traversal.read(Side::mask, *plan_.mask(), box, mask_.get());
+    }
 }
 
-void BoxComparer::find_different(const Pairs& pairs, const Box& box) {
-    const talreal tolerance = plan_.question().tolerance;
-    for (std::size_t i = pairs.find_different(tolerance, 0); i < pairs.count();
-         i = pairs.find_different(tolerance, i + 1)) {
-        const bool wanted = findings_.first.add(found_pair(pairs, i, plan_.number_of(box, i)));
+void BoxComparer::find_different(const Pairs& asked, const Pairs& stored, const Box& box) {
+    const talreal tolerance = plan_.tolerance();
+    for (std::size_t i = asked.find_different(tolerance, 0); i < asked.count();
+         i = asked.find_different(tolerance, i + 1)) {
+        const bool wanted = findings_.first.add(found_pair(stored, i, number_of(box, i)));
         if (!wanted && plan_.in_order()) {
             return; // later ones have higher numbers still
         }

@@ -4,7 +4,9 @@
 #pragma once
 
 #include "array_source.h"
+#include "chosen_pairs.h"
 #include "layout.h"
+#include "map_filler.h"
 #include "pair_counter.h"
 #include "question.h"
 #include "traversal.h"
@@ -21,13 +23,22 @@ bool column_major(const ArraySource& first, const ArraySource& second);
 // What all boxes of a comparison have in common. Keeps references to what it is constructed from.
 class BoxPlan {
   public:
-    BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second,
-            const Question& question);
+    // `mask` may be null.
+    BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second, ArraySource* mask,
+            const Question& question, const DifferenceMaps& maps);
 
     const Traversal& traversal() const { return traversal_; }
     ArraySource& first() const { return first_; }
     ArraySource& second() const { return second_; }
+    ArraySource* mask() const { return mask_; }
     const Question& question() const { return question_; }
+    const DifferenceMaps& maps() const { return maps_; }
+
+    // Whether the module is asked about other pairs than those that are stored.
+    bool chooses() const { return mask_ != nullptr || Allowances(question_).any(); }
+
+    // In binary digits, for the types of the two arrays.
+    talreal tolerance() const { return tolerance_; }
 
     // Whether the numbers of pairs ascend from each to the next, in a box and from box to box.
     bool in_order() const { return in_order_; }
@@ -51,7 +62,10 @@ class BoxPlan {
     const Traversal& traversal_;
     ArraySource& first_;
     ArraySource& second_;
+    ArraySource* mask_;
     const Question& question_;
+    const DifferenceMaps& maps_;
+    talreal tolerance_;
     bool as_stored_;
     bool in_order_;
     RowMajorNumbers numbers_;
@@ -70,12 +84,21 @@ class BoxComparer {
 
   private:
     void read(const Box& box);
-    void find_different(const Pairs& pairs, const Box& box);
+    void compare(const Pairs& asked, const Pairs& stored, const Box& box);
+    void find_different(const Pairs& asked, const Pairs& stored, const Box& box);
+
+    // The number of one of the chosen pairs.
+    std::uint64_t number_of(const Box& box, const std::size_t i) const {
+        return plan_.number_of(box, chosen_.index_of(i));
+    }
 
     const BoxPlan& plan_;
     std::unique_ptr<unsigned char[]> buffer1_;
     std::unique_ptr<unsigned char[]> buffer2_;
+    std::unique_ptr<unsigned char[]> mask_;
+    ChosenPairs chosen_;
     PairCounter counter_;
+    MapFiller maps_;
     Findings findings_;
 };
 

@@ -63,7 +63,7 @@ class BoxQueue {
 // The work of each thread.
 void take_boxes(const BoxPlan& plan, BoxQueue& queue, BoxComparer& comparer,
                 ProgressListener& progress) {
-    remember_factor_of(plan.question().tolerance);
+    remember_factor_of(plan.tolerance());
     while (const auto number = queue.next_box()) {
         try {
             const Box box = plan.traversal().box(*number);
@@ -105,7 +105,14 @@ unsigned thread_count(const BoxPlan& plan) {
     const unsigned allowed = plan.question().threads;
     const unsigned wanted =
         allowed != 0 ? allowed : std::clamp(std::thread::hardware_concurrency(), 1U, most);
-    return static_cast<unsigned>(std::min<std::uint64_t>(wanted, plan.traversal().box_count()));
+    // Large blocks are read by fewer threads, so that these take no more memory than many would
+    // take for small ones.
+    constexpr std::uint64_t most_bytes = std::uint64_t{48} << 20U;
+    const std::uint64_t bytes = plan.traversal().largest_box() * plan.bytes_of_pair();
+    const std::uint64_t in_memory =
+        allowed != 0 ? wanted : std::max<std::uint64_t>(most_bytes / bytes, 1);
+    return static_cast<unsigned>(
+        std::min({std::uint64_t{wanted}, in_memory, plan.traversal().box_count()}));
 }
 
 Findings compare_boxes(const BoxPlan& plan, const unsigned threads, ProgressListener& progress) {

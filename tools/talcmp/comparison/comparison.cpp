@@ -2,28 +2,32 @@
 
 #include "compare_boxes.h"
 #include "layout.h"
+#include "shape_text.h"
 #include "temporary_copy.h"
 #include "traversal.h"
 #include "trouble.h"
 
 #include <algorithm>
+#include <iterator>
 #include <new>
 #include <stdexcept>
 
 namespace talcmp {
 namespace {
 
-View selected(const NamedArray& array, const Selection& selection) {
+View selected(const NamedArray& array, const Question& question) {
     try {
-        return select(*array.source, selection);
+        const View view = select(*array.source, question.selection);
+        return question.squeeze ? squeezed(view) : view;
     } catch (const std::invalid_argument& error) {
         throw Trouble(array.name, error.what());
     }
 }
 
 ArrayFacts facts_of(const NamedArray& array, const View& view) {
-    return {array.name, &array.source->type(), array.source->shape(), view.shape,
-            array.source->fortran_order()};
+    return {
+        array.name, &array.source->type(),        array.source->type_name(), array.source->shape(),
+        view.shape, array.source->fortran_order()};
 }
 
 // ---- From what was found to what is reported
@@ -35,6 +39,7 @@ void find_samenesses(const BoxPlan& plan, std::vector<FoundPair>& pairs) {
     constexpr std::size_t at_once = 4096;
     std::vector<unsigned char> elements1(std::min(pairs.size(), at_once) * type1.size);
     std::vector<unsigned char> elements2(std::min(pairs.size(), at_once) * type2.size);
+    Allowances allowances(plan.question());
     DigitSearch search;
     for (std::size_t begin = 0; begin < pairs.size(); begin += at_once) {
         const std::size_t count = std::min(at_once, pairs.size() - begin);
@@ -42,6 +47,9 @@ void find_samenesses(const BoxPlan& plan, std::vector<FoundPair>& pairs) {
         for (std::size_t i = 0; i < count; ++i) {
             std::copy_n(first[i].element1.data(), type1.size, &elements1[i * type1.size]);
             std::copy_n(first[i].element2.data(), type2.size, &elements2[i * type2.size]);
+        }
+        if (allowances.any()) {
+            allowances.apply(type1, elements1.data(), type2, elements2.data(), count);
         }
         const auto& found =
             search.search(Pairs(type1, elements1.data(), type2, elements2.data(), count));
@@ -52,8 +60,14 @@ void find_samenesses(const BoxPlan& plan, std::vector<FoundPair>& pairs) {
 }
 
 Place place_of(const BoxPlan& plan, const FoundPair& pair) {
-    const Pairs pairs(plan.first().type(), pair.element1.data(), plan.second().type(),
-                      pair.element2.data(), 1);
+    const ElementType& type1 = plan.first().type();
+    const ElementType& type2 = plan.second().type();
+    FoundPair asked = pair;
+    Allowances allowances(plan.question());
+    if (allowances.any()) {
+        allowances.apply(type1, asked.element1.data(), type2, asked.element2.data(), 1);
+    }
+    const Pairs pairs(type1, asked.element1.data(), type2, asked.element2.data(), 1);
     return {plan.index_of(pair.number), pair.element1, pair.element2,
             verdict_on(pairs, 0, *pair.sameness)};
 }
@@ -83,19 +97,68 @@ Report report_on(const BoxPlan& plan, const Totals& totals) {
 
 // ---- The elements
 
-void make_readable_in_any_order(NamedArray& array, ProgressListener& progress) {
-    if (!array.source->random_access()) {
-        array.source = std::make_unique<TemporaryCopy>(
-            std::move(array.source), [&](const std::uint64_t bytes) { progress.advance(bytes); });
-    }
+// What is compared, and where it is in each array; `mask` has no source where there is no mask.
+struct SelectedArrays {
+    NamedArray& first;
+    NamedArray& second;
+    NamedArray& mask;
+    View view1, view2, mask_view;
+};
+
+Traversal traversal_of(const SelectedArrays& arrays) {
+    const std::size_t size =
+        std::max(arrays.first.source->type().size, arrays.second.source->type().size);
+    return {arrays.view1, arrays.view2, column_major(*arrays.first.source, *arrays.second.source),
+            size, arrays.mask.source == nullptr ? nullptr : &arrays.mask_view};
 }
 
-// The size of the copy of an array that can be read only once, in an order that is not the one
-// wanted.
-std::uint64_t bytes_to_copy(const Traversal& traversal, const ArraySource& source) {
-    return traversal.is_linear() || source.random_access()
-               ? 0
-               : element_count(source) * source.type().size;
+void copy_to_file(NamedArray& array, ProgressListener& progress) {
+    array.source = std::make_unique<TemporaryCopy>(
+        std::move(array.source), [&](const std::uint64_t bytes) { progress.advance(bytes); });
+}
+
+// Whether whole blocks of both arrays take so much memory that one of them is better copied.
+bool blocks_clash(const SelectedArrays& arrays) {
+    constexpr std::uint64_t most_bytes = std::uint64_t{32} << 20U;
+    if (arrays.view1.blocks.empty() || arrays.view2.blocks.empty()) {
+        return false;
+    }
+    const std::uint64_t both = smallest_box(arrays.view1, arrays.view2);
+    const std::uint64_t larger = std::max(smallest_box(arrays.view1, arrays.view1),
+                                          smallest_box(arrays.view2, arrays.view2));
+    const std::size_t bytes = arrays.first.source->type().size + arrays.second.source->type().size;
+    return both > larger && both > most_bytes / bytes;
+}
+
+// Copies what cannot be read in the order in which it is compared; otherwise a block might have to
+// be read twice, or something again that can be read only once.
+void make_readable(SelectedArrays& arrays, const Question& question, ProgressListener& progress) {
+    const bool clash = blocks_clash(arrays);
+    const bool linear = traversal_of(arrays).is_linear();
+    const auto needs_copy = [linear](const NamedArray& array) {
+        return !linear && !array.source->random_access();
+    };
+    const bool mask_in_blocks =
+        arrays.mask.source != nullptr && !arrays.mask.source->block().empty();
+    const bool copies[] = {needs_copy(arrays.first), clash || needs_copy(arrays.second),
+                           arrays.mask.source != nullptr
+                               && (mask_in_blocks || needs_copy(arrays.mask))};
+    NamedArray* const each[] = {&arrays.first, &arrays.second, &arrays.mask};
+    const auto bytes_of = [](const NamedArray& array) {
+        return element_count(*array.source) * array.source->type().size;
+    };
+    std::uint64_t total = traversal_of(arrays).pair_count()
+                          * (arrays.first.source->type().size + arrays.second.source->type().size);
+    for (std::size_t i = 0; i < std::size(each); ++i) {
+        total += copies[i] ? bytes_of(*each[i]) : 0;
+    }
+    progress.begin(total);
+    for (std::size_t i = 0; i < std::size(each); ++i) {
+        if (copies[i]) {
+            copy_to_file(*each[i], progress);
+        }
+    }
+    arrays.view2 = clash ? selected(arrays.second, question) : arrays.view2;
 }
 
 // How much memory the comparison may need, for the message when there is not enough.
@@ -111,20 +174,16 @@ std::string memory_text(const BoxPlan& plan, const std::string& other_name,
            + " for differences; fewer --threads and --max-differences take less";
 }
 
-void compare_elements(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
-                      const Question& question, ProgressListener& progress, Comparison& result) {
-    const std::size_t size1 = first.source->type().size;
-    const std::size_t size2 = second.source->type().size;
-    const Traversal traversal(view1, view2, column_major(*first.source, *second.source),
-                              std::max(size1, size2));
-    progress.begin(traversal.pair_count() * (size1 + size2)
-                   + bytes_to_copy(traversal, *first.source)
-                   + bytes_to_copy(traversal, *second.source));
-    if (!traversal.is_linear()) {
-        make_readable_in_any_order(first, progress);
-        make_readable_in_any_order(second, progress);
+void compare_elements(SelectedArrays arrays, const Question& question, ProgressListener& progress,
+                      Comparison& result) {
+    make_readable(arrays, question, progress);
+    const Traversal traversal = traversal_of(arrays);
+    for (const auto& room_for : question.maps) {
+        const Shape& shape = arrays.view1.shape;
+        result.maps.push_back(std::make_shared<DifferenceMap>(shape, room_for(shape)));
     }
-    const BoxPlan plan(traversal, *first.source, *second.source, question);
+    const BoxPlan plan(traversal, *arrays.first.source, *arrays.second.source,
+                       arrays.mask.source.get(), question, result.maps);
     const unsigned threads = thread_count(plan);
     try {
         const Findings findings = compare_boxes(plan, threads, progress);
@@ -133,20 +192,21 @@ void compare_elements(NamedArray& first, NamedArray& second, const View& view1, 
             result.report = report_on(plan, findings.totals);
         }
     } catch (const std::bad_alloc&) {
-        throw Trouble(first.name, memory_text(plan, second.name, threads));
+        throw Trouble(arrays.first.name, memory_text(plan, arrays.second.name, threads));
     }
 }
 
 // For arrays of one shape.
-void compare_contents(NamedArray& first, NamedArray& second, const View& view1, const View& view2,
-                      const Question& question, ProgressListener& progress, Comparison& result) {
+void compare_contents(SelectedArrays arrays, const Question& question, ProgressListener& progress,
+                      Comparison& result) {
     if (question.report) {
         result.report.emplace();
     }
-    result.has_elements = has_elements(view1.shape);
-    const bool types_differ = question.strict_type && result.array1.type != result.array2.type;
+    result.has_elements = has_elements(arrays.view1.shape);
+    const bool types_differ =
+        question.strict_type && result.array1.stored_type != result.array2.stored_type;
     if (result.has_elements && (!types_differ || question.report)) {
-        compare_elements(first, second, view1, view2, question, progress, result);
+        compare_elements(std::move(arrays), question, progress, result);
     }
     if (types_differ) {
         result.difference = Difference::type;
@@ -155,23 +215,45 @@ void compare_contents(NamedArray& first, NamedArray& second, const View& view1, 
     }
 }
 
+void check_mask(const NamedArray& mask, const NamedArray& first) {
+    if (mask.source->type_name() != "bool") {
+        throw NotNumbers(mask.name, "has elements of type " + mask.source->type_name()
+                                        + "; --ignore takes an array of booleans");
+    }
+    if (mask.source->shape() != first.source->shape()) {
+        throw Trouble(mask.name, "has the shape " + shape_text(mask.source->shape())
+                                     + ", not that of " + first.name + ", which is "
+                                     + shape_text(first.source->shape()));
+    }
+}
+
 } // namespace
 
-Comparison compare(NamedArray first, NamedArray second, const Question& question,
+Comparison compare(NamedArray first, NamedArray second, NamedArray mask, const Question& question,
                    ProgressListener& progress) {
-    const View view1 = selected(first, question.selection);
-    const View view2 = selected(second, question.selection);
+    const View view1 = selected(first, question);
+    const View view2 = selected(second, question);
     Comparison result;
     result.array1 = facts_of(first, view1);
     result.array2 = facts_of(second, view2);
+    result.tolerance = tolerance_for(question, first.source->type(), second.source->type());
+    View mask_view;
+    if (mask.source != nullptr) {
+        check_mask(mask, first);
+        mask_view = selected(mask, question);
+    }
     // Not by the records' dimensions, which are 32-bit: those of a file may be larger.
     if (view1.shape != view2.shape) {
         result.difference = Difference::shape;
     } else {
-        compare_contents(first, second, view1, view2, question, progress, result);
+        compare_contents({first, second, mask, view1, view2, mask_view}, question, progress,
+                         result);
     }
-    first.source->check_to_end();
-    second.source->check_to_end();
+    for (const NamedArray* const array : {&first, &second, &mask}) {
+        if (array->source != nullptr) {
+            array->source->check_to_end();
+        }
+    }
     return result;
 }
 

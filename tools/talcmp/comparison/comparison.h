@@ -4,6 +4,7 @@
 
 #include "array_source.h"
 #include "findings.h"
+#include "map_filler.h"
 #include "progress_listener.h"
 #include "question.h"
 #include "verdict.h"
@@ -20,9 +21,10 @@ enum class Difference { none, shape, type, elements };
 // What is reported about an array.
 struct ArrayFacts {
     std::string name;
-    const ElementType* type = nullptr;
-    Shape shape;          // of the whole array
-    Shape selected_shape; // of what is compared
+    const ElementType* type = nullptr; // as which elements are compared
+    std::string stored_type;           // the name of the type in the file
+    Shape shape;                       // of the whole array
+    Shape selected_shape;              // of what is compared
     bool fortran_order = false;
 };
 
@@ -46,10 +48,12 @@ struct Report {
 
 struct Comparison {
     ArrayFacts array1, array2;
+    talreal tolerance = 0;    // in binary digits, for the types of the two
     bool has_elements = true; // whether there was any pair to compare
     Difference difference = Difference::none;
     std::vector<Place> places;    // the first that differ, in row-major order
     std::optional<Report> report; // if asked for and the shapes are the same
+    DifferenceMaps maps;          // those of the question, if there is a report of any pairs
 };
 
 // An array, and what messages call it.
@@ -63,7 +67,10 @@ struct NamedArray {
 // of different types differ even if they have no elements. The answer depends neither on how the
 // arrays are stored nor on the number of threads. What can be read only once is read to its end,
 // whatever was found before, as only the end shows that an archive is damaged. Throws Trouble.
-Comparison compare(NamedArray first, NamedArray second, const Question& question,
+//
+// `mask`, if it has a source, is an array of booleans of the shape of the first array: where it is
+// true, nothing is compared.
+Comparison compare(NamedArray first, NamedArray second, NamedArray mask, const Question& question,
                    ProgressListener& progress);
 
 } // namespace talcmp

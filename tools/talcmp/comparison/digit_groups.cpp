@@ -1,9 +1,8 @@
 #include "digit_groups.h"
 
-#include "to_type.h"
+#include "element_parts.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
 #include <cstring>
 #include <limits>
@@ -91,41 +90,6 @@ void sort_parts(const Real* const x, const Real* const y, const std::size_t coun
 
 #endif
 
-// ---- The parts of elements, as reals
-
-template <typename Real, typename T>
-const Real* parts_as(const void* const elements, const std::size_t count, const int part,
-                     Real* const room) {
-    const auto* const values = static_cast<const T*>(elements);
-    if constexpr (is_complex_v<T>) {
-        const auto* const parts = static_cast<const to_real_type_t<T>*>(elements) + part;
-        for (std::size_t i = 0; i < count; ++i) {
-            room[i] = static_cast<Real>(parts[2 * i]);
-        }
-        return room;
-    } else if (part == 1) {
-        std::fill_n(room, count, Real{0});
-        return room;
-    } else if constexpr (std::is_same_v<T, Real>) {
-        return values;
-    } else {
-        for (std::size_t i = 0; i < count; ++i) {
-            room[i] = static_cast<Real>(values[i]);
-        }
-        return room;
-    }
-}
-
-template <typename Real, typename... Types>
-const Real* parts(type_list<Types...> /*types*/, const type_t type, const void* const elements,
-                  const std::size_t count, const int part, std::vector<double>& room) {
-    using Convert = const Real* (*)(const void*, std::size_t, int, Real*);
-    static constexpr std::array<Convert, sizeof...(Types)> convert = {parts_as<Real, Types>...};
-    room.resize(std::max(room.size(), count));
-    return convert.at(static_cast<std::size_t>(type - 1))(elements, count, part,
-                                                          reinterpret_cast<Real*>(room.data()));
-}
-
 bool is_double(const ElementType& type) {
     return !is_integer(type) && type.part_size == sizeof(double);
 }
@@ -136,11 +100,10 @@ template <typename Real>
 void DigitGroups::sort_as(const Pairs& pairs, Group* const groups) {
     const bool complex = is_complex(pairs.type1()) || is_complex(pairs.type2());
     const auto sort_part = [&](const int part, Group* const groups_of_part) {
-        constexpr element_type_list types;
         const Real* const x =
-            parts<Real>(types, pairs.type1().id, pairs.element1(0), pairs.count(), part, parts1_);
+            parts_of<Real>(pairs.type1(), pairs.element1(0), pairs.count(), part, parts1_);
         const Real* const y =
-            parts<Real>(types, pairs.type2().id, pairs.element2(0), pairs.count(), part, parts2_);
+            parts_of<Real>(pairs.type2(), pairs.element2(0), pairs.count(), part, parts2_);
         sort_parts(x, y, pairs.count(), groups_of_part);
     };
     sort_part(0, groups);

@@ -1,6 +1,7 @@
 #include "digits.h"
 
 #include <algorithm>
+#include <cmath>
 #include <limits>
 
 namespace talcmp {
@@ -34,6 +35,12 @@ int all_digits(const ElementType& type1, const ElementType& type2) {
     const bool as_singles = (has_singles(type1) && (has_singles(type2) || is_integer(type2)))
                             || (is_integer(type1) && has_singles(type2));
     return as_singles ? std::numeric_limits<float>::digits : most_digits;
+}
+
+talreal tolerance_for(const Question& question, const ElementType& type1,
+                      const ElementType& type2) {
+    return question.relative ? all_digits(type1, type2) + std::log2(*question.relative)
+                             : question.tolerance;
 }
 
 // From one whole tolerance to the next, no pair stops being the same. The usual answers come first:

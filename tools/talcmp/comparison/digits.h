@@ -4,6 +4,7 @@
 
 #include "digit_groups.h"
 #include "pairs.h"
+#include "question.h"
 
 #include <array>
 #include <cstdint>
@@ -24,6 +25,9 @@ using DigitCounts = std::array<std::uint64_t, more_than_all_digits + 1>;
 // digits takes any two numbers of one sign for the same, and NaNs too: it says nothing about the
 // pair.
 int all_digits(const ElementType& type1, const ElementType& type2);
+
+// The tolerance, in binary digits, under which two elements are compared.
+talreal tolerance_for(const Question& question, const ElementType& type1, const ElementType& type2);
 
 // Under which whole tolerances a pair is the same: perhaps under 0, and from some tolerance
 // upwards. NaNs of the same bits are the same under 0, and yet not under 1.

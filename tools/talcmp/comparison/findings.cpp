@@ -21,6 +21,8 @@ void add(Totals& sum, const Totals& part) {
         sum.digits[i] += part.digits[i];
     }
     sum.needed_from_one = std::max(sum.needed_from_one, part.needed_from_one);
+    sum.ignored += part.ignored;
+    add(sum.largest, part.largest);
     add(sum.values1, part.values1);
     add(sum.values2, part.values2);
     const bool worse = part.worst_digits > sum.worst_digits;

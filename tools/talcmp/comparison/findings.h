@@ -4,6 +4,7 @@
 
 #include "digits.h"
 #include "found_pairs.h"
+#include "largest_differences.h"
 #include "value_counts.h"
 
 #include <cstdint>
@@ -20,6 +21,8 @@ struct Totals {
     int worst_digits = 0;           // of any pair
     std::optional<FoundPair> worst; // the first that differs in that many digits
     ValueCounts values1, values2;
+    LargestDifferences largest;
+    std::uint64_t ignored = 0; // pairs that the mask leaves out; they are counted nowhere else
 };
 
 void add(Totals& sum, const Totals& part);

@@ -17,7 +17,8 @@ namespace talcmp {
 // Room for an element of any type.
 using Element = std::array<unsigned char, largest_element_size>;
 
-// The values are kept, as an array may be readable only once.
+// The values are kept, as an array may be readable only once; as they are stored, without what is
+// allowed beside the tolerance.
 struct FoundPair {
     std::uint64_t number = 0; // of the element in the first array, in row-major order
     Element element1 = {};

@@ -7,9 +7,9 @@
 namespace talcmp {
 namespace {
 
-FoundPair found_pair(const Pairs& pairs, const std::size_t i, const std::uint64_t number,
+FoundPair found_pair(const Pairs& stored, const std::size_t i, const std::uint64_t number,
                      const Sameness sameness) {
-    FoundPair pair = talcmp::found_pair(pairs, i, number);
+    FoundPair pair = talcmp::found_pair(stored, i, number);
     pair.sameness = sameness;
     return pair;
 }
@@ -34,7 +34,7 @@ int worst_digits(const DigitSearch::Result& found) {
     return worst;
 }
 
-void add_worst(const Pairs& pairs, const DigitSearch::Result& found,
+void add_worst(const Pairs& stored, const DigitSearch::Result& found,
                const PairCounter::Numbering& number, const bool in_order, Totals& totals) {
     Totals worst;
     worst.worst_digits = worst_digits(found);
@@ -44,27 +44,39 @@ void add_worst(const Pairs& pairs, const DigitSearch::Result& found,
     if (in_order && worst.worst_digits == totals.worst_digits && totals.worst->number < number(0)) {
         return;
     }
-    for (std::size_t i = 0; i < pairs.count() && !(in_order && worst.worst); ++i) {
+    for (std::size_t i = 0; i < stored.count() && !(in_order && worst.worst); ++i) {
         if (sameness_of(found, i).digits() == worst.worst_digits
             && (!worst.worst || number(i) < worst.worst->number)) {
-            worst.worst = found_pair(pairs, i, number(i), sameness_of(found, i));
+            worst.worst = found_pair(stored, i, number(i), sameness_of(found, i));
         }
     }
     add(totals, worst);
 }
 
+// Whether a number may differ from the other one of its pair. Where the module is asked about the
+// stored pairs, those that are the same under 0 do not.
+bool may_differ(const Pairs& asked, const Pairs& stored, const DigitSearch::Result& found) {
+    return asked.element1(0) != stored.element1(0) || worst_digits(found) != 0;
+}
+
 } // namespace
 
-void PairCounter::add(const Pairs& pairs, const Numbering& number, const bool in_order,
-                      Findings& findings) {
+const DigitSearch::Result& PairCounter::add(const Pairs& asked, const Pairs& stored,
+                                            const Numbering& number, const bool in_order,
+                                            Findings& findings) {
     Totals& totals = findings.totals;
-    totals.pairs += pairs.count();
-    talcmp::add(totals.values1, count_values(pairs.type1().id, pairs.element1(0), pairs.count()));
-    talcmp::add(totals.values2, count_values(pairs.type2().id, pairs.element2(0), pairs.count()));
-    const DigitSearch::Result& found = search_.search(pairs);
+    const std::size_t count = stored.count();
+    totals.pairs += count;
+    talcmp::add(totals.values1, count_values(stored.type1().id, stored.element1(0), count));
+    talcmp::add(totals.values2, count_values(stored.type2().id, stored.element2(0), count));
+    const DigitSearch::Result& found = search_.search(asked);
     add_counts(found, totals);
-    add_differing(pairs, found, number, in_order, findings);
-    add_worst(pairs, found, number, in_order, totals);
+    if (may_differ(asked, stored, found)) {
+        talcmp::add(totals.largest, meter_.measure(stored));
+    }
+    add_differing(asked, stored, found, number, in_order, findings);
+    add_worst(stored, found, number, in_order, totals);
+    return found;
 }
 
 // Whether pairs of this sameness are the same under the tolerance. A pair that is the same under a
@@ -86,9 +98,9 @@ PairCounter::Answer PairCounter::answer_on(const Sameness sameness) const {
     return between && sameness.from_one() == whole + 1 ? Answer::to_be_asked : Answer::different;
 }
 
-void PairCounter::add_differing(const Pairs& pairs, const DigitSearch::Result& found,
-                                const Numbering& number, const bool in_order,
-                                Findings& findings) const {
+void PairCounter::add_differing(const Pairs& asked, const Pairs& stored,
+                                const DigitSearch::Result& found, const Numbering& number,
+                                const bool in_order, Findings& findings) const {
     std::array<Answer, DigitSearch::class_count> answers = {};
     std::uint64_t to_be_asked = 0;
     std::uint64_t different = 0;
@@ -106,13 +118,13 @@ void PairCounter::add_differing(const Pairs& pairs, const DigitSearch::Result& f
     bool wanted = true;
     for (std::size_t i = 0; to_be_asked + (wanted ? different : 0) != 0; ++i) {
         const Answer answer = answers[found.class_of[i]];
-        const bool asked = answer == Answer::to_be_asked;
-        const bool differs = asked ? !pairs.same(tolerance_, i) : answer == Answer::different;
-        to_be_asked -= asked ? 1 : 0;
+        const bool to_ask = answer == Answer::to_be_asked;
+        const bool differs = to_ask ? !asked.same(tolerance_, i) : answer == Answer::different;
+        to_be_asked -= to_ask ? 1 : 0;
         different -= answer == Answer::different ? 1 : 0;
-        findings.totals.differing += asked && differs ? 1 : 0;
+        findings.totals.differing += to_ask && differs ? 1 : 0;
         if (differs && wanted) {
-            wanted = findings.first.add(found_pair(pairs, i, number(i), sameness_of(found, i)))
+            wanted = findings.first.add(found_pair(stored, i, number(i), sameness_of(found, i)))
                      || !in_order;
         }
     }

@@ -55,8 +55,8 @@ AxisRange range_from(const std::string_view text) {
     }
     range.stop = number_from(parts[1]);
     range.step = parts.size() == 3 ? number_from(parts[2]).value_or(1) : 1;
-    if (range.step < 1) {
-        throw std::invalid_argument("the step " + std::to_string(range.step) + " is not positive");
+    if (range.step == 0) {
+        throw std::invalid_argument("a step is 0");
     }
     return range;
 }
@@ -65,8 +65,15 @@ AxisRange range_from(const std::string_view text) {
 
 Selection read_selection(const std::string& text) {
     Selection selection;
+    bool after_ellipsis = false;
     for (const std::string_view part : split(text, ',')) {
-        selection.push_back(range_from(part));
+        if (trimmed(part) != "...") {
+            (after_ellipsis ? selection.last : selection.first).push_back(range_from(part));
+        } else if (after_ellipsis) {
+            throw std::invalid_argument("there is more than one '...'");
+        } else {
+            after_ellipsis = true;
+        }
     }
     return selection;
 }

@@ -14,14 +14,17 @@ namespace talcmp {
 struct AxisRange {
     std::optional<std::int64_t> start;
     std::optional<std::int64_t> stop;
-    std::int64_t step = 1;
+    std::int64_t step = 1;  // not 0
     bool one_index = false; // `start`; the axis goes away
 };
 
-// For the first axes of an array; the others are taken whole.
-using Selection = std::vector<AxisRange>;
+// Ranges for the first axes and for the last ones; those between are taken whole.
+struct Selection {
+    std::vector<AxisRange> first;
+    std::vector<AxisRange> last; // what follows "..."
+};
 
-// Reads "0:10,:,3". Throws std::invalid_argument, whose text says what is wrong.
+// Reads "0:10,:,3" or "0,...,::-1". Throws std::invalid_argument, whose text says what is wrong.
 Selection read_selection(const std::string& text);
 
 } // namespace talcmp

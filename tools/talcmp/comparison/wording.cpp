@@ -1,15 +1,9 @@
 #include "wording.h"
 
+#include "shape_text.h"
+
 namespace talcmp {
 namespace {
-
-std::string joined(const Shape& numbers) {
-    std::string text;
-    for (const std::uint64_t number : numbers) {
-        text += (text.empty() ? "" : ", ") + std::to_string(number);
-    }
-    return text;
-}
 
 bool as_doubles(const Comparison& comparison) {
     return comparison.array1.type != comparison.array2.type;
@@ -38,10 +32,6 @@ std::string text_of(const Reason reason, const Sameness sameness) {
 
 } // namespace
 
-std::string shape_text(const Shape& shape) {
-    return "(" + joined(shape) + (shape.size() == 1 ? ",)" : ")");
-}
-
 std::string first_value_text(const Comparison& comparison, const Place& place) {
     return comparison.array1.type->text(place.element1.data(), as_doubles(comparison));
 }
@@ -68,7 +58,7 @@ std::string difference_text(const Comparison& comparison) {
         return "shape " + shape_text(comparison.array1.selected_shape) + " and "
                + shape_text(comparison.array2.selected_shape);
     case Difference::type:
-        return "type " + comparison.array1.type->name + " and " + comparison.array2.type->name;
+        return "type " + comparison.array1.stored_type + " and " + comparison.array2.stored_type;
     default:
         return place_text(comparison, comparison.places.front());
     }

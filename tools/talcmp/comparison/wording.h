@@ -8,9 +8,6 @@
 
 namespace talcmp {
 
-// As NumPy writes a shape: "()", "(3,)", "(2, 3)".
-std::string shape_text(const Shape& shape);
-
 // A value in digits that read back as the same value, a NaN as its bits. If the types differ, a
 // single is written as a double; otherwise 0.1 in singles and 0.1 in doubles would look alike.
 std::string first_value_text(const Comparison& comparison, const Place& place);

@@ -8,6 +8,8 @@
 
 #include <cmath>
 #include <cstdio>
+#include <optional>
+#include <string>
 
 namespace talcmp {
 namespace {
@@ -24,6 +26,8 @@ const char* kind_text(const Outcome::Kind kind) {
         return "only in first";
     case Outcome::Kind::only_in_second:
         return "only in second";
+    case Outcome::Kind::skipped:
+        return "skipped";
     default:
         return "trouble";
     }
@@ -47,6 +51,14 @@ Json number(const talreal value) {
     return std::isfinite(value) ? Json(value) : Json(number_text(value));
 }
 
+Json number_or_null(const std::optional<double>& value) {
+    return value ? Json(*value) : Json();
+}
+
+Json text_or_null(const std::string& text) {
+    return text.empty() ? Json() : Json(text);
+}
+
 Json digits(const int count) {
     return count > most_digits ? Json() : Json(count);
 }
@@ -54,6 +66,7 @@ Json digits(const int count) {
 Json array_json(const ArrayFacts& array) {
     return {{"name", array.name},
             {"type", array.type->name},
+            {"stored_type", array.stored_type},
             {"shape", array.shape},
             {"selected_shape", array.selected_shape},
             {"order", array.fortran_order ? "Fortran" : "C"}};
@@ -91,8 +104,11 @@ Json report_json(const Comparison& comparison) {
     const Totals& totals = report.totals;
     const auto smallest = report.smallest_tolerance;
     return {{"pairs", totals.pairs},
+            {"ignored", totals.ignored},
             {"differing", totals.differing},
             {"worst", report.worst_place ? place_json(comparison, *report.worst_place) : Json()},
+            {"largest_absolute_difference", number(totals.largest.absolute)},
+            {"largest_relative_difference", number(totals.largest.relative)},
             {"smallest_tolerance", smallest ? Json(*smallest) : Json()},
             {"why_no_tolerance", smallest ? Json() : Json(reason_of_no_tolerance(comparison))},
             {"first_values", values_json(totals.values1)},
@@ -103,6 +119,7 @@ Json report_json(const Comparison& comparison) {
 void write_comparison(JsonWriter& writer, const Comparison& comparison) {
     writer.add("first", array_json(comparison.array1));
     writer.add("second", array_json(comparison.array2));
+    writer.add("tolerance", number(comparison.tolerance));
     writer.add("difference", difference_kind(comparison.difference));
     writer.begin_array("differences");
     for (const Place& place : comparison.places) {
@@ -119,13 +136,19 @@ JsonAnswers::JsonAnswers(const CommandLine& command_line)
 
 JsonAnswers::~JsonAnswers() = default;
 
-void JsonAnswers::begin(const bool /*many*/) {
+void JsonAnswers::begin() {
+    const Question& question = command_line_.question;
     writer_->begin_object();
     writer_->add("talcmp", TALCMP_VERSION);
     writer_->add("format", 1);
-    writer_->add("tolerance", number(command_line_.question.tolerance));
-    writer_->add("strict_type", command_line_.question.strict_type);
-    writer_->add("slice", command_line_.slice.empty() ? Json() : Json(command_line_.slice));
+    writer_->add("tolerance", question.relative ? Json() : number(question.tolerance));
+    writer_->add("relative", number_or_null(question.relative));
+    writer_->add("absolute", number_or_null(question.absolute));
+    writer_->add("equal_nan", question.equal_nan);
+    writer_->add("strict_type", question.strict_type);
+    writer_->add("squeeze", question.squeeze);
+    writer_->add("slice", text_or_null(command_line_.slice));
+    writer_->add("ignore", text_or_null(command_line_.ignore));
     writer_->begin_array("comparisons");
 }
 
@@ -146,6 +169,7 @@ void JsonAnswers::print(const Outcome& outcome) {
         writer_->add("name", outcome.name);
         break;
     case Outcome::Kind::trouble:
+    case Outcome::Kind::skipped:
         writer_->add("names", {outcome.first, outcome.second});
         writer_->add("message", outcome.message);
         break;
@@ -159,7 +183,10 @@ void JsonAnswers::finish(const Summary& summary) {
                              {"different", summary.different},
                              {"only_in_first", summary.only_in_first},
                              {"only_in_second", summary.only_in_second},
-                             {"trouble", summary.trouble}});
+                             {"trouble", summary.trouble},
+                             {"skipped", summary.skipped},
+                             {"other_files", summary.other_files}});
+    writer_->add("stopped", summary.stopped);
     writer_->add("exit_status", talcmp::exit_status(summary));
     writer_->end();
 }

@@ -19,7 +19,7 @@ class JsonAnswers : public Answers {
     JsonAnswers& operator=(const JsonAnswers&) = delete;
     ~JsonAnswers() override;
 
-    void begin(bool many) override;
+    void begin() override;
     void print(const Outcome& outcome) override;
     void finish(const Summary& summary) override;
 

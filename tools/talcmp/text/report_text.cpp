@@ -1,10 +1,12 @@
 #include "report_text.h"
 
 #include "number_text.h"
+#include "shape_text.h"
 #include "wording.h"
 
 #include <algorithm>
 #include <array>
+#include <cmath>
 #include <cstdio>
 
 namespace talcmp {
@@ -18,7 +20,9 @@ std::string line(const std::string& name, const std::string& value) {
 std::string array_text(const ArrayFacts& array) {
     const std::string part =
         array.selected_shape == array.shape ? "" : ", of it " + shape_text(array.selected_shape);
-    return array.type->name + " " + shape_text(array.shape) + part
+    const std::string compared_as =
+        array.stored_type == array.type->name ? "" : " as " + array.type->name;
+    return array.stored_type + compared_as + " " + shape_text(array.shape) + part
            + (array.fortran_order ? ", Fortran order" : "");
 }
 
@@ -37,6 +41,17 @@ std::string digits_text(const int digits) {
     return digits > most_digits ? "more than all" : std::to_string(digits);
 }
 
+std::string tolerance_text(const Comparison& comparison, const Question& question) {
+    std::string text = number_text(comparison.tolerance) + " binary digits";
+    if (question.relative) {
+        text += " (a relative error of " + number_text(*question.relative) + ")";
+    }
+    if (question.absolute) {
+        text += ", or an absolute error of " + number_text(*question.absolute);
+    }
+    return text + (question.equal_nan ? "; NaNs are equal" : "");
+}
+
 std::string smallest_tolerance_text(const Comparison& comparison) {
     const Report& report = *comparison.report;
     if (report.smallest_tolerance) {
@@ -46,6 +61,10 @@ std::string smallest_tolerance_text(const Comparison& comparison) {
     const std::string below =
         none_at_all ? "" : " below all " + std::to_string(report.all_digits) + " digits";
     return "none" + below + "; " + reason_of_no_tolerance(comparison);
+}
+
+std::string largest_text(const double difference) {
+    return std::isinf(difference) ? "infinite" : "at most " + number_text(difference);
 }
 
 // One bar for each number of digits up to the worst.
@@ -78,12 +97,15 @@ std::string report_text(const Comparison& comparison, const Question& question,
     std::string text;
     text += line("first array", array_text(comparison.array1));
     text += line("second array", array_text(comparison.array2));
-    text += line("tolerance", number_text(question.tolerance) + " binary digits");
+    text += line("tolerance", tolerance_text(comparison, question));
     if (!comparison.report) {
         return text;
     }
     const Totals& totals = comparison.report->totals;
     text += line("pairs", std::to_string(totals.pairs));
+    if (totals.ignored != 0) {
+        text += line("ignored", std::to_string(totals.ignored));
+    }
     if (totals.pairs == 0) {
         return text;
     }
@@ -95,6 +117,8 @@ std::string report_text(const Comparison& comparison, const Question& question,
         text += line("worst place", place_text(comparison, *worst));
     }
     text += line("largest difference", digits_text(totals.worst_digits) + " binary digits");
+    text += line("absolute difference", largest_text(totals.largest.absolute));
+    text += line("relative difference", largest_text(totals.largest.relative));
     text += line("smallest tolerance", smallest_tolerance_text(comparison));
     text += line("NaNs", two(totals.values1.nans, totals.values2.nans));
     text += line("infinities", two(totals.values1.infinities, totals.values2.infinities));

@@ -18,9 +18,9 @@ std::string environment(const char* const variable) {
 } // namespace
 
 Terminal Terminal::of_standard_output() {
-    const bool colours =
-        ::isatty(STDOUT_FILENO) == 1 && takes_escapes() && environment("NO_COLOR").empty();
-    return {colours, columns_of(STDOUT_FILENO)};
+    const bool is_terminal = ::isatty(STDOUT_FILENO) == 1;
+    const bool colours = is_terminal && takes_escapes() && environment("NO_COLOR").empty();
+    return {is_terminal, colours, columns_of(STDOUT_FILENO)};
 }
 
 std::string Terminal::coloured(const std::string& text, const Colour colour) const {

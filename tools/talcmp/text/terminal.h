@@ -15,7 +15,10 @@ class Terminal {
     // NO_COLOR is set.
     static Terminal of_standard_output();
 
-    Terminal(const bool colours, const int columns) : colours_(colours), columns_(columns) {}
+    Terminal(const bool is_terminal, const bool colours, const int columns)
+        : is_terminal_(is_terminal), colours_(colours), columns_(columns) {}
+
+    bool is_terminal() const { return is_terminal_; }
 
     std::string coloured(const std::string& text, Colour colour) const;
 
@@ -23,6 +26,7 @@ class Terminal {
     int columns() const { return columns_; }
 
   private:
+    bool is_terminal_;
     bool colours_;
     int columns_;
 };

@@ -2,6 +2,7 @@
 
 #include "report_text.h"
 #include "shown.h"
+#include "text_map.h"
 #include "wording.h"
 
 #include <cstdio>
@@ -14,10 +15,19 @@ void print_line(const std::string& line) {
 }
 
 std::string summary_text(const Summary& summary) {
-    return std::to_string(summary.same) + " the same, " + std::to_string(summary.different)
-           + " different, " + std::to_string(summary.only_in_first) + " only in the first, "
-           + std::to_string(summary.only_in_second) + " only in the second, "
-           + std::to_string(summary.trouble) + " in trouble";
+    std::string text = std::to_string(summary.same) + " the same, "
+                       + std::to_string(summary.different) + " different, "
+                       + std::to_string(summary.only_in_first) + " only in the first, "
+                       + std::to_string(summary.only_in_second) + " only in the second, "
+                       + std::to_string(summary.trouble) + " in trouble";
+    if (summary.skipped != 0) {
+        text += ", " + std::to_string(summary.skipped) + " skipped";
+    }
+    if (summary.other_files != 0) {
+        text += "; " + std::to_string(summary.other_files) + " other "
+                + (summary.other_files == 1 ? "file" : "files");
+    }
+    return text + (summary.stopped ? "; stopped at the first difference" : "");
 }
 
 } // namespace
@@ -26,17 +36,31 @@ void TextAnswers::print(const Outcome& outcome) {
     if (command_line_.quiet || outcome.kind == Outcome::Kind::trouble) {
         return;
     }
-    if (outcome.kind != Outcome::Kind::same) {
+    if (outcome.kind == Outcome::Kind::skipped) {
+        print_line(shown(outcome.first) + " " + shown(outcome.second)
+                   + " are skipped: " + outcome.message);
+    } else if (outcome.kind != Outcome::Kind::same) {
         print_difference(outcome);
-    } else if (many_ || command_line_.verbose || command_line_.question.report) {
+    } else if (command_line_.verbose || command_line_.report) {
         print_line(shown(outcome.first) + " " + shown(outcome.second) + " "
                    + terminal_.coloured("are the same", Colour::green)
                    + (outcome.comparison.has_elements ? "" : " (no elements)"));
     }
     const bool compared =
         outcome.kind == Outcome::Kind::same || outcome.kind == Outcome::Kind::different;
-    if (compared && command_line_.question.report) {
+    if (compared && command_line_.report) {
         const auto text = report_text(outcome.comparison, command_line_.question, terminal_);
+        std::fputs(text.c_str(), stdout);
+        print_map(outcome.comparison);
+    }
+}
+
+// The first map is the one that was asked for here.
+void TextAnswers::print_map(const Comparison& comparison) const {
+    if (terminal_.is_terminal() && !comparison.maps.empty()) {
+        const int digits = all_digits(*comparison.array1.type, *comparison.array2.type);
+        const std::string text =
+            text_map(*comparison.maps.front(), digits, character_set_of_environment(), terminal_);
         std::fputs(text.c_str(), stdout);
     }
 }
@@ -59,9 +83,7 @@ void TextAnswers::print_difference(const Outcome& outcome) const {
 }
 
 void TextAnswers::finish(const Summary& summary) {
-    // For two archives, which may be empty, only with --verbose.
-    const bool one = total(summary) == 1;
-    if ((many_ || (command_line_.verbose && !one)) && !command_line_.quiet) {
+    if (summary.many && !command_line_.quiet) {
         print_line(summary_text(summary));
     }
 }

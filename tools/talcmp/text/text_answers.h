@@ -13,16 +13,16 @@ class TextAnswers : public Answers {
     TextAnswers(const CommandLine& command_line, const Terminal& terminal)
         : command_line_(command_line), terminal_(terminal) {}
 
-    void begin(const bool many) override { many_ = many; }
+    void begin() override {}
     void print(const Outcome& outcome) override;
     void finish(const Summary& summary) override;
 
   private:
     void print_difference(const Outcome& outcome) const;
+    void print_map(const Comparison& comparison) const;
 
     const CommandLine& command_line_;
     Terminal terminal_;
-    bool many_ = false;
 };
 
 } // namespace talcmp
