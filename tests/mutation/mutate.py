@@ -198,10 +198,14 @@ def main():
     WORK.mkdir(parents=True, exist_ok=True)
     memory = Memory()
     reasons, quick = read_list("equivalent.txt"), read_list("quick.txt")
-    outcomes, names = {}, set()
-    for target in TARGETS:
-        there = list(target.mutants())
-        names |= {mutant.name for mutant in there}
+    mutants = {target: list(target.mutants()) for target in TARGETS}
+    names = {mutant.name for there in mutants.values() for mutant in there}
+    # At once, as what is listed in vain would otherwise be told after hours.
+    if stale := [f"listed, but no mutant: {name}" for name in (*reasons, *quick)
+                 if name not in names]:
+        sys.exit("\n".join(stale))
+    outcomes = {}
+    for target, there in mutants.items():
         wanted = [mutant for mutant in there if is_wanted(argument, mutant, quick)]
         if wanted:
             found = outcomes_of(target, wanted, memory)
@@ -209,7 +213,6 @@ def main():
             if len(wanted) == len(there):
                 renew_document(target, found)
     wrong = list(complaints(outcomes, reasons))
-    wrong += [f"listed, but no mutant: {name}" for name in (*reasons, *quick) if name not in names]
     if argument == "":
         REPORT.write_text("".join(f"{line_of(*item)}\n" for item in outcomes.items()),
                           encoding="utf-8")
