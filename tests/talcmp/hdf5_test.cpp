@@ -5,8 +5,8 @@
 #include "array_file.h"
 
 #include "support/hdf5_writer.h"
-#include "support/indices.h"
 #include "support/named_cases.h"
+#include "support/random_slabs.h"
 #include "support/temporary_folder.h"
 #include "support/thrown_message.h"
 
@@ -647,33 +647,9 @@ class Hdf5Layouts : public Hdf5Files, public testing::WithParamInterface<NamedCa
     }
 };
 
-std::uint64_t seed() {
-    const char* const text = std::getenv("TALNUMERICARRAY_SEED");
-    return text != nullptr ? std::strtoull(text, nullptr, 10) : std::random_device()();
-}
-
-Slab random_slab(std::mt19937_64& random) {
-    const auto below = [&random](const std::uint64_t end) { return random() % end; };
-    Slab slab;
-    for (const std::uint64_t extent : shape) {
-        const std::uint64_t begin = below(extent);
-        const std::uint64_t step = 1 + below(3);
-        slab.axes.push_back({begin, 1 + below((extent - begin - 1) / step + 1), step});
-    }
-    return slab;
-}
-
 std::vector<int> expected_in(const Slab& slab) {
-    Shape part;
-    for (const Slab::Axis& axis : slab.axes) {
-        part.push_back(axis.extent);
-    }
     std::vector<int> values;
-    for (const Shape& index : indices_of(part)) {
-        std::uint64_t position = 0;
-        for (std::size_t i = 0; i < shape.size(); ++i) {
-            position = position * shape[i] + slab.axes[i].begin + index[i] * slab.axes[i].step;
-        }
+    for (const std::size_t position : positions_of(slab, shape)) {
         values.push_back(static_cast<int>(position) + 1);
     }
     return values;
@@ -683,12 +659,9 @@ TEST_P(Hdf5Layouts, AreReadInSlabs) {
     const Source source = open(GetParam().name);
     EXPECT_EQ(source->block(), GetParam().block);
     EXPECT_EQ(contents(*source), bytes_of(numbers(count)));
-    const std::uint64_t drawn = seed();
-    SCOPED_TRACE("seed " + std::to_string(drawn));
-    std::cout << "seed " << drawn << '\n';
-    std::mt19937_64 random(drawn);
+    std::mt19937_64 random(drawn_seed());
     for (int i = 0; i < 200; ++i) {
-        const Slab slab = random_slab(random);
+        const Slab slab = random_slab(shape, random);
         const std::vector<int> expected = expected_in(slab);
         std::vector<int> elements(expected.size());
         source->read_slab(slab, elements.data());

@@ -62,20 +62,6 @@ Shape chunk_of(const hid_t creation, const Shape& shape, const std::string& name
     return {extents.begin(), extents.end()};
 }
 
-// No chunk is larger than the array. Without chunks all extents are one, of which any number can
-// be read at once.
-Shape block_of(const hid_t creation, const Shape& shape, const std::string& name) {
-    Shape block(shape.size(), 1);
-    if (::H5Pget_layout(creation) == H5D_CHUNKED) {
-        block = chunk_of(creation, shape, name);
-    }
-    std::transform(block.begin(), block.end(), shape.begin(), block.begin(),
-                   [](const std::uint64_t extent, const std::uint64_t all) {
-                       return std::min(extent, std::max<std::uint64_t>(all, 1));
-                   });
-    return block;
-}
-
 bool is_contiguous(const hid_t creation) {
     return ::H5Pget_layout(creation) == H5D_CONTIGUOUS && ::H5Pget_nfilters(creation) == 0;
 }
@@ -202,8 +188,23 @@ void Hdf5Array::find_elements() {
                      && offset != HADDR_UNDEF;
     if (is_contiguous_) {
         offset_ = offset;
-    } else {
-        block_ = block_of(creation.id(), shape_, name_);
+        return;
+    }
+    find_blocks(creation.id());
+}
+
+// Without chunks all extents are one, of which any number can be read at once. No block is larger
+// than the array.
+void Hdf5Array::find_blocks(const hid_t creation) {
+    block_.assign(shape_.size(), 1);
+    if (::H5Pget_layout(creation) == H5D_CHUNKED) {
+        block_ = chunk_of(creation, shape_, name_);
+        if (type_.as_in_file) {
+            chunks_ = hdf5::Chunks(dataset_.id(), block_, type_.stored.size, name_);
+        }
+    }
+    for (std::size_t axis = 0; axis < shape_.size(); ++axis) {
+        block_[axis] = std::min(block_[axis], std::max<std::uint64_t>(shape_[axis], 1));
     }
 }
 
@@ -228,18 +229,23 @@ void Hdf5Array::read(const std::uint64_t first, const std::uint64_t count, void*
 
 void Hdf5Array::read_slab(const Slab& slab, void* const elements) {
     const std::size_t count = count_of(slab);
-    {
-        const LibraryUse use(name_, hdf5::time_to_read);
-        const Handle in_file = selection_of(dataset_.id(), slab, name_);
-        const Handle in_memory = space_in_memory(slab);
-        if (::H5Dread(dataset_.id(), type_.memory.id(), in_memory.id(), in_file.id(), H5P_DEFAULT,
-                      room_for_stored(type_.stored, elements, count))
-            < 0) {
-            throw_unreadable(dataset_.id(), name_);
-        }
+    void* const stored = room_for_stored(type_.stored, elements, count);
+    if (!chunks_.read(slab, stored)) {
+        read_by_library(slab, stored);
     }
     check_size();
     decode(type_.stored, elements, count);
+}
+
+void Hdf5Array::read_by_library(const Slab& slab, void* const stored) const {
+    const LibraryUse use(name_, hdf5::time_to_read);
+    const Handle in_file = selection_of(dataset_.id(), slab, name_);
+    const Handle in_memory = space_in_memory(slab);
+    if (::H5Dread(dataset_.id(), type_.memory.id(), in_memory.id(), in_file.id(), H5P_DEFAULT,
+                  stored)
+        < 0) {
+        throw_unreadable(dataset_.id(), name_);
+    }
 }
 
 // The library takes what is missing at the end of a file for zeros.

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "array_source.h"
+#include "hdf5_chunks.h"
 #include "hdf5_handles.h"
 #include "hdf5_type.h"
 
@@ -12,7 +13,7 @@
 namespace talcmp {
 
 // Elements that are stored one after another, as numbers of whole bytes, are read by their
-// positions, by several threads at once. The library reads all others, chunk by chunk.
+// positions, by several threads at once. All others are read chunk by chunk.
 class Hdf5Array : public ArraySource {
   public:
     // `name` is what messages call the array, and `location` where it is in the file, which this
@@ -32,6 +33,8 @@ class Hdf5Array : public ArraySource {
   private:
     void find_file();
     void find_elements();
+    void find_blocks(hid_t creation);
+    void read_by_library(const Slab& slab, void* stored) const;
     void check_size() const;
 
     std::shared_ptr<const hdf5::Handle> file_;
@@ -45,6 +48,7 @@ class Hdf5Array : public ArraySource {
     bool is_contiguous_ = false;
     std::uint64_t offset_ = 0; // of the elements in that file, if they are contiguous
     Shape block_;              // empty if they are
+    hdf5::Chunks chunks_;
 };
 
 } // namespace talcmp

@@ -1,0 +1,319 @@
+// Chunks of HDF5 files: which are decompressed here, and which are left to the library.
+
+#include "hdf5_chunks.h"
+
+#include "support/hdf5_writer.h"
+#include "support/random_slabs.h"
+#include "support/temporary_folder.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <random>
+#include <string>
+#include <thread>
+#include <utility>
+#include <vector>
+
+#include <zlib.h>
+
+namespace {
+
+using namespace hdf5_test;
+using talcmp::Shape;
+using talcmp::Slab;
+using talcmp::hdf5::Chunks;
+using Bytes = std::vector<unsigned char>;
+
+const Shape shape = {7, 6, 9};
+const Shape chunk = {3, 2, 4}; // those at the end have elements beyond the shape
+constexpr std::size_t count = 378;
+constexpr std::size_t count_of_chunk = 24;
+
+const Slab whole = {{{0, 7, 1}, {0, 6, 1}, {0, 9, 1}}};
+const Slab first_chunk = {{{0, 3, 1}, {0, 2, 1}, {0, 4, 1}}};
+
+struct Pipeline {
+    bool shuffle = false;
+    bool deflate = false;
+};
+
+const Pipeline pipelines[] = {{false, false}, {false, true}, {true, false}, {true, true}};
+
+Layout layout_of(const Pipeline& pipeline) {
+    Layout layout = Layout::chunked({chunk.begin(), chunk.end()});
+    if (pipeline.shuffle) {
+        done(::H5Pset_shuffle(layout.id()));
+    }
+    if (pipeline.deflate) {
+        done(::H5Pset_deflate(layout.id(), 6));
+    }
+    return layout;
+}
+
+// Few values, so that they can be compressed.
+Bytes random_bytes(const std::size_t size, std::mt19937_64& random) {
+    Bytes bytes(size);
+    std::generate(bytes.begin(), bytes.end(),
+                  [&random] { return static_cast<unsigned char>(random() % 5); });
+    return bytes;
+}
+
+Bytes deflated(const Bytes& bytes) {
+    uLongf size = ::compressBound(static_cast<uLong>(bytes.size()));
+    Bytes result(size);
+    ::compress(result.data(), &size, bytes.data(), static_cast<uLong>(bytes.size()));
+    result.resize(size);
+    return result;
+}
+
+Bytes shuffled(const Bytes& bytes, const std::size_t element_size) {
+    Bytes result;
+    for (std::size_t byte = 0; byte < element_size; ++byte) {
+        for (std::size_t i = byte; i < bytes.size(); i += element_size) {
+            result.push_back(bytes[i]);
+        }
+    }
+    return result;
+}
+
+Bytes elements_at(const Slab& slab, const Bytes& all, const std::size_t size) {
+    Bytes bytes;
+    for (const std::size_t position : positions_of(slab, shape)) {
+        bytes.insert(bytes.end(), &all[position * size], &all[position * size] + size);
+    }
+    return bytes;
+}
+
+std::size_t count_of(const Slab& slab) {
+    return positions_of(slab, shape).size();
+}
+
+class Hdf5Chunks : public testing::Test {
+  protected:
+    // Makes the array; `elements` may be null.
+    void write(const Layout& layout, const std::size_t size, const void* const elements) {
+        const Handle type = made(::H5Tcreate(H5T_OPAQUE, size));
+        size_ = size;
+        name_ = "x" + std::to_string(++arrays_);
+        dataset_ = file_.array(name_, type.id(), space_of({shape.begin(), shape.end()}), layout);
+        if (elements != nullptr) {
+            done(::H5Dwrite(dataset_.id(), type.id(), H5S_ALL, H5S_ALL, H5P_DEFAULT, elements));
+        }
+        reopen();
+    }
+
+    // Writes the first chunk as it is stored, without some of the filters.
+    void store(const Bytes& stored, const std::uint32_t left_out = 0) {
+        const Extents first = {0, 0, 0};
+        done(::H5Dwrite_chunk(dataset_.id(), H5P_DEFAULT, left_out, first.data(), stored.size(),
+                              stored.data()));
+        reopen();
+    }
+
+    bool read(const Slab& slab, Bytes& elements) const {
+        return chunks_.read(slab, elements.data());
+    }
+
+    bool is_left_to_library(const Slab& slab = whole) const {
+        Bytes elements(count_of(slab) * 16);
+        return !read(slab, elements);
+    }
+
+  private:
+    // The library does not know which filters were left out by who wrote with the same handle.
+    void reopen() {
+        dataset_ = {};
+        dataset_ = made(::H5Dopen2(file_.id(), name_.c_str(), H5P_DEFAULT));
+        chunks_ = Chunks(dataset_.id(), chunk, size_, "x");
+    }
+
+    TemporaryFolder folder_;
+    Writer file_{folder_.path_of("a.h5")};
+    int arrays_ = 0;
+    std::string name_;
+    std::size_t size_ = 0;
+    Handle dataset_;
+    Chunks chunks_;
+};
+
+TEST_F(Hdf5Chunks, AreReadInSlabs) {
+    std::mt19937_64 random(drawn_seed());
+    for (const std::size_t size : {1U, 2U, 4U, 8U, 16U}) {
+        for (const Pipeline& pipeline : pipelines) {
+            const Bytes all = random_bytes(count * size, random);
+            write(layout_of(pipeline), size, all.data());
+            for (int i = 0; i < 100; ++i) {
+                const Slab slab = i == 0 ? whole : random_slab(shape, random);
+                Bytes elements(count_of(slab) * size);
+                ASSERT_TRUE(read(slab, elements));
+                ASSERT_EQ(elements, elements_at(slab, all, size))
+                    << "elements of " << size << " bytes";
+            }
+        }
+    }
+}
+
+TEST_F(Hdf5Chunks, MayLackSomeOfTheFilters) {
+    constexpr std::size_t size = 4;
+    std::mt19937_64 random(drawn_seed());
+    const Bytes plain = random_bytes(count_of_chunk * size, random);
+    const Bytes stored[] = {deflated(shuffled(plain, size)), deflated(plain), shuffled(plain, size),
+                            plain};
+    for (std::uint32_t left_out = 0; left_out < 4; ++left_out) {
+        write(layout_of({true, true}), size, nullptr);
+        store(stored[left_out], left_out);
+        Bytes elements(plain.size());
+        EXPECT_TRUE(read(first_chunk, elements));
+        EXPECT_EQ(elements, plain) << left_out;
+    }
+}
+
+TEST_F(Hdf5Chunks, AreReadByThreads) {
+    std::mt19937_64 random(drawn_seed());
+    const Bytes all = random_bytes(count * 8, random);
+    write(layout_of({true, true}), 8, all.data());
+    std::atomic<int> right = 0;
+    std::vector<std::thread> threads;
+    for (int i = 0; i < 4; ++i) {
+        threads.emplace_back([&] {
+            for (int j = 0; j < 50; ++j) {
+                Bytes elements(all.size());
+                right += read(whole, elements) && elements == all ? 1 : 0;
+            }
+        });
+    }
+    for (std::thread& thread : threads) {
+        thread.join();
+    }
+    EXPECT_EQ(right, 200);
+}
+
+// ---- What the library has to read
+
+TEST_F(Hdf5Chunks, OfOtherFiltersAreLeftToTheLibrary) {
+    const Bytes all(count * 4, 1);
+    const std::pair<const char*, std::function<void(hid_t)>> others[] = {
+        {"sums", [](const hid_t layout) { done(::H5Pset_fletcher32(layout)); }},
+        {"sums of what is deflated",
+         [](const hid_t layout) {
+             done(::H5Pset_deflate(layout, 1));
+             done(::H5Pset_fletcher32(layout));
+         }},
+        {"shuffled after deflating",
+         [](const hid_t layout) {
+             done(::H5Pset_deflate(layout, 1));
+             done(::H5Pset_shuffle(layout));
+         }},
+        {"deflated twice",
+         [](const hid_t layout) {
+             done(::H5Pset_deflate(layout, 1));
+             done(::H5Pset_deflate(layout, 1));
+         }},
+        {"whole chunks alone",
+         [](const hid_t layout) {
+             done(::H5Pset_deflate(layout, 1));
+             done(::H5Pset_chunk_opts(layout, H5D_CHUNK_DONT_FILTER_PARTIAL_CHUNKS));
+         }},
+    };
+    for (const auto& [name, set_filters] : others) {
+        const Layout layout = layout_of({});
+        set_filters(layout.id());
+        write(layout, 4, all.data());
+        EXPECT_TRUE(is_left_to_library(first_chunk)) << name;
+    }
+}
+
+TEST_F(Hdf5Chunks, AreLeftToTheLibraryIfOneWasNeverWritten) {
+    write(layout_of({false, true}), 4, nullptr);
+    EXPECT_TRUE(is_left_to_library(first_chunk));
+    store(deflated(Bytes(count_of_chunk * 4)));
+    EXPECT_FALSE(is_left_to_library(first_chunk));
+    EXPECT_TRUE(is_left_to_library());
+}
+
+TEST_F(Hdf5Chunks, ThatAreDamagedAreLeftToTheLibrary) {
+    constexpr std::size_t size = count_of_chunk * 4;
+    const Bytes plain(size, 1);
+    const auto is_left = [this](const Bytes& stored, const std::uint32_t left_out = 0) {
+        write(layout_of({false, true}), 4, nullptr);
+        store(stored, left_out);
+        return is_left_to_library(first_chunk);
+    };
+    EXPECT_FALSE(is_left(plain, 1));
+    EXPECT_TRUE(is_left(Bytes(size - 1), 1));
+    EXPECT_TRUE(is_left(Bytes(size + 1), 1));
+    EXPECT_TRUE(is_left(Bytes(size + 2000)));
+    EXPECT_TRUE(is_left(deflated(Bytes(size - 1))));
+    EXPECT_TRUE(is_left(deflated(Bytes(size + 1))));
+    const Bytes good = deflated(plain);
+    EXPECT_FALSE(is_left(good));
+    for (std::size_t i = 0; i < 8 * good.size(); ++i) {
+        Bytes flipped = good;
+        flipped[i / 8] = static_cast<unsigned char>(flipped[i / 8] ^ (1U << i % 8));
+        Bytes elements(size);
+        // A few bits have no meaning.
+        EXPECT_TRUE(is_left(flipped) || (read(first_chunk, elements) && elements == plain)) << i;
+    }
+}
+
+class LargeHdf5Chunks : public testing::Test {
+  protected:
+    static constexpr std::size_t large = 6400;
+
+    // Of bytes, in one chunk.
+    Chunks write(const Layout& layout) {
+        dataset_ =
+            file_.array("x" + std::to_string(++arrays_), H5T_STD_U8LE, space_of({large}), layout);
+        const Bytes elements(large, 1);
+        done(::H5Dwrite(dataset_.id(), H5T_NATIVE_UCHAR, H5S_ALL, H5S_ALL, H5P_DEFAULT,
+                        elements.data()));
+        done(::H5Dflush(dataset_.id()));
+        return {dataset_.id(), {large}, 1, "x"};
+    }
+
+    static bool reads(const Chunks& chunks, const std::uint64_t elements) {
+        Bytes room(large);
+        return chunks.read({{{0, elements, 1}}}, room.data());
+    }
+
+    Handle dataset_;
+
+  private:
+    TemporaryFolder folder_;
+    Writer file_{folder_.path_of("a.h5")};
+    int arrays_ = 0;
+};
+
+TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfItCanReadAFewElementsOfThem) {
+    const Chunks plain = write(Layout::chunked({large}));
+    EXPECT_TRUE(reads(plain, 100));
+    EXPECT_FALSE(reads(plain, 99));
+    const Layout layout = Layout::chunked({large});
+    done(::H5Pset_deflate(layout.id(), 1));
+    EXPECT_TRUE(reads(write(layout), 1));
+}
+
+TEST_F(LargeHdf5Chunks, AreNotInflatedFromTooFewBytes) {
+    const Layout layout = Layout::chunked({large});
+    done(::H5Pset_deflate(layout.id(), 1));
+    const Chunks chunks = write(layout);
+    const hsize_t begin = 0;
+    const Bytes stored(5);
+    done(::H5Dwrite_chunk(dataset_.id(), H5P_DEFAULT, 0, &begin, stored.size(), stored.data()));
+    EXPECT_FALSE(reads(chunks, large));
+}
+
+TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfTheyAreHuge) {
+    write(Layout::chunked({large}));
+    const std::uint64_t gibibyte = std::uint64_t{1} << 30U;
+    EXPECT_FALSE(reads({dataset_.id(), {gibibyte + 1}, 1, "x"}, large));
+    EXPECT_FALSE(reads({dataset_.id(), {gibibyte}, 2, "x"}, large));
+    EXPECT_FALSE(reads({dataset_.id(), {0}, 1, "x"}, large));
+}
+
+} // namespace

@@ -1,0 +1,295 @@
+#include "hdf5_chunks.h"
+
+#include <algorithm>
+#include <cstring>
+#include <memory>
+#include <utility>
+
+#include <libdeflate.h>
+
+namespace talcmp::hdf5 {
+namespace {
+
+struct FreeDecompressor {
+    void operator()(libdeflate_decompressor* const decompressor) const {
+        ::libdeflate_free_decompressor(decompressor);
+    }
+};
+
+// In bytes. Larger chunks, which are rare or damaged, are the library's matter; so that sizes fit a
+// size_t on all platforms.
+constexpr std::size_t largest_chunk = std::size_t{1} << 30U;
+
+// In bytes; more than `largest_chunk` for all that are larger.
+std::size_t chunk_size(const Shape& extents, const std::size_t element_size) {
+    std::size_t size = element_size;
+    for (const std::uint64_t extent : extents) {
+        if (extent == 0 || size > largest_chunk / extent) {
+            return largest_chunk + 1;
+        }
+        size *= static_cast<std::size_t>(extent);
+    }
+    return size;
+}
+
+// ---- What a slab and a chunk have in common
+
+// Along one axis: `count` indices of the slab from `in_slab`, the first of which is `in_chunk`
+// there.
+struct CommonPart {
+    std::size_t in_slab = 0;
+    std::size_t in_chunk = 0;
+    std::size_t count = 0;
+};
+
+CommonPart common_part(const Slab::Axis& axis, const std::uint64_t begin,
+                       const std::uint64_t extent) {
+    const std::uint64_t first =
+        begin <= axis.begin ? 0 : (begin - axis.begin + axis.step - 1) / axis.step;
+    if (first >= axis.extent || axis.begin + first * axis.step >= begin + extent) {
+        return {};
+    }
+    const std::uint64_t in_chunk = axis.begin + first * axis.step - begin;
+    const std::uint64_t count =
+        std::min(axis.extent - first, (extent - in_chunk - 1) / axis.step + 1);
+    return {static_cast<std::size_t>(first), static_cast<std::size_t>(in_chunk),
+            static_cast<std::size_t>(count)};
+}
+
+// Where the chunks begin that have elements of the slab, along one axis.
+std::vector<std::uint64_t> chunks_along(const Slab::Axis& axis, const std::uint64_t extent) {
+    std::vector<std::uint64_t> begins;
+    for (std::uint64_t i = 0; i < axis.extent;) {
+        const std::uint64_t begin = (axis.begin + i * axis.step) / extent * extent;
+        begins.push_back(begin);
+        i += common_part(axis, begin, extent).count;
+    }
+    return begins;
+}
+
+// The chunks that have elements of the slab, by their first indices.
+std::vector<Shape> chunks_of(const Slab& slab, const Shape& extents) {
+    std::vector<Shape> chunks = {{}};
+    for (std::size_t axis = 0; axis < extents.size(); ++axis) {
+        const std::vector<std::uint64_t> begins = chunks_along(slab.axes[axis], extents[axis]);
+        std::vector<Shape> longer;
+        for (const Shape& chunk : chunks) {
+            for (const std::uint64_t begin : begins) {
+                longer.push_back(chunk);
+                longer.back().push_back(begin);
+            }
+        }
+        chunks = std::move(longer);
+    }
+    return chunks;
+}
+
+// ---- Elements of a chunk
+
+// Copies `count` elements that are `step` apart.
+template <std::size_t size>
+void take(unsigned char* const to, const unsigned char* const from, const std::size_t /*plane*/,
+          const std::size_t step, const std::size_t count) {
+    for (std::size_t i = 0; i < count; ++i) {
+        std::memcpy(to + i * size, from + i * step * size, size);
+    }
+}
+
+// Shuffling puts the first bytes of all elements before their second ones, which begin `plane`
+// bytes later, and so on.
+template <std::size_t size>
+void take_shuffled(unsigned char* const to, const unsigned char* const from,
+                   const std::size_t plane, const std::size_t step, const std::size_t count) {
+    for (std::size_t i = 0; i < count; ++i) {
+        for (std::size_t byte = 0; byte < size; ++byte) {
+            to[i * size + byte] = from[byte * plane + i * step];
+        }
+    }
+}
+
+using Take = void (*)(unsigned char*, const unsigned char*, std::size_t, std::size_t, std::size_t);
+
+Take take_of(const std::size_t element_size, const bool shuffled) {
+    static_assert(largest_element_size == 16, "there is a case for each size");
+    switch (element_size) {
+    case 1:
+        return take<1>; // shuffling changes nothing
+    case 2:
+        return shuffled ? take_shuffled<2> : take<2>;
+    case 4:
+        return shuffled ? take_shuffled<4> : take<4>;
+    case 8:
+        return shuffled ? take_shuffled<8> : take<8>;
+    default:
+        return shuffled ? take_shuffled<16> : take<16>;
+    }
+}
+
+} // namespace
+
+// What is read of a chunk at a time.
+struct Chunks::Bytes {
+    std::vector<unsigned char> stored;
+    std::vector<unsigned char> inflated;
+    bool deflated = false; // so that it is in `inflated`, else in `stored`
+    bool shuffled = false;
+    std::unique_ptr<libdeflate_decompressor, FreeDecompressor> decompressor;
+
+    const unsigned char* elements() const { return (deflated ? inflated : stored).data(); }
+};
+
+Chunks::Chunks(const hid_t dataset, Shape chunk, const std::size_t element_size, std::string name)
+    : dataset_(dataset), element_size_(element_size), name_(std::move(name)) {
+    const LibraryUse use(name_);
+    const Handle creation(::H5Dget_create_plist(dataset));
+    size_ = chunk_size(chunk, element_size);
+    if (size_ <= largest_chunk && know_filters(creation.id())) {
+        extents_ = std::move(chunk);
+    }
+}
+
+// Notes the filters. Returns false if others, or others in this order, were applied.
+bool Chunks::know_filters(const hid_t creation) {
+    unsigned options = 0;
+    if (::H5Pget_chunk_opts(creation, &options) < 0 || options != 0) {
+        return false;
+    }
+    const int count = ::H5Pget_nfilters(creation);
+    for (int i = 0; i < count; ++i) {
+        unsigned flags = 0;
+        unsigned parameter = 0; // the first one: when shuffling, the size of an element
+        std::size_t parameters = 1;
+        const H5Z_filter_t filter = ::H5Pget_filter2(creation, static_cast<unsigned>(i), &flags,
+                                                     &parameters, &parameter, 0, nullptr, nullptr);
+        const std::uint32_t bit = std::uint32_t{1} << static_cast<unsigned>(i);
+        if (filter == H5Z_FILTER_SHUFFLE && i == 0 && parameter == element_size_) {
+            shuffle_ = bit;
+        } else if (filter == H5Z_FILTER_DEFLATE && i == count - 1) {
+            deflate_ = bit;
+        } else {
+            return false;
+        }
+    }
+    return count >= 0;
+}
+
+bool Chunks::read(const Slab& slab, void* const elements) const {
+    if (extents_.empty()) {
+        return false;
+    }
+    const std::vector<Shape> chunks = chunks_of(slab, extents_);
+    if (!is_worth_reading(slab, chunks.size())) {
+        return false;
+    }
+    const std::vector<std::size_t> sizes = stored_sizes(chunks);
+    Bytes bytes;
+    for (std::size_t i = 0; i < sizes.size(); ++i) {
+        if (!fetch(chunks[i], sizes[i], bytes) || !inflate(bytes)) {
+            return false;
+        }
+        copy(chunks[i], slab, bytes, static_cast<unsigned char*>(elements));
+    }
+    return !sizes.empty();
+}
+
+// Of chunks that are not compressed, the library can read parts, which is faster if few elements
+// are wanted.
+bool Chunks::is_worth_reading(const Slab& slab, const std::size_t chunks) const {
+    constexpr std::uint64_t most_in_vain = 64;
+    std::uint64_t wanted = 1;
+    for (const Slab::Axis& axis : slab.axes) {
+        wanted *= axis.extent;
+    }
+    return deflate_ != 0 || shuffle_ != 0
+           || chunks * (size_ / element_size_) / most_in_vain <= wanted;
+}
+
+// How many bytes of each chunk there are in the file; none if one was never written, so that its
+// elements have another value that the library knows.
+std::vector<std::size_t> Chunks::stored_sizes(const std::vector<Shape>& chunks) const {
+    const LibraryUse use(name_);
+    std::vector<std::size_t> sizes;
+    for (const Shape& chunk : chunks) {
+        const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
+        hsize_t size = 0;
+        // Deflating makes nothing much longer: there are such sizes in damaged files alone.
+        if (::H5Dget_chunk_storage_size(dataset_, begin.data(), &size) < 0 || size == 0
+            || size > size_ + size_ / 8 + 1024) {
+            return {};
+        }
+        sizes.push_back(static_cast<std::size_t>(size));
+    }
+    return sizes;
+}
+
+bool Chunks::fetch(const Shape& chunk, const std::size_t stored_size, Bytes& bytes) const {
+    const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
+    std::uint32_t left_out = 0; // filters that were not applied to this chunk
+    bytes.stored.resize(stored_size);
+    {
+        const LibraryUse use(name_);
+        if (::H5Dread_chunk(dataset_, H5P_DEFAULT, begin.data(), &left_out, bytes.stored.data())
+            < 0) {
+            return false;
+        }
+    }
+    bytes.deflated = (deflate_ & ~left_out) != 0;
+    bytes.shuffled = (shuffle_ & ~left_out) != 0;
+    return bytes.deflated || stored_size == size_;
+}
+
+bool Chunks::inflate(Bytes& bytes) const {
+    constexpr std::size_t best_ratio = 1032; // that the format allows
+    if (!bytes.deflated) {
+        return true;
+    }
+    if (bytes.stored.size() < size_ / best_ratio) {
+        return false; // and no memory is taken for what cannot be there
+    }
+    if (bytes.decompressor == nullptr) {
+        bytes.decompressor.reset(::libdeflate_alloc_decompressor());
+    }
+    if (bytes.decompressor == nullptr) {
+        return false;
+    }
+    bytes.inflated.resize(size_);
+    std::size_t inflated = 0;
+    return ::libdeflate_zlib_decompress(bytes.decompressor.get(), bytes.stored.data(),
+                                        bytes.stored.size(), bytes.inflated.data(), size_,
+                                        &inflated)
+               == LIBDEFLATE_SUCCESS
+           && inflated == size_;
+}
+
+void Chunks::copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,
+                  unsigned char* const elements) const {
+    const std::size_t rank = extents_.size();
+    std::vector<CommonPart> parts(rank);
+    std::size_t runs = 1;
+    for (std::size_t axis = 0; axis < rank; ++axis) {
+        parts[axis] = common_part(slab.axes[axis], chunk[axis], extents_[axis]);
+        runs *= axis + 1 < rank ? parts[axis].count : 1;
+    }
+    const Take take_run = take_of(element_size_, bytes.shuffled);
+    const std::size_t bytes_apart = bytes.shuffled ? 1 : element_size_;
+    const std::size_t plane = size_ / element_size_;
+    for (std::size_t run = 0; run < runs; ++run) {
+        std::size_t to = parts.back().in_slab;
+        std::size_t from = parts.back().in_chunk;
+        std::size_t slab_stride = static_cast<std::size_t>(slab.axes.back().extent);
+        std::size_t chunk_stride = static_cast<std::size_t>(extents_.back());
+        std::size_t number = run;
+        for (std::size_t axis = rank - 1; axis-- > 0;) {
+            const std::size_t index = number % parts[axis].count;
+            number /= parts[axis].count;
+            to += (parts[axis].in_slab + index) * slab_stride;
+            from += (parts[axis].in_chunk + index * slab.axes[axis].step) * chunk_stride;
+            slab_stride *= slab.axes[axis].extent;
+            chunk_stride *= extents_[axis];
+        }
+        take_run(elements + to * element_size_, bytes.elements() + from * bytes_apart, plane,
+                 slab.axes.back().step, parts.back().count);
+    }
+}
+
+} // namespace talcmp::hdf5
