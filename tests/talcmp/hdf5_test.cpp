@@ -851,6 +851,67 @@ TEST_F(BrokenHdf5Files, HaveLessDataThanTheirShapesSay) {
     }
 }
 
+TEST_F(BrokenHdf5Files, HaveLessDataInOtherFilesThanTheirShapesSay) {
+    Layout outside;
+    done(::H5Pset_external(outside.id(), path("raw1").c_str(), 8, 10 * sizeof(int)));
+    done(::H5Pset_external(outside.id(), path("raw2").c_str(), 0, H5F_UNLIMITED));
+    Writer(path()).write("x", {15}, numbers(15), outside);
+    EXPECT_EQ(contents(*open("x")), bytes_of(numbers(15)));
+    std::filesystem::resize_file(path("raw2"), 5 * sizeof(int) - 1);
+    EXPECT_EQ(trouble("x"), "a.h5[/x]: has less data in raw2 than its shape says; is that file "
+                            "complete?");
+    std::filesystem::resize_file(path("raw1"), 8 + 10 * sizeof(int) - 1);
+    EXPECT_EQ(trouble("x"), "a.h5[/x]: has less data in raw1 than its shape says; is that file "
+                            "complete?");
+    std::filesystem::remove(path("raw1"));
+    std::filesystem::resize_file(path("raw2"), 5 * sizeof(int));
+    EXPECT_EQ(trouble("x"), "a.h5[/x]: cannot be read: unable to open external raw data file; is "
+                            "the file complete and undamaged?");
+}
+
+// A virtual array of {2, 3}, whose rows are those arrays.
+void write_virtual(const Writer& file, const std::string& name,
+                   const std::vector<std::pair<std::string, std::string>>& sources) {
+    Layout layout;
+    hsize_t row = 0;
+    for (const auto& [path, array] : sources) {
+        const Handle part = space_of({2, 3});
+        const Extents begin = {row++, 0};
+        const Extents extent = {1, 3};
+        done(::H5Sselect_hyperslab(part.id(), H5S_SELECT_SET, begin.data(), nullptr, extent.data(),
+                                   nullptr));
+        done(::H5Pset_virtual(layout.id(), part.id(), path.c_str(), array.c_str(),
+                              space_of({3}).id()));
+    }
+    file.array(name, H5T_STD_I32LE, space_of({2, 3}), layout);
+}
+
+TEST_F(BrokenHdf5Files, LackArraysOfWhichTheyAreMade) {
+    Writer(path("b.h5")).write("x", {3}, {4, 5, 6});
+    {
+        const Writer file(path());
+        file.write("y", {3}, {1, 2, 3});
+        write_virtual(file, "beside", {{".", "y"}, {"b.h5", "x"}});
+        write_virtual(file, "absolute", {{".", "y"}, {path("b.h5"), "/x"}});
+        write_virtual(file, "moved", {{".", "y"}, {"/no such folder/b.h5", "x"}});
+        write_virtual(file, "another", {{".", "y"}, {"b.h5", "z"}});
+        write_virtual(file, "none here", {{".", "z"}, {"b.h5", "x"}});
+        write_virtual(file, "no file", {{".", "y"}, {"c.h5", "x"}});
+    }
+    for (const char* const whole : {"beside", "absolute", "moved"}) {
+        EXPECT_EQ(contents(*open(whole)), bytes_of<int>({1, 2, 3, 4, 5, 6})) << whole;
+    }
+    const auto needs = [this](const std::string& member, const std::string& source) {
+        EXPECT_EQ(trouble(member), "a.h5[/" + member + "]: is a virtual array that needs " + source
+                                       + ", which is missing or unreadable; put it back");
+    };
+    needs("another", "b.h5[z]");
+    needs("none here", ".[z]");
+    needs("no file", "c.h5[x]");
+    std::filesystem::remove(path("b.h5"));
+    needs("beside", "b.h5[x]");
+}
+
 TEST_F(BrokenHdf5Files, HaveChunksOfAnotherRank) {
     Writer(path()).write("x", {1000}, numbers(1000), Layout::chunked({10}));
     change([](std::string& bytes) { bytes.at(place_of_extent(bytes) - 7) = 0; });

@@ -1,6 +1,7 @@
 #include "hdf5_array.h"
 
 #include "descriptor.h"
+#include "hdf5_other_files.h"
 
 #include <algorithm>
 #include <array>
@@ -66,16 +67,22 @@ bool is_contiguous(const hid_t creation) {
     return ::H5Pget_layout(creation) == H5D_CONTIGUOUS && ::H5Pget_nfilters(creation) == 0;
 }
 
-// Checks that there is room in the file for `count` elements where they are one after another, or
+// How many bytes all elements take in the file.
+std::uint64_t bytes_in_file(const hid_t dataset, const std::uint64_t count,
+                            const std::string& name) {
+    const Handle type(checked(::H5Dget_type(dataset), name, "has elements of an unreadable type"));
+    return count * ::H5Tget_size(type.id());
+}
+
+// Checks that there is room in the file for all elements where they are one after another, or
 // for none where nothing was written. The library would read what is after them.
-void check_room(const hid_t dataset, const hid_t creation, const std::uint64_t count,
+void check_room(const hid_t dataset, const hid_t creation, const std::uint64_t bytes,
                 const std::string& name) {
     if (!is_contiguous(creation) && ::H5Pget_layout(creation) != H5D_COMPACT) {
         return;
     }
-    const Handle type(checked(::H5Dget_type(dataset), name, "has elements of an unreadable type"));
     const hsize_t room = ::H5Dget_storage_size(dataset);
-    if (room != 0 && room / ::H5Tget_size(type.id()) < count) {
+    if (room != 0 && room < bytes) {
         throw Trouble(name, "has less data than its shape says; is the file damaged?");
     }
 }
@@ -181,7 +188,9 @@ void Hdf5Array::find_elements() {
     const LibraryUse use(name_);
     const Handle creation(
         checked(::H5Dget_create_plist(dataset_.id()), name_, "has an unreadable layout"));
-    check_room(dataset_.id(), creation.id(), element_count(*this), name_);
+    const std::uint64_t bytes = bytes_in_file(dataset_.id(), element_count(*this), name_);
+    check_room(dataset_.id(), creation.id(), bytes, name_);
+    hdf5::check_other_files(dataset_.id(), creation.id(), bytes, name_);
     const haddr_t offset = ::H5Dget_offset(dataset_.id());
     // Elements in files of their own have no offset in this one, nor have those that nobody wrote.
     is_contiguous_ = descriptor_ >= 0 && type_.as_in_file && is_contiguous(creation.id())
