@@ -263,7 +263,7 @@ TEST_F(Hdf5Chunks, ThatAreDamagedAreLeftToTheLibrary) {
 
 class LargeHdf5Chunks : public testing::Test {
   protected:
-    static constexpr std::size_t large = 6400;
+    static constexpr std::size_t large = 65536;
 
     // Of bytes, in one chunk.
     Chunks write(const Layout& layout) {
@@ -276,9 +276,10 @@ class LargeHdf5Chunks : public testing::Test {
         return {dataset_.id(), {large}, 1, "x"};
     }
 
-    static bool reads(const Chunks& chunks, const std::uint64_t elements) {
+    static bool reads(const Chunks& chunks, const std::uint64_t elements,
+                      const std::uint64_t step = 1) {
         Bytes room(large);
-        return chunks.read({{{0, elements, 1}}}, room.data());
+        return chunks.read({{{0, elements, step}}}, room.data());
     }
 
     Handle dataset_;
@@ -291,11 +292,21 @@ class LargeHdf5Chunks : public testing::Test {
 
 TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfItCanReadAFewElementsOfThem) {
     const Chunks plain = write(Layout::chunked({large}));
-    EXPECT_TRUE(reads(plain, 100));
-    EXPECT_FALSE(reads(plain, 99));
+    EXPECT_TRUE(reads(plain, large / 64));
+    EXPECT_FALSE(reads(plain, large / 64 - 1));
     const Layout layout = Layout::chunked({large});
     done(::H5Pset_deflate(layout.id(), 1));
     EXPECT_TRUE(reads(write(layout), 1));
+}
+
+TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfItCanReadLongRunsOfThem) {
+    const Chunks plain = write(Layout::chunked({large}));
+    EXPECT_TRUE(reads(plain, large - 1));
+    EXPECT_FALSE(reads(plain, large));
+    EXPECT_TRUE(reads(plain, large / 2, 2));
+    const Layout layout = Layout::chunked({large});
+    done(::H5Pset_shuffle(layout.id()));
+    EXPECT_TRUE(reads(write(layout), large));
 }
 
 TEST_F(LargeHdf5Chunks, AreNotInflatedFromTooFewBytes) {

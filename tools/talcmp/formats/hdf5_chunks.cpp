@@ -192,16 +192,21 @@ bool Chunks::read(const Slab& slab, void* const elements) const {
     return !sizes.empty();
 }
 
-// Of chunks that are not compressed, the library can read parts, which is faster if few elements
-// are wanted.
+// Parts of chunks without filters the library reads from where they are, which is faster if few
+// elements are wanted, or long runs of them.
 bool Chunks::is_worth_reading(const Slab& slab, const std::size_t chunks) const {
     constexpr std::uint64_t most_in_vain = 64;
+    constexpr std::uint64_t long_run = std::uint64_t{64} * 1024;
+    if (deflate_ != 0 || shuffle_ != 0) {
+        return true;
+    }
     std::uint64_t wanted = 1;
     for (const Slab::Axis& axis : slab.axes) {
         wanted *= axis.extent;
     }
-    return deflate_ != 0 || shuffle_ != 0
-           || chunks * (size_ / element_size_) / most_in_vain <= wanted;
+    const std::uint64_t run = std::min(slab.axes.back().extent, extents_.back());
+    const bool are_runs_long = slab.axes.back().step == 1 && run * element_size_ >= long_run;
+    return !are_runs_long && chunks * (size_ / element_size_) / most_in_vain <= wanted;
 }
 
 // How many bytes of each chunk there are in the file; none if one was never written, so that its
