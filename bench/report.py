@@ -389,6 +389,19 @@ def files_table(files):
     return table(("command and files", "time, s", "of cmp", "memory, MiB"), rows)
 
 
+def files_of_peers_table(files):
+    rows = []
+    for row in files["rows"]:
+        talcmp_seconds = row["commands"][0]["seconds"]
+        for one in row["commands"]:
+            rows.append((f"{row['files']}, {row['workload']}", f"{row['bytes'] / 2**20:.0f}",
+                         one["name"], f"{one['seconds']:.2f}",
+                         f"{one['seconds'] / talcmp_seconds:.2f}", f"{one['memory'] / 2**20:.0f}"))
+    rows.extend((name, "", "left out, as talcmp was built without HDF5", "", "", "")
+                for name in files["left_out"])
+    return table(("files", "each, MiB", "command", "time, s", "of talcmp", "memory, MiB"), rows)
+
+
 # ---- 32-bit ARM
 
 ARM_COLUMNS = [("VFP", "identical"), ("VFP", "near"), ("NEON", "identical"), ("NEON", "near")]
@@ -526,6 +539,7 @@ def report_of_times(results, documents):
         "worst pairs": worst_pairs_table(loops),
         "peers": peers_table(peers),
         "files": files_table(files),
+        "files of peers": files_of_peers_table(read(results, "talcmp_peers")),
     })
     print_bars(measured)
 
