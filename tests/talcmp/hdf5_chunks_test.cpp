@@ -5,6 +5,7 @@
 #include "support/hdf5_writer.h"
 #include "support/random_slabs.h"
 #include "support/temporary_folder.h"
+#include "support/thrown_message.h"
 
 #include <gtest/gtest.h>
 
@@ -245,10 +246,8 @@ TEST_F(Hdf5Chunks, ThatAreDamagedAreLeftToTheLibrary) {
         return is_left_to_library(first_chunk);
     };
     EXPECT_FALSE(is_left(plain, 1));
-    EXPECT_TRUE(is_left(Bytes(size - 1), 1));
     EXPECT_TRUE(is_left(Bytes(size + 1), 1));
     EXPECT_TRUE(is_left(Bytes(size + 2000)));
-    EXPECT_TRUE(is_left(deflated(Bytes(size - 1))));
     EXPECT_TRUE(is_left(deflated(Bytes(size + 1))));
     const Bytes good = deflated(plain);
     EXPECT_FALSE(is_left(good));
@@ -259,6 +258,21 @@ TEST_F(Hdf5Chunks, ThatAreDamagedAreLeftToTheLibrary) {
         // A few bits have no meaning.
         EXPECT_TRUE(is_left(flipped) || (read(first_chunk, elements) && elements == plain)) << i;
     }
+}
+
+TEST_F(Hdf5Chunks, ThatAreTooShortAreRefused) {
+    constexpr std::size_t size = count_of_chunk * 4;
+    const auto trouble = [this](const Bytes& stored, const std::uint32_t left_out) {
+        write(layout_of({false, true}), 4, nullptr);
+        store(stored, left_out);
+        return thrown_message([&] { is_left_to_library(first_chunk); });
+    };
+    EXPECT_EQ(trouble(deflated(Bytes(size)), 0), "none");
+    EXPECT_EQ(trouble(deflated(Bytes(size - 1)), 0),
+              "x: has a chunk that is too short; is the file damaged?");
+    EXPECT_EQ(trouble(Bytes(size), 1), "none");
+    EXPECT_EQ(trouble(Bytes(size - 1), 1),
+              "x: has a chunk that is too short; is the file damaged?");
 }
 
 class LargeHdf5Chunks : public testing::Test {
@@ -316,7 +330,8 @@ TEST_F(LargeHdf5Chunks, AreNotInflatedFromTooFewBytes) {
     const hsize_t begin = 0;
     const Bytes stored(5);
     done(::H5Dwrite_chunk(dataset_.id(), H5P_DEFAULT, 0, &begin, stored.size(), stored.data()));
-    EXPECT_FALSE(reads(chunks, large));
+    EXPECT_EQ(thrown_message([&] { reads(chunks, large); }),
+              "x: has a chunk that is too short; is the file damaged?");
 }
 
 TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfTheyAreHuge) {

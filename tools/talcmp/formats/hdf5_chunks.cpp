@@ -184,7 +184,7 @@ bool Chunks::read(const Slab& slab, void* const elements) const {
     const std::vector<std::size_t> sizes = stored_sizes(chunks);
     Bytes bytes;
     for (std::size_t i = 0; i < sizes.size(); ++i) {
-        if (!fetch(chunks[i], sizes[i], bytes) || !inflate(bytes)) {
+        if (!fetch(chunks[i], sizes[i], bytes)) {
             return false;
         }
         copy(chunks[i], slab, bytes, static_cast<unsigned char*>(elements));
@@ -240,16 +240,13 @@ bool Chunks::fetch(const Shape& chunk, const std::size_t stored_size, Bytes& byt
     }
     bytes.deflated = (deflate_ & ~left_out) != 0;
     bytes.shuffled = (shuffle_ & ~left_out) != 0;
-    return bytes.deflated || stored_size == size_;
+    return bytes.deflated ? inflate(bytes) : has_all_bytes(stored_size);
 }
 
 bool Chunks::inflate(Bytes& bytes) const {
     constexpr std::size_t best_ratio = 1032; // that the format allows
-    if (!bytes.deflated) {
-        return true;
-    }
     if (bytes.stored.size() < size_ / best_ratio) {
-        return false; // and no memory is taken for what cannot be there
+        return has_all_bytes(0); // and no memory is taken for what cannot be there
     }
     if (bytes.decompressor == nullptr) {
         bytes.decompressor.reset(::libdeflate_alloc_decompressor());
@@ -259,11 +256,19 @@ bool Chunks::inflate(Bytes& bytes) const {
     }
     bytes.inflated.resize(size_);
     std::size_t inflated = 0;
-    return ::libdeflate_zlib_decompress(bytes.decompressor.get(), bytes.stored.data(),
-                                        bytes.stored.size(), bytes.inflated.data(), size_,
-                                        &inflated)
-               == LIBDEFLATE_SUCCESS
-           && inflated == size_;
+    const libdeflate_result result =
+        ::libdeflate_zlib_decompress(bytes.decompressor.get(), bytes.stored.data(),
+                                     bytes.stored.size(), bytes.inflated.data(), size_, &inflated);
+    return result == LIBDEFLATE_SUCCESS && has_all_bytes(inflated);
+}
+
+// Throws Trouble if a chunk has fewer bytes than it should have. The library would read what is
+// after them in memory.
+bool Chunks::has_all_bytes(const std::size_t bytes) const {
+    if (bytes < size_) {
+        throw Trouble(name_, "has a chunk that is too short; is the file damaged?");
+    }
+    return bytes == size_;
 }
 
 void Chunks::copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,

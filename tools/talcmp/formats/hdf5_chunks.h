@@ -14,7 +14,7 @@ namespace talcmp::hdf5 {
 
 // Reads chunks that were shuffled, deflated, both or neither, as most are. The library fetches
 // their bytes, and has to read whatever is not just as expected here; so it is the library that
-// says what is wrong with a damaged chunk.
+// says what is wrong with most damaged chunks.
 class Chunks {
   public:
     // None that could be read here.
@@ -26,7 +26,7 @@ class Chunks {
 
     // Reads the elements of the slab as they are in the file, in C order. Returns false, and
     // may leave anything in `elements`, if the library has to read them. Several threads may read
-    // at once.
+    // at once. Throws Trouble.
     bool read(const Slab& slab, void* elements) const;
 
   private:
@@ -37,6 +37,7 @@ class Chunks {
     std::vector<std::size_t> stored_sizes(const std::vector<Shape>& chunks) const;
     bool fetch(const Shape& chunk, std::size_t stored_size, Bytes& bytes) const;
     bool inflate(Bytes& bytes) const;
+    bool has_all_bytes(std::size_t bytes) const;
     void copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,
               unsigned char* elements) const;
 
