@@ -136,6 +136,20 @@ class AbsoluteErrors(Drawn):
         self.assertEqual(self.differences("--absolute=1022", a, c)[0], [[0]])
         self.assertEqual(self.differences("--absolute=1023", a, c)[0], [])
 
+    def test_are_reported_where_rounding_makes_a_pair_the_same(self):
+        for integer, integer_type, real_type, difference in (
+                (2**53 + 1, "i8", "f8", 1), (2**64 - 1, "u8", "c16", 1), (2**24 + 1, "u4", "f4", 1),
+                (-2**31 + 5, "i4", "c8", 5), (2**24 + 1, "u4", "f8", 0), (255, "u1", "f2", 0)):
+            real = np.array([integer]).astype(real_type)
+            for dtypes in ((integer_type, real_type), (real_type, integer_type)):
+                with self.subTest(dtypes=dtypes):
+                    a, b = (self.save(name, [integer] if dtype == integer_type else real, dtype)
+                            for name, dtype in zip(("a.npy", "b.npy"), dtypes))
+                    found, report = self.differences(a, b)
+                    self.assertEqual((found, report["largest_absolute_difference"],
+                                      report["largest_relative_difference"]),
+                                     ([], difference, difference / max(abs(float(integer)), abs(real[0]))))
+
     def test_zero_beside_a_tiny_number(self):
         a, b = self.save("a.npy", [0.0, 1]), self.save("b.npy", [1e-17, 1 + 2.0**-52])
         self.assertEqual(self.differences("--tol=50", a, b)[0], [[0]])

@@ -53,10 +53,20 @@ void add_worst(const Pairs& stored, const DigitSearch::Result& found,
     add(totals, worst);
 }
 
+// Whether integers may be rounded where the module compares them with reals, and so be the same as
+// others.
+bool rounds_integers(const ElementType& type1, const ElementType& type2) {
+    constexpr std::size_t bits_of_byte = 8;
+    const ElementType& integer = is_integer(type1) ? type1 : type2;
+    return is_integer(type1) != is_integer(type2)
+           && integer.size * bits_of_byte > static_cast<std::size_t>(all_digits(type1, type2));
+}
+
 // Whether a number may differ from the other one of its pair. Where the module is asked about the
-// stored pairs, those that are the same under 0 do not.
+// stored pairs and rounds nothing, those that are the same under 0 do not.
 bool may_differ(const Pairs& asked, const Pairs& stored, const DigitSearch::Result& found) {
-    return asked.element1(0) != stored.element1(0) || worst_digits(found) != 0;
+    return asked.element1(0) != stored.element1(0) || worst_digits(found) != 0
+           || rounds_integers(stored.type1(), stored.type2());
 }
 
 } // namespace
