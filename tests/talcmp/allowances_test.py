@@ -13,7 +13,7 @@ from fractions import Fraction
 
 import numpy as np
 
-from support.talcmp_command import Folder, document_of, run, run_tests
+from support.talcmp_command import Folder, document_of, read_bytes, run, run_tests, summary
 
 SEED = int(os.environ.get("TALNUMERICARRAY_SEED", random.randrange(2**32)))
 REALS_AND_INTEGERS = "i1 u1 i2 u2 i4 u4 i8 u8 f4 f8 c8 c16".split()
@@ -277,6 +277,36 @@ class Masks(Drawn):
                            "booleans\n", "--ignore", m, a, a)
         self.expect(2, "", f"talcmp: {m}x: cannot be opened: No such file or directory\n",
                     "--ignore", m + "x", a, a)
+
+    def test_that_can_be_read_once_are_for_one_comparison(self):
+        """Standard input is closed when it has been read, and another file gets its number."""
+        for name in ("a.npy", "b.npy"):
+            ours = self.save(f"one/{name}", [True, True, False])
+            self.save(f"two/{name}", [False, True, False])
+        mask = self.save("m.npy", [False, False, True])
+        one, two = self.path("one"), self.path("two")
+        many = (self.save_archive("one.npz", x=[1], y=[2]), self.save_archive("two.npz", x=[1], y=[3]))
+        pipe = self.path("pipe")
+        os.mkfifo(pipe)
+        message = ("can be read only once, but several arrays are compared without what --ignore "
+                   "names; save that to a file first\n")
+        for operands in (one, two), many:
+            for option in "-", "-[x]":
+                self.expect(2, "", f"talcmp: standard input: {message}", f"--ignore={option}",
+                            *operands, input=read_bytes(mask))
+            self.expect(2, "", f"talcmp: {pipe}: {message}", "--ignore", pipe, *operands)
+        self.expect(1, f"{ours} {two}/b.npy differ: [0]: 1 and 0 (different integers)\n", "",
+                    "--ignore=-", ours, f"{two}/b.npy", input=read_bytes(mask))
+
+    def test_of_several_in_a_file(self):
+        """Patterns are for the arrays that are compared."""
+        a = self.save_archive("a.npz", x=[1, 2], y=[1, 2])
+        b = self.save_archive("b.npz", x=[1, 3], y=[1, 2])
+        m = self.save_archive("m.npz", land=[False, True])
+        self.expect(0, summary(same=1), "", "--include=x", "--ignore", m, a, b)
+        m = self.save_archive("m.npz", land=[False, True], sea=[True, False])
+        self.expect(2, summary(trouble=1), f"talcmp: {m}: has 2 arrays, and one is needed; choose one, "
+                    f"such as {m}[land]\n", "--include=x", "--ignore", m, a, b)
 
 
 class SqueezedShapes(Drawn):

@@ -34,9 +34,21 @@ class MembersAsOperands(Folder):
         """The array of the same name, if there is one."""
         self.expect(1, f"{self.a}[x] {self.b}[x] differ: [0]: 0 and 1 (different integers)\n", "",
                     f"{self.a}[x]", self.b)
-        self.expect(2, "", f"talcmp: {self.b}: has 2 arrays, the other operand one; choose one, such "
+        self.expect(2, "", f"talcmp: {self.b}: has 2 arrays, and one is needed; choose one, such "
                            f"as {self.b}[x]\n", f"{self.a}[y]", self.b)
         self.expect(0, "", "", f"{self.a}[y]", self.b, "--include=z")
+
+    def test_when_none_is_left(self):
+        file = self.save("file.npy", np.arange(4))
+        self.expect(2, "", f"talcmp: {self.a}: has no array that --include and --exclude leave\n",
+                    "--include=q", self.a, file)
+        empty = self.save_archive("empty.npz")
+        self.expect(2, "", f"talcmp: {empty}: holds no array\n", empty, file)
+        self.expect(2, "", f"talcmp: {self.a}: has 2 arrays, and one is needed; choose one, such as "
+                           f"{self.a}[x]\n", self.a, file)
+        more = self.save_archive("more.npz", x=1, y=2, z=3)
+        self.expect(2, "", f"talcmp: {more}: has 2 arrays, and one is needed; choose one, such as "
+                           f"{more}[y]\n", "--exclude=x", more, file)
 
     def test_with_the_root(self):
         """Of files with groups, names may be written with the root or without it."""

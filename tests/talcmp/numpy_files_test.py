@@ -477,7 +477,7 @@ class Archives(NumpyFiles):
         self.expect(0, "", "", b, a, "--include=x")
         status, _, errors = run(a, b)
         self.assertEqual(status, 2)
-        self.assertEqual(errors, f"talcmp: {a}: has 2 arrays, the other operand one; choose one, such "
+        self.assertEqual(errors, f"talcmp: {a}: has 2 arrays, and one is needed; choose one, such "
                                  f"as {a}[x]\n")
 
     def test_orders(self):

@@ -9,11 +9,18 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <filesystem>
 #include <new>
+#include <system_error>
 #include <tuple>
 
 namespace talcmp {
 namespace {
+
+bool is_pipe(const std::string& path) {
+    std::error_code error;
+    return path == standard_input_path || std::filesystem::is_fifo(path, error);
+}
 
 class OperandComparison {
   public:
@@ -50,7 +57,7 @@ class OperandComparison {
         try {
             FilePairs files = match_files(first, second, command_line_.filter.exclude);
             if (files.many) {
-                check_picture_of_many();
+                check_suits_many();
             }
             summary_.many = files.many;
             summary_.other_files = files.others;
@@ -85,10 +92,17 @@ class OperandComparison {
         report(outcome);
     }
 
-    void check_picture_of_many() const {
+    // Whether what there is only one of is enough for several comparisons.
+    void check_suits_many() const {
         if (!command_line_.picture.empty()) {
             throw Trouble(command_line_.picture, "cannot show several arrays; compare two, such as "
                                                  "a.npz[x] and b.npz[x]");
+        }
+        const std::string mask = split_member(command_line_.ignore).first;
+        if (is_pipe(mask)) {
+            throw Trouble(mask == standard_input_path ? "standard input" : mask,
+                          "can be read only once, but several arrays are compared without what "
+                          "--ignore names; save that to a file first");
         }
     }
 
@@ -112,8 +126,9 @@ class OperandComparison {
             && !second.member) {
             compare_members(first, second);
         } else {
-            const std::string member1 = chosen_member(first, second);
-            compare_arrays(first, member1, second, chosen_member(second, first));
+            const NameFilter& filter = command_line_.filter;
+            const std::string member1 = chosen_member(first, second, filter);
+            compare_arrays(first, member1, second, chosen_member(second, first, filter));
         }
     }
 
@@ -133,7 +148,7 @@ class OperandComparison {
             throw Trouble(first.path, "has no array that --include and --exclude leave, nor has "
                                           + second.path);
         }
-        check_picture_of_many();
+        check_suits_many();
         summary_.many = true;
         for (const NamedPair& pair : pairs) {
             if (summary_.stopped) {
@@ -150,7 +165,8 @@ class OperandComparison {
     }
 
     // The array of the operand that is compared with one of the other operand.
-    std::string chosen_member(const Operand& operand, const Operand& other) const {
+    static std::string chosen_member(const Operand& operand, const Operand& other,
+                                     const NameFilter& filter) {
         if (!operand.file->is_archive()) {
             return "";
         }
@@ -164,17 +180,21 @@ class OperandComparison {
             }
             return *operand.member;
         }
-        const auto members = match_names(names, {}, command_line_.filter);
+        const auto members = match_names(names, {}, filter);
         if (members.size() == 1) {
             return members.front().name;
         }
         if (other.member && has(*other.member)) {
             return *other.member;
         }
+        if (members.empty()) {
+            throw Trouble(operand.path, names.empty()
+                                            ? "holds no array"
+                                            : "has no array that --include and --exclude leave");
+        }
         throw Trouble(operand.path, "has " + std::to_string(members.size())
-                                        + " arrays, the other operand one; choose one, such as "
-                                        + operand.path + "[" + operand.file->root()
-                                        + (names.empty() ? "NAME" : names.front()) + "]");
+                                        + " arrays, and one is needed; choose one, such as "
+                                        + name_of(operand, members.front().name));
     }
 
     // Some of the arrays that a file has, for a message.
@@ -210,7 +230,7 @@ class OperandComparison {
             Operand operand;
             std::tie(operand.path, operand.member) = split_member(command_line_.ignore);
             open(operand);
-            const std::string member = chosen_member(operand, {});
+            const std::string member = chosen_member(operand, {}, {});
             mask.name = name_of(operand, member);
             mask.source = operand.file->open(member);
         }
