@@ -267,6 +267,22 @@ class Masks(Drawn):
         self.assertEqual(found, [[3]])
         self.assertEqual(self.differences("--equal-nan", "--absolute=0.5", "--ignore", m, a, b)[0], [])
 
+    def test_that_are_read_from_beginning_to_end(self):
+        """By one thread, though several could read the arrays."""
+        ours = np.zeros(1000000)
+        ignored = self.rng.random(ours.size) < 0.5
+        theirs = np.where(ignored, 1.0, 0)
+        a, b = self.save("a.npy", ours), self.save("b.npy", theirs)
+        m = self.save("m.npy", ignored)
+        packed = self.save_archive("m.npz", np.savez_compressed, m=ignored)
+        self.expect(0, "", "", "--threads=8", "--ignore", packed, a, b)
+        self.expect(0, "", "", "--threads=8", "--ignore=-", a, b, input=read_bytes(m))
+        theirs[-1:] = 2
+        ignored[-1:] = False
+        b, m = self.save("b.npy", theirs), self.save("m.npy", ignored)
+        self.expect(1, f"{a} {b} differ: [999999]: 0 and 2 (zero is the same only as zero)\n", "",
+                    "--threads=8", "--ignore=-", a, b, input=read_bytes(m))
+
     def test_that_do_not_fit(self):
         a = self.save("a.npy", np.zeros((2, 3)))
         m = self.save("m.npy", np.zeros((3, 2), bool))

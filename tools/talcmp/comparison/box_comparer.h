@@ -56,7 +56,10 @@ class BoxPlan {
     std::size_t bytes_of_pair() const { return first_.type().size + second_.type().size; }
 
     // Whether boxes may be compared in any order, several at a time.
-    bool random_access() const { return first_.random_access() && second_.random_access(); }
+    bool random_access() const {
+        return first_.random_access() && second_.random_access()
+               && (mask_ == nullptr || mask_->random_access());
+    }
 
   private:
     const Traversal& traversal_;
