@@ -56,6 +56,14 @@ class MembersAsOperands(Folder):
         self.expect(1, f"{self.a}[x] {self.b}[x] differ: [0]: 0 and 1 (different integers)\n"
                     + summary(different=1), "", self.a, self.b, "--include=/x")
 
+    def test_of_pipes(self):
+        """As a shell passes the output of a command by <(command)."""
+        reading, writing = os.pipe()
+        os.write(writing, read_bytes(self.a)) # less than a pipe holds
+        os.close(writing)
+        self.expect(0, "", "", f"/dev/fd/{reading}[y]", f"{self.b}[z]", pass_fds=[reading])
+        os.close(reading)
+
     def test_that_are_not_there(self):
         self.expect(2, "", f"talcmp: {self.a}: has no array 'q'; it has x, y\n", f"{self.a}[q]",
                     self.b)

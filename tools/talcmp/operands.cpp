@@ -125,9 +125,10 @@ std::string in_folder(const std::string& folder, const std::string& file) {
     return path;
 }
 
-bool is_file(const std::string& path) {
+bool is_file_or_pipe(const std::string& path) {
     std::error_code error;
-    return path == standard_input_path || fs::is_regular_file(path, error);
+    const fs::file_status status = fs::status(path, error);
+    return path == standard_input_path || fs::is_regular_file(status) || fs::is_fifo(status);
 }
 
 // A pattern of members, or the name of one, without the root.
@@ -174,7 +175,7 @@ std::pair<std::string, std::optional<std::string>> split_member(const std::strin
     for (std::size_t bracket = operand.find('['); bracket != std::string::npos;
          bracket = operand.find('[', bracket + 1)) {
         std::string path = operand.substr(0, bracket);
-        if (is_file(path)) {
+        if (is_file_or_pipe(path)) {
             const std::string member = operand.substr(bracket + 1, operand.size() - bracket - 2);
             return {std::move(path), without_root(member)};
         }
