@@ -283,6 +283,17 @@ class Masks(Drawn):
         self.expect(1, f"{a} {b} differ: [999999]: 0 and 2 (zero is the same only as zero)\n", "",
                     "--threads=8", "--ignore=-", a, b, input=read_bytes(m))
 
+    def test_of_all_pairs(self):
+        a, b = self.save("a.npy", np.zeros((2, 3))), self.save("b.npy", np.ones((2, 3)))
+        m = self.save("m.npy", [[True] * 3, [True, True, False]])
+        ignored = f"{a} {b} are the same (all pairs ignored)\n"
+        self.expect(0, ignored, "", "-v", "--slice=0", "--ignore", m, a, b)
+        self.expect(0, f"{a} {a} are the same\n", "", "-v", "--ignore", m, a, a)
+        self.expect(0, f"{a} {a} are the same (no elements)\n", "", "-v", "--slice=2:", "--ignore", m,
+                    a, a)
+        self.assertEqual(run("--report", "--slice=0", "--ignore", m, a, b)[1].splitlines()[0] + "\n",
+                         ignored)
+
     def test_that_do_not_fit(self):
         a = self.save("a.npy", np.zeros((2, 3)))
         m = self.save("m.npy", np.zeros((3, 2), bool))

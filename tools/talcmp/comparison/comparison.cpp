@@ -187,6 +187,7 @@ void compare_elements(SelectedArrays arrays, const Question& question, ProgressL
     const unsigned threads = thread_count(plan);
     try {
         const Findings findings = compare_boxes(plan, threads, progress);
+        result.all_ignored = findings.totals.ignored == traversal.pair_count();
         result.places = places_of(plan, findings.first.in_order());
         if (question.report) {
             result.report = report_on(plan, findings.totals);

@@ -49,7 +49,8 @@ struct Report {
 struct Comparison {
     ArrayFacts array1, array2;
     talreal tolerance = 0;    // in binary digits, for the types of the two
-    bool has_elements = true; // whether there was any pair to compare
+    bool has_elements = true; // whether there was any pair of elements
+    bool all_ignored = false; // whether there were some, and the mask left all of them out
     Difference difference = Difference::none;
     std::vector<Place> places;    // the first that differ, in row-major order
     std::optional<Report> report; // if asked for and the shapes are the same
