@@ -145,10 +145,11 @@ class AbsoluteErrors(Drawn):
                 with self.subTest(dtypes=dtypes):
                     a, b = (self.save(name, [integer] if dtype == integer_type else real, dtype)
                             for name, dtype in zip(("a.npy", "b.npy"), dtypes))
+                    larger = max(abs(float(integer)), abs(real[0]))
                     found, report = self.differences(a, b)
                     self.assertEqual((found, report["largest_absolute_difference"],
                                       report["largest_relative_difference"]),
-                                     ([], difference, difference / max(abs(float(integer)), abs(real[0]))))
+                                     ([], difference, difference / larger))
 
     def test_zero_beside_a_tiny_number(self):
         a, b = self.save("a.npy", [0.0, 1]), self.save("b.npy", [1e-17, 1 + 2.0**-52])
