@@ -274,6 +274,21 @@ class Links(Hdf5Folder):
         self.expect(0, "".join(f"{path}[/{name}] {path}[/{name}] are the same\n" for name in names)
                     + summary(same=3), "", "-v", path, path)
 
+    def test_may_be_named_by_any_path(self):
+        """Of several hard links to a group only one is followed for the list."""
+        path = self.path("a.h5")
+        with h5py.File(path, "w") as file:
+            file["a/x"] = np.arange(3)
+            file["b"] = file["a"]
+            file["a/up"] = file
+        lines = f"{path}[/a/x] {path}[/a/x] are the same\n" + summary(same=1)
+        self.expect(0, lines, "", "-v", path, path)
+        for name in ("b/x", "/b/x", "a/up/b/up/a/x"):
+            self.expect(0, "", "", f"{path}[{name}]", f"{path}[a/x]")
+        for name in ("b/y", "b"):
+            self.expect(2, "", f"talcmp: {path}: has no array '/{name}'; it has /a/x\n",
+                        f"{path}[{name}]", path)
+
 
 class Trouble(Hdf5Folder):
     def write_array(self, **options):

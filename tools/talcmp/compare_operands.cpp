@@ -170,21 +170,19 @@ class OperandComparison {
         if (!operand.file->is_archive()) {
             return "";
         }
-        const auto names = operand.file->members();
-        const auto has = [&names](const std::string& name) {
-            return std::find(names.begin(), names.end(), name) != names.end();
-        };
         if (operand.member) {
-            if (!has(*operand.member)) {
-                throw Trouble(operand.path, "has no array '" + *operand.member + "'" + some(names));
+            if (!operand.file->has(*operand.member)) {
+                throw Trouble(operand.path, std::string("has no array '") + operand.file->root()
+                                                + *operand.member + "'" + some(*operand.file));
             }
             return *operand.member;
         }
+        const auto names = operand.file->members();
         const auto members = match_names(names, {}, filter);
         if (members.size() == 1) {
             return members.front().name;
         }
-        if (other.member && has(*other.member)) {
+        if (other.member && operand.file->has(*other.member)) {
             return *other.member;
         }
         if (members.empty()) {
@@ -198,11 +196,12 @@ class OperandComparison {
     }
 
     // Some of the arrays that a file has, for a message.
-    static std::string some(const std::vector<std::string>& names) {
+    static std::string some(const ArrayFile& file) {
         constexpr std::size_t most = 5;
+        const auto names = file.members();
         std::string text;
         for (std::size_t i = 0; i < std::min(most, names.size()); ++i) {
-            text += (i == 0 ? "; it has " : ", ") + names[i];
+            text += (i == 0 ? "; it has " : ", ") + (file.root() + names[i]);
         }
         return text + (names.size() > most ? ", ..." : "");
     }

@@ -4,6 +4,7 @@
 
 #include "array_source.h"
 
+#include <algorithm>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -29,7 +30,13 @@ class ArrayFile {
     // The names of the arrays, without the root, each once; one empty name where they have none.
     virtual std::vector<std::string> members() const = 0;
 
-    // Opens an array. Each may be opened only once. Throws Trouble; NotNumbers if it is not an
+    // Whether there is an array of that name. Some may have further names than `members` lists.
+    virtual bool has(const std::string& member) {
+        const std::vector<std::string> names = members();
+        return std::find(names.begin(), names.end(), member) != names.end();
+    }
+
+    // Opens an array that the file has. Each may be opened only once. Throws Trouble; NotNumbers if it is not an
     // array of numbers.
     virtual std::unique_ptr<ArraySource> open(const std::string& member) = 0;
 };

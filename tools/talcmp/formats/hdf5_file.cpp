@@ -67,10 +67,16 @@ std::vector<std::string> Hdf5File::members() const {
     return names;
 }
 
+bool Hdf5File::has(const std::string& member) {
+    return members_.count(member) != 0 || hdf5::has_array(file_->id(), root() + member, path_);
+}
+
 std::unique_ptr<ArraySource> Hdf5File::open(const std::string& member) {
     std::string location = root() + member;
     std::string name = path_ + "[" + location + "]";
-    check_array(members_.at(member), name);
+    if (const auto listed = members_.find(member); listed != members_.end()) {
+        check_array(listed->second, name);
+    }
     return std::make_unique<Hdf5Array>(file_, std::move(name), location);
 }
 

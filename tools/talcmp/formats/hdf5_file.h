@@ -13,7 +13,8 @@ namespace talcmp {
 // Each array has the name of the path from the root to it, without the first slash. What is in
 // several groups by hard links has the name under which it is found first: groups are searched in
 // the order of their names, and before all other links are followed. These, symbolic and external,
-// give what they lead to further names; but a group is not entered from within itself.
+// give what they lead to further names; but a group is not entered from within itself. Any other
+// path to an array is a name that is not listed.
 class Hdf5File : public ArrayFile {
   public:
     // Throws Trouble when the file is broken.
@@ -22,6 +23,7 @@ class Hdf5File : public ArrayFile {
     bool is_archive() const override { return true; }
     const char* root() const override { return "/"; }
     std::vector<std::string> members() const override;
+    bool has(const std::string& member) override;
     std::unique_ptr<ArraySource> open(const std::string& member) override;
 
   private:

@@ -245,4 +245,9 @@ std::map<std::string, Member> members_of(const hid_t file, const std::string& pa
     return Search(file, path).all();
 }
 
+bool has_array(const hid_t group, const std::string& path, const std::string& name) {
+    const LibraryUse use(name);
+    return type_at(group, path) == H5O_TYPE_DATASET;
+}
+
 } // namespace talcmp::hdf5

@@ -20,4 +20,8 @@ struct Member {
 // calls the file `path`.
 std::map<std::string, Member> members_of(hid_t file, const std::string& path);
 
+// Whether the path leads from the group to an array, whatever it goes through. Messages call the
+// file `name`.
+bool has_array(hid_t group, const std::string& path, const std::string& name);
+
 } // namespace talcmp::hdf5

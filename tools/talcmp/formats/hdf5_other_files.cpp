@@ -1,6 +1,7 @@
 #include "hdf5_other_files.h"
 
 #include "hdf5_handles.h"
+#include "hdf5_members.h"
 #include "shown.h"
 
 #include <algorithm>
@@ -59,17 +60,21 @@ std::string name_of(const NameOf get, const hid_t creation, const std::size_t in
     return text;
 }
 
-bool has_array(const hid_t file, const std::string& array) {
-    return Handle(::H5Dopen2(file, array.c_str(), H5P_DEFAULT)).id() >= 0;
-}
+// A source: the path of a file, or a dot for the array's own one, and that of an array in it.
+using Source = std::pair<std::string, std::string>;
 
-// The library tries the path from the current folder too.
-bool has_array(const std::string& path, const std::string& folder, const std::string& array) {
-    const std::string beside =
-        folder + (path.front() == '/' ? path.substr(path.rfind('/') + 1) : path);
+bool is_there(const Source& source, const hid_t own_file, const std::string& folder,
+              const std::string& name) {
+    const auto& [path, array] = source;
+    if (path == ".") {
+        return has_array(own_file, array, name);
+    }
+    // The library tries the path from the current folder too.
+    const bool is_absolute = path.find('/') == 0;
+    const std::string beside = folder + (is_absolute ? path.substr(path.rfind('/') + 1) : path);
     for (const std::string& there : {path, beside}) {
         const Handle file(::H5Fopen(there.c_str(), H5F_ACC_RDONLY, H5P_DEFAULT));
-        if (file.id() >= 0 && has_array(file.id(), array)) {
+        if (file.id() >= 0 && has_array(file.id(), array, name)) {
             return true;
         }
     }
@@ -84,8 +89,6 @@ std::string folder_of(const hid_t dataset) {
     ::H5Fget_name(file.id(), path.data(), path.size() + 1);
     return path.substr(0, path.rfind('/') + 1);
 }
-
-using Source = std::pair<std::string, std::string>; // the path of a file, and of an array in it
 
 std::set<Source> sources_of(const hid_t creation) {
     std::size_t count = 0;
@@ -104,12 +107,13 @@ void check_sources(const hid_t dataset, const hid_t creation, const std::string&
     }
     const Handle own_file(::H5Iget_file_id(dataset));
     const std::string folder = folder_of(dataset);
-    for (const auto& [path, array] : sources_of(creation)) {
-        if ((path + array).find('%') != std::string::npos) {
+    for (const Source& source : sources_of(creation)) {
+        const std::string text = source.first + "[" + source.second + "]";
+        if (text.find('%') != std::string::npos) {
             continue; // a pattern stands for as many files as there are
         }
-        if (!(path == "." ? has_array(own_file.id(), array) : has_array(path, folder, array))) {
-            throw Trouble(name, "is a virtual array that needs " + shown(path + "[" + array + "]")
+        if (!is_there(source, own_file.id(), folder, name)) {
+            throw Trouble(name, "is a virtual array that needs " + shown(text)
                                     + ", which is missing or unreadable; put it back");
         }
     }
