@@ -32,20 +32,6 @@ void scatter(const std::size_t size, unsigned char* to, const std::size_t to_str
     }
 }
 
-// Calls `action(position, slot)` for each step along the axes, the last one fastest.
-template <typename Action>
-void for_each_step(const BoxAxis* const begin, const BoxAxis* const end,
-                   const std::uint64_t position, const std::size_t slot, const Action& action) {
-    if (begin == end) {
-        action(position, slot);
-        return;
-    }
-    for (std::size_t i = 0; i < begin->extent; ++i) {
-        for_each_step(begin + 1, end, position + i * begin->stride, slot + i * begin->slot_stride,
-                      action);
-    }
-}
-
 class BoxReader {
   public:
     // In `axes`, long strides come first.

@@ -1,5 +1,7 @@
 #include "hdf5_chunks.h"
 
+#include "box_axis.h"
+
 #include <algorithm>
 #include <cstring>
 #include <memory>
@@ -67,7 +69,7 @@ std::vector<std::uint64_t> chunks_along(const Slab::Axis& axis, const std::uint6
     return begins;
 }
 
-// The chunks that have elements of the slab, by their first indices.
+// The chunks that have elements of the slab, each by the indices of its first element.
 std::vector<Shape> chunks_of(const Slab& slab, const Shape& extents) {
     std::vector<Shape> chunks = {{}};
     for (std::size_t axis = 0; axis < extents.size(); ++axis) {
@@ -273,33 +275,30 @@ bool Chunks::has_all_bytes(const std::size_t bytes) const {
 
 void Chunks::copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,
                   unsigned char* const elements) const {
-    const std::size_t rank = extents_.size();
-    std::vector<CommonPart> parts(rank);
-    std::size_t runs = 1;
-    for (std::size_t axis = 0; axis < rank; ++axis) {
-        parts[axis] = common_part(slab.axes[axis], chunk[axis], extents_[axis]);
-        runs *= axis + 1 < rank ? parts[axis].count : 1;
+    std::vector<BoxAxis> axes(extents_.size());
+    std::size_t first_in_chunk = 0;
+    std::size_t first_in_slab = 0;
+    std::size_t chunk_stride = 1;
+    std::size_t slab_stride = 1;
+    for (std::size_t i = axes.size(); i-- > 0;) {
+        const Slab::Axis& axis = slab.axes[i];
+        const CommonPart part = common_part(axis, chunk[i], extents_[i]);
+        first_in_chunk += part.in_chunk * chunk_stride;
+        first_in_slab += part.in_slab * slab_stride;
+        axes[i] = {part.count, axis.step * chunk_stride, slab_stride};
+        chunk_stride *= static_cast<std::size_t>(extents_[i]);
+        slab_stride *= static_cast<std::size_t>(axis.extent);
     }
+    const BoxAxis& run = axes.back();
     const Take take_run = take_of(element_size_, bytes.shuffled);
     const std::size_t bytes_apart = bytes.shuffled ? 1 : element_size_;
     const std::size_t plane = size_ / element_size_;
-    for (std::size_t run = 0; run < runs; ++run) {
-        std::size_t to = parts.back().in_slab;
-        std::size_t from = parts.back().in_chunk;
-        std::size_t slab_stride = static_cast<std::size_t>(slab.axes.back().extent);
-        std::size_t chunk_stride = static_cast<std::size_t>(extents_.back());
-        std::size_t number = run;
-        for (std::size_t axis = rank - 1; axis-- > 0;) {
-            const std::size_t index = number % parts[axis].count;
-            number /= parts[axis].count;
-            to += (parts[axis].in_slab + index) * slab_stride;
-            from += (parts[axis].in_chunk + index * slab.axes[axis].step) * chunk_stride;
-            slab_stride *= slab.axes[axis].extent;
-            chunk_stride *= extents_[axis];
-        }
-        take_run(elements + to * element_size_, bytes.elements() + from * bytes_apart, plane,
-                 slab.axes.back().step, parts.back().count);
-    }
+    for_each_step(axes.data(), &run, first_in_chunk, first_in_slab,
+                  [&](const std::uint64_t from, const std::size_t to) {
+                      take_run(elements + to * element_size_,
+                               bytes.elements() + static_cast<std::size_t>(from) * bytes_apart,
+                               plane, static_cast<std::size_t>(run.stride), run.extent);
+                  });
 }
 
 } // namespace talcmp::hdf5
