@@ -12,12 +12,6 @@
 namespace talcmp::hdf5 {
 namespace {
 
-struct FreeDecompressor {
-    void operator()(libdeflate_decompressor* const decompressor) const {
-        ::libdeflate_free_decompressor(decompressor);
-    }
-};
-
 // In bytes. Larger chunks, which are rare or damaged, are the library's matter; so that sizes fit a
 // size_t on all platforms.
 constexpr std::size_t largest_chunk = std::size_t{1} << 30U;
@@ -131,6 +125,12 @@ Take take_of(const std::size_t element_size, const bool shuffled) {
 
 // What is read of a chunk at a time.
 struct Chunks::Bytes {
+    struct FreeDecompressor {
+        void operator()(libdeflate_decompressor* const decompressor) const {
+            ::libdeflate_free_decompressor(decompressor);
+        }
+    };
+
     std::vector<unsigned char> stored;
     std::vector<unsigned char> inflated;
     bool deflated = false; // so that it is in `inflated`, else in `stored`
