@@ -180,6 +180,7 @@ TEST_F(Hdf5Chunks, AreReadByThreads) {
     write(layout_of({true, true}), 8, all.data());
     std::atomic<int> right = 0;
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([&] {
             for (int j = 0; j < 50; ++j) {

@@ -125,26 +125,19 @@ Take take_of(const std::size_t element_size, const bool shuffled) {
 
 // What is read of a chunk at a time.
 struct Chunks::Bytes {
-    struct FreeDecompressor {
-        void operator()(libdeflate_decompressor* const decompressor) const {
-            ::libdeflate_free_decompressor(decompressor);
-        }
-    };
-
     std::vector<unsigned char> stored;
-    std::vector<unsigned char> inflated;
-    bool deflated = false; // so that it is in `inflated`, else in `stored`
+    std::vector<unsigned char> inflated; // unused if they were not deflated
+    const unsigned char* elements = nullptr;
     bool shuffled = false;
-    std::unique_ptr<libdeflate_decompressor, FreeDecompressor> decompressor;
-
-    const unsigned char* elements() const { return (deflated ? inflated : stored).data(); }
+    std::unique_ptr<libdeflate_decompressor, void (*)(libdeflate_decompressor*)> decompressor = {
+        nullptr, ::libdeflate_free_decompressor};
 };
 
 Chunks::Chunks(const hid_t dataset, Shape chunk, const std::size_t element_size, std::string name)
-    : dataset_(dataset), element_size_(element_size), name_(std::move(name)) {
+    : dataset_(dataset), element_size_(element_size), size_(chunk_size(chunk, element_size)),
+      name_(std::move(name)) {
     const LibraryUse use(name_);
     const Handle creation(::H5Dget_create_plist(dataset));
-    size_ = chunk_size(chunk, element_size);
     if (size_ <= largest_chunk && know_filters(creation.id())) {
         extents_ = std::move(chunk);
     }
@@ -240,9 +233,12 @@ bool Chunks::fetch(const Shape& chunk, const std::size_t stored_size, Bytes& byt
             return false;
         }
     }
-    bytes.deflated = (deflate_ & ~left_out) != 0;
     bytes.shuffled = (shuffle_ & ~left_out) != 0;
-    return bytes.deflated ? inflate(bytes) : has_all_bytes(stored_size);
+    if ((deflate_ & ~left_out) != 0) {
+        return inflate(bytes);
+    }
+    bytes.elements = bytes.stored.data();
+    return has_all_bytes(stored_size);
 }
 
 bool Chunks::inflate(Bytes& bytes) const {
@@ -257,6 +253,7 @@ bool Chunks::inflate(Bytes& bytes) const {
         return false;
     }
     bytes.inflated.resize(size_);
+    bytes.elements = bytes.inflated.data();
     std::size_t inflated = 0;
     const libdeflate_result result =
         ::libdeflate_zlib_decompress(bytes.decompressor.get(), bytes.stored.data(),
@@ -296,8 +293,8 @@ void Chunks::copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,
     for_each_step(axes.data(), &run, first_in_chunk, first_in_slab,
                   [&](const std::uint64_t from, const std::size_t to) {
                       take_run(elements + to * element_size_,
-                               bytes.elements() + static_cast<std::size_t>(from) * bytes_apart,
-                               plane, static_cast<std::size_t>(run.stride), run.extent);
+                               bytes.elements + static_cast<std::size_t>(from) * bytes_apart, plane,
+                               static_cast<std::size_t>(run.stride), run.extent);
                   });
 }
 

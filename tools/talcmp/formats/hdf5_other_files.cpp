@@ -65,20 +65,19 @@ using Source = std::pair<std::string, std::string>;
 
 bool is_there(const Source& source, const hid_t own_file, const std::string& folder,
               const std::string& name) {
-    const auto& [path, array] = source;
+    const std::string& path = source.first;
+    const std::string& array = source.second;
     if (path == ".") {
         return has_array(own_file, array, name);
     }
     // The library tries the path from the current folder too.
     const bool is_absolute = path.find('/') == 0;
     const std::string beside = folder + (is_absolute ? path.substr(path.rfind('/') + 1) : path);
-    for (const std::string& there : {path, beside}) {
-        const Handle file(::H5Fopen(there.c_str(), H5F_ACC_RDONLY, H5P_DEFAULT));
-        if (file.id() >= 0 && has_array(file.id(), array, name)) {
-            return true;
-        }
-    }
-    return false;
+    const auto is_in = [&](const std::string& other_file) {
+        const Handle file(::H5Fopen(other_file.c_str(), H5F_ACC_RDONLY, H5P_DEFAULT));
+        return file.id() >= 0 && has_array(file.id(), array, name);
+    };
+    return is_in(path) || is_in(beside);
 }
 
 // The folder of the file with its last slash; nothing if that is the current one.
@@ -102,6 +101,7 @@ std::set<Source> sources_of(const hid_t creation) {
 }
 
 void check_sources(const hid_t dataset, const hid_t creation, const std::string& name) {
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing here changes the environment.
     if (std::getenv("HDF5_VDS_PREFIX") != nullptr) {
         return; // which may name any number of folders
     }
