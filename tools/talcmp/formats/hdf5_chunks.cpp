@@ -33,18 +33,16 @@ std::size_t chunk_size(const Shape& extents, const std::size_t element_size) {
 // Along one axis: `count` indices of the slab from `in_slab`, the first of which is `in_chunk`
 // there.
 struct CommonPart {
-    std::size_t in_slab = 0;
-    std::size_t in_chunk = 0;
-    std::size_t count = 0;
+    std::size_t in_slab;
+    std::size_t in_chunk;
+    std::size_t count;
 };
 
+// There is at least one such index.
 CommonPart common_part(const Slab::Axis& axis, const std::uint64_t begin,
                        const std::uint64_t extent) {
     const std::uint64_t first =
         begin <= axis.begin ? 0 : (begin - axis.begin + axis.step - 1) / axis.step;
-    if (first >= axis.extent || axis.begin + first * axis.step >= begin + extent) {
-        return {};
-    }
     const std::uint64_t in_chunk = axis.begin + first * axis.step - begin;
     const std::uint64_t count =
         std::min(axis.extent - first, (extent - in_chunk - 1) / axis.step + 1);
@@ -130,7 +128,7 @@ struct Chunks::Bytes {
     const unsigned char* elements = nullptr;
     bool shuffled = false;
     std::unique_ptr<libdeflate_decompressor, void (*)(libdeflate_decompressor*)> decompressor = {
-        nullptr, ::libdeflate_free_decompressor};
+        ::libdeflate_alloc_decompressor(), ::libdeflate_free_decompressor};
 };
 
 Chunks::Chunks(const hid_t dataset, Shape chunk, const std::size_t element_size, std::string name)
@@ -247,10 +245,7 @@ bool Chunks::inflate(Bytes& bytes) const {
         return has_all_bytes(0); // and no memory is taken for what cannot be there
     }
     if (bytes.decompressor == nullptr) {
-        bytes.decompressor.reset(::libdeflate_alloc_decompressor());
-    }
-    if (bytes.decompressor == nullptr) {
-        return false;
+        return false; // there was no memory for it
     }
     bytes.inflated.resize(size_);
     bytes.elements = bytes.inflated.data();
