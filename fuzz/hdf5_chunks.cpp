@@ -172,7 +172,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* const bytes, const std
         store(dataset, array, draws);
     }
     const Handle dataset = made(::H5Dopen2(file.id(), "x", H5P_DEFAULT));
-    const Chunks chunks(dataset.id(), array.chunk, array.element_size, "input");
+    const Chunks chunks(dataset.id(), array.shape, array.chunk, array.element_size, "input");
     for (int i = 0; i < 4; ++i) {
         const Slab slab = draw_slab(draws, array.shape);
         std::size_t room = array.element_size;

@@ -30,13 +30,13 @@ using talcmp::Slab;
 using talcmp::hdf5::Chunks;
 using Bytes = std::vector<unsigned char>;
 
-const Shape shape = {7, 6, 9};
-const Shape chunk = {3, 2, 4}; // those at the end have elements beyond the shape
-constexpr std::size_t count = 378;
-constexpr std::size_t count_of_chunk = 24;
+const Shape shape = {30, 20, 10};
+const Shape chunk = {17, 11, 4}; // those at the end have elements beyond the shape
+constexpr std::size_t count = 6000;
+constexpr std::size_t count_of_chunk = 748;
 
-const Slab whole = {{{0, 7, 1}, {0, 6, 1}, {0, 9, 1}}};
-const Slab first_chunk = {{{0, 3, 1}, {0, 2, 1}, {0, 4, 1}}};
+const Slab whole = {{{0, 30, 1}, {0, 20, 1}, {0, 10, 1}}};
+const Slab first_chunk = {{{0, 17, 1}, {0, 11, 1}, {0, 4, 1}}};
 
 struct Pipeline {
     bool shuffle = false;
@@ -130,7 +130,7 @@ class Hdf5Chunks : public testing::Test {
     void reopen() {
         dataset_ = {};
         dataset_ = made(::H5Dopen2(file_.id(), name_.c_str(), H5P_DEFAULT));
-        chunks_ = Chunks(dataset_.id(), chunk, size_, "x");
+        chunks_ = Chunks(dataset_.id(), shape, chunk, size_, "x");
     }
 
     TemporaryFolder folder_;
@@ -148,13 +148,20 @@ TEST_F(Hdf5Chunks, AreReadInSlabs) {
         for (const Pipeline& pipeline : pipelines) {
             const Bytes all = random_bytes(count * size, random);
             write(layout_of(pipeline), size, all.data());
+            const bool filtered = pipeline.shuffle || pipeline.deflate;
+            int read_here = 0;
             for (int i = 0; i < 100; ++i) {
                 const Slab slab = i == 0 ? whole : random_slab(shape, random);
                 Bytes elements(count_of(slab) * size);
-                ASSERT_TRUE(read(slab, elements));
-                ASSERT_EQ(elements, elements_at(slab, all, size))
-                    << "elements of " << size << " bytes";
+                const bool was_read = read(slab, elements);
+                ASSERT_TRUE(was_read || (!filtered && i > 0));
+                if (was_read) {
+                    ASSERT_EQ(elements, elements_at(slab, all, size))
+                        << "elements of " << size << " bytes";
+                    ++read_here;
+                }
             }
+            EXPECT_GE(read_here, 3); // mostly some twenty, without filters
         }
     }
 }
@@ -278,23 +285,37 @@ TEST_F(Hdf5Chunks, ThatAreTooShortAreRefused) {
 
 class LargeHdf5Chunks : public testing::Test {
   protected:
-    static constexpr std::size_t large = 65536;
+    static constexpr std::size_t rows = 32;
+    static constexpr std::size_t columns = 65536;
 
     // Of bytes, in one chunk.
     Chunks write(const Layout& layout) {
-        dataset_ =
-            file_.array("x" + std::to_string(++arrays_), H5T_STD_U8LE, space_of({large}), layout);
-        const Bytes elements(large, 1);
+        dataset_ = file_.array("x" + std::to_string(++arrays_), H5T_STD_U8LE,
+                               space_of({rows, columns}), layout);
+        const Bytes elements(rows * columns, 1);
         done(::H5Dwrite(dataset_.id(), H5T_NATIVE_UCHAR, H5S_ALL, H5S_ALL, H5P_DEFAULT,
                         elements.data()));
         done(::H5Dflush(dataset_.id()));
-        return {dataset_.id(), {large}, 1, "x"};
+        return with_chunk({rows, columns}, 1);
     }
 
-    static bool reads(const Chunks& chunks, const std::uint64_t elements,
-                      const std::uint64_t step = 1) {
-        Bytes room(large);
-        return chunks.read({{{0, elements, step}}}, room.data());
+    Chunks with_chunk(const Shape& extents, const std::size_t element_size) const {
+        return {dataset_.id(), {rows, columns}, extents, element_size, "x"};
+    }
+
+    static Layout in_one_chunk() { return Layout::chunked({rows, columns}); }
+
+    static Layout deflated() {
+        Layout layout = in_one_chunk();
+        done(::H5Pset_deflate(layout.id(), 1));
+        return layout;
+    }
+
+    // Elements of the first columns, or of each `step`-th one.
+    static bool reads(const Chunks& chunks, const std::uint64_t of_rows,
+                      const std::uint64_t of_columns, const std::uint64_t step = 1) {
+        Bytes room(rows * columns);
+        return chunks.read({{{0, of_rows, 1}, {0, of_columns, step}}}, room.data());
     }
 
     Handle dataset_;
@@ -305,42 +326,45 @@ class LargeHdf5Chunks : public testing::Test {
     int arrays_ = 0;
 };
 
-TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfItCanReadAFewElementsOfThem) {
-    const Chunks plain = write(Layout::chunked({large}));
-    EXPECT_TRUE(reads(plain, large / 64));
-    EXPECT_FALSE(reads(plain, large / 64 - 1));
-    const Layout layout = Layout::chunked({large});
-    done(::H5Pset_deflate(layout.id(), 1));
-    EXPECT_TRUE(reads(write(layout), 1));
+TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfFewElementsAreWanted) {
+    const Chunks plain = write(in_one_chunk());
+    EXPECT_TRUE(reads(plain, rows, columns / 64));
+    EXPECT_FALSE(reads(plain, rows, columns / 64 - 1));
+    EXPECT_TRUE(reads(write(deflated()), 1, 1));
 }
 
-TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfItCanReadLongRunsOfThem) {
-    const Chunks plain = write(Layout::chunked({large}));
-    EXPECT_TRUE(reads(plain, large - 1));
-    EXPECT_FALSE(reads(plain, large));
-    EXPECT_TRUE(reads(plain, large / 2, 2));
-    const Layout layout = Layout::chunked({large});
+TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfFewPartsAreWanted) {
+    const Chunks plain = write(in_one_chunk());
+    EXPECT_TRUE(reads(plain, 16, columns / 2));
+    EXPECT_FALSE(reads(plain, 15, columns / 2));
+    EXPECT_TRUE(reads(plain, 1, columns / 2, 2));
+}
+
+TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfLongPartsAreWanted) {
+    const Chunks plain = write(in_one_chunk());
+    EXPECT_TRUE(reads(plain, rows, columns - 1));
+    EXPECT_FALSE(reads(plain, rows, columns));
+    const Layout layout = in_one_chunk();
     done(::H5Pset_shuffle(layout.id()));
-    EXPECT_TRUE(reads(write(layout), large));
+    EXPECT_TRUE(reads(write(layout), rows, columns));
 }
 
 TEST_F(LargeHdf5Chunks, AreNotInflatedFromTooFewBytes) {
-    const Layout layout = Layout::chunked({large});
-    done(::H5Pset_deflate(layout.id(), 1));
-    const Chunks chunks = write(layout);
-    const hsize_t begin = 0;
+    const Chunks chunks = write(deflated());
+    const Extents begin = {0, 0};
     const Bytes stored(5);
-    done(::H5Dwrite_chunk(dataset_.id(), H5P_DEFAULT, 0, &begin, stored.size(), stored.data()));
-    EXPECT_EQ(thrown_message([&] { reads(chunks, large); }),
+    done(::H5Dwrite_chunk(dataset_.id(), H5P_DEFAULT, 0, begin.data(), stored.size(),
+                          stored.data()));
+    EXPECT_EQ(thrown_message([&] { reads(chunks, 1, 1); }),
               "x: has a chunk that is too short; is the file damaged?");
 }
 
 TEST_F(LargeHdf5Chunks, AreLeftToTheLibraryIfTheyAreHuge) {
-    write(Layout::chunked({large}));
+    write(deflated());
     const std::uint64_t gibibyte = std::uint64_t{1} << 30U;
-    EXPECT_FALSE(reads({dataset_.id(), {gibibyte + 1}, 1, "x"}, large));
-    EXPECT_FALSE(reads({dataset_.id(), {gibibyte}, 2, "x"}, large));
-    EXPECT_FALSE(reads({dataset_.id(), {0}, 1, "x"}, large));
+    EXPECT_FALSE(reads(with_chunk({1, gibibyte + 1}, 1), 1, 1));
+    EXPECT_FALSE(reads(with_chunk({gibibyte, 1}, 2), 1, 1));
+    EXPECT_FALSE(reads(with_chunk({1, 0}, 1), 1, 1));
 }
 
 } // namespace

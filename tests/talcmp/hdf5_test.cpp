@@ -912,6 +912,17 @@ TEST_F(BrokenHdf5Files, LackArraysOfWhichTheyAreMade) {
     needs("beside", "b.h5[x]");
 }
 
+TEST_F(BrokenHdf5Files, HaveLargerChunksThanTheirLayoutSays) {
+    Writer(path()).write("x", {331, 2}, numbers(662), Layout::chunked({331, 1}));
+    change([](std::string& bytes) {
+        const std::string size({'\x2C', '\x05', '\0', '\0', '\0', '\0', '\0', '\0'});
+        for (auto at = bytes.find(size); at != std::string::npos; at = bytes.find(size)) {
+            bytes[at + 2] = '\x10';
+        }
+    });
+    EXPECT_EQ(contents(*open("x")), bytes_of(numbers(662)));
+}
+
 TEST_F(BrokenHdf5Files, HaveChunksOfAnotherRank) {
     Writer(path()).write("x", {1000}, numbers(1000), Layout::chunked({10}));
     change([](std::string& bytes) { bytes.at(place_of_extent(bytes) - 7) = 0; });

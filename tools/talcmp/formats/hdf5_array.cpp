@@ -209,7 +209,7 @@ void Hdf5Array::find_blocks(const hid_t creation) {
     if (::H5Pget_layout(creation) == H5D_CHUNKED) {
         block_ = chunk_of(creation, shape_, name_);
         if (type_.as_in_file) {
-            chunks_ = hdf5::Chunks(dataset_.id(), block_, type_.stored.size, name_);
+            chunks_ = hdf5::Chunks(dataset_.id(), shape_, block_, type_.stored.size, name_);
         }
     }
     for (std::size_t axis = 0; axis < shape_.size(); ++axis) {

@@ -121,20 +121,23 @@ Take take_of(const std::size_t element_size, const bool shuffled) {
 
 } // namespace
 
-// What is read of a chunk at a time.
+// What has been read of a chunk.
 struct Chunks::Bytes {
     std::vector<unsigned char> stored;
     std::vector<unsigned char> inflated; // unused if they were not deflated
     const unsigned char* elements = nullptr;
+    Shape extents; // of the elements, which may end where the array does
     bool shuffled = false;
     std::unique_ptr<libdeflate_decompressor, void (*)(libdeflate_decompressor*)> decompressor = {
         ::libdeflate_alloc_decompressor(), ::libdeflate_free_decompressor};
 };
 
-Chunks::Chunks(const hid_t dataset, Shape chunk, const std::size_t element_size, std::string name)
-    : dataset_(dataset), element_size_(element_size), size_(chunk_size(chunk, element_size)),
-      name_(std::move(name)) {
+Chunks::Chunks(const hid_t dataset, Shape shape, Shape chunk, const std::size_t element_size,
+               std::string name)
+    : dataset_(dataset), shape_(std::move(shape)), element_size_(element_size),
+      size_(chunk_size(chunk, element_size)), name_(std::move(name)) {
     const LibraryUse use(name_);
+    type_ = Handle(checked(::H5Dget_type(dataset), name_, "has elements of an unreadable type"));
     const Handle creation(::H5Dget_create_plist(dataset));
     if (size_ <= largest_chunk && know_filters(creation.id())) {
         extents_ = std::move(chunk);
@@ -171,72 +174,95 @@ bool Chunks::read(const Slab& slab, void* const elements) const {
         return false;
     }
     const std::vector<Shape> chunks = chunks_of(slab, extents_);
-    if (!is_worth_reading(slab, chunks.size())) {
+    const bool filtered = deflate_ != 0 || shuffle_ != 0;
+    if (filtered ? !are_written(chunks) : !is_worth_reading(slab, chunks.size())) {
         return false;
     }
-    const std::vector<std::size_t> sizes = stored_sizes(chunks);
     Bytes bytes;
-    for (std::size_t i = 0; i < sizes.size(); ++i) {
-        if (!fetch(chunks[i], sizes[i], bytes)) {
+    return std::all_of(chunks.begin(), chunks.end(), [&](const Shape& chunk) {
+        if (filtered ? !fetch(chunk, bytes) : !fetch_plain(chunk, bytes)) {
             return false;
         }
-        copy(chunks[i], slab, bytes, static_cast<unsigned char*>(elements));
-    }
-    return !sizes.empty();
+        copy(chunk, slab, bytes, static_cast<unsigned char*>(elements));
+        return true;
+    });
 }
 
-// Parts of chunks without filters the library reads from where they are, which is faster if few
-// elements are wanted, or long runs of them.
+// Parts of chunks without filters the library reads from where they are, one after another. That
+// is faster than to read them whole if the parts are few, or long, or little of all.
 bool Chunks::is_worth_reading(const Slab& slab, const std::size_t chunks) const {
     constexpr std::uint64_t most_in_vain = 64;
-    constexpr std::uint64_t long_run = std::uint64_t{64} * 1024;
-    if (deflate_ != 0 || shuffle_ != 0) {
-        return true;
-    }
+    constexpr std::uint64_t long_part = std::uint64_t{64} * 1024;
+    constexpr std::uint64_t few_parts = 16;
     std::uint64_t wanted = 1;
     for (const Slab::Axis& axis : slab.axes) {
         wanted *= axis.extent;
     }
-    const std::uint64_t run = std::min(slab.axes.back().extent, extents_.back());
-    const bool are_runs_long = slab.axes.back().step == 1 && run * element_size_ >= long_run;
-    return !are_runs_long && chunks * (size_ / element_size_) / most_in_vain <= wanted;
+    const std::uint64_t part =
+        slab.axes.back().step == 1 ? std::min(slab.axes.back().extent, extents_.back()) : 1;
+    return part * element_size_ < long_part && wanted / part >= few_parts * chunks
+           && wanted >= chunks * (size_ / element_size_) / most_in_vain;
 }
 
-// How many bytes of each chunk there are in the file; none if one was never written, so that its
-// elements have another value that the library knows.
-std::vector<std::size_t> Chunks::stored_sizes(const std::vector<Shape>& chunks) const {
+// The elements of a chunk that was never written have a value that the library knows.
+bool Chunks::are_written(const std::vector<Shape>& chunks) const {
     const LibraryUse use(name_);
-    std::vector<std::size_t> sizes;
-    for (const Shape& chunk : chunks) {
-        const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
-        hsize_t size = 0;
-        // Deflating makes nothing much longer: there are such sizes in damaged files alone.
-        if (::H5Dget_chunk_storage_size(dataset_, begin.data(), &size) < 0 || size == 0
-            || size > size_ + size_ / 8 + 1024) {
-            return {};
-        }
-        sizes.push_back(static_cast<std::size_t>(size));
-    }
-    return sizes;
+    return std::all_of(chunks.begin(), chunks.end(),
+                       [this](const Shape& chunk) { return stored_size(chunk) != 0; });
 }
 
-bool Chunks::fetch(const Shape& chunk, const std::size_t stored_size, Bytes& bytes) const {
+// How many bytes of a chunk with filters there are in the file.
+std::size_t Chunks::stored_size(const Shape& chunk) const {
+    const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
+    hsize_t size = 0;
+    // Deflating makes nothing much longer: there are such sizes in damaged files alone.
+    if (::H5Dget_chunk_storage_size(dataset_, begin.data(), &size) < 0
+        || size > size_ + size_ / 8 + 1024) {
+        return 0;
+    }
+    return static_cast<std::size_t>(size);
+}
+
+bool Chunks::fetch(const Shape& chunk, Bytes& bytes) const {
     const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
     std::uint32_t left_out = 0; // filters that were not applied to this chunk
-    bytes.stored.resize(stored_size);
     {
         const LibraryUse use(name_);
+        bytes.stored.resize(stored_size(chunk));
         if (::H5Dread_chunk(dataset_, H5P_DEFAULT, begin.data(), &left_out, bytes.stored.data())
             < 0) {
             return false;
         }
     }
+    bytes.extents = extents_;
     bytes.shuffled = (shuffle_ & ~left_out) != 0;
     if ((deflate_ & ~left_out) != 0) {
         return inflate(bytes);
     }
     bytes.elements = bytes.stored.data();
-    return has_all_bytes(stored_size);
+    return has_all_bytes(bytes.stored.size());
+}
+
+// Not as above: without filters, a damaged file may have larger chunks than the library says.
+bool Chunks::fetch_plain(const Shape& chunk, Bytes& bytes) const {
+    const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
+    bytes.extents = extents_;
+    for (std::size_t axis = 0; axis < chunk.size(); ++axis) {
+        bytes.extents[axis] = std::min(bytes.extents[axis], shape_[axis] - chunk[axis]);
+    }
+    const std::vector<hsize_t> extents(bytes.extents.begin(), bytes.extents.end());
+    bytes.stored.resize(size_);
+    bytes.elements = bytes.stored.data();
+    const LibraryUse use(name_);
+    const Handle in_file(::H5Dget_space(dataset_));
+    const Handle in_memory(
+        ::H5Screate_simple(static_cast<int>(extents.size()), extents.data(), nullptr));
+    return ::H5Sselect_hyperslab(in_file.id(), H5S_SELECT_SET, begin.data(), nullptr,
+                                 extents.data(), nullptr)
+               >= 0
+           && ::H5Dread(dataset_, type_.id(), in_memory.id(), in_file.id(), H5P_DEFAULT,
+                        bytes.stored.data())
+                  >= 0;
 }
 
 bool Chunks::inflate(Bytes& bytes) const {
@@ -274,11 +300,11 @@ void Chunks::copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,
     std::size_t slab_stride = 1;
     for (std::size_t i = axes.size(); i-- > 0;) {
         const Slab::Axis& axis = slab.axes[i];
-        const CommonPart part = common_part(axis, chunk[i], extents_[i]);
+        const CommonPart part = common_part(axis, chunk[i], bytes.extents[i]);
         first_in_chunk += part.in_chunk * chunk_stride;
         first_in_slab += part.in_slab * slab_stride;
         axes[i] = {part.count, axis.step * chunk_stride, slab_stride};
-        chunk_stride *= static_cast<std::size_t>(extents_[i]);
+        chunk_stride *= static_cast<std::size_t>(bytes.extents[i]);
         slab_stride *= static_cast<std::size_t>(axis.extent);
     }
     const BoxAxis& run = axes.back();

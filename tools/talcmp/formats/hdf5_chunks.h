@@ -21,8 +21,8 @@ class Chunks {
     Chunks() = default;
 
     // Those of a chunked dataset whose elements take `element_size` bytes. `name` is what messages
-    // call it.
-    Chunks(hid_t dataset, Shape chunk, std::size_t element_size, std::string name);
+    // call it. Throws Trouble.
+    Chunks(hid_t dataset, Shape shape, Shape chunk, std::size_t element_size, std::string name);
 
     // Reads the elements of the slab as they are in the file, in C order. Returns false, and
     // may leave anything in `elements`, if the library has to read them. Several threads may read
@@ -34,14 +34,18 @@ class Chunks {
 
     bool know_filters(hid_t creation);
     bool is_worth_reading(const Slab& slab, std::size_t chunks) const;
-    std::vector<std::size_t> stored_sizes(const std::vector<Shape>& chunks) const;
-    bool fetch(const Shape& chunk, std::size_t stored_size, Bytes& bytes) const;
+    bool are_written(const std::vector<Shape>& chunks) const;
+    std::size_t stored_size(const Shape& chunk) const;
+    bool fetch(const Shape& chunk, Bytes& bytes) const;
+    bool fetch_plain(const Shape& chunk, Bytes& bytes) const;
     bool inflate(Bytes& bytes) const;
     bool has_all_bytes(std::size_t bytes) const;
     void copy(const Shape& chunk, const Slab& slab, const Bytes& bytes,
               unsigned char* elements) const;
 
     hid_t dataset_ = H5I_INVALID_HID;
+    Handle type_; // of its elements
+    Shape shape_;
     Shape extents_; // of each chunk; empty if the library has to read all
     std::size_t element_size_ = 0;
     std::size_t size_ = 0; // of each chunk, in bytes
