@@ -36,8 +36,8 @@ class ArrayFile {
         return std::find(names.begin(), names.end(), member) != names.end();
     }
 
-    // Opens an array that the file has. Each may be opened only once. Throws Trouble; NotNumbers if it is not an
-    // array of numbers.
+    // Opens an array that the file has. Each may be opened only once. Throws Trouble; NotNumbers if
+    // it is not an array of numbers.
     virtual std::unique_ptr<ArraySource> open(const std::string& member) = 0;
 };
 
