@@ -231,6 +231,67 @@ class RelativeErrors(Drawn):
                       "absolute error of 0.001; NaNs are equal\n", output)
 
 
+class LargestDifferences(Drawn):
+    def expect_largest(self, x, y):
+        """x and y are doubles; those of the files may be of other types with the same values."""
+        with np.errstate(all="ignore"):
+            differences = abs(x - y)
+            larger = np.maximum(abs(x), abs(y))
+            quotients = np.where(np.isinf(larger), differences, differences / larger)
+        expected = [np.max(each[~np.isnan(each)], initial=0) for each in (differences, quotients)]
+        report = document_of(run("--json", "--tol=1", self.path("a.npy"), self.path("b.npy"))[1]
+                             )["comparisons"][0]["report"]
+        found = [float(report[f"largest_{kind}_difference"]) for kind in ("absolute", "relative")]
+        self.assertEqual(found, expected)
+
+    def test_are_found_wherever_they_are(self):
+        """The largest absolute difference is of large numbers, the largest relative one of small
+        ones; others are smaller by one unit in the last place, so that none can be missed."""
+        for count in (511, 512, 513, 1023, 1025, 5000):
+            for _ in range(4):
+                with self.subTest(count=count, seed=SEED):
+                    x = self.rng.standard_normal(count)
+                    y = x * (1 + self.rng.standard_normal(count) * 1e-6)
+                    large, small, *others = self.rng.choice(count, 8, replace=False)
+                    x[large], y[large] = 1e9, 1e9 + 1
+                    x[small], y[small] = 1e-9, 1.5e-9
+                    x[others] = 1e-9
+                    y[others] = np.nextafter(1.5e-9, 0)
+                    self.save("a.npy", x), self.save("b.npy", y)
+                    self.expect_largest(x, y)
+                    self.save("a.npy", x + 1j), self.save("b.npy", y + 1j)
+                    self.expect_largest(x, y)
+
+    def test_are_found_by_one_unit_in_the_last_place(self):
+        """Of quotients whose product with the larger magnitude is rounded up to the difference."""
+        unit = 2.0**-51
+        for _ in range(10):
+            product, difference = 0, 1
+            while product < difference:
+                larger = 1 + float(self.rng.integers(2**51)) * unit
+                smaller = float(self.rng.integers(2**51)) * unit
+                difference = larger + smaller
+                before = np.nextafter(difference / larger, 0)
+                product = larger * before
+            with self.subTest(larger=larger, smaller=smaller):
+                x, y = np.ones(1024), np.ones(1024)
+                x[0], y[0] = 8, -8 * (before - 1)
+                x[600], y[600] = larger, -smaller
+                self.save("a.npy", x), self.save("b.npy", y)
+                self.expect_largest(x, y)
+
+    def test_of_special_values(self):
+        special = np.array([0, -0.0, 5e-324, 1e-310, 1, 1.7e308, -1.7e308, np.inf, -np.inf, np.nan])
+        for _ in range(40):
+            with self.subTest(seed=SEED):
+                drawn = special[self.rng.choice(len(special), 1 + self.rng.integers(10))]
+                x, y = (np.ones(2000) for _ in range(2))
+                some = self.rng.choice(2000, 3, replace=False)
+                x[some], y[some] = self.rng.choice(drawn, (2, 3))
+                self.save("a.npy", x), self.save("b.npy", y)
+                self.expect_largest(x, y)
+
+
 class Masks(Drawn):
     def test_leave_elements_out(self):
         for shape, order in (((), "C"), ((7,), "C"), ((40, 30), "C"), ((40, 30), "F"),

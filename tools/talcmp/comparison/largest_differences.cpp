@@ -2,6 +2,7 @@
 
 #include "element_parts.h"
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstddef>
@@ -10,85 +11,95 @@
 namespace talcmp {
 namespace {
 
-// Without branches; neither a NaN nor the quotient of two zeros is larger than anything.
-[[gnu::always_inline]] inline void take(const double x, const double y, const double difference,
-                                        double& absolute, double& relative) {
-    const double magnitude1 = std::fabs(x);
-    const double magnitude2 = std::fabs(y);
-    const double larger = magnitude1 < magnitude2 ? magnitude2 : magnitude1;
+// Neither a NaN nor the quotient of two zeros is larger than anything.
+void take(const double x, const double y, const double difference, LargestDifferences& largest) {
+    const double larger = std::max(std::fabs(x), std::fabs(y));
     const double quotient =
         larger <= std::numeric_limits<double>::max() ? difference / larger : difference;
-    absolute = difference > absolute ? difference : absolute;
-    relative = quotient > relative ? quotient : relative;
+    largest.absolute = difference > largest.absolute ? difference : largest.absolute;
+    largest.relative = quotient > largest.relative ? quotient : largest.relative;
 }
 
-[[gnu::always_inline]] inline LargestDifferences
-measure_here(const double* const x, const double* const y, const std::size_t count) {
-    // Numbers side by side, so that compilers make vector instructions of them.
-    constexpr std::size_t lanes = 8;
-    std::array<double, lanes> absolute = {};
-    std::array<double, lanes> relative = {};
-    std::size_t i = 0;
-    for (; i + lanes <= count; i += lanes) {
+constexpr std::size_t at_once = 512;
+
+// Whether a pair among `at_once` may have a larger difference or quotient than the largest ones so
+// far, which is found out without a division: a quotient above `largest.relative` has a difference
+// above the product of that and the larger magnitude, and so not below that product rounded.
+[[gnu::always_inline]] inline bool may_be_larger(const double* const x, const double* const y,
+                                                 const LargestDifferences largest) {
+    // Many numbers side by side, so that compilers make a loop of vector instructions.
+    constexpr std::size_t lanes = 64;
+    std::array<double, lanes> larger_ones = {};
+    for (std::size_t i = 0; i < at_once; i += lanes) {
         for (std::size_t lane = 0; lane < lanes; ++lane) {
-            const std::size_t each = i + lane;
-            take(x[each], y[each], std::fabs(x[each] - y[each]), absolute[lane], relative[lane]);
+            const double magnitude1 = std::fabs(x[i + lane]);
+            const double magnitude2 = std::fabs(y[i + lane]);
+            const double larger = magnitude1 < magnitude2 ? magnitude2 : magnitude1;
+            const double difference = std::fabs(x[i + lane] - y[i + lane]);
+            const double by_quotient = difference < larger * largest.relative ? 0 : difference;
+            const double found = difference > largest.absolute ? difference : by_quotient;
+            larger_ones[lane] = found > larger_ones[lane] ? found : larger_ones[lane];
         }
     }
-    for (; i < count; ++i) {
-        take(x[i], y[i], std::fabs(x[i] - y[i]), absolute[0], relative[0]);
+    return *std::max_element(larger_ones.begin(), larger_ones.end()) > 0;
+}
+
+[[gnu::always_inline]] inline void add_here(const double* const x, const double* const y,
+                                            const std::size_t count, LargestDifferences& largest) {
+    for (std::size_t begin = 0; begin < count; begin += at_once) {
+        const std::size_t end = std::min(count, begin + at_once);
+        if (end < begin + at_once || may_be_larger(x + begin, y + begin, largest)) {
+            for (std::size_t i = begin; i < end; ++i) {
+                take(x[i], y[i], std::fabs(x[i] - y[i]), largest);
+            }
+        }
     }
-    return {*std::max_element(absolute.begin(), absolute.end()),
-            *std::max_element(relative.begin(), relative.end())};
 }
 
 #if defined(__x86_64__)
 
-[[gnu::target("avx2")]] LargestDifferences
-measure_by_avx2(const double* const x, const double* const y, const std::size_t count) {
-    return measure_here(x, y, count);
+[[gnu::target("avx2")]] void add_by_avx2(const double* const x, const double* const y,
+                                         const std::size_t count, LargestDifferences& largest) {
+    add_here(x, y, count, largest);
 }
 
-LargestDifferences measure_reals(const double* const x, const double* const y,
-                                 const std::size_t count) {
+void add_reals(const double* const x, const double* const y, const std::size_t count,
+               LargestDifferences& largest) {
     if (static_cast<bool>(__builtin_cpu_supports("avx2"))) {
-        return measure_by_avx2(x, y, count);
+        add_by_avx2(x, y, count, largest);
+    } else {
+        add_here(x, y, count, largest);
     }
-    return measure_here(x, y, count);
 }
 
 #else
 
-LargestDifferences measure_reals(const double* const x, const double* const y,
-                                 const std::size_t count) {
-    return measure_here(x, y, count);
+void add_reals(const double* const x, const double* const y, const std::size_t count,
+               LargestDifferences& largest) {
+    add_here(x, y, count, largest);
 }
 
 #endif
 
-LargestDifferences measure_sums(const double* const x, const double* const x_rests,
-                                const double* const y, const double* const y_rests,
-                                const std::size_t count) {
-    LargestDifferences largest;
+void add_sums(const double* const x, const double* const x_rests, const double* const y,
+              const double* const y_rests, const std::size_t count, LargestDifferences& largest) {
     for (std::size_t i = 0; i < count; ++i) {
         const double rests =
             (x_rests == nullptr ? 0 : x_rests[i]) - (y_rests == nullptr ? 0 : y_rests[i]);
-        take(x[i], y[i], std::fabs((x[i] - y[i]) + rests), largest.absolute, largest.relative);
+        take(x[i], y[i], std::fabs((x[i] - y[i]) + rests), largest);
     }
-    return largest;
 }
 
 } // namespace
 
-LargestDifferences DifferenceMeter::measure(const Pairs& pairs) {
-    LargestDifferences largest = measure_part(pairs, 0);
+void DifferenceMeter::add(const Pairs& pairs, LargestDifferences& largest) {
+    add_part(pairs, 0, largest);
     if (is_complex(pairs.type1()) || is_complex(pairs.type2())) {
-        add(largest, measure_part(pairs, 1));
+        add_part(pairs, 1, largest);
     }
-    return largest;
 }
 
-LargestDifferences DifferenceMeter::measure_part(const Pairs& pairs, const int part) {
+void DifferenceMeter::add_part(const Pairs& pairs, const int part, LargestDifferences& largest) {
     const void* const elements1 = pairs.element1(0);
     const void* const elements2 = pairs.element2(0);
     const std::size_t count = pairs.count();
@@ -99,8 +110,11 @@ LargestDifferences DifferenceMeter::measure_part(const Pairs& pairs, const int p
         whole ? rests_of(pairs.type1(), elements1, count, rests1_) : nullptr;
     const double* const y_rests =
         whole ? rests_of(pairs.type2(), elements2, count, rests2_) : nullptr;
-    return x_rests == nullptr && y_rests == nullptr ? measure_reals(x, y, count)
-                                                    : measure_sums(x, x_rests, y, y_rests, count);
+    if (x_rests == nullptr && y_rests == nullptr) {
+        add_reals(x, y, count, largest);
+    } else {
+        add_sums(x, x_rests, y, y_rests, count, largest);
+    }
 }
 
 } // namespace talcmp

@@ -22,10 +22,11 @@ inline void add(LargestDifferences& sum, const LargestDifferences& part) {
 
 class DifferenceMeter {
   public:
-    LargestDifferences measure(const Pairs& pairs);
+    // Adds those of the pairs to the largest ones so far.
+    void add(const Pairs& pairs, LargestDifferences& largest);
 
   private:
-    LargestDifferences measure_part(const Pairs& pairs, int part);
+    void add_part(const Pairs& pairs, int part, LargestDifferences& largest);
 
     std::vector<double> parts1_, parts2_, rests1_, rests2_;
 };

@@ -82,7 +82,7 @@ const DigitSearch::Result& PairCounter::add(const Pairs& asked, const Pairs& sto
     const DigitSearch::Result& found = search_.search(asked);
     add_counts(found, totals);
     if (may_differ(asked, stored, found)) {
-        talcmp::add(totals.largest, meter_.measure(stored));
+        meter_.add(stored, totals.largest);
     }
     add_differing(asked, stored, found, number, in_order, findings);
     add_worst(stored, found, number, in_order, totals);
