@@ -1,5 +1,6 @@
 #include "npz_file.h"
 
+#include "ends_with.h"
 #include "npy_array.h"
 #include "trouble.h"
 
@@ -9,10 +10,6 @@ namespace talcmp {
 namespace {
 
 constexpr std::string_view suffix = ".npy";
-
-bool ends_with(const std::string_view text, const std::string_view end) {
-    return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
-}
 
 } // namespace
 

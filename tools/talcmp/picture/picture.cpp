@@ -1,18 +1,13 @@
 #include "picture.h"
 
 #include "drawing.h"
+#include "ends_with.h"
 #include "png_picture.h"
 #include "shape_text.h"
 #include "svg_picture.h"
 
-#include <string_view>
-
 namespace talcmp {
 namespace {
-
-bool ends_with(const std::string_view text, const std::string_view end) {
-    return text.size() >= end.size() && text.substr(text.size() - end.size()) == end;
-}
 
 ArrayCaption caption_of(const ArrayFacts& array) {
     const std::string part =

@@ -18,7 +18,7 @@ std::string attribute(const char* const name, const std::string& value) {
     return " " + std::string(name) + "=\"" + value + "\"";
 }
 
-std::string hexadecimal(const Rgb colour) {
+std::string hex_code(const Rgb colour) {
     constexpr char digits[] = "0123456789abcdef";
     std::string text = "#";
     for (const unsigned channel : {colour.red, colour.green, colour.blue}) {
@@ -28,7 +28,7 @@ std::string hexadecimal(const Rgb colour) {
     return text;
 }
 
-std::string escaped(const std::string& text) {
+std::string in_xml(const std::string& text) {
     std::string result;
     for (const char each : text) {
         switch (each) {
@@ -64,16 +64,16 @@ std::string rectangle(const Drawing::Box& box, const std::string& fill) {
 std::string nan_pattern(const Drawing& drawing) {
     const int square = drawing.nan_square;
     const std::string side = number(2 * square);
-    const std::string colour = hexadecimal(colour_of(nan_level, drawing.all_digits));
+    const std::string colour = hex_code(colour_of(nan_level, drawing.all_digits));
     return R"(<pattern id="nan" patternUnits="userSpaceOnUse")" + attribute("width", side)
            + attribute("height", side) + ">\n"
-           + rectangle({0, 0, 2 * square, 2 * square}, hexadecimal(paper)) + "\n"
+           + rectangle({0, 0, 2 * square, 2 * square}, hex_code(paper)) + "\n"
            + rectangle({0, 0, square, square}, colour) + "\n"
            + rectangle({square, square, square, square}, colour) + "\n</pattern>\n";
 }
 
 std::string look(const Level level, const int all_digits) {
-    return level == nan_level ? "url(#nan)" : hexadecimal(colour_of(level, all_digits));
+    return level == nan_level ? "url(#nan)" : hex_code(colour_of(level, all_digits));
 }
 
 // One path for each level.
@@ -108,7 +108,7 @@ std::string text_element(const Drawing::Text& text) {
                                                                         : "end";
     return "<text" + attribute("x", number(text.x))
            + attribute("y", number(text.y + Drawing::letter_height))
-           + (*anchor == '\0' ? "" : attribute("text-anchor", anchor)) + ">" + escaped(text.text)
+           + (*anchor == '\0' ? "" : attribute("text-anchor", anchor)) + ">" + in_xml(text.text)
            + "</text>\n";
 }
 
@@ -123,7 +123,7 @@ std::string svg_text(const Drawing& drawing) {
                        + R"( shape-rendering="crispEdges" font-family="monospace")"
                        + attribute("font-size", number(font_size)) + ">\n";
     text += nan_pattern(drawing);
-    text += R"(<rect width="100%" height="100%")" + attribute("fill", hexadecimal(paper)) + "/>\n";
+    text += R"(<rect width="100%" height="100%")" + attribute("fill", hex_code(paper)) + "/>\n";
     text += paths(drawing);
     text += lines_path(drawing);
     for (const Drawing::Text& each : drawing.texts) {

@@ -13,9 +13,9 @@
 namespace talcmp {
 namespace {
 
-constexpr std::string_view nothing = "\r\x1B[K";
+constexpr std::string_view empty_line = "\r\x1B[K";
 
-std::atomic<bool> is_shown = false;
+std::atomic<bool> line_is_shown = false;
 std::atomic<bool> is_written = false; // at the moment
 static_assert(std::atomic<bool>::is_always_lock_free, "a signal handler uses them");
 
@@ -41,8 +41,8 @@ bool stop_writing() {
 
 // Only calls what a signal handler may call.
 void end_by_signal(const int signal) {
-    if (stop_writing() && is_shown) {
-        write_to_terminal(nothing);
+    if (stop_writing() && line_is_shown) {
+        write_to_terminal(empty_line);
     }
     // Ends the process when the handler returns, as its action is the default again.
     ::raise(signal);
@@ -52,7 +52,7 @@ void write_status(const std::string& text, const bool shown) {
     // The handler of these signals would wait for the write that it has interrupted.
     const BlockedSignals blocked;
     if (!is_written.exchange(true)) {
-        is_shown = shown;
+        line_is_shown = shown;
         write_to_terminal(text);
         is_written = false;
     }
@@ -65,8 +65,8 @@ void show_status(const std::string& text) {
 }
 
 void clear_status() {
-    if (is_shown) {
-        write_status(std::string(nothing), false);
+    if (line_is_shown) {
+        write_status(std::string(empty_line), false);
     }
 }
 

@@ -14,7 +14,7 @@
 namespace talcmp {
 namespace {
 
-constexpr std::size_t indentation = 2;
+constexpr std::size_t map_margin = 2;
 constexpr std::uint64_t lines_of_cells = 16;
 
 // ---- The characters
@@ -96,7 +96,7 @@ class MapText {
             const Terminal& terminal)
         : map_(map), layout_(map.layout()), all_digits_(all_digits),
           characters_(characters == CharacterSet::utf8 ? blocks : ascii), terminal_(terminal),
-          room_(room_in_line(terminal.columns())), left_(indentation + label_width(layout_.rows)),
+          room_(room_in_line(terminal.columns())), left_(map_margin + label_width(layout_.rows)),
           stride_(static_cast<std::size_t>(layout_.cell_columns) + 1) {}
 
     std::string text() {
@@ -122,17 +122,17 @@ class MapText {
   private:
     // In as many lines as it takes.
     void add_line(std::string line) {
-        const std::size_t most = std::max(room_, indentation + 1) - indentation;
+        const std::size_t most = std::max(room_, map_margin + 1) - map_margin;
         while (line.size() > most) {
             const std::size_t last = line.rfind(' ', most);
             const std::size_t end = last == std::string::npos ? line.find(' ') : last;
             if (end == std::string::npos) {
                 break;
             }
-            text_ += std::string(indentation, ' ') + line.substr(0, end) + "\n";
+            text_ += std::string(map_margin, ' ') + line.substr(0, end) + "\n";
             line.erase(0, end + 1);
         }
-        text_ += std::string(indentation, ' ') + line + "\n";
+        text_ += std::string(map_margin, ' ') + line + "\n";
     }
 
     std::uint64_t first_image(const std::uint64_t grid_row) const {
@@ -232,12 +232,12 @@ class MapText {
                 continue;
             }
             const std::string meaning = shade_text(shade, all_digits_);
-            const std::size_t width = indentation + 2 + meaning.size();
+            const std::size_t width = map_margin + 2 + meaning.size();
             if (length != 0 && length + width > room_) {
                 text_ += "\n";
                 length = 0;
             }
-            text_ += std::string(indentation, ' ') + coloured(std::string(character(shade)), shade)
+            text_ += std::string(map_margin, ' ') + coloured(std::string(character(shade)), shade)
                      + " " + meaning;
             length += width;
         }
@@ -277,7 +277,7 @@ CharacterSet character_set_of_environment() {
 
 MapRoom room_of_text(const Shape& shape, const int columns) {
     const std::uint64_t rows = shape.size() < 2 ? 1 : shape[shape.size() - 2];
-    const std::size_t left = indentation + label_width(rows);
+    const std::size_t left = map_margin + label_width(rows);
     const std::size_t all = room_in_line(columns);
     const std::size_t room = all > left ? all - left : 1;
     return {lines_of_cells, room, 1, 3, false};
