@@ -2,6 +2,7 @@
 
 #include "descriptor.h"
 #include "hdf5_other_files.h"
+#include "hdf5_slab.h"
 
 #include <algorithm>
 #include <array>
@@ -115,8 +116,8 @@ std::string missing_filter(const hid_t dataset) {
     return "";
 }
 
-[[noreturn]] void throw_unreadable(const hid_t dataset, const std::string& name) {
-    const std::string reason = hdf5::library_reason();
+[[noreturn]] void throw_unreadable(const hid_t dataset, const std::string& reason,
+                                   const std::string& name) {
     const std::string filter = missing_filter(dataset);
     if (filter.empty()) {
         throw Trouble(name, "cannot be read: " + reason + "; is the file complete and undamaged?");
@@ -133,33 +134,6 @@ std::size_t count_of(const Slab& slab) {
         count *= static_cast<std::size_t>(axis.extent);
     }
     return count;
-}
-
-std::vector<hsize_t> each(const Slab& slab, std::uint64_t Slab::Axis::*const member) {
-    std::vector<hsize_t> values;
-    for (const Slab::Axis& axis : slab.axes) {
-        values.push_back(axis.*member);
-    }
-    return values;
-}
-
-// The elements of the slab among all those of the array.
-Handle selection_of(const hid_t dataset, const Slab& slab, const std::string& name) {
-    constexpr const char* what_failed = "cannot be read in parts";
-    Handle space(checked(::H5Dget_space(dataset), name, what_failed));
-    if (!slab.axes.empty()) {
-        checked(::H5Sselect_hyperslab(space.id(), H5S_SELECT_SET,
-                                      each(slab, &Slab::Axis::begin).data(),
-                                      each(slab, &Slab::Axis::step).data(),
-                                      each(slab, &Slab::Axis::extent).data(), nullptr),
-                name, what_failed);
-    }
-    return space;
-}
-
-Handle space_in_memory(const Slab& slab) {
-    const auto extents = each(slab, &Slab::Axis::extent);
-    return Handle(::H5Screate_simple(static_cast<int>(extents.size()), extents.data(), nullptr));
 }
 
 } // namespace
@@ -248,12 +222,9 @@ void Hdf5Array::read_slab(const Slab& slab, void* const elements) {
 
 void Hdf5Array::read_by_library(const Slab& slab, void* const stored) const {
     const LibraryUse use(name_, hdf5::time_to_read);
-    const Handle in_file = selection_of(dataset_.id(), slab, name_);
-    const Handle in_memory = space_in_memory(slab);
-    if (::H5Dread(dataset_.id(), type_.memory.id(), in_memory.id(), in_file.id(), H5P_DEFAULT,
-                  stored)
-        < 0) {
-        throw_unreadable(dataset_.id(), name_);
+    if (const auto reason =
+            hdf5::read_slab(dataset_.id(), type_.memory.id(), slab, stored, name_)) {
+        throw_unreadable(dataset_.id(), *reason, name_);
     }
 }
 

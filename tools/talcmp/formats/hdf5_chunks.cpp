@@ -1,6 +1,7 @@
 #include "hdf5_chunks.h"
 
 #include "box_axis.h"
+#include "hdf5_slab.h"
 
 #include <algorithm>
 #include <cstring>
@@ -245,24 +246,15 @@ bool Chunks::fetch(const Shape& chunk, Bytes& bytes) const {
 
 // Not as above: without filters, a damaged file may have larger chunks than the library says.
 bool Chunks::fetch_plain(const Shape& chunk, Bytes& bytes) const {
-    const std::vector<hsize_t> begin(chunk.begin(), chunk.end());
+    Slab slab;
     bytes.extents = extents_;
     for (std::size_t axis = 0; axis < chunk.size(); ++axis) {
         bytes.extents[axis] = std::min(bytes.extents[axis], shape_[axis] - chunk[axis]);
+        slab.axes.push_back({chunk[axis], bytes.extents[axis], 1});
     }
-    const std::vector<hsize_t> extents(bytes.extents.begin(), bytes.extents.end());
     bytes.stored.resize(size_);
     bytes.elements = bytes.stored.data();
-    const LibraryUse use(name_);
-    const Handle in_file(::H5Dget_space(dataset_));
-    const Handle in_memory(
-        ::H5Screate_simple(static_cast<int>(extents.size()), extents.data(), nullptr));
-    return ::H5Sselect_hyperslab(in_file.id(), H5S_SELECT_SET, begin.data(), nullptr,
-                                 extents.data(), nullptr)
-               >= 0
-           && ::H5Dread(dataset_, type_.id(), in_memory.id(), in_file.id(), H5P_DEFAULT,
-                        bytes.stored.data())
-                  >= 0;
+    return !read_slab(dataset_, type_.id(), slab, bytes.stored.data(), name_);
 }
 
 bool Chunks::inflate(Bytes& bytes) const {
