@@ -424,9 +424,10 @@ struct Operand {
 
 void check_question(const Operand& first, const Operand& second, const talcmp::Question& question) {
     const Expected expected = expected_answer(first.array, second.array, question);
+    talcmp::AllBoxes boxes;
     NoProgress progress;
     const auto comparison =
-        talcmp::compare(named(first.file), named(second.file), {}, question, progress);
+        talcmp::compare(named(first.file), named(second.file), {}, question, boxes, progress);
     require(comparison.difference == expected.difference, "the arrays differ as is expected");
     if (comparison.difference != Difference::none) {
         check_text(talcmp::difference_text(comparison), expected, first.array, second.array);

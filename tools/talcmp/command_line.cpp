@@ -7,7 +7,6 @@
 #include <array>
 #include <charconv>
 #include <cmath>
-#include <cstdio>
 #include <vector>
 
 namespace talcmp {
@@ -220,41 +219,37 @@ void check_together(const Words& words, const CommandLine& line) {
 }
 
 // An error is easily taken for a number of digits.
-void note_small_tolerance(const Words& words, const CommandLine& line) {
+std::string note_on_tolerance(const Words& words, const CommandLine& line) {
     const talreal tolerance = line.question.tolerance;
-    if (!line.quiet && 0 < tolerance && tolerance < 1) {
-        const std::string text = value_of(words, "--tol", "");
-        std::fprintf(stderr,
-                     "talcmp: note: --tol %s means %s binary digits; a relative error is "
-                     "--relative %s\n",
-                     text.c_str(), text.c_str(), text.c_str());
+    if (line.quiet || !(0 < tolerance && tolerance < 1)) {
+        return "";
     }
+    const std::string text = value_of(words, "--tol", "");
+    return "--tol " + text + " means " + text + " binary digits; a relative error is --relative "
+           + text;
 }
 
-void print_version() {
+std::string version() {
     std::string formats;
     for (const std::string_view format : format_names()) {
         formats += (formats.empty() ? "" : ", ") + std::string(format);
     }
-    std::printf("talcmp " TALCMP_VERSION "\nreads %s\n", formats.c_str());
+    return "talcmp " TALCMP_VERSION "\nreads " + formats + "\n";
 }
 
 } // namespace
 
-std::optional<CommandLine> read_command_line(const int argc, const char* const* argv) {
+CommandLine read_command_line(const int argc, const char* const* argv) {
     const Words words = sort_words(options(), {argv + 1, argv + argc});
-    if (has(words, "--help")) {
-        std::fputs(help, stdout);
-        return std::nullopt;
-    }
-    if (has(words, "--version")) {
-        print_version();
-        return std::nullopt;
+    if (has(words, "--help") || has(words, "--version")) {
+        CommandLine line;
+        line.text = has(words, "--help") ? help : version();
+        return line;
     }
     CommandLine line = command_line_of(words);
     take_operands(words.operands, line);
     check_together(words, line);
-    note_small_tolerance(words, line);
+    line.note = note_on_tolerance(words, line);
     line.question.report = line.report || line.json || !line.picture.empty();
     line.question.only_whether = line.quiet;
     return line;

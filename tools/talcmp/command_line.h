@@ -12,6 +12,8 @@
 namespace talcmp {
 
 struct CommandLine {
+    std::string text; // of --help or --version, which is all that was asked
+    std::string note; // for the user, if there is something to say
     Question question;
     NameFilter filter;   // for members of archives; exclusions also for files in folders
     bool report = false; // whether it is printed
@@ -27,8 +29,7 @@ struct CommandLine {
     std::string second;
 };
 
-// Returns what is asked; nothing if that was the help or the version, which has then been printed.
 // Throws UsageError.
-std::optional<CommandLine> read_command_line(int argc, const char* const* argv);
+CommandLine read_command_line(int argc, const char* const* argv);
 
 } // namespace talcmp

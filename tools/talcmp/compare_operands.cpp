@@ -3,6 +3,7 @@
 #include "array_file.h"
 #include "operands.h"
 #include "picture.h"
+#include "shape_text.h"
 #include "shown.h"
 #include "status_line.h"
 #include "trouble.h"
@@ -10,9 +11,12 @@
 #include <algorithm>
 #include <cstdio>
 #include <filesystem>
+#include <memory>
 #include <new>
+#include <numeric>
 #include <system_error>
 #include <tuple>
+#include <vector>
 
 namespace talcmp {
 namespace {
@@ -22,29 +26,51 @@ bool is_pipe(const std::string& path) {
     return path == standard_input_path || std::filesystem::is_fifo(path, error);
 }
 
+std::string name_of_input(const std::string& path) {
+    return path == standard_input_path ? "standard input" : path;
+}
+
+// In bytes; 0 if the file is not there.
+std::uint64_t file_size(const std::string& path) {
+    std::error_code error;
+    const std::uint64_t size = std::filesystem::file_size(path, error);
+    return error ? 0 : size;
+}
+
 class OperandComparison {
   public:
-    OperandComparison(const CommandLine& command_line, Answers& answers, ProgressBar& progress)
-        : command_line_(command_line), answers_(answers), progress_(progress) {}
+    OperandComparison(const CommandLine& command_line, Answers& answers, ProgressListener& progress,
+                      const MakeGroup& make_group)
+        : command_line_(command_line), answers_(answers), progress_(progress),
+          all_(make_group([this](const Outcome& outcome) { return print(outcome); })),
+          group_(all_.get()) {}
 
     Summary compare_all() {
-        const FilePairs files = file_pairs();
+        if (group_->leads()) {
+            answers_.begin();
+        }
+        const FilePairs files = group_->same_files([this] { return file_pairs(); });
+        const std::uint64_t total = total_bytes(files.pairs);
         for (const NamedPair& pair : files.pairs) {
-            if (summary_.stopped) {
+            if (group_->has_ended()) {
                 break;
             }
             if (pair.trouble) {
                 report_trouble(pair.first.value_or(command_line_.first),
                                pair.second.value_or(command_line_.second), *pair.trouble);
             } else if (pair.first && pair.second) {
-                guarded(*pair.first, *pair.second, [&] {
+                const bool suits_one = files.many && group_->suits_one(pair.bytes, total);
+                by_one_or_all(suits_one, *pair.first, *pair.second, [&] {
                     compare_files({*pair.first, files.member1}, {*pair.second, files.member2});
                 });
             } else {
                 report_single(pair, pair.name, command_line_.first, command_line_.second);
             }
         }
-        answers_.finish(summary_);
+        group_->finish();
+        if (group_->leads()) {
+            answers_.finish(summary_);
+        }
         return summary_;
     }
 
@@ -53,11 +79,16 @@ class OperandComparison {
     FilePairs file_pairs() {
         const std::string& first = command_line_.first;
         const std::string& second = command_line_.second;
-        answers_.begin();
         try {
+            if (!group_->is_alone()) {
+                refuse_pipes();
+            }
             FilePairs files = match_files(first, second, command_line_.filter.exclude);
             if (files.many) {
                 check_suits_many();
+            }
+            if (!group_->is_alone()) {
+                find_sizes(files.pairs);
             }
             summary_.many = files.many;
             summary_.other_files = files.others;
@@ -66,6 +97,52 @@ class OperandComparison {
             report_trouble(first, second, trouble.what());
             return {};
         }
+    }
+
+    void refuse_pipes() const {
+        for (const std::string& operand :
+             {command_line_.first, command_line_.second, command_line_.ignore}) {
+            const std::string path = split_member(operand).first;
+            if (is_pipe(path)) {
+                throw Trouble(name_of_input(path),
+                              "can be read by one process only; save it to a file first");
+            }
+        }
+    }
+
+    static void find_sizes(std::vector<NamedPair>& pairs) {
+        for (NamedPair& pair : pairs) {
+            if (pair.first && pair.second) {
+                pair.bytes = file_size(*pair.first) + file_size(*pair.second);
+            }
+        }
+    }
+
+    static std::uint64_t total_bytes(const std::vector<NamedPair>& pairs) {
+        return std::accumulate(
+            pairs.begin(), pairs.end(), std::uint64_t{0},
+            [](const std::uint64_t sum, const NamedPair& pair) { return sum + pair.bytes; });
+    }
+
+    // Runs `compare` in one process, or in all of them.
+    template <typename Action>
+    void by_one_or_all(const bool one, const std::string& first, const std::string& second,
+                       const Action& compare) {
+        if (!one) {
+            guarded(first, second, compare);
+            return;
+        }
+        group_->by_one([&] {
+            std::vector<Outcome> outcomes;
+            SingleProcess single([&](const Outcome& outcome) {
+                outcomes.push_back(outcome);
+                return !stops_at(outcome);
+            });
+            group_ = &single;
+            guarded(first, second, compare);
+            group_ = all_.get();
+            return outcomes;
+        });
     }
 
     // Trouble with these two does not stop the comparison of the others.
@@ -100,7 +177,7 @@ class OperandComparison {
         }
         const std::string mask = split_member(command_line_.ignore).first;
         if (is_pipe(mask)) {
-            throw Trouble(mask == standard_input_path ? "standard input" : mask,
+            throw Trouble(name_of_input(mask),
                           "can be read only once, but several arrays are compared without what "
                           "--ignore names; save that to a file first");
         }
@@ -120,8 +197,14 @@ class OperandComparison {
     }
 
     void compare_files(Operand first, Operand second) {
-        open(first);
-        open(second);
+        group_->agree(
+            [&] {
+                open(first);
+                open(second);
+            },
+            [&] {
+                return std::vector<ProcessGroup::Sight>{contents_of(first), contents_of(second)};
+            });
         if (first.file->is_archive() && second.file->is_archive() && !first.member
             && !second.member) {
             compare_members(first, second);
@@ -129,6 +212,29 @@ class OperandComparison {
             const NameFilter& filter = command_line_.filter;
             const std::string member1 = chosen_member(first, second, filter);
             compare_arrays(first, member1, second, chosen_member(second, first, filter));
+        }
+    }
+
+    // What all processes have to see of a file alike.
+    static ProcessGroup::Sight contents_of(const Operand& operand) {
+        std::string text = std::to_string(file_size(operand.path)) + " bytes";
+        if (operand.file->is_archive()) {
+            for (const std::string& member : operand.file->members()) {
+                text +=
+                    ", " + member + " of " + std::to_string(operand.file->divisible_bytes(member));
+            }
+        }
+        return {operand.path, text};
+    }
+
+    static void find_sizes(std::vector<NamedPair>& pairs, const Operand& first,
+                           const Operand& second) {
+        for (NamedPair& pair : pairs) {
+            if (pair.first && pair.second) {
+                const std::uint64_t bytes1 = first.file->divisible_bytes(pair.name);
+                const std::uint64_t bytes2 = second.file->divisible_bytes(pair.name);
+                pair.bytes = bytes1 == 0 || bytes2 == 0 ? 0 : bytes1 + bytes2;
+            }
         }
     }
 
@@ -143,20 +249,25 @@ class OperandComparison {
     void compare_members(const Operand& first, const Operand& second) {
         const auto members1 = first.file->members();
         const auto members2 = second.file->members();
-        const auto pairs = match_names(members1, members2, command_line_.filter);
+        auto pairs = match_names(members1, members2, command_line_.filter);
         if (pairs.empty() && !(members1.empty() && members2.empty())) {
             throw Trouble(first.path, "has no array that --include and --exclude leave, nor has "
                                           + second.path);
         }
         check_suits_many();
         summary_.many = true;
+        if (!group_->is_alone()) {
+            find_sizes(pairs, first, second);
+        }
+        const std::uint64_t total = total_bytes(pairs);
         for (const NamedPair& pair : pairs) {
-            if (summary_.stopped) {
+            if (group_->has_ended()) {
                 return;
             }
             if (pair.first && pair.second) {
-                guarded(name_of(first, pair.name), name_of(second, pair.name),
-                        [&] { compare_arrays(first, pair.name, second, pair.name); });
+                by_one_or_all(group_->suits_one(pair.bytes, total), name_of(first, pair.name),
+                              name_of(second, pair.name),
+                              [&] { compare_arrays(first, pair.name, second, pair.name); });
             } else {
                 const Operand& owner = pair.first ? first : second;
                 report_single(pair, owner.file->root() + pair.name, first.path, second.path);
@@ -212,6 +323,21 @@ class OperandComparison {
         std::optional<std::string> not_numbers;
     };
 
+    // What all processes have to see of an array alike.
+    static ProcessGroup::Sight header_of(const NamedArray& array,
+                                         const std::optional<std::string>& not_numbers) {
+        const ArraySource* const source = array.source.get();
+        std::string text = not_numbers.value_or("");
+        if (source != nullptr) {
+            text = source->type_name() + " " + shape_text(source->shape()) + ", "
+                   + (source->fortran_order() ? "column-major" : "row-major");
+            if (!source->block().empty()) {
+                text += ", in blocks " + shape_text(source->block());
+            }
+        }
+        return {array.name, text};
+    }
+
     static OpenedArray open_array(const Operand& operand, const std::string& member) {
         OpenedArray opened;
         opened.array.name = name_of(operand, member);
@@ -238,8 +364,22 @@ class OperandComparison {
 
     void compare_arrays(const Operand& operand1, const std::string& member1,
                         const Operand& operand2, const std::string& member2) {
-        OpenedArray first = open_array(operand1, member1);
-        OpenedArray second = open_array(operand2, member2);
+        OpenedArray first;
+        OpenedArray second;
+        NamedArray mask;
+        group_->agree(
+            [&] {
+                first = open_array(operand1, member1);
+                second = open_array(operand2, member2);
+                if (!first.not_numbers && !second.not_numbers) {
+                    mask = open_mask();
+                }
+            },
+            [&] {
+                return std::vector<ProcessGroup::Sight>{header_of(first.array, first.not_numbers),
+                                                        header_of(second.array, second.not_numbers),
+                                                        header_of(mask, {})};
+            });
         Outcome outcome;
         outcome.first = first.array.name;
         outcome.second = second.array.name;
@@ -252,13 +392,16 @@ class OperandComparison {
             report(outcome);
             return;
         }
-        outcome.comparison = compare(std::move(first.array), std::move(second.array), open_mask(),
-                                     command_line_.question, progress_);
+        outcome.comparison =
+            compare(std::move(first.array), std::move(second.array), std::move(mask),
+                    command_line_.question, group_->boxes(), progress_);
         if (outcome.comparison.difference != Difference::none) {
             outcome.kind = Outcome::Kind::different;
         }
         report(outcome);
-        draw(outcome.comparison);
+        if (group_->leads()) {
+            draw(outcome.comparison);
+        }
     }
 
     // The last map is the one of the picture.
@@ -286,7 +429,10 @@ class OperandComparison {
         report(outcome);
     }
 
-    void report(const Outcome& outcome) {
+    void report(const Outcome& outcome) { group_->report(outcome); }
+
+    // Returns whether more outcomes are wanted.
+    bool print(const Outcome& outcome) {
         clear_status();
         count(summary_, outcome.kind);
         if (outcome.kind == Outcome::Kind::trouble) {
@@ -294,22 +440,31 @@ class OperandComparison {
             std::fprintf(stderr, "talcmp: %s\n", outcome.message.c_str());
         }
         answers_.print(outcome);
+        summary_.stopped = stops_at(outcome);
+        return !summary_.stopped;
+    }
+
+    // Whether the outcome is the last that is wanted.
+    bool stops_at(const Outcome& outcome) const {
         const bool differs = outcome.kind == Outcome::Kind::different
                              || outcome.kind == Outcome::Kind::only_in_first
                              || outcome.kind == Outcome::Kind::only_in_second;
-        summary_.stopped = command_line_.only_first && differs;
+        return command_line_.only_first && differs;
     }
 
     const CommandLine& command_line_;
     Answers& answers_;
-    ProgressBar& progress_;
+    ProgressListener& progress_;
     Summary summary_;
+    std::unique_ptr<ProcessGroup> all_;
+    ProcessGroup* group_; // that compares at the moment: all processes, or this one
 };
 
 } // namespace
 
-Summary compare_operands(const CommandLine& command_line, Answers& answers, ProgressBar& progress) {
-    return OperandComparison(command_line, answers, progress).compare_all();
+Summary compare_operands(const CommandLine& command_line, Answers& answers,
+                         ProgressListener& progress, const MakeGroup& make_group) {
+    return OperandComparison(command_line, answers, progress, make_group).compare_all();
 }
 
 } // namespace talcmp

@@ -16,6 +16,7 @@ struct NamedPair {
     std::optional<std::string> first;
     std::optional<std::string> second;
     std::optional<std::string> trouble = {}; // why they cannot be compared, with the name of which
+    std::uint64_t bytes = 0;                 // of both that can be divided; 0 if that is not known
 };
 
 struct FilePairs {

@@ -19,7 +19,8 @@ class NoListener : public talcmp::ProgressListener {
 inline talcmp::Comparison compare_arrays(Source first, Source second,
                                          const talcmp::Question& question,
                                          talcmp::ProgressListener& listener) {
-    return talcmp::compare({"a", std::move(first)}, {"b", std::move(second)}, {}, question,
+    talcmp::AllBoxes boxes;
+    return talcmp::compare({"a", std::move(first)}, {"b", std::move(second)}, {}, question, boxes,
                            listener);
 }
 

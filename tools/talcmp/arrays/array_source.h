@@ -2,6 +2,7 @@
 
 #pragma once
 
+#include "byte_source.h"
 #include "element_type.h"
 
 #include <algorithm>
@@ -74,6 +75,11 @@ class ArraySource {
     // Reads the rest if only the end shows whether what was read is right. No answer can be trusted
     // until this has returned. Throws Trouble.
     virtual void check_to_end() {}
+
+    // The sums of bytes that were read, for `check_to_end` of a source of the same array in another
+    // process; see ByteSource.
+    virtual std::vector<SummedPart> summed_parts() const { return {}; }
+    virtual void add_summed_parts(const std::vector<SummedPart>& /*parts*/) {}
 };
 
 // The number of elements: the product of the shape, which was checked to be below 2^64.

@@ -5,8 +5,16 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
+#include <vector>
 
 namespace talcmp {
+
+// The CRC-32 of the bytes from `begin` to `end` - 1.
+struct SummedPart {
+    std::uint64_t begin = 0;
+    std::uint64_t end = 0;
+    std::uint32_t sum = 0;
+};
 
 class ByteSource {
   public:
@@ -29,6 +37,12 @@ class ByteSource {
     // Where bytes may be read in any order, reads those that were not if only all of them show
     // whether they were right. Throws Trouble.
     virtual void check_to_end() {}
+
+    // The sums of what was read, if `check_to_end` needs sums.
+    virtual std::vector<SummedPart> summed_parts() const { return {}; }
+
+    // Takes these parts, of the same bytes, as read here. Those that overlap others are left out.
+    virtual void add_summed_parts(const std::vector<SummedPart>& /*parts*/) {}
 };
 
 } // namespace talcmp

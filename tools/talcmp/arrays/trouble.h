@@ -15,6 +15,9 @@ class Trouble : public std::runtime_error {
   public:
     Trouble(const std::string& file, const std::string& what_is_wrong)
         : std::runtime_error(shown(file) + ": " + shown(what_is_wrong)) {}
+
+    // With the text of another trouble.
+    explicit Trouble(const std::string& text) : std::runtime_error(text) {}
 };
 
 // An array that can be read but holds no numbers that talcmp compares, such as text.

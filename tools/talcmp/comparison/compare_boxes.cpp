@@ -5,59 +5,71 @@
 #include <exception>
 #include <limits>
 #include <mutex>
+#include <new>
 #include <optional>
 #include <system_error>
 #include <thread>
+#include <utility>
 #include <vector>
 
 namespace talcmp {
 namespace {
 
-// What the threads share: the next box, the number from which no pair is wanted, what failed.
+// What the threads share: the next boxes, the number from which no pair is wanted, what failed.
 class BoxQueue {
   public:
-    explicit BoxQueue(const std::uint64_t box_count) : box_count_(box_count) {}
+    BoxQueue(const BoxPlan& plan, BoxSupply& supply) : plan_(plan), supply_(supply) {}
 
-    // The number of the next box; nothing when all are done or something failed.
+    // The number of the next box; nothing when there are no more or something failed.
     std::optional<std::uint64_t> next_box() {
-        const std::uint64_t box = next_box_++;
-        return box < box_count_ && !stopped_ ? std::optional(box) : std::nullopt;
+        const std::lock_guard<std::mutex> lock(mutex_);
+        if (!stopped_ && range_.begin == range_.end) {
+            range_ = supply_.next();
+        }
+        return stopped_ || range_.begin == range_.end ? std::nullopt
+                                                      : std::optional(range_.begin++);
     }
 
     // All boxes before it have been given out, so the first of several failures is known in the
     // end.
-    void fail(const std::uint64_t box, const std::exception_ptr& failure) {
+    void fail(const std::uint64_t box, const std::exception_ptr& reason) {
         const std::lock_guard<std::mutex> lock(mutex_);
-        if (!failure_ || box < failed_box_) {
-            failed_box_ = box;
-            failure_ = failure;
+        if (!failure_ || box < failure_->box) {
+            failure_ = BoxFailure{box, reason};
         }
-        stopped_ = true;
+        stop();
     }
 
+    // Boxes are given out in ascending order, so that all that were not are beyond the bound if the
+    // last one is.
     void lower_bound_to(const std::uint64_t bound) {
-        std::uint64_t known = bound_;
-        while (bound < known && !bound_.compare_exchange_weak(known, bound)) {
+        if (bound >= bound_) {
+            return;
+        }
+        const std::lock_guard<std::mutex> lock(mutex_);
+        bound_ = std::min<std::uint64_t>(bound, bound_);
+        const Traversal& traversal = plan_.traversal();
+        if (!stopped_ && plan_.is_beyond(traversal.box(traversal.box_count() - 1), bound)) {
+            stop();
         }
     }
     std::uint64_t bound() const { return bound_; }
 
-    // Called when all threads have ended. A single thread would not have reached a box beyond
-    // `bound`.
-    void rethrow_failure_before(const std::uint64_t bound, const BoxPlan& plan) const {
-        if (failure_ && !plan.is_beyond(plan.traversal().box(failed_box_), bound)) {
-            std::rethrow_exception(failure_);
-        }
-    }
+    const std::optional<BoxFailure>& failure() const { return failure_; }
 
   private:
-    std::uint64_t box_count_;
-    std::atomic<std::uint64_t> next_box_ = 0;
-    std::atomic<std::uint64_t> bound_ = std::numeric_limits<std::uint64_t>::max();
-    std::atomic<bool> stopped_ = false;
+    void stop() {
+        stopped_ = true;
+        supply_.stop();
+    }
+
+    const BoxPlan& plan_;
+    BoxSupply& supply_;
     std::mutex mutex_;
-    std::exception_ptr failure_;
-    std::uint64_t failed_box_ = 0;
+    BoxRange range_;
+    bool stopped_ = false;
+    std::atomic<std::uint64_t> bound_ = std::numeric_limits<std::uint64_t>::max();
+    std::optional<BoxFailure> failure_;
 };
 
 // The work of each thread.
@@ -95,6 +107,22 @@ void in_threads(const std::size_t count, const Action& action) {
     }
 }
 
+// A single thread would not have reached a box beyond the first pairs. What failed in another
+// process is tried here, as it may be something that all of them see.
+void rethrow_failure(const BoxPlan& plan, const BoxResults& results) {
+    if (!results.failure) {
+        return;
+    }
+    const Box box = plan.traversal().box(results.failure->box);
+    if (plan.is_beyond(box, results.findings.first.bound())) {
+        return;
+    }
+    if (results.failure->elsewhere) {
+        BoxComparer(plan).compare(box);
+    }
+    std::rethrow_exception(results.failure->reason);
+}
+
 } // namespace
 
 unsigned thread_count(const BoxPlan& plan) {
@@ -115,20 +143,29 @@ unsigned thread_count(const BoxPlan& plan) {
         std::min({std::uint64_t{wanted}, in_memory, plan.traversal().box_count()}));
 }
 
-Findings compare_boxes(const BoxPlan& plan, const unsigned threads, ProgressListener& progress) {
-    BoxQueue queue(plan.traversal().box_count());
+Findings compare_boxes(const BoxPlan& plan, const unsigned threads, BoxSupply& supply,
+                       ProgressListener& progress) {
+    supply.begin(plan, progress);
+    BoxQueue queue(plan, supply);
     std::vector<std::unique_ptr<BoxComparer>> comparers;
-    for (unsigned i = 0; i < threads; ++i) {
-        comparers.push_back(std::make_unique<BoxComparer>(plan));
+    try {
+        for (unsigned i = 0; i < threads; ++i) {
+            comparers.push_back(std::make_unique<BoxComparer>(plan));
+        }
+        in_threads(threads,
+                   [&](const std::size_t i) { take_boxes(plan, queue, *comparers[i], progress); });
+    } catch (const std::bad_alloc&) {
+        queue.fail(0, std::current_exception());
     }
-    in_threads(threads,
-               [&](const std::size_t i) { take_boxes(plan, queue, *comparers[i], progress); });
-    Findings sum = {FirstPairs(plan.question().differences), {}};
+    BoxResults sum = {{FirstPairs(plan.question().differences), {}}, queue.failure()};
     for (const auto& comparer : comparers) {
-        add(sum, comparer->findings());
+        add(sum.findings, comparer->findings());
     }
-    queue.rethrow_failure_before(sum.first.bound(), plan);
-    return sum;
+    supply.merge(plan, sum);
+    if (supply.leads()) {
+        rethrow_failure(plan, sum);
+    }
+    return std::move(sum.findings);
 }
 
 } // namespace talcmp

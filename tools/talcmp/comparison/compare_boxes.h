@@ -2,7 +2,7 @@
 
 #pragma once
 
-#include "box_comparer.h"
+#include "box_supply.h"
 #include "progress_listener.h"
 
 namespace talcmp {
@@ -10,8 +10,10 @@ namespace talcmp {
 // How many threads are worthwhile, up to as many as the question allows.
 unsigned thread_count(const BoxPlan& plan);
 
-// The findings are those of a single thread. Throws Trouble if a single thread would have reached a
-// box that cannot be read; throws std::bad_alloc.
-Findings compare_boxes(const BoxPlan& plan, unsigned threads, ProgressListener& progress);
+// Compares the boxes that are supplied. If the supply leads, the findings are those of a single
+// thread that compares all boxes; throws Trouble if that would have reached a box that cannot be
+// read, std::bad_alloc if there was not enough memory.
+Findings compare_boxes(const BoxPlan& plan, unsigned threads, BoxSupply& supply,
+                       ProgressListener& progress);
 
 } // namespace talcmp

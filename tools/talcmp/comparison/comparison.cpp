@@ -8,7 +8,7 @@
 #include "trouble.h"
 
 #include <algorithm>
-#include <iterator>
+#include <array>
 #include <new>
 #include <stdexcept>
 
@@ -130,35 +130,51 @@ bool blocks_clash(const SelectedArrays& arrays) {
     return both > larger && both > most_bytes / bytes;
 }
 
-// Copies what cannot be read in the order in which it is compared; otherwise a block might have to
-// be read twice, or something again that can be read only once.
-void make_readable(SelectedArrays& arrays, const Question& question, ProgressListener& progress) {
-    const bool clash = blocks_clash(arrays);
+std::array<NamedArray*, 3> each_of(SelectedArrays& arrays) {
+    return {&arrays.first, &arrays.second, &arrays.mask};
+}
+
+// Which arrays are copied, as they cannot be read in the order in which they are compared;
+// otherwise a block might have to be read twice, or something again that can be read only once.
+std::array<bool, 3> copies_needed(const SelectedArrays& arrays) {
     const bool linear = traversal_of(arrays).is_linear();
     const auto needs_copy = [linear](const NamedArray& array) {
         return !linear && !array.source->random_access();
     };
     const bool mask_in_blocks =
         arrays.mask.source != nullptr && !arrays.mask.source->block().empty();
-    const bool copies[] = {needs_copy(arrays.first), clash || needs_copy(arrays.second),
-                           arrays.mask.source != nullptr
-                               && (mask_in_blocks || needs_copy(arrays.mask))};
-    NamedArray* const each[] = {&arrays.first, &arrays.second, &arrays.mask};
+    return {needs_copy(arrays.first), blocks_clash(arrays) || needs_copy(arrays.second),
+            arrays.mask.source != nullptr && (mask_in_blocks || needs_copy(arrays.mask))};
+}
+
+// Whether several processes can compare the arrays without reading anything twice.
+bool is_divisible(SelectedArrays& arrays) {
+    const std::array<bool, 3> copies = copies_needed(arrays);
+    const std::array<NamedArray*, 3> each = each_of(arrays);
+    return std::none_of(copies.begin(), copies.end(), [](const bool copied) { return copied; })
+           && std::all_of(each.begin(), each.end(), [](const NamedArray* const array) {
+                  return array->source == nullptr || array->source->random_access();
+              });
+}
+
+void make_readable(SelectedArrays& arrays, const Question& question, ProgressListener& progress) {
+    const std::array<bool, 3> copies = copies_needed(arrays);
+    const std::array<NamedArray*, 3> each = each_of(arrays);
     const auto bytes_of = [](const NamedArray& array) {
         return element_count(*array.source) * array.source->type().size;
     };
     std::uint64_t total = traversal_of(arrays).pair_count()
                           * (arrays.first.source->type().size + arrays.second.source->type().size);
-    for (std::size_t i = 0; i < std::size(each); ++i) {
+    for (std::size_t i = 0; i < each.size(); ++i) {
         total += copies[i] ? bytes_of(*each[i]) : 0;
     }
     progress.begin(total);
-    for (std::size_t i = 0; i < std::size(each); ++i) {
+    for (std::size_t i = 0; i < each.size(); ++i) {
         if (copies[i]) {
             copy_to_file(*each[i], progress);
         }
     }
-    arrays.view2 = clash ? selected(arrays.second, question) : arrays.view2;
+    arrays.view2 = selected(arrays.second, question); // a copy is not in blocks
 }
 
 // How much memory the comparison may need, for the message when there is not enough.
@@ -174,8 +190,8 @@ std::string memory_text(const BoxPlan& plan, const std::string& other_name,
            + " for differences; fewer --threads and --max-differences take less";
 }
 
-void compare_elements(SelectedArrays arrays, const Question& question, ProgressListener& progress,
-                      Comparison& result) {
+void compare_elements(SelectedArrays arrays, const Question& question, BoxSupply& supply,
+                      ProgressListener& progress, Comparison& result) {
     make_readable(arrays, question, progress);
     const Traversal traversal = traversal_of(arrays);
     for (const auto& room_for : question.maps) {
@@ -186,7 +202,10 @@ void compare_elements(SelectedArrays arrays, const Question& question, ProgressL
                        arrays.mask.source.get(), question, result.maps);
     const unsigned threads = thread_count(plan);
     try {
-        const Findings findings = compare_boxes(plan, threads, progress);
+        const Findings findings = compare_boxes(plan, threads, supply, progress);
+        if (!supply.leads()) {
+            return;
+        }
         result.all_ignored = findings.totals.ignored == traversal.pair_count();
         result.places = places_of(plan, findings.first.in_order());
         if (question.report) {
@@ -198,8 +217,8 @@ void compare_elements(SelectedArrays arrays, const Question& question, ProgressL
 }
 
 // For arrays of one shape.
-void compare_contents(SelectedArrays arrays, const Question& question, ProgressListener& progress,
-                      Comparison& result) {
+void compare_contents(SelectedArrays arrays, const Question& question, BoxSupply& supply,
+                      ProgressListener& progress, Comparison& result) {
     if (question.report) {
         result.report.emplace();
     }
@@ -207,7 +226,12 @@ void compare_contents(SelectedArrays arrays, const Question& question, ProgressL
     const bool types_differ =
         question.strict_type && result.array1.stored_type != result.array2.stored_type;
     if (result.has_elements && (!types_differ || question.report)) {
-        compare_elements(std::move(arrays), question, progress, result);
+        AllBoxes undivided;
+        if (!supply.is_shared() || is_divisible(arrays)) {
+            compare_elements(std::move(arrays), question, supply, progress, result);
+        } else if (supply.leads()) {
+            compare_elements(std::move(arrays), question, undivided, progress, result);
+        }
     }
     if (types_differ) {
         result.difference = Difference::type;
@@ -231,7 +255,7 @@ void check_mask(const NamedArray& mask, const NamedArray& first) {
 } // namespace
 
 Comparison compare(NamedArray first, NamedArray second, NamedArray mask, const Question& question,
-                   ProgressListener& progress) {
+                   BoxSupply& supply, ProgressListener& progress) {
     const View view1 = selected(first, question);
     const View view2 = selected(second, question);
     Comparison result;
@@ -247,11 +271,11 @@ Comparison compare(NamedArray first, NamedArray second, NamedArray mask, const Q
     if (view1.shape != view2.shape) {
         result.difference = Difference::shape;
     } else {
-        compare_contents({first, second, mask, view1, view2, mask_view}, question, progress,
+        compare_contents({first, second, mask, view1, view2, mask_view}, question, supply, progress,
                          result);
     }
     for (const NamedArray* const array : {&first, &second, &mask}) {
-        if (array->source != nullptr) {
+        if (array->source != nullptr && supply.leads()) {
             array->source->check_to_end();
         }
     }

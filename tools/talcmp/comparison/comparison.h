@@ -3,6 +3,7 @@
 #pragma once
 
 #include "array_source.h"
+#include "box_supply.h"
 #include "findings.h"
 #include "map_filler.h"
 #include "progress_listener.h"
@@ -71,7 +72,10 @@ struct NamedArray {
 //
 // `mask`, if it has a source, is an array of booleans of the shape of the first array: where it is
 // true, nothing is compared.
+//
+// Several processes that open the same arrays may share `supply`, and compare a part each. What
+// cannot be divided among them is compared by the one that leads. Only there is the result whole.
 Comparison compare(NamedArray first, NamedArray second, NamedArray mask, const Question& question,
-                   ProgressListener& progress);
+                   BoxSupply& supply, ProgressListener& progress);
 
 } // namespace talcmp

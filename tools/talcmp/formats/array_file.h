@@ -36,6 +36,10 @@ class ArrayFile {
         return std::find(names.begin(), names.end(), member) != names.end();
     }
 
+    // The bytes of the elements of an array that the file has; 0 if they cannot be read in any
+    // order, or if opening it would fail.
+    virtual std::uint64_t divisible_bytes(const std::string& /*member*/) { return 0; }
+
     // Opens an array that the file has. Each may be opened only once. Throws Trouble; NotNumbers if
     // it is not an array of numbers.
     virtual std::unique_ptr<ArraySource> open(const std::string& member) = 0;

@@ -71,6 +71,10 @@ bool Hdf5File::has(const std::string& member) {
     return members_.count(member) != 0 || hdf5::has_array(file_->id(), root() + member, path_);
 }
 
+std::uint64_t Hdf5File::divisible_bytes(const std::string& member) {
+    return hdf5::bytes_of_array(file_->id(), root() + member, path_);
+}
+
 std::unique_ptr<ArraySource> Hdf5File::open(const std::string& member) {
     std::string location = root() + member;
     std::string name = path_ + "[" + location + "]";

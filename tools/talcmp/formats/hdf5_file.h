@@ -24,6 +24,7 @@ class Hdf5File : public ArrayFile {
     const char* root() const override { return "/"; }
     std::vector<std::string> members() const override;
     bool has(const std::string& member) override;
+    std::uint64_t divisible_bytes(const std::string& member) override;
     std::unique_ptr<ArraySource> open(const std::string& member) override;
 
   private:

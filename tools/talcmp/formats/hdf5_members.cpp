@@ -250,4 +250,16 @@ bool has_array(const hid_t group, const std::string& path, const std::string& na
     return type_at(group, path) == H5O_TYPE_DATASET;
 }
 
+std::uint64_t bytes_of_array(const hid_t group, const std::string& path, const std::string& name) {
+    const LibraryUse use(name);
+    if (type_at(group, path) != H5O_TYPE_DATASET) {
+        return 0;
+    }
+    const Handle dataset(::H5Dopen2(group, path.c_str(), H5P_DEFAULT));
+    const Handle space(::H5Dget_space(dataset.id()));
+    const Handle type(::H5Dget_type(dataset.id()));
+    const hssize_t count = ::H5Sget_simple_extent_npoints(space.id());
+    return static_cast<std::uint64_t>(std::max<hssize_t>(count, 0)) * ::H5Tget_size(type.id());
+}
+
 } // namespace talcmp::hdf5

@@ -24,4 +24,8 @@ std::map<std::string, Member> members_of(hid_t file, const std::string& path);
 // file `name`.
 bool has_array(hid_t group, const std::string& path, const std::string& name);
 
+// The bytes of the elements of the array at the path; 0 if there is no such array. Messages call
+// the file `name`.
+std::uint64_t bytes_of_array(hid_t group, const std::string& path, const std::string& name);
+
 } // namespace talcmp::hdf5

@@ -135,6 +135,13 @@ std::vector<std::string> NetcdfFile::members() const {
     return names;
 }
 
+std::uint64_t NetcdfFile::divisible_bytes(const std::string& member) {
+    const NetcdfVariable& variable = variables_.at(member);
+    const std::uint64_t records =
+        variable.in_records && !variable.shape.empty() ? variable.shape.front() : 1;
+    return variable.type && end_of(variable) ? variable.piece_bytes * records : 0;
+}
+
 std::unique_ptr<ArraySource> NetcdfFile::open(const std::string& member) {
     const NetcdfVariable& variable = variables_.at(member);
     const std::string name = path_ + "[" + root() + member + "]";

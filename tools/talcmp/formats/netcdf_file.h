@@ -20,6 +20,8 @@ class NetcdfFile : public ArrayFile {
     const char* root() const override { return "/"; }
     std::vector<std::string> members() const override;
 
+    std::uint64_t divisible_bytes(const std::string& member) override;
+
     // Throws Trouble if the file does not have all elements of the variable.
     std::unique_ptr<ArraySource> open(const std::string& member) override;
 

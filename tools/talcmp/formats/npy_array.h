@@ -23,6 +23,10 @@ class NpyArray : public ArraySource {
     bool random_access() const override { return file_->random_access(); }
     void read(std::uint64_t first, std::uint64_t count, void* elements) override;
     void check_to_end() override;
+    std::vector<SummedPart> summed_parts() const override { return file_->summed_parts(); }
+    void add_summed_parts(const std::vector<SummedPart>& parts) override {
+        file_->add_summed_parts(parts);
+    }
 
   private:
     // Checks that nothing follows the elements; an archive checks its sum only when asked for more.

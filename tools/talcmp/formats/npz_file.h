@@ -18,6 +18,9 @@ class NpzFile : public ArrayFile {
 
     bool is_archive() const override { return true; }
     std::vector<std::string> members() const override;
+    std::uint64_t divisible_bytes(const std::string& member) override {
+        return archive_->stored_bytes(index_.at(member));
+    }
     std::unique_ptr<ArraySource> open(const std::string& member) override;
 
   private:

@@ -74,6 +74,21 @@ void StoredEntry::check_to_end() {
     }
 }
 
+std::vector<SummedPart> StoredEntry::summed_parts() const {
+    std::vector<SummedPart> parts;
+    parts.reserve(parts_.size());
+    for (const auto& [begin, part] : parts_) {
+        parts.push_back({begin, part.end, part.sum});
+    }
+    return parts;
+}
+
+void StoredEntry::add_summed_parts(const std::vector<SummedPart>& parts) {
+    for (const SummedPart& part : parts) {
+        add(part.begin, part.end, part.sum);
+    }
+}
+
 std::uint64_t StoredEntry::first_gap() const {
     return parts_.empty() || parts_.begin()->first != 0 ? 0 : parts_.begin()->second.end;
 }

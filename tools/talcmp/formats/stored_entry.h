@@ -33,6 +33,8 @@ class StoredEntry : public ByteSource {
 
     // Reads what has not been read. Throws Trouble if the sum is not right.
     void check_to_end() override;
+    std::vector<SummedPart> summed_parts() const override;
+    void add_summed_parts(const std::vector<SummedPart>& parts) override;
 
   private:
     struct Part {

@@ -9,14 +9,14 @@
 namespace talcmp {
 namespace {
 
-// Below this, the entry is read as fast by one thread.
-constexpr std::uint64_t large = std::uint64_t{1} << 20U;
-
-bool is_stored(const zip_stat_t& status) {
+// Whether the entry is stored as it is, and so large that several threads read it faster than one.
+bool is_divisible(const zip_stat_t& status) {
+    constexpr std::uint64_t large = std::uint64_t{1} << 20U;
     constexpr zip_uint64_t needed = ZIP_STAT_SIZE | ZIP_STAT_COMP_SIZE | ZIP_STAT_CRC
                                     | ZIP_STAT_COMP_METHOD | ZIP_STAT_ENCRYPTION_METHOD;
     return (status.valid & needed) == needed && status.comp_method == ZIP_CM_STORE
-           && status.encryption_method == ZIP_EM_NONE && status.size == status.comp_size;
+           && status.encryption_method == ZIP_EM_NONE && status.size == status.comp_size
+           && status.size >= large;
 }
 
 } // namespace
@@ -141,10 +141,17 @@ std::vector<std::optional<std::string>> ZipArchive::names() const {
     return names;
 }
 
+std::uint64_t ZipArchive::stored_bytes(const std::uint64_t index) const {
+    zip_stat_t status;
+    ::zip_stat_init(&status);
+    const bool is_known = ::zip_stat_index(archive_.get(), index, 0, &status) == 0;
+    return is_known && is_divisible(status) ? status.size : 0;
+}
+
 std::unique_ptr<ByteSource> ZipArchive::open(const std::uint64_t index, const std::string& name) {
     auto entry = std::make_unique<Entry>(shared_from_this(), index, name);
     const zip_stat_t& status = entry->status();
-    if (!is_stored(status) || status.size < large) {
+    if (!is_divisible(status)) {
         return entry;
     }
     char first = 0;

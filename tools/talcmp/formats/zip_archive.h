@@ -26,6 +26,9 @@ class ZipArchive : public std::enable_shared_from_this<ZipArchive> {
     // The names of all entries; nothing in place of one that cannot be read.
     std::vector<std::optional<std::string>> names() const;
 
+    // How many bytes of an entry may be read in any order; 0 if they may not.
+    std::uint64_t stored_bytes(std::uint64_t index) const;
+
     // The bytes of an entry, checked against its sum as they are read, or when the last were. Those
     // of a large entry that is not compressed may be read in any order, by several threads; those
     // of others are decompressed one after another. `name` is what messages call it. Throws

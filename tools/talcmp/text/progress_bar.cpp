@@ -8,8 +8,6 @@
 #include <cmath>
 #include <cstdio>
 
-#include <unistd.h>
-
 namespace talcmp {
 namespace {
 
@@ -50,8 +48,8 @@ std::string progress_text(const std::uint64_t done, const std::uint64_t total, c
     return "[" + std::string(full, '=') + std::string(width - full, ' ') + "]" + text;
 }
 
-ProgressBar::ProgressBar(const bool wanted)
-    : wanted_(wanted && ::isatty(STDERR_FILENO) == 1 && takes_escapes()) {
+ProgressBar::ProgressBar(const bool wanted, const int terminal)
+    : terminal_(terminal), wanted_(wanted && ::isatty(terminal) == 1 && takes_escapes()) {
     if (wanted_) {
         clear_status_at_signals();
     }
@@ -73,7 +71,7 @@ void ProgressBar::advance(const std::uint64_t bytes) {
     const auto now = Clock::now();
     if (now >= next_) {
         const double seconds = std::chrono::duration<double>(now - begin_).count();
-        show_status(progress_text(done_, total_, seconds, columns_of(STDERR_FILENO)));
+        show_status(progress_text(done_, total_, seconds, columns_of(terminal_)));
         next_ = now + period;
     }
 }

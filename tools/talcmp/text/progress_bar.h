@@ -10,6 +10,8 @@
 #include <mutex>
 #include <string>
 
+#include <unistd.h>
+
 namespace talcmp {
 
 // A bar, then what part of the bytes has been read, how fast, and how long the rest will take; in
@@ -21,7 +23,8 @@ std::string progress_text(std::uint64_t done, std::uint64_t total, double second
 // the bytes has been read, how fast, and how long the rest will take.
 class ProgressBar : public ProgressListener {
   public:
-    explicit ProgressBar(bool wanted);
+    // `terminal` is the descriptor of the terminal that shows what is written to standard error.
+    explicit ProgressBar(bool wanted, int terminal = STDERR_FILENO);
     ProgressBar(const ProgressBar&) = delete;
     ProgressBar& operator=(const ProgressBar&) = delete;
     ~ProgressBar() override;
@@ -32,6 +35,7 @@ class ProgressBar : public ProgressListener {
   private:
     using Clock = std::chrono::steady_clock;
 
+    int terminal_;
     bool wanted_;
     std::uint64_t total_ = 0;
     std::atomic<std::uint64_t> done_ = 0;

@@ -17,10 +17,10 @@ std::string environment(const char* const variable) {
 
 } // namespace
 
-Terminal Terminal::of_standard_output() {
-    const bool is_terminal = ::isatty(STDOUT_FILENO) == 1;
+Terminal Terminal::of(const int descriptor) {
+    const bool is_terminal = ::isatty(descriptor) == 1;
     const bool colours = is_terminal && takes_escapes() && environment("NO_COLOR").empty();
-    return {is_terminal, colours, columns_of(STDOUT_FILENO)};
+    return {is_terminal, colours, columns_of(descriptor)};
 }
 
 std::string Terminal::coloured(const std::string& text, const Colour colour) const {

@@ -8,12 +8,12 @@ namespace talcmp {
 
 enum class Colour { red, green, blue };
 
-// What standard output is.
+// What output goes to.
 class Terminal {
   public:
     // Colours are shown on a terminal that takes escape sequences, unless the environment variable
     // NO_COLOR is set.
-    static Terminal of_standard_output();
+    static Terminal of(int descriptor);
 
     Terminal(const bool is_terminal, const bool colours, const int columns)
         : is_terminal_(is_terminal), colours_(colours), columns_(columns) {}
