@@ -16,6 +16,7 @@
 #include <numeric>
 #include <system_error>
 #include <tuple>
+#include <utility>
 #include <vector>
 
 namespace talcmp {
@@ -42,7 +43,8 @@ class OperandComparison {
     OperandComparison(const CommandLine& command_line, Answers& answers, ProgressListener& progress,
                       const MakeGroup& make_group)
         : command_line_(command_line), answers_(answers), progress_(progress),
-          all_(make_group([this](const Outcome& outcome) { return print(outcome); })),
+          all_(make_group([this](const Outcome& outcome) { return print(outcome); },
+                          command_line.question)),
           group_(all_.get()) {}
 
     Summary compare_all() {
@@ -50,6 +52,20 @@ class OperandComparison {
             answers_.begin();
         }
         const FilePairs files = group_->same_files([this] { return file_pairs(); });
+        try {
+            compare_pairs(files);
+        } catch (const Ended&) {
+            // The process that leads has printed the last outcome.
+        }
+        group_->finish();
+        if (group_->leads()) {
+            answers_.finish(summary_);
+        }
+        return summary_;
+    }
+
+  private:
+    void compare_pairs(const FilePairs& files) {
         const std::uint64_t total = total_bytes(files.pairs);
         for (const NamedPair& pair : files.pairs) {
             if (group_->has_ended()) {
@@ -67,14 +83,8 @@ class OperandComparison {
                 report_single(pair, pair.name, command_line_.first, command_line_.second);
             }
         }
-        group_->finish();
-        if (group_->leads()) {
-            answers_.finish(summary_);
-        }
-        return summary_;
     }
 
-  private:
     // None if there was trouble, which is then reported.
     FilePairs file_pairs() {
         const std::string& first = command_line_.first;
@@ -436,12 +446,33 @@ class OperandComparison {
         clear_status();
         count(summary_, outcome.kind);
         if (outcome.kind == Outcome::Kind::trouble) {
+            const std::string where = outcome.process.empty() || is_trouble_here(outcome)
+                                          ? ""
+                                          : " (" + outcome.process + ")";
             std::fflush(stdout); // so that lines on one terminal stay in their order
-            std::fprintf(stderr, "talcmp: %s\n", outcome.message.c_str());
+            std::fprintf(stderr, "talcmp: %s%s\n", outcome.message.c_str(), where.c_str());
         }
         answers_.print(outcome);
         summary_.stopped = stops_at(outcome);
         return !summary_.stopped;
+    }
+
+    // Whether this process has the same trouble as another one.
+    bool is_trouble_here(const Outcome& outcome) {
+        const auto [path1, member1] = split_member(outcome.first);
+        const auto [path2, member2] = split_member(outcome.second);
+        bool is_same = false;
+        SingleProcess single([&](const Outcome& here) {
+            is_same = is_same || here.message == outcome.message;
+            return true;
+        });
+        ProcessGroup* const group = std::exchange(group_, &single);
+        guarded(outcome.first, outcome.second,
+                [&, path1 = path1, member1 = member1, path2 = path2, member2 = member2] {
+                    compare_files({path1, member1}, {path2, member2});
+                });
+        group_ = group;
+        return is_same;
     }
 
     // Whether the outcome is the last that is wanted.

@@ -12,8 +12,9 @@
 
 namespace talcmp {
 
-// Makes the group of processes, which reports outcomes by the function that it is given.
-using MakeGroup = std::function<std::unique_ptr<ProcessGroup>(Reporter)>;
+// Makes the group of processes, which reports outcomes of the question by the function that it is
+// given.
+using MakeGroup = std::function<std::unique_ptr<ProcessGroup>(Reporter, const Question&)>;
 
 // Compares what the operands stand for, array by array, and reports each outcome when it is known.
 // Trouble with the operands, or with two of their files, is an outcome too. The summary is whole in

@@ -8,9 +8,10 @@
 #include <unistd.h>
 
 int main(int argc, char** argv) {
-    const auto single_process = [](talcmp::Reporter report) {
+    const auto single_process = [](talcmp::Reporter report, const talcmp::Question& /*question*/) {
         return std::make_unique<talcmp::SingleProcess>(std::move(report));
     };
+    const auto terminal = talcmp::Terminal::of(STDOUT_FILENO);
     return talcmp::run(argc, argv,
-                       {talcmp::Terminal::of(STDOUT_FILENO), STDERR_FILENO, true, single_process});
+                       {terminal, STDERR_FILENO, true, single_process, talcmp::complain});
 }

@@ -18,6 +18,7 @@ struct Outcome {
     std::string name;      // of an array that has no counterpart, in a folder or an archive
     Comparison comparison; // if the kind is same or different
     std::string message;   // if there was trouble, or why they are skipped
+    std::string process;   // that found it, if it was not this one
 };
 
 // How many outcomes there were of each kind.

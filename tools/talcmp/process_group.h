@@ -14,6 +14,9 @@
 
 namespace talcmp {
 
+// Thrown in processes that do not lead when no more outcomes are wanted.
+struct Ended {};
+
 // All processes go through the operands in the same order. What is small is compared by one of
 // them, each time by one that is free; they share the boxes of what is large. One leads: it finds
 // the files and prints all outcomes, in their order.
@@ -37,7 +40,7 @@ class ProcessGroup {
     using Sight = std::pair<std::string, std::string>;
 
     // Calls `open` in all processes. Throws Trouble in all of them if it does in one, or if they do
-    // not see the same.
+    // not see the same; Ended.
     virtual void agree(const std::function<void()>& open,
                        const std::function<std::vector<Sight>()>& seen) = 0;
 

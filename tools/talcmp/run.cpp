@@ -56,13 +56,12 @@ Summary answer(const int argc, const char* const* argv, const Surroundings& surr
 
 } // namespace
 
+void complain(const std::string& text) {
+    std::fprintf(stderr, "talcmp: %s\n", text.c_str());
+}
+
 int run(const int argc, const char* const* argv, const Surroundings& surroundings) {
     constexpr int trouble = 2;
-    const auto complain = [&surroundings](const std::string& text) {
-        if (surroundings.speaks) {
-            std::fprintf(stderr, "talcmp: %s\n", text.c_str());
-        }
-    };
     try {
         const Summary summary = answer(argc, argv, surroundings);
         // Output of a line too long for the buffer may have failed before the flush.
@@ -71,11 +70,13 @@ int run(const int argc, const char* const* argv, const Surroundings& surrounding
         }
         return exit_status(summary);
     } catch (const UsageError& error) {
-        complain(std::string(error.what()) + "; see 'talcmp --help'");
+        if (surroundings.speaks) {
+            complain(std::string(error.what()) + "; see 'talcmp --help'");
+        }
     } catch (const std::bad_alloc&) {
-        complain("there is not enough memory");
+        surroundings.complain("there is not enough memory");
     } catch (const std::exception& error) {
-        complain(shown(error.what()));
+        surroundings.complain(shown(error.what()));
     }
     return trouble;
 }

@@ -56,6 +56,9 @@ class BoxSupply {
 
     // Adds what other processes have found, if this one leads.
     virtual void merge(const BoxPlan& /*plan*/, BoxResults& /*results*/) {}
+
+    // The comparison ends by an exception.
+    virtual void abandon() {}
 };
 
 // All boxes for this process.

@@ -227,10 +227,15 @@ void compare_contents(SelectedArrays arrays, const Question& question, BoxSupply
         question.strict_type && result.array1.stored_type != result.array2.stored_type;
     if (result.has_elements && (!types_differ || question.report)) {
         AllBoxes undivided;
-        if (!supply.is_shared() || is_divisible(arrays)) {
-            compare_elements(std::move(arrays), question, supply, progress, result);
-        } else if (supply.leads()) {
-            compare_elements(std::move(arrays), question, undivided, progress, result);
+        const bool divided = !supply.is_shared() || is_divisible(arrays);
+        if (divided || supply.leads()) {
+            BoxSupply& boxes = divided ? supply : undivided;
+            try {
+                compare_elements(std::move(arrays), question, boxes, progress, result);
+            } catch (...) {
+                boxes.abandon();
+                throw;
+            }
         }
     }
     if (types_differ) {

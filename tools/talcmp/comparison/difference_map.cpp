@@ -62,6 +62,16 @@ void DifferenceMap::add_run(std::uint64_t first, std::uint64_t count, const Leve
     }
 }
 
+std::vector<Level> DifferenceMap::levels() const {
+    return {cells_.begin(), cells_.end()};
+}
+
+void DifferenceMap::add_levels(const std::vector<Level>& levels) {
+    for (std::size_t i = 0; i < levels.size(); ++i) {
+        raise(cells_[i], levels[i]);
+    }
+}
+
 std::array<std::uint64_t, level_count> DifferenceMap::counts() const {
     std::array<std::uint64_t, level_count> counts = {};
     for (const Cell& cell : cells_) {

@@ -81,6 +81,10 @@ class DifferenceMap {
         return cells_[static_cast<std::size_t>(cell)].load(std::memory_order_relaxed);
     }
 
+    // Of all cells, for another map of the same shape and room.
+    std::vector<Level> levels() const;
+    void add_levels(const std::vector<Level>& levels);
+
     // How many cells have each level.
     std::array<std::uint64_t, level_count> counts() const;
 
