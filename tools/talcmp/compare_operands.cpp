@@ -1,9 +1,9 @@
 #include "compare_operands.h"
 
 #include "array_file.h"
+#include "operand_file.h"
 #include "operands.h"
 #include "picture.h"
-#include "shape_text.h"
 #include "shown.h"
 #include "status_line.h"
 #include "trouble.h"
@@ -15,7 +15,6 @@
 #include <new>
 #include <numeric>
 #include <system_error>
-#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -29,13 +28,6 @@ bool is_pipe(const std::string& path) {
 
 std::string name_of_input(const std::string& path) {
     return path == standard_input_path ? "standard input" : path;
-}
-
-// In bytes; 0 if the file is not there.
-std::uint64_t file_size(const std::string& path) {
-    std::error_code error;
-    const std::uint64_t size = std::filesystem::file_size(path, error);
-    return error ? 0 : size;
 }
 
 class OperandComparison {
@@ -193,76 +185,49 @@ class OperandComparison {
         }
     }
 
-    // An open file, and which of its arrays the operand named, if it did.
-    struct Operand {
-        std::string path;
-        std::optional<std::string> member;
-        std::unique_ptr<ArrayFile> file = {};
-    };
+    // The path of a file, and the array that is named in it, if one is.
+    using NamedFile = std::pair<std::string, std::optional<std::string>>;
 
-    // The name of one of its arrays, in messages and as an operand.
-    static std::string name_of(const Operand& operand, const std::string& array) {
-        return operand.file->is_archive() ? operand.path + "[" + operand.file->root() + array + "]"
-                                          : operand.path;
-    }
-
-    void compare_files(Operand first, Operand second) {
+    void compare_files(const NamedFile& named1, const NamedFile& named2) {
+        std::optional<OperandFile> first;
+        std::optional<OperandFile> second;
         group_->agree(
             [&] {
-                open(first);
-                open(second);
+                first.emplace(named1.first, named1.second);
+                second.emplace(named2.first, named2.second);
             },
             [&] {
-                return std::vector<ProcessGroup::Sight>{contents_of(first), contents_of(second)};
+                return ProcessGroup::Sights{{first->path(), first->contents()},
+                                            {second->path(), second->contents()}};
             });
-        if (first.file->is_archive() && second.file->is_archive() && !first.member
-            && !second.member) {
-            compare_members(first, second);
+        if (first->file().is_archive() && second->file().is_archive() && !first->member()
+            && !second->member()) {
+            compare_members(*first, *second);
         } else {
             const NameFilter& filter = command_line_.filter;
-            const std::string member1 = chosen_member(first, second, filter);
-            compare_arrays(first, member1, second, chosen_member(second, first, filter));
+            const std::string array1 = first->chosen_array(&*second, filter);
+            compare_arrays(*first, array1, *second, second->chosen_array(&*first, filter));
         }
     }
 
-    // What all processes have to see of a file alike.
-    static ProcessGroup::Sight contents_of(const Operand& operand) {
-        std::string text = std::to_string(file_size(operand.path)) + " bytes";
-        if (operand.file->is_archive()) {
-            for (const std::string& member : operand.file->members()) {
-                text +=
-                    ", " + member + " of " + std::to_string(operand.file->divisible_bytes(member));
-            }
-        }
-        return {operand.path, text};
-    }
-
-    static void find_sizes(std::vector<NamedPair>& pairs, const Operand& first,
-                           const Operand& second) {
+    static void find_sizes(std::vector<NamedPair>& pairs, const OperandFile& first,
+                           const OperandFile& second) {
         for (NamedPair& pair : pairs) {
             if (pair.first && pair.second) {
-                const std::uint64_t bytes1 = first.file->divisible_bytes(pair.name);
-                const std::uint64_t bytes2 = second.file->divisible_bytes(pair.name);
+                const std::uint64_t bytes1 = first.file().divisible_bytes(pair.name);
+                const std::uint64_t bytes2 = second.file().divisible_bytes(pair.name);
                 pair.bytes = bytes1 == 0 || bytes2 == 0 ? 0 : bytes1 + bytes2;
             }
         }
     }
 
-    static void open(Operand& operand) {
-        operand.file = open_array_file(operand.path);
-        if (operand.member && !operand.file->is_archive()) {
-            throw Trouble(operand.path,
-                          "holds one array, without a name; leave out [" + *operand.member + "]");
-        }
-    }
-
-    void compare_members(const Operand& first, const Operand& second) {
-        const auto members1 = first.file->members();
-        const auto members2 = second.file->members();
+    void compare_members(const OperandFile& first, const OperandFile& second) {
+        const auto members1 = first.file().members();
+        const auto members2 = second.file().members();
         auto pairs = match_names(members1, members2, command_line_.filter);
         if (pairs.empty() && !(members1.empty() && members2.empty())) {
-            throw Trouble(first.path, "has no array that --include and --exclude leave, nor has "
-                                          + second.path);
+            throw Trouble(first.path(), "has no array that --include and --exclude leave, nor has "
+                                            + second.path());
         }
         check_suits_many();
         summary_.many = true;
@@ -275,120 +240,46 @@ class OperandComparison {
                 return;
             }
             if (pair.first && pair.second) {
-                by_one_or_all(group_->suits_one(pair.bytes, total), name_of(first, pair.name),
-                              name_of(second, pair.name),
+                by_one_or_all(group_->suits_one(pair.bytes, total), first.name_of(pair.name),
+                              second.name_of(pair.name),
                               [&] { compare_arrays(first, pair.name, second, pair.name); });
             } else {
-                const Operand& owner = pair.first ? first : second;
-                report_single(pair, owner.file->root() + pair.name, first.path, second.path);
+                const OperandFile& owner = pair.first ? first : second;
+                report_single(pair, owner.file().root() + pair.name, first.path(), second.path());
             }
         }
     }
 
-    // The array of the operand that is compared with one of the other operand.
-    static std::string chosen_member(const Operand& operand, const Operand& other,
-                                     const NameFilter& filter) {
-        if (!operand.file->is_archive()) {
-            return "";
+    OpenedArray open_mask() const {
+        if (command_line_.ignore.empty()) {
+            return {};
         }
-        if (operand.member) {
-            if (!operand.file->has(*operand.member)) {
-                throw Trouble(operand.path, std::string("has no array '") + operand.file->root()
-                                                + *operand.member + "'" + some(*operand.file));
-            }
-            return *operand.member;
-        }
-        const auto names = operand.file->members();
-        const auto members = match_names(names, {}, filter);
-        if (members.size() == 1) {
-            return members.front().name;
-        }
-        if (other.member && operand.file->has(*other.member)) {
-            return *other.member;
-        }
-        if (members.empty()) {
-            throw Trouble(operand.path, names.empty()
-                                            ? "holds no array"
-                                            : "has no array that --include and --exclude leave");
-        }
-        throw Trouble(operand.path, "has " + std::to_string(members.size())
-                                        + " arrays, and one is needed; choose one, such as "
-                                        + name_of(operand, members.front().name));
-    }
-
-    // Some of the arrays that a file has, for a message.
-    static std::string some(const ArrayFile& file) {
-        constexpr std::size_t most = 5;
-        const auto names = file.members();
-        std::string text;
-        for (std::size_t i = 0; i < std::min(most, names.size()); ++i) {
-            text += (i == 0 ? "; it has " : ", ") + (file.root() + names[i]);
-        }
-        return text + (names.size() > most ? ", ..." : "");
-    }
-
-    // An array, or why it is none of numbers.
-    struct OpenedArray {
-        NamedArray array;
-        std::optional<std::string> not_numbers;
-    };
-
-    // What all processes have to see of an array alike.
-    static ProcessGroup::Sight header_of(const NamedArray& array,
-                                         const std::optional<std::string>& not_numbers) {
-        const ArraySource* const source = array.source.get();
-        std::string text = not_numbers.value_or("");
-        if (source != nullptr) {
-            text = source->type_name() + " " + shape_text(source->shape()) + ", "
-                   + (source->fortran_order() ? "column-major" : "row-major");
-            if (!source->block().empty()) {
-                text += ", in blocks " + shape_text(source->block());
-            }
-        }
-        return {array.name, text};
-    }
-
-    static OpenedArray open_array(const Operand& operand, const std::string& member) {
-        OpenedArray opened;
-        opened.array.name = name_of(operand, member);
-        try {
-            opened.array.source = operand.file->open(member);
-        } catch (const NotNumbers& reason) {
-            opened.not_numbers = reason.what();
-        }
-        return opened;
-    }
-
-    NamedArray open_mask() const {
-        NamedArray mask;
-        if (!command_line_.ignore.empty()) {
-            Operand operand;
-            std::tie(operand.path, operand.member) = split_member(command_line_.ignore);
-            open(operand);
-            const std::string member = chosen_member(operand, {}, {});
-            mask.name = name_of(operand, member);
-            mask.source = operand.file->open(member);
+        const auto [path, member] = split_member(command_line_.ignore);
+        const OperandFile file(path, member);
+        OpenedArray mask = file.open(file.chosen_array(nullptr, {}));
+        if (mask.not_numbers) {
+            throw Trouble(*mask.not_numbers);
         }
         return mask;
     }
 
-    void compare_arrays(const Operand& operand1, const std::string& member1,
-                        const Operand& operand2, const std::string& member2) {
+    void compare_arrays(const OperandFile& file1, const std::string& array1,
+                        const OperandFile& file2, const std::string& array2) {
         OpenedArray first;
         OpenedArray second;
-        NamedArray mask;
+        OpenedArray mask;
         group_->agree(
             [&] {
-                first = open_array(operand1, member1);
-                second = open_array(operand2, member2);
+                first = file1.open(array1);
+                second = file2.open(array2);
                 if (!first.not_numbers && !second.not_numbers) {
                     mask = open_mask();
                 }
             },
             [&] {
-                return std::vector<ProcessGroup::Sight>{header_of(first.array, first.not_numbers),
-                                                        header_of(second.array, second.not_numbers),
-                                                        header_of(mask, {})};
+                return ProcessGroup::Sights{{first.array.name, first.header()},
+                                            {second.array.name, second.header()},
+                                            {mask.array.name, mask.header()}};
             });
         Outcome outcome;
         outcome.first = first.array.name;
@@ -403,7 +294,7 @@ class OperandComparison {
             return;
         }
         outcome.comparison =
-            compare(std::move(first.array), std::move(second.array), std::move(mask),
+            compare(std::move(first.array), std::move(second.array), std::move(mask.array),
                     command_line_.question, group_->boxes(), progress_);
         if (outcome.comparison.difference != Difference::none) {
             outcome.kind = Outcome::Kind::different;

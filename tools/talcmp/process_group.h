@@ -36,13 +36,12 @@ class ProcessGroup {
     // The files that `find` returns, which is called in the process that leads.
     virtual FilePairs same_files(const std::function<FilePairs()>& find) = 0;
 
-    // What a process sees of a file: its name, and what must be the same for all.
-    using Sight = std::pair<std::string, std::string>;
+    // What a process sees of files: their names, and what must be the same for all.
+    using Sights = std::vector<std::pair<std::string, std::string>>;
 
     // Calls `open` in all processes. Throws Trouble in all of them if it does in one, or if they do
     // not see the same; Ended.
-    virtual void agree(const std::function<void()>& open,
-                       const std::function<std::vector<Sight>()>& seen) = 0;
+    virtual void agree(const std::function<void()>& open, const std::function<Sights()>& seen) = 0;
 
     // Whether one process suffices for a pair of `bytes`, of `total` bytes in all.
     virtual bool suits_one(std::uint64_t bytes, std::uint64_t total) const = 0;
@@ -72,7 +71,7 @@ class SingleProcess : public ProcessGroup {
     BoxSupply& boxes() override { return boxes_; }
     FilePairs same_files(const std::function<FilePairs()>& find) override { return find(); }
     void agree(const std::function<void()>& open,
-               const std::function<std::vector<Sight>()>& /*seen*/) override {
+               const std::function<Sights()>& /*seen*/) override {
         open();
     }
     bool suits_one(const std::uint64_t /*bytes*/, const std::uint64_t /*total*/) const override {

@@ -15,26 +15,35 @@ enum Counter : std::size_t { numbers_taken, boxes_handed_out, counter_count = 3 
 // What the first rank says before all open something, or at the end.
 enum class Word : char { opened = 'o', failed = 'f', end = 'e' };
 
-std::string packed(const Word word, const std::vector<ProcessGroup::Sight>& sights = {}) {
+std::string packed(const Word word, const ProcessGroup::Sights& sights = {}) {
     Packer packer;
     packer.pass(word);
     packer.pass(sights.size());
     for (const auto& [file, text] : sights) {
+        packer.pass(file);
         packer.pass(text);
     }
     return packer.take();
 }
 
+// Of a description, which may list many arrays.
+std::string beginning(const std::string& text) {
+    constexpr std::size_t most = 100;
+    return text.size() > most ? text.substr(0, most) + "..." : text;
+}
+
 // Why this rank cannot go on: it sees another file than the first rank does.
-std::string complaint(const std::vector<ProcessGroup::Sight>& sights, Unpacker& first_rank) {
+std::string complaint(const ProcessGroup::Sights& sights, Unpacker& first_rank) {
     std::size_t count = 0;
     first_rank.pass(count);
     for (const auto& [file, text] : sights) {
+        std::string expected_file;
         std::string expected;
+        first_rank.pass(expected_file);
         first_rank.pass(expected);
-        if (text != expected) {
-            return Trouble(file, process_name() + " sees another file (" + text
-                                     + ") than the first rank (" + expected
+        if (file != expected_file || text != expected) {
+            return Trouble(file, process_name() + " sees another file (" + beginning(text)
+                                     + ") than the first rank (" + beginning(expected)
                                      + "); give all ranks the same files")
                 .what();
         }
@@ -61,8 +70,7 @@ FilePairs MpiGroup::same_files(const std::function<FilePairs()>& find) {
 
 // The first rank opens first: what it cannot open no other rank has to try, and a broken file is
 // found by one.
-void MpiGroup::agree(const std::function<void()>& open,
-                     const std::function<std::vector<Sight>()>& seen) {
+void MpiGroup::agree(const std::function<void()>& open, const std::function<Sights()>& seen) {
     std::string trouble;
     if (leads()) {
         open_first(open, seen);
@@ -79,9 +87,8 @@ void MpiGroup::agree(const std::function<void()>& open,
     throw Trouble(leads() ? receive(Tag::trouble, in_trouble).bytes : trouble);
 }
 
-void MpiGroup::open_first(const std::function<void()>& open,
-                          const std::function<std::vector<Sight>()>& seen) {
-    std::vector<Sight> sights;
+void MpiGroup::open_first(const std::function<void()>& open, const std::function<Sights()>& seen) {
+    Sights sights;
     try {
         open();
         sights = seen();
@@ -94,7 +101,7 @@ void MpiGroup::open_first(const std::function<void()>& open,
 
 // Returns why this rank cannot go on, nothing if it can.
 std::string MpiGroup::open_like_first(const std::function<void()>& open,
-                                      const std::function<std::vector<Sight>()>& seen) {
+                                      const std::function<Sights()>& seen) {
     const std::string bytes = broadcast("");
     Unpacker first_rank(bytes);
     Word word = {};

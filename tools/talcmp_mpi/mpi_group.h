@@ -28,8 +28,7 @@ class MpiGroup : public ProcessGroup {
     bool leads() const override { return rank() == 0; }
     BoxSupply& boxes() override { return boxes_; }
     FilePairs same_files(const std::function<FilePairs()>& find) override;
-    void agree(const std::function<void()>& open,
-               const std::function<std::vector<Sight>()>& seen) override;
+    void agree(const std::function<void()>& open, const std::function<Sights()>& seen) override;
     bool suits_one(std::uint64_t bytes, std::uint64_t total) const override;
     void by_one(const std::function<std::vector<Outcome>()>& compare) override;
     void report(const Outcome& outcome) override;
@@ -45,10 +44,9 @@ class MpiGroup : public ProcessGroup {
         std::optional<Outcomes> outcomes = {};
     };
 
-    void open_first(const std::function<void()>& open,
-                    const std::function<std::vector<Sight>()>& seen);
+    void open_first(const std::function<void()>& open, const std::function<Sights()>& seen);
     std::string open_like_first(const std::function<void()>& open,
-                                const std::function<std::vector<Sight>()>& seen);
+                                const std::function<Sights()>& seen);
     void take_in(const Message& message);
     void print_next();
     void print(const Outcomes& outcomes);
