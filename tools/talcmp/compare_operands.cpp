@@ -69,6 +69,9 @@ class OperandComparison {
             } else if (pair.first && pair.second) {
                 const bool suits_one = files.many && group_->suits_one(pair.bytes, total);
                 by_one_or_all(suits_one, *pair.first, *pair.second, [&] {
+                    if (suits_one) {
+                        check_sizes(pair);
+                    }
                     compare_files({*pair.first, files.member1}, {*pair.second, files.member2});
                 });
             } else {
@@ -117,6 +120,18 @@ class OperandComparison {
             if (pair.first && pair.second) {
                 pair.bytes = file_size(*pair.first) + file_size(*pair.second);
             }
+        }
+    }
+
+    // Throws Trouble if this process sees other files than the one that has found them.
+    static void check_sizes(const NamedPair& pair) {
+        const std::uint64_t size1 = file_size(*pair.first);
+        const std::uint64_t size2 = file_size(*pair.second);
+        if (size1 != 0 && size2 != 0 && size1 + size2 != pair.bytes) {
+            throw Trouble(*pair.first,
+                          "and " + *pair.second + " have " + std::to_string(size1 + size2)
+                              + " bytes, but for the first rank " + std::to_string(pair.bytes)
+                              + "; give all ranks the same files");
         }
     }
 
