@@ -292,9 +292,9 @@ class OperandComparison {
                 }
             },
             [&] {
-                return ProcessGroup::Sights{{first.array.name, first.header()},
-                                            {second.array.name, second.header()},
-                                            {mask.array.name, mask.header()}};
+                return ProcessGroup::Sights{{first.array.name, header_of(first)},
+                                            {second.array.name, header_of(second)},
+                                            {mask.array.name, header_of(mask)}};
             });
         Outcome outcome;
         outcome.first = first.array.name;

@@ -28,7 +28,8 @@ Process process_of(const int number) {
     const auto end = line.rfind(')');
     if (begin != std::string::npos && end != std::string::npos && end + 4 < line.size()) {
         process.name = line.substr(begin + 1, end - begin - 1);
-        process.parent = std::atoi(line.c_str() + end + 4);
+        constexpr int decimal = 10;
+        process.parent = static_cast<int>(std::strtol(line.c_str() + end + 4, nullptr, decimal));
     }
     return process;
 }

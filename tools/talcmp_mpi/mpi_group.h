@@ -44,7 +44,7 @@ class MpiGroup : public ProcessGroup {
         std::optional<Outcomes> outcomes = {};
     };
 
-    void open_first(const std::function<void()>& open, const std::function<Sights()>& seen);
+    static void open_first(const std::function<void()>& open, const std::function<Sights()>& seen);
     std::string open_like_first(const std::function<void()>& open,
                                 const std::function<Sights()>& seen);
     void take_in(const Message& message);

@@ -4,15 +4,16 @@
 
 #include <algorithm>
 #include <array>
+#include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <ctime>
 #include <new>
 #include <sstream>
 #include <string>
 #include <system_error>
+#include <thread>
 
 #include <fcntl.h>
 #include <sys/mman.h>
@@ -89,17 +90,17 @@ std::string first_words(const std::string& text) {
 void let_first_rank_speak() {
     const std::string rank = rank_from_environment();
     if (!rank.empty() && rank != "0") {
-        constexpr unsigned seconds = 5; // mpirun takes one
-        ::sleep(seconds);
+        constexpr int seconds = 5; // mpirun takes one
+        std::this_thread::sleep_for(std::chrono::seconds(seconds));
     }
 }
 
 // Waits for the end of the process; ends it if it is going to end the run before it has started.
 int status_of(const pid_t process, const std::atomic<bool>& has_started, const Descriptor& kept) {
-    constexpr struct timespec while_it_starts = {0, 20000000};
+    constexpr auto while_it_starts = std::chrono::milliseconds(20);
     int status = 0;
     while (!has_started && ::waitpid(process, &status, WNOHANG) == 0) {
-        ::nanosleep(&while_it_starts, nullptr);
+        std::this_thread::sleep_for(while_it_starts);
         if (contents_of(kept).find(before_end) != std::string::npos) {
             ::kill(process, SIGKILL);
         }

@@ -18,6 +18,7 @@ class Watched {
     Watched();
     Watched(const Watched&) = delete;
     Watched& operator=(const Watched&) = delete;
+    ~Watched() = default;
 
     // Until this is called, what is written to standard error is kept. It becomes part of that
     // line, or is written now.

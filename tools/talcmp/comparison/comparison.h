@@ -32,7 +32,8 @@ struct ArrayFacts {
 // A place in both arrays, and what to say about the elements there.
 struct Place {
     Shape index; // in the first array
-    Element element1, element2;
+    Element element1 = {};
+    Element element2 = {};
     Verdict verdict;
 };
 
