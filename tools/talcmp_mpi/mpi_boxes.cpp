@@ -17,7 +17,11 @@ void MpiBoxes::begin(const BoxPlan& plan, ProgressListener& progress) {
     }
     box_count_ = plan.traversal().box_count();
     const auto ranks = static_cast<std::uint64_t>(rank_count());
-    batch_ = std::clamp(box_count_ / (batches_of_rank * ranks), std::uint64_t{1}, largest_batch);
+    // The first rank, which has the counter, takes single boxes: without RDMA the others wait until
+    // it calls MPI again.
+    batch_ = leads() ? 1
+                     : std::clamp(box_count_ / (batches_of_rank * ranks), std::uint64_t{1},
+                                  largest_batch);
     is_merged_ = false;
     progress_ = &progress;
     bytes_of_box_ = plan.traversal().largest_box() * plan.bytes_of_pair();
