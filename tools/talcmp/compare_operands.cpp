@@ -9,6 +9,7 @@
 #include "trouble.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdio>
 #include <filesystem>
 #include <memory>
@@ -67,7 +68,7 @@ class OperandComparison {
                 report_trouble(pair.first.value_or(command_line_.first),
                                pair.second.value_or(command_line_.second), *pair.trouble);
             } else if (pair.first && pair.second) {
-                const bool suits_one = files.many && group_->suits_one(pair.bytes, total);
+                const bool suits_one = files.many && group_->suits_one(both_bytes(pair), total);
                 by_one_or_all(suits_one, *pair.first, *pair.second, [&] {
                     if (suits_one) {
                         check_sizes(pair);
@@ -118,27 +119,35 @@ class OperandComparison {
     static void find_sizes(std::vector<NamedPair>& pairs) {
         for (NamedPair& pair : pairs) {
             if (pair.first && pair.second) {
-                pair.bytes = file_size(*pair.first) + file_size(*pair.second);
+                pair.bytes = {file_size(*pair.first), file_size(*pair.second)};
             }
         }
     }
 
     // Throws Trouble if this process sees other files than the one that has found them.
     static void check_sizes(const NamedPair& pair) {
-        const std::uint64_t size1 = file_size(*pair.first);
-        const std::uint64_t size2 = file_size(*pair.second);
-        if (size1 != 0 && size2 != 0 && size1 + size2 != pair.bytes) {
-            throw Trouble(*pair.first,
-                          "and " + *pair.second + " have " + std::to_string(size1 + size2)
-                              + " bytes, but for the first rank " + std::to_string(pair.bytes)
-                              + "; give all ranks the same files");
+        const std::string* const paths[] = {&*pair.first, &*pair.second};
+        for (std::size_t i = 0; i < pair.bytes.size(); ++i) {
+            const std::uint64_t size = file_size(*paths[i]);
+            if (size != 0 && size != pair.bytes[i]) {
+                throw Trouble(*paths[i],
+                              "has " + std::to_string(size) + " bytes, but "
+                                  + std::to_string(pair.bytes[i])
+                                  + " for the first rank; give all ranks the same files");
+            }
         }
+    }
+
+    // Of arrays that can be divided; 0 where one of the two cannot.
+    static std::uint64_t both_bytes(const NamedPair& pair) {
+        const auto [first, second] = pair.bytes;
+        return first == 0 || second == 0 ? 0 : first + second;
     }
 
     static std::uint64_t total_bytes(const std::vector<NamedPair>& pairs) {
         return std::accumulate(
             pairs.begin(), pairs.end(), std::uint64_t{0},
-            [](const std::uint64_t sum, const NamedPair& pair) { return sum + pair.bytes; });
+            [](const std::uint64_t sum, const NamedPair& pair) { return sum + both_bytes(pair); });
     }
 
     // Runs `compare` in one process, or in all of them.
@@ -229,9 +238,8 @@ class OperandComparison {
                            const OperandFile& second) {
         for (NamedPair& pair : pairs) {
             if (pair.first && pair.second) {
-                const std::uint64_t bytes1 = first.file().divisible_bytes(pair.name);
-                const std::uint64_t bytes2 = second.file().divisible_bytes(pair.name);
-                pair.bytes = bytes1 == 0 || bytes2 == 0 ? 0 : bytes1 + bytes2;
+                pair.bytes = {first.file().divisible_bytes(pair.name),
+                              second.file().divisible_bytes(pair.name)};
             }
         }
     }
@@ -255,7 +263,7 @@ class OperandComparison {
                 return;
             }
             if (pair.first && pair.second) {
-                by_one_or_all(group_->suits_one(pair.bytes, total), first.name_of(pair.name),
+                by_one_or_all(group_->suits_one(both_bytes(pair), total), first.name_of(pair.name),
                               second.name_of(pair.name),
                               [&] { compare_arrays(first, pair.name, second, pair.name); });
             } else {

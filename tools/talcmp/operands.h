@@ -2,6 +2,7 @@
 
 #pragma once
 
+#include <array>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -16,7 +17,8 @@ struct NamedPair {
     std::optional<std::string> first;
     std::optional<std::string> second;
     std::optional<std::string> trouble = {}; // why they cannot be compared, with the name of which
-    std::uint64_t bytes = 0;                 // of both that can be divided; 0 if that is not known
+    // Of each, if known: those that may be read in any order.
+    std::array<std::uint64_t, 2> bytes = {};
 };
 
 struct FilePairs {

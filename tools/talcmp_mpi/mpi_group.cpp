@@ -36,6 +36,9 @@ std::string beginning(const std::string& text) {
 std::string complaint(const ProcessGroup::Sights& sights, Unpacker& first_rank) {
     std::size_t count = 0;
     first_rank.pass(count);
+    if (count != sights.size()) {
+        return "other files are opened on " + process_name() + " than on the first rank";
+    }
     for (const auto& [file, text] : sights) {
         std::string expected_file;
         std::string expected;
@@ -159,10 +162,16 @@ void MpiGroup::by_one(const std::function<Outcomes()>& compare) {
 // ---- What the first rank prints
 
 void MpiGroup::report(const Outcome& outcome) {
-    if (leads()) {
-        next_.push_back({0, Outcomes{outcome}});
-        print_next();
+    if (!leads()) {
+        return;
     }
+    // Where no rank has compared anything alone, the last outcome that is wanted is followed by
+    // nothing but trouble with its picture.
+    if (number_ == 0) {
+        ended_ = false;
+    }
+    next_.push_back({0, Outcomes{outcome}});
+    print_next();
 }
 
 void MpiGroup::take_in(const Message& message) {

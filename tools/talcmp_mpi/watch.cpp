@@ -95,33 +95,40 @@ void let_first_rank_speak() {
     }
 }
 
-// Waits for the end of the process; ends it if it is going to end the run before it has started.
-int status_of(const pid_t process, const std::atomic<bool>& has_started, const Descriptor& kept) {
+// How a process has ended.
+struct End {
+    int status = 0;               // as the system tells it
+    bool is_start_failed = false; // whether MPI was going to end the run before it had started
+};
+
+// Waits for the end of the process; ends it where its start fails.
+End end_of(const pid_t process, const std::atomic<bool>& has_started, const Descriptor& kept) {
     constexpr auto while_it_starts = std::chrono::milliseconds(20);
-    int status = 0;
-    while (!has_started && ::waitpid(process, &status, WNOHANG) == 0) {
+    End end;
+    while (!has_started && ::waitpid(process, &end.status, WNOHANG) == 0) {
         std::this_thread::sleep_for(while_it_starts);
         if (contents_of(kept).find(before_end) != std::string::npos) {
+            end.is_start_failed = true;
             ::kill(process, SIGKILL);
         }
     }
     if (has_started) {
-        while (::waitpid(process, &status, 0) < 0 && errno == EINTR) {
+        while (::waitpid(process, &end.status, 0) < 0 && errno == EINTR) {
         }
     }
-    return status;
+    return end;
 }
 
 [[noreturn]] void watch(const pid_t process, const std::atomic<bool>& has_started,
                         const Descriptor& kept) {
-    const int status = status_of(process, has_started, kept);
-    if (WIFSIGNALED(status) && (has_started || WTERMSIG(status) != SIGKILL)) {
-        const int signal = WTERMSIG(status);
+    const End end = end_of(process, has_started, kept);
+    if (WIFSIGNALED(end.status) && !end.is_start_failed) {
+        const int signal = WTERMSIG(end.status);
         end_with(this_process() + " was killed (signal " + std::to_string(signal) + ", "
                  + ::sigdescr_np(signal) + "); there is no answer");
     }
     if (has_started) {
-        ::_exit(WEXITSTATUS(status));
+        ::_exit(WEXITSTATUS(end.status));
     }
     let_first_rank_speak();
     end_with("MPI cannot be started (" + this_process() + ")" + first_words(contents_of(kept))
