@@ -5,11 +5,43 @@
 #include "run.h"
 #include "watch.h"
 
+#include <cstddef>
 #include <cstdio>
 #include <memory>
+#include <string>
 #include <utility>
+#include <vector>
 
 #include <unistd.h>
+
+namespace {
+
+// The words of the first rank's command line, so that all ranks do the same.
+class FirstRanksWords {
+  public:
+    FirstRanksWords(const int argc, const char* const* argv) {
+        const char separator = '\0'; // which no word has
+        std::string text;
+        for (const char* const word : std::vector<const char*>(argv, argv + argc)) {
+            text += word;
+            text += separator;
+        }
+        text_ = talcmp::broadcast(std::move(text));
+        for (std::size_t begin = 0; begin < text_.size();
+             begin = text_.find(separator, begin) + 1) {
+            words_.push_back(text_.data() + begin);
+        }
+    }
+
+    int count() const { return static_cast<int>(words_.size()); }
+    const char* const* words() const { return words_.data(); }
+
+  private:
+    std::string text_;
+    std::vector<const char*> words_;
+};
+
+} // namespace
 
 int main(int argc, char** argv) {
     talcmp::Watched watched;
@@ -23,10 +55,11 @@ int main(int argc, char** argv) {
     if (!terminal.is_terminal()) {
         std::setvbuf(stdout, nullptr, _IOFBF, BUFSIZ);
     }
+    const FirstRanksWords line(argc, argv);
     const auto ranks = [](talcmp::Reporter report, const talcmp::Question& question) {
         return std::make_unique<talcmp::MpiGroup>(std::move(report), question);
     };
-    const int exit_status =
-        talcmp::run(argc, argv, {terminal, status.number(), speaks, ranks, talcmp::end_run});
+    const int exit_status = talcmp::run(
+        line.count(), line.words(), {terminal, status.number(), speaks, ranks, talcmp::end_run});
     return speaks ? exit_status : 0;
 }
