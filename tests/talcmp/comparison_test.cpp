@@ -5,6 +5,7 @@
 
 #include "support/compare_arrays.h"
 #include "support/memory_array.h"
+#include "support/sanitizers.h"
 #include "support/thrown_message.h"
 
 #include <gtest/gtest.h>
@@ -359,6 +360,32 @@ TEST_P(Comparisons, ReadNoFurtherThanToThePlacesThatAreListed) {
         EXPECT_LT(listener_.done, length);
     }
     EXPECT_GT(listener_.done, 0U);
+}
+
+// ---- Memory
+
+// Has to be read in blocks that no memory holds.
+class HugeBlocks : public FunctionArray<std::int8_t> {
+  public:
+    HugeBlocks() : FunctionArray({block_size}, {}) {}
+    const Shape& block() const override { return shape(); }
+
+  private:
+    static constexpr std::uint64_t block_size = std::uint64_t{1} << 46U;
+};
+
+TEST(Memory, ThatIsNotThereIsTrouble) {
+    if (address_sanitizer || thread_sanitizer || sizeof(void*) < sizeof(std::uint64_t)) {
+        GTEST_SKIP() << "sanitizers end the process, and 32-bit systems cannot name the size";
+    }
+    EXPECT_EQ(thrown_message([] {
+                  compare_arrays(std::make_unique<HugeBlocks>(), std::make_unique<HugeBlocks>(),
+                                 question_of(1));
+              }),
+              "a: there is not enough memory to compare it with b: 140737488355328 bytes for "
+              "pieces of both, up to "
+                  + std::to_string(sizeof(talcmp::FoundPair))
+                  + " for differences; fewer --threads and --max-differences take less");
 }
 
 // ---- Threads
