@@ -1,4 +1,5 @@
-# Debian packages by CPack: libtalnumericarray-dev and talcmp, for whatever architecture is built.
+# Debian packages by CPack: libtalnumericarray-dev, talcmp and, if it is built, talcmp-mpi, for
+# whatever architecture is built.
 
 find_program(TALNUMERICARRAY_DPKG_ARCHITECTURE dpkg-architecture)
 if(NOT TALNUMERICARRAY_DPKG_ARCHITECTURE)
@@ -21,7 +22,7 @@ talnumericarray_debian_name(CPACK_DEBIAN_PACKAGE_ARCHITECTURE DEB_HOST_ARCH ${ta
 talnumericarray_debian_name(multiarch DEB_HOST_MULTIARCH ${target})
 set(CMAKE_INSTALL_LIBDIR lib/${multiarch})
 
-# ---- The two packages
+# ---- The packages
 
 set(CPACK_GENERATOR DEB)
 set(CPACK_COMPONENTS_ALL Development Runtime)
@@ -30,14 +31,14 @@ set(CPACK_PACKAGING_INSTALL_PREFIX /usr)
 set(CPACK_STRIP_FILES ON)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_MAINTAINER "TalNumericArray developers <talnumericarray@localhost>")
-# Each package has a description of its own.
+# Each package has a description of its own. CPack indents its lines.
 set(CPACK_PACKAGE_DESCRIPTION_SUMMARY "")
 
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_NAME libtalnumericarray-dev)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
     "${PROJECT_DESCRIPTION}
- The headers, the static library and what CMake and pkg-config need to find them.")
+The headers, the static library and what CMake and pkg-config need to find them.")
 
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME talcmp)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION math)
@@ -52,7 +53,23 @@ else()
 endif()
 set(CPACK_COMPONENT_RUNTIME_DESCRIPTION
     "Compare the arrays in .npy and .npz files
- talcmp says whether two arrays of numbers are the same, where they differ and by how much, under a
- tolerance in binary digits.")
+talcmp says whether two arrays of numbers are the same, where they differ and by how much, under a
+tolerance in binary digits.")
+
+if(TARGET talcmp_mpi)
+  list(APPEND CPACK_COMPONENTS_ALL Mpi)
+  set(CPACK_DEBIAN_MPI_PACKAGE_NAME talcmp-mpi)
+  set(CPACK_DEBIAN_MPI_PACKAGE_SECTION math)
+  # This has mpirun, which no library of Open MPI asks for, and what starts the program alone.
+  set(CPACK_DEBIAN_MPI_PACKAGE_DEPENDS openmpi-bin)
+  set(CPACK_DEBIAN_MPI_PACKAGE_SHLIBDEPS ON)
+  # Its manual page explains the options of both.
+  set(CPACK_DEBIAN_MPI_PACKAGE_RECOMMENDS talcmp)
+  set(CPACK_COMPONENT_MPI_DESCRIPTION
+      "Compare arrays in files by several processes, with MPI
+talcmp-mpi says what talcmp says about arrays in files, and has the same options. It divides the work
+between the processes that mpirun or srun starts, on one computer or on several that see the same
+files.")
+endif()
 
 include(CPack)

@@ -1,6 +1,6 @@
-# What `cmake --install` lays down: the library, in the component Development, and talcmp, in the
-# component Runtime. None of it contains the prefix, which may be moved afterwards, unless
-# CMAKE_INSTALL_LIBDIR is absolute.
+# What `cmake --install` lays down: the library, in the component Development, talcmp, in the
+# component Runtime, and talcmp-mpi, if it is built, in the component Mpi. None of it contains the
+# prefix, which may be moved afterwards, unless CMAKE_INSTALL_LIBDIR is absolute.
 
 option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
        OFF)
@@ -24,6 +24,19 @@ function(talnumericarray_install component folder)
     FILES ${ARGN}
     DESTINATION ${folder}
     COMPONENT ${component})
+endfunction()
+
+# talnumericarray_install_manual(COMPONENT FILE)
+function(talnumericarray_install_manual component manual)
+  if(TALNUMERICARRAY_DEBIAN_PACKAGES)
+    # Debian compresses its manual pages.
+    get_filename_component(name ${manual} NAME)
+    file(MAKE_DIRECTORY ${generated})
+    execute_process(COMMAND gzip -9nc ${manual} OUTPUT_FILE ${generated}/${name}.gz
+                            COMMAND_ERROR_IS_FATAL ANY)
+    set(manual ${generated}/${name}.gz)
+  endif()
+  talnumericarray_install(${component} ${CMAKE_INSTALL_MANDIR}/man1 ${manual})
 endfunction()
 
 # ---- Headers and archive
@@ -68,20 +81,12 @@ file(GENERATE OUTPUT ${generated}/talnumericarray.pc INPUT ${generated}/talnumer
 talnumericarray_install(Development ${CMAKE_INSTALL_LIBDIR}/pkgconfig
                         ${generated}/talnumericarray.pc)
 
-# ---- The command
+# ---- The commands
 
 if(TARGET talcmp)
   set(talcmp_folder ${PROJECT_SOURCE_DIR}/tools/talcmp)
   install(TARGETS talcmp RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT Runtime)
-  set(manual ${talcmp_folder}/talcmp.1)
-  if(TALNUMERICARRAY_DEBIAN_PACKAGES)
-    # Debian compresses its manual pages.
-    file(MAKE_DIRECTORY ${generated})
-    execute_process(COMMAND gzip -9nc ${manual} OUTPUT_FILE ${generated}/talcmp.1.gz
-                            COMMAND_ERROR_IS_FATAL ANY)
-    set(manual ${generated}/talcmp.1.gz)
-  endif()
-  talnumericarray_install(Runtime ${CMAKE_INSTALL_MANDIR}/man1 ${manual})
+  talnumericarray_install_manual(Runtime ${talcmp_folder}/talcmp.1)
   talnumericarray_install(Runtime ${CMAKE_INSTALL_DATADIR}/doc/talcmp
                           ${talcmp_folder}/talcmp.schema.json ${PROJECT_SOURCE_DIR}/docs/talcmp.md)
   install(
@@ -95,4 +100,11 @@ if(TARGET talcmp)
                           ${talcmp_folder}/completions/_talcmp)
   talnumericarray_install(Runtime ${CMAKE_INSTALL_DATADIR}/fish/vendor_completions.d
                           ${talcmp_folder}/completions/talcmp.fish)
+endif()
+
+if(TARGET talcmp_mpi)
+  install(TARGETS talcmp_mpi RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT Mpi)
+  talnumericarray_install_manual(Mpi ${PROJECT_SOURCE_DIR}/tools/talcmp_mpi/talcmp-mpi.1)
+  talnumericarray_install(Mpi ${CMAKE_INSTALL_DATADIR}/doc/talcmp-mpi
+                          ${PROJECT_SOURCE_DIR}/docs/mpi.md)
 endif()
