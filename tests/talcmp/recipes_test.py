@@ -3,6 +3,7 @@
 
 import json
 import os
+import pathlib
 import re
 import shlex
 import shutil
@@ -107,6 +108,69 @@ class ShellScript(Recipe):
         status, _, errors = self.run_in_folder(RECIPES / "check_results.sh")
         self.assertEqual(status, 2)
         self.assertIn("could not be compared", errors)
+
+
+class SlurmJob(Recipe):
+    """The job, with stand-ins for srun, and here also for talcmp-mpi."""
+
+    def setUp(self):
+        super().setUp()
+        self.add_program("talcmp-mpi", f'exec {shlex.join(COMMAND)} "$@"')
+        self.start_by("exec")
+
+    def start_by(self, launcher):
+        options = "--kill-on-bad-exit=0|--wait=60|--cpus-per-task=1"
+        self.add_program("srun", f'while :; do case $1 in {options}) shift;; *) break;; esac; done\n'
+                                 f'{launcher} "$@"')
+
+    def run_job(self):
+        return self.run_in_folder(RECIPES / "slurm_job.sh", "first", "second", "report.txt")
+
+    def compare(self, result):
+        self.save("first/run.npy", np.arange(5.0))
+        self.save("second/run.npy", result)
+        return self.run_job()
+
+    def report(self):
+        return read_bytes(self.path("report.txt")).decode()
+
+    def test_the_same(self):
+        self.assertEqual(self.compare(np.arange(5.0)), (0, "all results are the same\n", ""))
+        self.assertIn("\n1 the same, 0 different", self.report())
+
+    def test_different(self):
+        self.assertEqual(self.compare(np.arange(5.0) * (1 + 2.0**-35)),
+                         (1, "some results differ, as report.txt says\n", ""))
+        self.assertIn("smallest tolerance    --tol 18", self.report())
+
+    def test_trouble(self):
+        self.write("first/run.npy", b"broken")
+        self.write("second/run.npy", b"broken")
+        status, output, errors = self.run_job()
+        self.assertEqual((status, output), (2, ""))
+        self.assertIn("talcmp: first/run.npy: ", errors)
+        self.assertTrue(errors.endswith("\nsome results could not be compared\n"), errors)
+
+    def test_ended(self):
+        self.start_by("exit 137 #")
+        self.assertEqual(self.compare(np.arange(5.0)),
+                         (2, "", "the comparison was ended: there is no answer\n"))
+
+
+class SlurmJobOfTwoProcesses(SlurmJob):
+    """The same with talcmp-mpi, started by Open MPI, which has to be told twice that root may."""
+
+    def setUp(self):
+        super().setUp()
+        program = pathlib.Path(COMMAND[-1]).with_name("talcmp-mpi")
+        if not program.exists() or shutil.which("mpirun") is None:
+            self.skipTest("NOT TESTED: talcmp-mpi is not built, or mpirun not installed")
+        os.remove(f"{self.programs}/talcmp-mpi")
+        os.symlink(program, f"{self.programs}/talcmp-mpi")
+        # Open MPI leaks memory.
+        self.environment.update(OMPI_ALLOW_RUN_AS_ROOT="1", OMPI_ALLOW_RUN_AS_ROOT_CONFIRM="1",
+                                ASAN_OPTIONS="detect_leaks=0")
+        self.start_by("exec mpirun -q --oversubscribe -n 2")
 
 
 class Workflow(Recipe):
