@@ -11,7 +11,6 @@ namespace talcmp {
 namespace {
 
 using Anchor = Drawing::Anchor;
-using Box = Drawing::Box;
 
 // Pixels.
 constexpr int margin = 16;
@@ -78,25 +77,25 @@ struct CellSize {
 };
 
 // Of all images along one side.
-struct Side {
+struct Extent {
     int images, cells; // the cells of one image
 };
 
-int side_length(const Side side, const int cell) {
+int side_length(const Extent side, const int cell) {
     return side.images * side.cells * cell + (side.images - 1) * image_gap;
 }
 
 // The largest cell up to `most` with which the side is not longer than `longest`.
-int cell_for(const Side side, const int longest, const int most) {
+int cell_for(const Extent side, const int longest, const int most) {
     const int room = (longest - (side.images - 1) * image_gap) / (side.images * side.cells);
     return std::clamp(room, smallest_cell, most);
 }
 
 // Cells are squares, except in long images of few rows or columns, where these are broadened.
-CellSize cell_size(const Side down, const Side right) {
+CellSize cell_size(const Extent down, const Extent right) {
     const int square = std::min(cell_for(down, usual_side, largest_cell),
                                 cell_for(right, usual_side, largest_cell));
-    const auto broadened = [square](const Side side, const Side other) {
+    const auto broadened = [square](const Extent side, const Extent other) {
         const int wanted = other.cells * square / (greatest_drawn_proportion * side.cells);
         return cell_for(side, largest_side, std::clamp(wanted, square, largest_cell));
     };
@@ -143,10 +142,10 @@ class Draughtsman {
     }
 
     void draw_images() {
-        const Side down = {static_cast<int>(layout_.grid_rows),
-                           static_cast<int>(layout_.cell_rows)};
-        const Side right = {static_cast<int>(layout_.grid_columns),
-                            static_cast<int>(layout_.cell_columns)};
+        const Extent down = {static_cast<int>(layout_.grid_rows),
+                             static_cast<int>(layout_.cell_rows)};
+        const Extent right = {static_cast<int>(layout_.grid_columns),
+                              static_cast<int>(layout_.cell_columns)};
         cell_ = cell_size(down, right);
         image_ = {0, 0, right.cells * cell_.width, down.cells * cell_.height};
         drawing_.nan_square = std::clamp(std::min(cell_.width, cell_.height) / 4, 1, 6);
@@ -172,7 +171,7 @@ class Draughtsman {
         right_ = std::max(right_, image_.x + width);
     }
 
-    Box box_of(const std::uint64_t image) const {
+    Drawing::Box box_of(const std::uint64_t image) const {
         const auto row = static_cast<int>(image / layout_.grid_columns);
         const auto column = static_cast<int>(image % layout_.grid_columns);
         return {image_.x + column * (image_.width + image_gap),
@@ -180,14 +179,14 @@ class Draughtsman {
     }
 
     void draw_image(const std::uint64_t image) {
-        const Box box = box_of(image);
+        const Drawing::Box box = box_of(image);
         draw_frame(box);
         for (std::uint64_t row = 0; row < layout_.cell_rows; ++row) {
             draw_row(image, row, box.x, box.y + static_cast<int>(row) * cell_.height);
         }
     }
 
-    void draw_frame(const Box& box) {
+    void draw_frame(const Drawing::Box& box) {
         drawing_.lines.push_back({box.x - 1, box.y - 1, box.width + 2, 1});
         drawing_.lines.push_back({box.x - 1, box.y + box.height, box.width + 2, 1});
         drawing_.lines.push_back({box.x - 1, box.y, 1, box.height});
@@ -219,7 +218,7 @@ class Draughtsman {
             round_ticks(layout_.rows, layout_.row_bin, static_cast<std::uint64_t>(apart));
         for (std::uint64_t grid_row = 0; layout_.rows > 1 && grid_row < layout_.grid_rows;
              ++grid_row) {
-            const Box box = box_of(grid_row * layout_.grid_columns);
+            const Drawing::Box box = box_of(grid_row * layout_.grid_columns);
             for (const auto& [index, cell] : ticks) {
                 const int y = box.y + static_cast<int>(cell) * cell_.height + cell_.height / 2;
                 drawing_.lines.push_back({box.x - 1 - tick_length, y - 1, tick_length, 2});
@@ -237,7 +236,7 @@ class Draughtsman {
             round_ticks(layout_.columns, layout_.column_bin, static_cast<std::uint64_t>(apart));
         const std::uint64_t first = (layout_.grid_rows - 1) * layout_.grid_columns;
         for (std::uint64_t image = first; image < layout_.images; ++image) {
-            const Box box = box_of(image);
+            const Drawing::Box box = box_of(image);
             const bool is_last = image + 1 == layout_.images;
             for (const auto& [index, cell] : ticks) {
                 const std::string text = std::to_string(index);
@@ -266,7 +265,7 @@ class Draughtsman {
         const int every = (widest + Drawing::letter_advance + stride - 1) / stride;
         const int right = std::max(right_, image_.x + widest);
         for (std::uint64_t image = 0; image < layout_.images; ++image) {
-            const Box box = box_of(image);
+            const Drawing::Box box = box_of(image);
             const bool is_named =
                 image % layout_.grid_columns % static_cast<std::uint64_t>(every) == 0;
             const std::string name = name_of(image);
@@ -317,8 +316,8 @@ class Draughtsman {
     std::string cell_name_;
     Drawing drawing_;
     CellSize cell_ = {};
-    Box image_ = {}; // the first one
-    int right_ = 0;  // of all that is drawn
+    Drawing::Box image_ = {}; // the first one
+    int right_ = 0;           // of all that is drawn
     int bottom_ = margin;
 };
 
