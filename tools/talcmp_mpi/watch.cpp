@@ -132,7 +132,9 @@ End end_of(const pid_t process, const std::atomic<bool>& has_started, const Desc
     }
     let_first_rank_speak();
     end_with("MPI cannot be started (" + this_process() + ")" + first_words(contents_of(kept))
-             + "; is Open MPI installed completely? mpirun says more without the option -q");
+             + "; is Open MPI installed completely? "
+             + (environment("SLURM_STEP_ID").empty() ? "mpirun says more without the option -q"
+                                                     : "srun starts it with --mpi=pmix"));
 }
 
 std::atomic<bool>& shared_flag() {
