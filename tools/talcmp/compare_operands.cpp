@@ -126,21 +126,22 @@ class OperandComparison {
 
     // Throws Trouble if this process sees other files than the one that has found them.
     static void check_sizes(const NamedPair& pair) {
-        const std::string* const paths[] = {&*pair.first, &*pair.second};
-        for (std::size_t i = 0; i < pair.bytes.size(); ++i) {
-            const std::uint64_t size = file_size(*paths[i]);
-            if (size != 0 && size != pair.bytes[i]) {
-                throw Trouble(*paths[i],
-                              "has " + std::to_string(size) + " bytes, but "
-                                  + std::to_string(pair.bytes[i])
-                                  + " for the first rank; give all ranks the same files");
+        const auto check = [](const std::string& path, const std::uint64_t expected) {
+            const std::uint64_t size = file_size(path);
+            if (size != 0 && size != expected) {
+                throw Trouble(path, "has " + std::to_string(size) + " bytes, but "
+                                        + std::to_string(expected)
+                                        + " for the first rank; give all ranks the same files");
             }
-        }
+        };
+        check(*pair.first, pair.bytes[0]);
+        check(*pair.second, pair.bytes[1]);
     }
 
     // Of arrays that can be divided; 0 where one of the two cannot.
     static std::uint64_t both_bytes(const NamedPair& pair) {
-        const auto [first, second] = pair.bytes;
+        const std::uint64_t first = pair.bytes[0];
+        const std::uint64_t second = pair.bytes[1];
         return first == 0 || second == 0 ? 0 : first + second;
     }
 
@@ -238,8 +239,7 @@ class OperandComparison {
                            const OperandFile& second) {
         for (NamedPair& pair : pairs) {
             if (pair.first && pair.second) {
-                pair.bytes = {first.file().divisible_bytes(pair.name),
-                              second.file().divisible_bytes(pair.name)};
+                pair.bytes = {first.divisible_bytes(pair.name), second.divisible_bytes(pair.name)};
             }
         }
     }
@@ -247,16 +247,21 @@ class OperandComparison {
     void compare_members(const OperandFile& first, const OperandFile& second) {
         const auto members1 = first.file().members();
         const auto members2 = second.file().members();
-        auto pairs = match_names(members1, members2, command_line_.filter);
-        if (pairs.empty() && !(members1.empty() && members2.empty())) {
+        FilePairs matched;
+        matched.pairs = match_names(members1, members2, command_line_.filter);
+        if (matched.pairs.empty() && !(members1.empty() && members2.empty())) {
             throw Trouble(first.path(), "has no array that --include and --exclude leave, nor has "
                                             + second.path());
         }
         check_suits_many();
         summary_.many = true;
         if (!group_->is_alone()) {
-            find_sizes(pairs, first, second);
+            matched = group_->same_files([&] {
+                find_sizes(matched.pairs, first, second);
+                return matched;
+            });
         }
+        const std::vector<NamedPair>& pairs = matched.pairs;
         const std::uint64_t total = total_bytes(pairs);
         for (const NamedPair& pair : pairs) {
             if (group_->has_ended()) {

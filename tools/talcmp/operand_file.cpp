@@ -80,6 +80,14 @@ std::string OperandFile::chosen_array(const OperandFile* const other,
                              + name_of(members.front().name));
 }
 
+std::uint64_t OperandFile::divisible_bytes(const std::string& array) const {
+    try {
+        return file_->divisible_bytes(array);
+    } catch (const Trouble&) {
+        return 0; // which is reported when the array is opened
+    }
+}
+
 OpenedArray OperandFile::open(const std::string& array) const {
     OpenedArray opened;
     opened.array.name = name_of(array);
@@ -95,7 +103,7 @@ std::string OperandFile::contents() const {
     std::string text = std::to_string(file_size(path_)) + " bytes";
     if (file_->is_archive()) {
         for (const std::string& member : file_->members()) {
-            text += ", " + member + " of " + std::to_string(file_->divisible_bytes(member));
+            text += ", " + member;
         }
     }
     return text;

@@ -38,10 +38,14 @@ class OperandFile {
     // The array that is compared with one of the other operand, if there is one. Throws Trouble.
     std::string chosen_array(const OperandFile* other, const NameFilter& filter) const;
 
+    // The bytes of an array that can be read in any order; 0 if they cannot, or if there is
+    // trouble.
+    std::uint64_t divisible_bytes(const std::string& array) const;
+
     // Throws Trouble.
     OpenedArray open(const std::string& array) const;
 
-    // Its size, and the names and sizes of its arrays.
+    // Its size, and the names of its arrays.
     std::string contents() const;
 
   private:

@@ -2,11 +2,13 @@
 
 #include "launcher.h"
 #include "mpi_group.h"
+#include "process_setup.h"
 #include "run.h"
 #include "watch.h"
 
 #include <cstddef>
 #include <cstdio>
+#include <exception>
 #include <memory>
 #include <string>
 #include <utility>
@@ -41,15 +43,15 @@ class FirstRanksWords {
     std::vector<const char*> words_;
 };
 
-} // namespace
-
-int main(int argc, char** argv) {
+int compare(const int argc, const char* const* argv) {
+    talcmp::set_up_process();
     talcmp::Watched watched;
+    // Before MPI starts: it leaves the marks of a launcher where there is none.
+    const talcmp::Descriptor output = talcmp::shown_by_launcher(STDOUT_FILENO);
+    const talcmp::Descriptor status = talcmp::shown_by_launcher(STDERR_FILENO);
     const talcmp::Mpi mpi;
     watched.has_started();
     const bool speaks = talcmp::rank() == 0;
-    const talcmp::Descriptor output = talcmp::shown_by_launcher(STDOUT_FILENO);
-    const talcmp::Descriptor status = talcmp::shown_by_launcher(STDERR_FILENO);
     talcmp::Terminal terminal = talcmp::Terminal::of(output.number());
     talcmp::broadcast(&terminal, sizeof terminal);
     if (!terminal.is_terminal()) {
@@ -62,4 +64,14 @@ int main(int argc, char** argv) {
     const int exit_status = talcmp::run(
         line.count(), line.words(), {terminal, status.number(), speaks, ranks, talcmp::end_run});
     return speaks ? exit_status : 0;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return compare(argc, argv);
+    } catch (const std::exception& error) {
+        talcmp::end_run(error.what());
+    }
 }

@@ -72,7 +72,8 @@ bool Hdf5File::has(const std::string& member) {
 }
 
 std::uint64_t Hdf5File::divisible_bytes(const std::string& member) {
-    return hdf5::bytes_of_array(file_->id(), root() + member, path_);
+    const std::string location = root() + member;
+    return hdf5::bytes_of_array(file_->id(), location, path_ + "[" + location + "]");
 }
 
 std::unique_ptr<ArraySource> Hdf5File::open(const std::string& member) {

@@ -25,7 +25,7 @@ std::map<std::string, Member> members_of(hid_t file, const std::string& path);
 bool has_array(hid_t group, const std::string& path, const std::string& name);
 
 // The bytes of the elements of the array at the path; 0 if there is no such array. Messages call
-// the file `name`.
+// the array `name`.
 std::uint64_t bytes_of_array(hid_t group, const std::string& path, const std::string& name);
 
 } // namespace talcmp::hdf5
