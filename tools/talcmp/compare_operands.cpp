@@ -35,7 +35,7 @@ class OperandComparison {
   public:
     OperandComparison(const CommandLine& command_line, Answers& answers, ProgressListener& progress,
                       const MakeGroup& make_group)
-        : command_line_(command_line), answers_(answers), progress_(progress),
+        : command_line_(command_line), answers_(answers), progress_(&progress),
           all_(make_group([this](const Outcome& outcome) { return print(outcome); },
                           command_line.question)),
           group_(all_.get()) {}
@@ -323,7 +323,7 @@ class OperandComparison {
         }
         outcome.comparison =
             compare(std::move(first.array), std::move(second.array), std::move(mask.array),
-                    command_line_.question, group_->boxes(), progress_);
+                    command_line_.question, group_->boxes(), *progress_);
         if (outcome.comparison.difference != Difference::none) {
             outcome.kind = Outcome::Kind::different;
         }
@@ -385,12 +385,15 @@ class OperandComparison {
             is_same = is_same || here.message == outcome.message;
             return true;
         });
+        NoProgress no_progress; // that of what is compared meanwhile goes on
         ProcessGroup* const group = std::exchange(group_, &single);
+        ProgressListener* const progress = std::exchange(progress_, &no_progress);
         guarded(outcome.first, outcome.second,
                 [&, path1 = path1, member1 = member1, path2 = path2, member2 = member2] {
                     compare_files({path1, member1}, {path2, member2});
                 });
         group_ = group;
+        progress_ = progress;
         return is_same;
     }
 
@@ -404,7 +407,7 @@ class OperandComparison {
 
     const CommandLine& command_line_;
     Answers& answers_;
-    ProgressListener& progress_;
+    ProgressListener* progress_;
     Summary summary_;
     std::unique_ptr<ProcessGroup> all_;
     ProcessGroup* group_; // that compares at the moment: all processes, or this one

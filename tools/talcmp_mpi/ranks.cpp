@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
+#include <limits>
 #include <utility>
 
 #include <unistd.h>
@@ -33,6 +34,15 @@ void choose_one_sided_calls() {
             ::setenv("OMPI_MCA_osc", "^ucx", 0);
         }
     }
+}
+
+// How many bytes a call is told of.
+int count_of(const std::size_t bytes) {
+    if (bytes > static_cast<std::size_t>(std::numeric_limits<int>::max())) {
+        end_run("what " + process_name() + " has found takes " + std::to_string(bytes)
+                + " bytes, too many to be sent; lower --max-differences");
+    }
+    return static_cast<int>(bytes);
 }
 
 Message received(MPI_Message message, const MPI_Status& status) {
@@ -85,8 +95,8 @@ void end_run(const std::string& reason) {
 }
 
 void send(const int to, const Tag tag, const std::string& bytes) {
-    checked(::MPI_Send(bytes.data(), static_cast<int>(bytes.size()), MPI_CHAR, to,
-                       static_cast<int>(tag), MPI_COMM_WORLD));
+    checked(::MPI_Send(bytes.data(), count_of(bytes.size()), MPI_CHAR, to, static_cast<int>(tag),
+                       MPI_COMM_WORLD));
 }
 
 void Sendings::send(const int to, const Tag tag, std::string bytes) {
@@ -98,7 +108,7 @@ void Sendings::send(const int to, const Tag tag, std::string bytes) {
     Sending& sending = sendings_.emplace_back();
     sending.bytes = std::move(bytes);
     // NOLINTNEXTLINE(clang-analyzer-optin.mpi.MPI-Checker): `wait` waits for it.
-    checked(::MPI_Isend(sending.bytes.data(), static_cast<int>(sending.bytes.size()), MPI_CHAR, to,
+    checked(::MPI_Isend(sending.bytes.data(), count_of(sending.bytes.size()), MPI_CHAR, to,
                         static_cast<int>(tag), MPI_COMM_WORLD, &sending.request));
 }
 
@@ -128,7 +138,7 @@ std::optional<Message> receive_if_there(const Tag tag) {
 }
 
 void broadcast(void* const bytes, const std::size_t count) {
-    checked(::MPI_Bcast(bytes, static_cast<int>(count), MPI_CHAR, first_rank, MPI_COMM_WORLD));
+    checked(::MPI_Bcast(bytes, count_of(count), MPI_CHAR, first_rank, MPI_COMM_WORLD));
 }
 
 std::string broadcast(std::string bytes) {

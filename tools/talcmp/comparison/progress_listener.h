@@ -20,4 +20,10 @@ class ProgressListener {
     virtual void advance(std::uint64_t bytes) = 0;
 };
 
+class NoProgress : public ProgressListener {
+  public:
+    void begin(std::uint64_t /*total_bytes*/) override {}
+    void advance(std::uint64_t /*bytes*/) override {}
+};
+
 } // namespace talcmp
