@@ -1,5 +1,6 @@
 """Seconds and memory of commands that compare files."""
 
+import functools
 import multiprocessing
 import os
 import re
@@ -39,12 +40,19 @@ def memory_of(command):
     return most
 
 
+def in_turns(calls, repetitions):
+    """What each function returns in all repetitions, by name; in turns, so that other work of the
+    machine affects all of them."""
+    returned = {name: [] for name in calls}
+    for _ in range(repetitions):
+        for name, call in calls.items():
+            returned[name].append(call())
+    return returned
+
+
 def measured_in_turns(commands, repetitions):
     """The least seconds and the memory of each command, by name; all of them have to succeed."""
     memory = {name: memory_of(command) for name, command in commands.items()}
-    # In turns, so that other work of the machine affects all of them.
-    seconds = {name: [] for name in commands}
-    for _ in range(repetitions):
-        for name, command in commands.items():
-            seconds[name].append(seconds_of(command))
+    calls = {name: functools.partial(seconds_of, command) for name, command in commands.items()}
+    seconds = in_turns(calls, repetitions)
     return {name: {"seconds": min(seconds[name]), "memory": memory[name]} for name in commands}

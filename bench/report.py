@@ -477,15 +477,14 @@ def bars_of_arm(arm):
 # ---- The documents
 
 
-def renew_blocks(documents, blocks):
+def renew_blocks(document, blocks):
     """Replaces what is between the marks of each block."""
-    document = documents / "performance.md"
     text = document.read_text(encoding="utf-8")
     for block, content in blocks.items():
         head, mark, tail = text.partition(f"<!-- measured: {block} -->\n")
         _, end, rest = tail.partition("<!-- end -->")
         if not mark or not end:
-            sys.exit(f"report: no marks for {block} in performance.md")
+            sys.exit(f"report: no marks for {block} in {document.name}")
         text = "".join((head, mark, content, end, rest))
     document.write_text(text, encoding="utf-8")
 
@@ -501,7 +500,8 @@ def report_of_arm(results, documents):
         picture = heat_map(title, arm.types, arm.worst_workload(build), (8, 48), 1)
         (documents / f"performance_arm_{build}.svg").write_text(picture, encoding="utf-8")
     measured = list(bars_of_arm(arm))
-    renew_blocks(documents, {"32-bit ARM": arm_table(arm), "bars of 32-bit ARM": bars_table(measured)})
+    renew_blocks(documents / "performance.md",
+                 {"32-bit ARM": arm_table(arm), "bars of 32-bit ARM": bars_table(measured)})
     print_bars(measured)
 
 
@@ -532,7 +532,7 @@ def report_of_times(results, documents):
         *bars_of_files(files),
     ]
     start = (results / "start").read_text(encoding="utf-8")
-    renew_blocks(documents, {
+    renew_blocks(documents / "performance.md", {
         "machine": machine_table(loops, start),
         "bars": bars_table(measured),
         "long arrays": loops_table(loops),
