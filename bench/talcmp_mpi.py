@@ -29,6 +29,9 @@ from talcmp_peers import changed, random_doubles, save_chunked, smooth_doubles
 BOX = 1 << 18  # bytes of each array
 MANY = 16  # ranks, more than there are processors
 
+# As if the ranks were on two machines without a better network.
+OVER_TCP = ("--mca", "pml", "ob1", "--mca", "btl", "self,tcp", "--mca", "osc", "pt2pt")
+
 # Open MPI asks whether this is meant.
 ROOT_MAY = {"OMPI_ALLOW_RUN_AS_ROOT": "1", "OMPI_ALLOW_RUN_AS_ROOT_CONFIRM": "1"}
 ENVIRONMENT = {**os.environ, **(ROOT_MAY if os.geteuid() == 0 else {})}
@@ -160,12 +163,12 @@ def seconds_of(command):
     return time.perf_counter() - begin
 
 
-def seconds_of_ranks(setting, ranks, folder, command):
+def seconds_of_ranks(setting, ranks, folder, words, command):
     """Those of the whole command, and those between starting the ranks and ending them."""
     inside = folder / "seconds"
     library = setting.benchmarks.resolve() / "libmpi_seconds.so"
-    whole = seconds_of([*mpirun(ranks, "-x", f"MPI_SECONDS={inside}", "-x", f"LD_PRELOAD={library}"),
-                        *command])
+    whole = seconds_of([*mpirun(ranks, "-x", f"MPI_SECONDS={inside}", "-x", f"LD_PRELOAD={library}",
+                                *words), *command])
     return whole, float(inside.read_text(encoding="utf-8"))
 
 
@@ -176,9 +179,10 @@ def calls_of(setting, folder, case):
         "talcmp --threads 1": functools.partial(seconds_of, setting.talcmp(*one_thread)),
         "talcmp": functools.partial(seconds_of, setting.talcmp(*arguments)),
     }
-    for ranks in (1, 2):
-        calls[f"mpirun -n {ranks} talcmp-mpi --threads 1"] = functools.partial(
-            seconds_of_ranks, setting, ranks, folder, setting.talcmp_mpi(*one_thread))
+    for name, ranks, words in (("one rank", 1, ()), ("two ranks", 2, ()),
+                               ("two ranks, TCP", 2, OVER_TCP)):
+        calls[name] = functools.partial(seconds_of_ranks, setting, ranks, folder, words,
+                                        setting.talcmp_mpi(*one_thread))
     return calls
 
 
@@ -224,9 +228,8 @@ def start_rows(setting, folder):
 
 def counter_rows(setting):
     """Seconds of a fetch-and-add, as mpi_counter prints them."""
-    over_tcp = ("--mca", "pml", "ob1", "--mca", "btl", "self,tcp", "--mca", "osc", "pt2pt")
     quick = ["--quick"] if setting.quick else []
-    for how, words in (("shared memory", ()), ("TCP", over_tcp)):
+    for how, words in (("shared memory", ()), ("TCP", OVER_TCP)):
         command = [*mpirun(2, *words), str(setting.benchmarks / "mpi_counter"), *quick]
         output = subprocess.run(command, check=True, env=ENVIRONMENT, stdout=subprocess.PIPE).stdout
         for row in json.loads(output):
