@@ -288,7 +288,7 @@ class MeasuredCosts:
         self.fetch = self.counter("shared memory", 0)
         self.idle_fetch = self.counter("TCP", 0)
         self.busy_fetch = self.counter("TCP", 250)
-        self.looks = max(round(self.busy_fetch / 250e-6 + 0.5), 1)
+        self.looks = max(round(self.busy_fetch / 250e-6), 1)
         self.merge = results["merge_bytes"]
 
     def start(self, name):

@@ -17,8 +17,7 @@ import sys
 import tempfile
 import time
 import zipfile
-from collections import defaultdict
-from dataclasses import dataclass
+from dataclasses import asdict, dataclass
 from pathlib import Path
 
 import numpy as np
@@ -45,12 +44,12 @@ class Setting:
 
     @property
     def repetitions(self):
-        return 1 if self.quick else 9
+        return 1 if self.quick else 7
 
     @property
     def elements(self):
         """Of the largest arrays: 4096 boxes."""
-        return 1 << (17 if self.quick else 27)
+        return 1 << (19 if self.quick else 27)
 
     @property
     def many(self):
@@ -176,7 +175,9 @@ def calls_of(setting, folder, case):
     arguments = [*case.options, str(folder / case.first), str(folder / case.second)]
     one_thread = ["--threads", "1", *arguments]
     calls = {
-        "talcmp --threads 1": functools.partial(seconds_of, setting.talcmp(*one_thread)),
+        # On one processor, as a rank is; some files are otherwise read ahead on another one.
+        "talcmp --threads 1": functools.partial(
+            seconds_of, ["taskset", "--cpu-list", "0", *setting.talcmp(*one_thread)]),
         "talcmp": functools.partial(seconds_of, setting.talcmp(*arguments)),
     }
     for name, ranks, words in (("one rank", 1, ()), ("two ranks", 2, ()),
@@ -226,51 +227,75 @@ def start_rows(setting, folder):
         yield {"name": name, **shortest_and_median(seconds)}
 
 
-def counter_rows(setting):
-    """Seconds of a fetch-and-add, as mpi_counter prints them."""
+def counter_nanoseconds(setting, words):
+    """Of a fetch-and-add, by how many microseconds rank 0 is busy between two looks."""
     quick = ["--quick"] if setting.quick else []
-    for how, words in (("shared memory", ()), ("TCP", OVER_TCP)):
-        command = [*mpirun(2, *words), str(setting.benchmarks / "mpi_counter"), *quick]
-        output = subprocess.run(command, check=True, env=ENVIRONMENT, stdout=subprocess.PIPE).stdout
-        for row in json.loads(output):
-            yield {"how": how, **row}
+    command = [*mpirun(2, *words), str(setting.benchmarks / "mpi_counter"), *quick]
+    output = subprocess.run(command, check=True, env=ENVIRONMENT, stdout=subprocess.PIPE).stdout
+    return {row["work"]: row["nanoseconds"] for row in json.loads(output)}
+
+
+def counter_rows(setting):
+    calls = {how: functools.partial(counter_nanoseconds, setting, words)
+             for how, words in (("shared memory", ()), ("TCP", OVER_TCP))}
+    for how, returned in in_turns(calls, setting.repetitions).items():
+        for work in returned[0]:
+            yield {"how": how, "work": work, "nanoseconds": min(one[work] for one in returned)}
 
 
 # ---- Messages
 
-# What Open MPI's monitoring writes: of one rank to another, messages and bytes, and the number of messages
-# of 0 bytes, of 1, of 2 to 3, of 4 to 7 and so on. Its own messages are those of collective calls and
-# of making windows.
-MESSAGES = re.compile(r"^(?P<kind>[EIS])\t\d+\t\d+\t(?P<bytes>\d+) bytes\t(?P<count>\d+) msgs sent"
-                      r"(\t(?P<sizes>[\d,]+))?", re.MULTILINE)
-KINDS = {"E": "point to point", "I": "collective", "S": "one-sided"}
-LARGE = 128  # bytes
+# What Open MPI's monitoring writes: of one rank to another, messages of the program itself, messages
+# that Open MPI sends for collective calls and to make windows, one-sided operations; then, for each
+# communicator, calls in which one rank sends to all or all send to one.
+CHANNEL = re.compile(r"^(?P<kind>[EIS])\t\d+\t\d+\t(?P<bytes>\d+) bytes\t(?P<count>\d+) msgs sent",
+                     re.MULTILINE)
+CALLS = re.compile(r"^D\tMPI_COMM_WORLD\t.*\n"
+                   r"O2A\t\d+\t(\d+) bytes\t(\d+) msgs sent\n"
+                   r"A2O\t\d+\t(\d+) bytes\t(\d+) msgs sent", re.MULTILINE)
+KINDS = {"E": "point to point", "I": "Open MPI's own", "S": "one-sided operations"}
+CALLS_TO_ALL = "broadcasts and reductions"
+
+
+@dataclass
+class Sent:
+    messages: int = 0
+    bytes: int = 0
+    most: int = 0  # bytes from one rank to another, so that no message is larger
+
+    def add(self, messages, size):
+        self.messages += messages
+        self.bytes += size
+        self.most = max(self.most, size)
 
 
 def messages_of(setting, folder, arguments):
-    """By kind; the last one counts those that are large."""
+    """What all ranks send, by kind."""
     profile = Path(tempfile.mkdtemp(dir=folder)) / "rank"
     run([*mpirun(setting.many, "--mca", "pml_monitoring_enable", "2",
                  "--mca", "pml_monitoring_enable_output", "3",
                  "--mca", "pml_monitoring_filename", str(profile)), *setting.talcmp_mpi(*arguments)])
-    sums = defaultdict(lambda: {"messages": 0, "bytes": 0, "large": 0})
     files = list(profile.parent.glob("rank.*.prof"))
     assert len(files) == setting.many, f"{len(files)} files of messages"
-    for file in files:
-        for found in MESSAGES.finditer(file.read_text(encoding="utf-8")):
-            kind = sums[KINDS[found["kind"]]]
-            kind["messages"] += int(found["count"])
-            kind["bytes"] += int(found["bytes"])
-            sizes = [int(size) for size in (found["sizes"] or "").split(",") if size]
-            kind["large"] += sum(sizes[LARGE.bit_length():])
-    return {kind: dict(sums[kind]) for kind in KINDS.values()}
+    sums = {kind: Sent() for kind in (*KINDS.values(), CALLS_TO_ALL)}
+    others = setting.many - 1
+    for text in (file.read_text(encoding="utf-8") for file in files):
+        for found in CHANNEL.finditer(text):
+            sums[KINDS[found["kind"]]].add(int(found["count"]), int(found["bytes"]))
+        to_all, calls_to_all, to_one, calls_to_one = map(int, CALLS.search(text).groups())
+        sums[CALLS_TO_ALL].add(others * (calls_to_all + calls_to_one), to_all + to_one)
+    sums[CALLS_TO_ALL].most = 0
+    # These are the messages of the calls too.
+    sums[KINDS["I"]].messages -= sums[CALLS_TO_ALL].messages
+    sums[KINDS["I"]].bytes -= sums[CALLS_TO_ALL].bytes
+    return {kind: asdict(sent) for kind, sent in sums.items()}
 
 
 def message_rows(setting, folder):
     pair = [str(folder / name) for name in ("one.npy", "near.npy")]
     tiny = [str(folder / name) for name in ("tiny_one.npy", "tiny_same.npy")]
     boxes = 8 * setting.elements // BOX
-    runs = {"start": (0, tiny), "no report": (boxes, ["--tol", "20", *pair]),
+    runs = {"tiny": (0, tiny), "no report": (boxes, ["--tol", "20", *pair]),
             "report": (boxes, ["--tol", "20", "--report", *pair])}
     for name, (boxes_of_run, arguments) in runs.items():
         yield {"run": name, "ranks": setting.many, "boxes": boxes_of_run,
@@ -278,10 +303,8 @@ def message_rows(setting, folder):
 
 
 def merge_bytes(rows):
-    """What a rank sends for a report, more than without one."""
-    sent = {row["run"]: sum(row["kinds"][kind]["bytes"] for kind in ("point to point", "collective"))
-            for row in rows}
-    return (sent["report"] - sent["start"]) / (rows[0]["ranks"] - 1)
+    """What a rank sends at its end, with a report."""
+    return next(row["kinds"][KINDS["E"]]["most"] for row in rows if row["run"] == "report")
 
 
 # ---- Memory
@@ -345,13 +368,11 @@ def memory_rows(setting, folder):
 
 
 def bytes_read(setting, folder, ranks, names):
-    """By all ranks, which find that the files differ; counted by the system."""
+    """By all ranks, counted by the system."""
     counts = Path(tempfile.mkdtemp(dir=folder))
-    script = ('"$@"; s=$?; cat /proc/$$/io >"$0/$OMPI_COMM_WORLD_RANK"; '
-              'test $s = "$EXPECTED" || exit 3')
+    script = '"$@"; s=$?; cat /proc/$$/io >"$0/$OMPI_COMM_WORLD_RANK"; test $s -le 1'
     arguments = [str(folder / name) for name in names]
-    expected = "1" if names[0].startswith("sparse") else "0"
-    run([*mpirun(ranks, "-x", f"EXPECTED={expected}"), "sh", "-c", script, str(counts),
+    run([*mpirun(ranks), "sh", "-c", script, str(counts),
          *setting.talcmp_mpi("--threads", "1", *arguments)])
     files = list(counts.iterdir())
     assert len(files) == ranks, f"{len(files)} counts of what was read"
