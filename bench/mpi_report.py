@@ -147,13 +147,17 @@ def files_of(simulation):
     return list(dict.fromkeys(row["files"] for row in simulation["rows"]))
 
 
+def seconds_text(seconds):
+    return f"{seconds:.0f}" if seconds >= 100 else f"{seconds:.3g}"
+
+
 def computed_table(simulation):
     rows = []
     for files in files_of(simulation):
         runs = runs_of(simulation, files)
         first = runs["32 ranks a node"]
         for i, row in enumerate(first):
-            rows.append((files, row["ranks"], *(f"{run[i]['seconds']:.3g}" for run in runs.values()),
+            rows.append((files, row["ranks"], *(seconds_text(run[i]["seconds"]) for run in runs.values()),
                          f"{row['start']:.1f}", f"{100 * row['efficiency']:.0f} %", row["limit"]))
     return table(("files", "ranks", *(f"{name}, s" for name in RUNS.values()), "start, s",
                   "efficiency", "what limits"), rows)

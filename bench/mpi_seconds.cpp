@@ -1,6 +1,6 @@
 // Preloaded into a rank: writes how long it took from the end of MPI_Init to the beginning of
-// MPI_Finalize, what starting all ranks takes apart from what they do, into the file that MPI_SECONDS
-// names, if it is rank 0.
+// MPI_Finalize, what starting all ranks takes apart from what they do, into the file that
+// MPI_SECONDS names, if it is rank 0.
 
 #include <mpi.h>
 
@@ -24,7 +24,7 @@ void write_seconds(const double seconds) {
     }
 }
 
-}  // namespace
+} // namespace
 
 int MPI_Init(int* const count, char*** const arguments) {
     const int result = PMPI_Init(count, arguments);
@@ -32,7 +32,8 @@ int MPI_Init(int* const count, char*** const arguments) {
     return result;
 }
 
-int MPI_Init_thread(int* const count, char*** const arguments, const int required, int* const provided) {
+int MPI_Init_thread(int* const count, char*** const arguments, const int required,
+                    int* const provided) {
     const int result = PMPI_Init_thread(count, arguments, required, provided);
     begin = PMPI_Wtime();
     return result;

@@ -217,14 +217,15 @@ def case_rows(setting, folder):
 def start_rows(setting, folder):
     tiny = [str(folder / "tiny_one.npy"), str(folder / "tiny_same.npy")]
     ranks = setting.talcmp_mpi(*tiny)
-    commands = {
-        "talcmp": setting.talcmp(*tiny),
-        "talcmp-mpi": ranks,
-        **{f"mpirun -n {n} talcmp-mpi": [*mpirun(n), *ranks] for n in (1, 2, setting.many)},
+    calls = {
+        "talcmp": functools.partial(seconds_of, setting.talcmp(*tiny)),
+        "talcmp-mpi": functools.partial(seconds_of, ranks),
     }
-    calls = {name: functools.partial(seconds_of, command) for name, command in commands.items()}
-    for name, seconds in in_turns(calls, setting.repetitions).items():
-        yield {"name": name, **shortest_and_median(seconds)}
+    for count, words in ((1, ()), (2, ()), (2, OVER_TCP), (setting.many, ())):
+        calls[f"mpirun -n {count} talcmp-mpi" + (", TCP" if words else "")] = functools.partial(
+            seconds_of_ranks, setting, count, folder, words, ranks)
+    for name, returned in in_turns(calls, setting.repetitions).items():
+        yield command_row(name, returned)
 
 
 def counter_nanoseconds(setting, words):
