@@ -130,9 +130,9 @@ def validation_table(simulation):
 
 RUNS = {
     ("32 ranks a node", "RDMA"): "32 ranks a node",
-    ("32 ranks a node", "TCP"): "the same over TCP",
+    ("32 ranks a node", "TCP"): "over TCP",
     ("a rank a node", "RDMA"): "a rank a node",
-    ("ten times the bandwidth", "RDMA"): "32 a node, ten times the bandwidth",
+    ("ten times the bandwidth", "RDMA"): "ten times the bandwidth",
 }
 
 
@@ -170,10 +170,12 @@ def differences_table(simulation):
     return table(("files", "network", "ranks", "boxes read", "time, ms"), rows)
 
 
-def limits_of(rows):
-    """Lines of what takes how long by itself, for the picture."""
-    return {name: [(row["ranks"], row["limits"][name]) for row in rows]
-            for name in ("processors", "bandwidth of the nodes", "file system", "start")}
+LIMITS = {
+    "processors": "limit of the processors",
+    "bandwidth of the nodes": "of the nodes&#8217; bandwidth",
+    "file system": "of the file system",
+    "start": "starting the ranks",
+}
 
 
 def picture(simulation):
@@ -181,9 +183,11 @@ def picture(simulation):
     for files in files_of(simulation):
         runs = runs_of(simulation, files)
         lines = [[(row["ranks"], row["seconds"]) for row in rows] for rows in runs.values()]
-        all_charts.append((f"1 TB each, {files}", lines, limits_of(runs["32 ranks a node"])))
+        limits = [[(row["ranks"], row["limits"][name]) for row in runs["32 ranks a node"]]
+                  for name in LIMITS]
+        all_charts.append((f"1 TB each, {files}", lines, limits))
     return charts("Time of a comparison, computed", RUNS.values(), all_charts, "ranks", "time, s",
-                  x_base=10)
+                  LIMITS.values(), x_base=10)
 
 
 # ---- The document

@@ -40,10 +40,9 @@ class Network:
     service_seconds: float  # in which the counter answers nobody else
     message_seconds: float
     bandwidth: float  # bytes a second
-    # The number of times that rank 0 has to look for messages until a fetch is complete; 0 if the
-    # network answers by itself.
+    # The number of times that rank 0 has to look for messages, which it does between two boxes,
+    # until a fetch is complete; 0 if the network answers by itself.
     looks: int = 0
-    looks_between_boxes: bool = True  # otherwise between two batches
 
 
 @dataclass(frozen=True)
@@ -94,23 +93,18 @@ class Simulation:
         self.taken = 0  # the counter
         self.counter, self.file_system = Shared(), Shared()
         self.nodes = [Shared() for _ in range(-(-ranks // storage.ranks_of_node))]
-        # Rank 0 while it compares: since when, how long a box takes it, until when, and what
-        # answering others has taken.
-        self.began, self.box_of_first, self.ends, self.stolen = 0.0, 0.0, 0.0, 0.0
+        # Rank 0 takes single boxes, as others may wait for it. Where they do not, batches take it no
+        # longer, and the simulation less.
+        self.batch_of_first = 1 if network.looks else self.batch
+        self.next_look = 0.0  # when rank 0 has compared its box
         self.compared = self.fetches = 0
         self.events = []  # times, ranks, and what they do then
         self.done = [0.0] * ranks
 
     # ---- The counter
 
-    def next_look(self, time):
-        """When rank 0 looks for messages next."""
-        if time >= self.ends or self.box_of_first == 0:
-            return time
-        if not self.network.looks_between_boxes:
-            return self.ends
-        passed = math.ceil(max(time - self.began, 0) / self.box_of_first)
-        return min(self.began + passed * self.box_of_first, self.ends)
+    def batch_of(self, rank):
+        return self.batch if rank else self.batch_of_first
 
     def ask(self, rank, time, what):
         """What a rank asks the counter: for a batch, or that nobody gets another one."""
@@ -129,21 +123,19 @@ class Simulation:
     def look(self, rank, time, what, looks):
         """Rank 0 looks for messages; so many looks are needed."""
         network = self.network
-        time = self.next_look(time)
+        time = max(time, self.next_look)
         if looks > 1:
             self.later(time + network.message_seconds, rank, what, looks - 1)
-            return
-        if time < self.ends:
-            self.stolen += network.service_seconds
-        self.answer(rank, self.counter.serve(time, network.service_seconds)
-                    + network.fetch_seconds / 2, what)
+        else:
+            self.answer(rank, self.counter.serve(time, network.service_seconds)
+                        + network.fetch_seconds / 2, what)
 
     def answer(self, rank, time, what):
         if what == "stop":
             self.taken += self.job.boxes
             self.later(time, rank, "ask")
             return
-        first, self.taken = self.taken, self.taken + self.batch
+        first, self.taken = self.taken, self.taken + self.batch_of(rank)
         if first < self.job.boxes:
             self.later(time, rank, "compare", first)
         else:
@@ -168,9 +160,7 @@ class Simulation:
         seconds = count * job.seconds_of_box * self.random.uniform(1 - job.spread, 1 + job.spread)
         self.compared += count
         if rank == 0:
-            # It looks between the boxes, each of which is read and compared.
-            self.began, self.ends = time, read + seconds
-            self.box_of_first = (self.ends - time) / count
+            self.next_look = read + seconds
         self.later(read + seconds, rank, "stop" if differs else "ask")
 
     def later(self, time, rank, what, number=0):
@@ -184,13 +174,10 @@ class Simulation:
         while self.events:
             time, rank, what, number = heapq.heappop(self.events)
             if what == "compare":
-                self.compare(rank, time, number, min(self.batch, self.job.boxes - number))
+                self.compare(rank, time, number,
+                             min(self.batch_of(rank), self.job.boxes - number))
             elif number:
                 self.look(rank, time, what, number)
-            elif rank == 0 and self.stolen:
-                self.ends = time + self.stolen
-                self.stolen = 0.0
-                self.later(self.ends, rank, what)
             else:
                 self.ask(rank, time, what)
         return self.done
@@ -342,7 +329,7 @@ def scenarios_of(costs, quick):
     share = costs.case("HDF5, chunks, shuffle, gzip", "identical")["share"]
     chunks = Job(round(size / BOX), 2 * BOX * share, costs.chunks)
     tcp = Network("TCP", TCP_FETCH.value, TCP_SERVICE.value, TCP_FETCH.value,
-                  NETWORK_BANDWIDTH.value, costs.looks, looks_between_boxes=False)
+                  NETWORK_BANDWIDTH.value, costs.looks)
     for files, job in ((".npy, near", near), ("HDF5 chunks, gzip", chunks)):
         for network in (RDMA, tcp):
             yield Scenario(files, job, network, CLUSTER)
@@ -385,7 +372,7 @@ def validation_rows(costs):
     simulated comes what tiny files take."""
     shared = Network("shared memory", costs.fetch, costs.fetch, costs.fetch, NETWORK_BANDWIDTH.value)
     tcp = Network("TCP", costs.idle_fetch, TCP_SERVICE.value, costs.idle_fetch,
-                  NETWORK_BANDWIDTH.value, costs.looks, looks_between_boxes=False)
+                  NETWORK_BANDWIDTH.value, costs.looks)
     for files, workload, seconds in ((".npy", "near", costs.near),
                                      ("HDF5, chunks, shuffle, gzip", "identical", costs.chunks)):
         job = Job(round(costs.case(files, workload)["bytes"] / BOX), 2 * BOX, seconds)

@@ -5,6 +5,9 @@ import math
 # For four lines; colour-blind readers can tell them apart too.
 LINE_COLOURS = ("#0072b2", "#d55e00", "#7f7f7f", "#009e73")
 
+# For four limits: black lines of strokes and gaps.
+DASHES = ("8 3", "2 3", "8 3 2 3", "1 5")
+
 
 def svg(width, height, lines):
     head = (
@@ -65,13 +68,12 @@ class LogAxis:
             power += 1
 
 
-def polyline(points, x_axis, y_axis, look):
-    places = " ".join(f"{x_axis(x)},{y_axis(y)}" for x, y in points)
-    return f'<polyline points="{places}" fill="none" {look}/>'
+LINE_LOOKS = tuple(f'stroke="{colour}" stroke-width="2"' for colour in LINE_COLOURS)
+LIMIT_LOOKS = tuple(f'stroke="#000000" stroke-dasharray="{dashes}"' for dashes in DASHES)
 
 
 def chart(title, lines_of_chart, limits, axes, x_base):
-    """A list of lines, each one of points, and of limits, which have names."""
+    """Lists of lines and of limits, each one of points."""
     x_axis, y_axis = axes
     middle = (x_axis.begin + x_axis.end) / 2
     yield f'<text x="{middle}" y="{y_axis.end - 10}" font-size="13">{title}</text>'
@@ -83,39 +85,42 @@ def chart(title, lines_of_chart, limits, axes, x_base):
         y = y_axis(tick)
         yield f'<path d="M{x_axis.begin} {y}H{x_axis.end}" stroke="#e5e5e5"/>'
         yield f'<text x="{x_axis.begin - 6}" y="{y + 4}" text-anchor="end">{tick}</text>'
-    for points, line_colour in reversed(list(zip(lines_of_chart, LINE_COLOURS))):
-        yield polyline(points, x_axis, y_axis, f'stroke="{line_colour}" stroke-width="2"')
-    for name, points in limits.items():
-        yield polyline(points, x_axis, y_axis, 'stroke="#000000" stroke-dasharray="4 3"')
-        x, y = points[-1]
-        yield f'<text x="{x_axis(x)}" y="{y_axis(y) - 4}" text-anchor="end">{name}</text>'
+    looks = [*zip(limits, LIMIT_LOOKS), *reversed(list(zip(lines_of_chart, LINE_LOOKS)))]
+    for points, look in looks:
+        places = " ".join(f"{x_axis(x)},{y_axis(y)}" for x, y in points)
+        yield f'<polyline points="{places}" fill="none" {look}/>'
 
 
-def charts(title, names_of_lines, all_charts, x_text, y_text, x_base=4):
-    """`all_charts` is a list of titles, lists of lines and, if there are any, limits: lines by name,
-    drawn dashed. Two charts are side by side."""
-    chart_width, chart_height, left, top, gap = 340, 220, 62, 88, 64
-    points = [point for _, lines, *limits in all_charts
-              for line in [*lines, *(line for some in limits for line in some.values())]
+def legend(names, looks, left, right, y):
+    """Names in a row, each beside a piece of its line."""
+    step = min(250, (right - left) // max(len(names), 1))
+    for i, (name, look) in enumerate(zip(names, looks)):
+        x = left + i * step
+        yield f'<path d="M{x} {y}h24" {look}/>'
+        yield f'<text x="{x + 30}" y="{y + 4}" text-anchor="start">{name}</text>'
+
+
+def charts(title, names_of_lines, all_charts, x_text, y_text, names_of_limits=(), x_base=4):
+    """`all_charts` is a list of titles, lists of lines and lists of limits; two charts are side by
+    side."""
+    chart_width, chart_height, left, gap = 340, 220, 62, 64
+    top = 88 + 18 * bool(names_of_limits)
+    points = [point for _, lines, limits in all_charts for line in [*lines, *limits]
               for point in line]
     least_x, most_x = (pick(x for x, _ in points) for pick in (min, max))
     least_y, most_y = (pick(y for _, y in points) for pick in (min, max))
     rows = -(-len(all_charts) // 2)
     width, height = left + 2 * chart_width + gap + 12, top + rows * (chart_height + gap)
     lines = [f'<text x="{width // 2}" y="20" font-size="14">{title}</text>']
-    step = min(250, (width - left) // len(names_of_lines))
-    for i, (name, line_colour) in enumerate(zip(names_of_lines, LINE_COLOURS)):
-        x = left + i * step
-        lines.append(f'<path d="M{x} 42h24" stroke="{line_colour}" stroke-width="2"/>')
-        lines.append(f'<text x="{x + 30}" y="46" text-anchor="start">{name}</text>')
-    for i, (chart_title, lines_of_chart, *limits) in enumerate(all_charts):
+    lines.extend(legend(names_of_lines, LINE_LOOKS, left, width, 42))
+    lines.extend(legend(names_of_limits, LIMIT_LOOKS, left, width, 60))
+    for i, (chart_title, lines_of_chart, limits) in enumerate(all_charts):
         x = left + i % 2 * (chart_width + gap)
         y = top + i // 2 * (chart_height + gap)
         x_axis = LogAxis(least_x, most_x, x, x + chart_width)
         y_axis = LogAxis(10 ** math.floor(math.log10(least_y)), 10 ** math.ceil(math.log10(most_y)),
                          y + chart_height, y)
-        lines.extend(chart(chart_title, lines_of_chart, limits[0] if limits else {},
-                           (x_axis, y_axis), x_base))
+        lines.extend(chart(chart_title, lines_of_chart, limits, (x_axis, y_axis), x_base))
         lines.append(f'<text x="{x + chart_width // 2}" y="{y + chart_height + 31}">{x_text}</text>')
         lines.append(f'<text x="{x - 34}" y="{y - 10}">{y_text}</text>')
     return svg(width, height, lines)

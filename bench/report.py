@@ -518,7 +518,7 @@ def report_of_times(results, documents):
         (documents / f"performance_{size}.svg").write_text(picture, encoding="utf-8")
     all_charts = [
         (f"{type1} and {type2}, {workload}",
-         [short.line((type1, type2, workload), contender) for contender in CONTENDERS])
+         [short.line((type1, type2, workload), contender) for contender in CONTENDERS], [])
         for type1, type2, workload in CHARTS
     ]
     picture = charts("A call over short arrays", CONTENDERS.values(), all_charts, "elements",
