@@ -97,7 +97,7 @@ int main(int count, char** arguments) {
     const bool quick = count > 1 && std::string_view(arguments[1]) == "--quick";
     const int turns = quick ? 1 : 10;
     JsonRows rows;
-    for (const std::size_t work : {0, 25, 250}) {
+    for (const std::size_t work : {0U, 25U, 250U}) {
         const double seconds = measured(rank, work, turns);
         if (rank == 0) {
             rows.row().add("work", work).add("nanoseconds", seconds * 1e9);

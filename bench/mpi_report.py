@@ -1,6 +1,6 @@
 #!/usr/bin/python3
-"""Turns what was measured and computed of talcmp-mpi into the tables and the picture of docs/mpi.md:
-mpi_report.py RESULTS DOCUMENTS. Prints each bar with what was measured.
+"""Turns what was measured and computed of talcmp-mpi into the tables and the picture of
+docs/mpi.md: mpi_report.py RESULTS DOCUMENTS. Prints each bar with what was measured.
 """
 
 import sys
@@ -157,7 +157,8 @@ def computed_table(simulation):
         runs = runs_of(simulation, files)
         first = runs["32 ranks a node"]
         for i, row in enumerate(first):
-            rows.append((files, row["ranks"], *(seconds_text(run[i]["seconds"]) for run in runs.values()),
+            times = [seconds_text(run[i]["seconds"]) for run in runs.values()]
+            rows.append((files, row["ranks"], *times,
                          f"{row['start']:.1f}", f"{100 * row['efficiency']:.0f} %", row["limit"]))
     return table(("files", "ranks", *(f"{name}, s" for name in RUNS.values()), "start, s",
                   "efficiency", "what limits"), rows)

@@ -4,8 +4,9 @@
 
 #include <mpi.h>
 
-#include <cstdio>
 #include <cstdlib>
+#include <fstream>
+#include <iomanip>
 
 namespace {
 
@@ -14,13 +15,10 @@ double begin = 0;
 void write_seconds(const double seconds) {
     int rank = 0;
     PMPI_Comm_rank(MPI_COMM_WORLD, &rank);
+    // NOLINTNEXTLINE(concurrency-mt-unsafe): nobody changes the environment.
     const char* const path = std::getenv("MPI_SECONDS");
-    if (rank != 0 || path == nullptr) {
-        return;
-    }
-    if (std::FILE* const file = std::fopen(path, "w"); file != nullptr) {
-        std::fprintf(file, "%.6f\n", seconds);
-        std::fclose(file);
+    if (rank == 0 && path != nullptr) {
+        std::ofstream(path) << std::fixed << std::setprecision(6) << seconds << '\n';
     }
 }
 

@@ -2,9 +2,9 @@
 """Computes how long talcmp-mpi takes on many ranks, from costs that were measured on one machine:
 mpi_simulation.py RESULTS [--quick]. Reads talcmp_mpi.json in the folder RESULTS and prints JSON.
 
-Ranks take batches of boxes from a counter at rank 0, read them, compare them, and merge what they found
-in a binomial tree. What one machine cannot show, networks and file systems, are assumptions; each
-cost says where it comes from.
+Ranks take batches of boxes from a counter at rank 0, read them, compare them, and merge what they
+found in a binomial tree. What one machine cannot show, networks and file systems, is assumed; each cost
+says where it comes from.
 """
 
 import heapq
@@ -93,8 +93,8 @@ class Simulation:
         self.taken = 0  # the counter
         self.counter, self.file_system = Shared(), Shared()
         self.nodes = [Shared() for _ in range(-(-ranks // storage.ranks_of_node))]
-        # Rank 0 takes single boxes, as others may wait for it. Where they do not, batches take it no
-        # longer, and the simulation less.
+        # Rank 0 takes single boxes, as others may wait for it. Where they do not, batches take it
+        # no longer, and the simulation less.
         self.batch_of_first = 1 if network.looks else self.batch
         self.next_look = 0.0  # when rank 0 has compared its box
         self.compared = self.fetches = 0
@@ -164,7 +164,7 @@ class Simulation:
         self.later(read + seconds, rank, "stop" if differs else "ask")
 
     def later(self, time, rank, what, number=0):
-        """`number` is the first box of a batch to compare, otherwise how often rank 0 has to look."""
+        """`number` is the first box to compare, otherwise how often rank 0 has to look."""
         heapq.heappush(self.events, (time, rank, what, number))
 
     def all_batches(self, begin):
@@ -303,10 +303,10 @@ class MeasuredCosts:
             Cost("box of near doubles in memory, one core", self.near, "s", MEASURED),
             Cost("box of chunks with gzip and shuffle, one core", self.chunks, "s", MEASURED),
             Cost("fetch-and-add, shared memory", self.fetch, "s", MEASURED),
-            Cost("fetch-and-add over TCP on one machine, rank 0 looks all the time", self.idle_fetch,
-                 "s", MEASURED),
-            Cost("fetch-and-add over TCP on one machine, rank 0 looks every 250 µs", self.busy_fetch,
-                 "s", MEASURED),
+            Cost("fetch-and-add over TCP on one machine, rank 0 looks all the time",
+                 self.idle_fetch, "s", MEASURED),
+            Cost("fetch-and-add over TCP on one machine, rank 0 looks every 250 µs",
+                 self.busy_fetch, "s", MEASURED),
             Cost("what a rank sends at its end, with a report", self.merge, "bytes", MEASURED),
             Cost("mpirun -n 1", self.start_of_one, "s", MEASURED),
         )
@@ -370,7 +370,8 @@ def difference_rows(scenario, costs, all_ranks):
 def validation_rows(costs):
     """The time of ranks on this machine, without starting them, measured and simulated. To what is
     simulated comes what tiny files take."""
-    shared = Network("shared memory", costs.fetch, costs.fetch, costs.fetch, NETWORK_BANDWIDTH.value)
+    shared = Network("shared memory", costs.fetch, costs.fetch, costs.fetch,
+                     NETWORK_BANDWIDTH.value)
     tcp = Network("TCP", costs.idle_fetch, TCP_SERVICE.value, costs.idle_fetch,
                   NETWORK_BANDWIDTH.value, costs.looks)
     for files, workload, seconds in ((".npy", "near", costs.near),

@@ -1,9 +1,9 @@
 #!/usr/bin/python3
 """Measures talcmp-mpi on this machine, next to talcmp: talcmp_mpi.py PROGRAMS BENCHMARKS [--quick].
 
-PROGRAMS is the folder of talcmp and talcmp-mpi, BENCHMARKS that of mpi_counter and of the library that
-is preloaded to take the time. Prints, as JSON, seconds on files in the cache of the system, messages,
-memory, how long a run takes to start, and how much is read after a difference was found.
+PROGRAMS is the folder of talcmp and talcmp-mpi, BENCHMARKS that of mpi_counter and of the library
+that is preloaded to take the time. Prints, as JSON, seconds on files in the cache of the system,
+messages, memory, how long a run takes to start, and how much is read after a difference was found.
 """
 
 import functools
@@ -246,9 +246,9 @@ def counter_rows(setting):
 
 # ---- Messages
 
-# What Open MPI's monitoring writes: of one rank to another, messages of the program itself, messages
-# that Open MPI sends for collective calls and to make windows, one-sided operations; then, for each
-# communicator, calls in which one rank sends to all or all send to one.
+# What Open MPI's monitoring writes: of one rank to another, messages of the program itself,
+# messages that Open MPI sends for collective calls and to make windows, one-sided operations; then,
+# for each communicator, calls in which one rank sends to all or all send to one.
 CHANNEL = re.compile(r"^(?P<kind>[EIS])\t\d+\t\d+\t(?P<bytes>\d+) bytes\t(?P<count>\d+) msgs sent",
                      re.MULTILINE)
 CALLS = re.compile(r"^D\tMPI_COMM_WORLD\t.*\n"
@@ -273,9 +273,9 @@ class Sent:
 def messages_of(setting, folder, arguments):
     """What all ranks send, by kind."""
     profile = Path(tempfile.mkdtemp(dir=folder)) / "rank"
-    run([*mpirun(setting.many, "--mca", "pml_monitoring_enable", "2",
-                 "--mca", "pml_monitoring_enable_output", "3",
-                 "--mca", "pml_monitoring_filename", str(profile)), *setting.talcmp_mpi(*arguments)])
+    monitoring = ("--mca", "pml_monitoring_enable", "2", "--mca", "pml_monitoring_enable_output",
+                  "3", "--mca", "pml_monitoring_filename", str(profile))
+    run([*mpirun(setting.many, *monitoring), *setting.talcmp_mpi(*arguments)])
     files = list(profile.parent.glob("rank.*.prof"))
     assert len(files) == setting.many, f"{len(files)} files of messages"
     sums = {kind: Sent() for kind in (*KINDS.values(), CALLS_TO_ALL)}

@@ -1,5 +1,5 @@
 #!/usr/bin/python3
-"""Checks the simulation of bench/ where the result can be calculated: mpi_simulation_test.py BENCH."""
+"""Checks mpi_simulation.py where its result can be calculated: mpi_simulation_test.py BENCH."""
 
 import math
 import sys
