@@ -59,6 +59,14 @@ def bars_of(results):
 # ---- Tables
 
 
+def run_table(results):
+    before, after = results["load"]
+    return table(("", "of this run"), [
+        ("cores", results["processors"]),
+        ("load before and after times were taken", f"{before:.1f} and {after:.1f} processes"),
+    ])
+
+
 def cases_table(results):
     rows = []
     for case in results["cases"]:
@@ -206,6 +214,7 @@ def main():
     (documents / "mpi.svg").write_text(picture(simulation), encoding="utf-8")
     measured = list(bars_of(results))
     renew_blocks(documents / "mpi.md", {
+        "run": run_table(results),
         "bars": bars_table(measured),
         "two ranks": cases_table(results),
         "messages": messages_table(results),

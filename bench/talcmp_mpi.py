@@ -416,12 +416,19 @@ def main():
         in_another_process(save_small, folder, small_count(setting))
         in_another_process(save_tiny, folder)
         in_another_process(save_sparse, folder, 1 << 33)
-        messages = list(message_rows(setting, folder))
-        print(json.dumps({
+        load_before = os.getloadavg()[0]
+        results = {
             "left_out": None,
+            "processors": os.cpu_count(),
             "cases": list(case_rows(setting, folder)),
             "start": list(start_rows(setting, folder)),
             "counter": list(counter_rows(setting)),
+        }
+        # That of these commands themselves is about 1.
+        results["load"] = [load_before, os.getloadavg()[0]]
+        messages = list(message_rows(setting, folder))
+        print(json.dumps({
+            **results,
             "messages": messages,
             "merge_bytes": merge_bytes(messages),
             "memory": list(memory_rows(setting, folder)),
