@@ -106,5 +106,5 @@ if(TARGET talcmp_mpi)
   install(TARGETS talcmp_mpi RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT Mpi)
   talnumericarray_install_manual(Mpi ${PROJECT_SOURCE_DIR}/tools/talcmp_mpi/talcmp-mpi.1)
   talnumericarray_install(Mpi ${CMAKE_INSTALL_DATADIR}/doc/talcmp-mpi
-                          ${PROJECT_SOURCE_DIR}/docs/mpi.md)
+                          ${PROJECT_SOURCE_DIR}/docs/mpi.md ${PROJECT_SOURCE_DIR}/docs/mpi.svg)
 endif()
