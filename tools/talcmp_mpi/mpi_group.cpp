@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <exception>
+#include <new>
 #include <utility>
 
 namespace talcmp {
@@ -30,6 +31,16 @@ std::string packed(const Word word, const ProcessGroup::Sights& sights = {}) {
 std::string beginning(const std::string& text) {
     constexpr std::size_t most = 100;
     return text.size() > most ? text.substr(0, most) + "..." : text;
+}
+
+// Without enough memory, an outcome would be lost that the first rank waits for.
+template <typename Action>
+void or_end_run(const Action& action) {
+    try {
+        action();
+    } catch (const std::bad_alloc&) {
+        end_run("there is not enough memory (" + process_name() + ")");
+    }
 }
 
 // Why this rank cannot go on: it sees another file than the first rank does.
@@ -140,23 +151,25 @@ void MpiGroup::by_one(const std::function<Outcomes()>& compare) {
     }
     const std::uint64_t number = number_++;
     if (number == *taken_) {
-        Outcomes outcomes = compare();
+        or_end_run([&] { hand_in(number, compare()); });
         taken_.reset();
-        if (leads()) {
-            next_.push_back({number, std::move(outcomes)});
-        } else {
-            for (Outcome& outcome : outcomes) {
-                outcome.process = process_name();
-            }
-            Packer packer;
-            packer.pass(number);
-            outcomes_sent_.send(0, Tag::outcomes,
-                                packer.take() + talcmp::packed(outcomes, question_));
-        }
     } else if (leads()) {
         next_.push_back({number});
     }
     print_next();
+}
+
+void MpiGroup::hand_in(const std::uint64_t number, Outcomes outcomes) {
+    if (leads()) {
+        next_.push_back({number, std::move(outcomes)});
+        return;
+    }
+    for (Outcome& outcome : outcomes) {
+        outcome.process = process_name();
+    }
+    Packer packer;
+    packer.pass(number);
+    outcomes_sent_.send(0, Tag::outcomes, packer.take() + talcmp::packed(outcomes, question_));
 }
 
 // ---- What the first rank prints
@@ -185,12 +198,21 @@ void MpiGroup::take_in(const Message& message) {
 }
 
 void MpiGroup::print_next() {
-    if (!leads()) {
-        return;
+    if (leads()) {
+        or_end_run([this] {
+            take_in_all();
+            print_all();
+        });
     }
+}
+
+void MpiGroup::take_in_all() {
     while (const auto message = receive_if_there(Tag::outcomes)) {
         take_in(*message);
     }
+}
+
+void MpiGroup::print_all() {
     while (!next_.empty()) {
         if (const Next& next = next_.front(); next.outcomes) {
             print(*next.outcomes);
@@ -225,7 +247,7 @@ void MpiGroup::finish() {
     }
     broadcast(packed(Word::end));
     while (finished_ < rank_count() - 1) {
-        take_in(receive(Tag::outcomes));
+        or_end_run([this] { take_in(receive(Tag::outcomes)); });
         print_next();
     }
     print_next();

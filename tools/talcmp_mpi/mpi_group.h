@@ -47,8 +47,11 @@ class MpiGroup : public ProcessGroup {
     static void open_first(const std::function<void()>& open, const std::function<Sights()>& seen);
     std::string open_like_first(const std::function<void()>& open,
                                 const std::function<Sights()>& seen);
+    void hand_in(std::uint64_t number, Outcomes outcomes);
     void take_in(const Message& message);
     void print_next();
+    void take_in_all();
+    void print_all();
     void print(const Outcomes& outcomes);
 
     Reporter reporter_;
