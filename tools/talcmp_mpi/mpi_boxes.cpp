@@ -22,7 +22,6 @@ void MpiBoxes::begin(const BoxPlan& plan, ProgressListener& progress) {
     batch_ = leads() ? 1
                      : std::clamp(box_count_ / (batches_of_rank * ranks), std::uint64_t{1},
                                   largest_batch);
-    is_merged_ = false;
     progress_ = &progress;
     bytes_of_box_ = plan.traversal().largest_box() * plan.bytes_of_pair();
     handed_out_ = 0;
@@ -54,12 +53,11 @@ void MpiBoxes::merge(const BoxPlan& plan, BoxResults& results) {
             add_packed(receive(Tag::findings, here + distance).bytes, plan, results);
         }
     }
-    is_merged_ = true;
+    others_wait_ = false;
 }
 
-// Other ranks would wait for what this one has found.
 void MpiBoxes::abandon() {
-    if (!is_merged_) {
+    if (others_wait_) {
         end_run("there is not enough memory (" + process_name() + ")");
     }
 }

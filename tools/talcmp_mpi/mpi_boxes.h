@@ -21,6 +21,9 @@ class MpiBoxes : public BoxSupply {
     MpiBoxes(SharedCounters& counters, const std::size_t first_counter, std::function<void()> chore)
         : counters_(counters), first_counter_(first_counter), chore_(std::move(chore)) {}
 
+    // All ranks begin a comparison now, unless all find that there is nothing to compare.
+    void expect() { others_wait_ = true; }
+
     bool is_shared() const override { return true; }
     bool leads() const override { return rank() == 0; }
     void begin(const BoxPlan& plan, ProgressListener& progress) override;
@@ -38,7 +41,7 @@ class MpiBoxes : public BoxSupply {
     std::uint64_t comparison_ = 0;
     std::uint64_t box_count_ = 0;
     std::uint64_t batch_ = 1;
-    bool is_merged_ = true;
+    bool others_wait_ = false; // for what this rank finds
     // What other ranks compare, for the progress of all.
     ProgressListener* progress_ = nullptr;
     std::uint64_t bytes_of_box_ = 0;

@@ -93,6 +93,7 @@ void MpiGroup::agree(const std::function<void()>& open, const std::function<Sigh
     }
     const int in_trouble = least_of_all(trouble.empty() ? rank_count() : rank());
     if (in_trouble == rank_count()) {
+        boxes_.expect();
         return;
     }
     if (in_trouble == rank()) {
@@ -130,6 +131,8 @@ std::string MpiGroup::open_like_first(const std::function<void()>& open,
     try {
         open();
         return complaint(seen(), first_rank);
+    } catch (const std::bad_alloc&) {
+        return "there is not enough memory (" + process_name() + ")";
     } catch (const std::exception& error) {
         return std::string(error.what()) + " (" + process_name() + ")";
     }
