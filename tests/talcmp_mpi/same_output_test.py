@@ -272,6 +272,9 @@ class PartsOfArrays(SameOutput):
         mask = self.save("mask.npy", ignored)
         for options in (LONG_LIST, ("--report", "--slice=::2,::3")):
             self.check(1, "--ignore", mask, *options, self.a, self.b)
+        everything = self.save("everything.npy", np.ones((50, 400, 300), "?"))
+        for options in ((), ("--report",)):
+            self.check(0, "-v", "--ignore", everything, *options, self.a, self.b)
         archive = self.save_archive("masks.npz", np.savez_compressed, x=ignored, y=~ignored)
         self.check(1, "--ignore", f"{archive}[y]", "--report", self.a, self.columns)
         for wrong in (self.path("missing.npy"), self.save("wrong.npy", np.zeros(3, "?")), self.a):
