@@ -180,6 +180,8 @@ void pass(Stream& stream, PackedResults& results, const BoxPlan& plan) {
     pass_list(stream, results.first);
     if (plan.question().report) {
         stream.pass(results.totals);
+    } else {
+        stream.pass(results.totals.ignored); // all that is counted
     }
     pass_optional(stream, results.failure, [&](PackedFailure& failure) {
         stream.pass(failure.box);
