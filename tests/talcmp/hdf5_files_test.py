@@ -6,7 +6,6 @@ Draws a new seed in every run and prints it; the environment variable TALNUMERIC
 """
 
 import os
-import pathlib
 import random
 import re
 import sys
@@ -20,6 +19,7 @@ except ImportError as error:
     print(f"NOT TESTED: {error}", file=sys.stderr)
     sys.exit(77)
 
+from support.damaged_hdf5 import write_file_on_which_the_library_fails
 from support.talcmp_command import Folder, read_bytes, run, run_tests, summary
 
 SEED = int(os.environ.get("TALNUMERICARRAY_SEED", random.randrange(2**32)))
@@ -336,15 +336,7 @@ class Trouble(Hdf5Folder):
 
     def test_of_a_file_on_which_the_library_fails(self):
         path = self.path("a.h5")
-        layout = h5py.VirtualLayout(shape=(2, 4), dtype="f8")
-        layout[0] = h5py.VirtualSource(".", "x", shape=(4,))
-        with h5py.File(path, "w", libver="latest") as file:
-            file["x"] = np.arange(4.0)
-            file.create_virtual_dataset("v", layout)
-        contents = bytearray(read_bytes(path))
-        # The size of an object, which is 8 bytes from its beginning, after the heap's 16.
-        contents[contents.index(b"GCOL") + 16 + 8 + 2] ^= 0xFF
-        pathlib.Path(path).write_bytes(contents)
+        write_file_on_which_the_library_fails(path)
         status, output, errors = run(f"{path}[/v]", f"{path}[/v]")
         if "AddressSanitizer" in errors:
             self.skipTest("NOT TESTED: AddressSanitizer ends the process before the crash")

@@ -12,12 +12,13 @@ import unittest
 
 import numpy as np
 
+from ranks import Folder, MarkedRun, read_bytes, run_alone, run_ranks, run_tests, talcmp_mpi
+
 try:
     import h5py
+    from support.damaged_hdf5 import write_file_on_which_the_library_fails
 except ImportError:
     h5py = None
-
-from ranks import Folder, MarkedRun, read_bytes, run_alone, run_ranks, run_tests, talcmp_mpi
 
 SEED = int(os.environ.get("TALNUMERICARRAY_SEED", random.randrange(2**32)))
 print(f"seed {SEED}", file=sys.stderr)
@@ -396,18 +397,11 @@ class Hdf5Files(SameOutput):
 
     def test_with_an_array_on_which_the_library_fails(self):
         path = self.path("a.h5")
-        layout = h5py.VirtualLayout(shape=(2, 4), dtype="f8")
-        layout[0] = h5py.VirtualSource(".", "x", shape=(4,))
-        with h5py.File(path, "w", libver="latest") as file:
-            file["x"] = np.arange(4.0)
-            file.create_virtual_dataset("v", layout)
-        contents = bytearray(read_bytes(path))
-        # The size of an object, which is 8 bytes from its beginning, after the heap's 16.
-        contents[contents.index(b"GCOL") + 16 + 8 + 2] ^= 0xFF
-        self.write("a.h5", contents)
+        write_file_on_which_the_library_fails(path)
         self.check(0, "-v", f"{path}[x]", f"{path}[x]")
         self.check(0, "-v", "--exclude=v", path, path)
-        self.check(2, path, path)
+        if b"AddressSanitizer" not in run_alone(path, path)[2]:  # which ends the process before
+            self.check(2, path, path)
 
     def test_with_files_that_are_missing(self):
         path = self.path("a.h5")
