@@ -164,7 +164,7 @@ TEST_P(Processes, CountTogetherWhatOneCounts) {
     EXPECT_EQ(result.report->totals.pairs, length);
     EXPECT_EQ(result.report->totals.differing, length / period + 1);
     ASSERT_EQ(result.places.size(), 3U);
-    for (std::uint64_t i = 0; i < 3; ++i) {
+    for (std::size_t i = 0; i < 3; ++i) {
         EXPECT_EQ(result.places[i].index, Shape{i * period});
     }
     EXPECT_EQ(exchange_.stops, 0);
@@ -177,7 +177,7 @@ TEST_P(Processes, TakeEachBoxOnce) {
     compare([&](std::size_t /*process*/) -> Read {
         return [&](const std::uint64_t first, const std::uint64_t count, std::int8_t* elements) {
             const std::lock_guard<std::mutex> lock(mutex);
-            ++read[first / box];
+            ++read[static_cast<std::size_t>(first / box)];
             std::fill_n(elements, count, std::int8_t{0});
         };
     });
