@@ -12,9 +12,9 @@
 
 namespace talcmp {
 
-// A rank takes the next boxes by adding to a number at the first rank, in batches, so that there
-// are some ten for each rank, and a few hundred at most wait on the way. What all have found goes
-// to the first rank along a tree.
+// A rank takes the next boxes by adding to a number at the first rank: in batches, of which there
+// are enough for all ranks to end at about the same time, and which are short enough for all to end
+// soon after a difference is found. What all have found goes to the first rank along a tree.
 class MpiBoxes : public BoxSupply {
   public:
     // `chore` is called before each batch. Two of the counters, from `first_counter` on, are used.

@@ -124,8 +124,9 @@ End end_of(const pid_t process, const std::atomic<bool>& has_started, const Desc
     const End end = end_of(process, has_started, kept);
     if (WIFSIGNALED(end.status) && !end.is_start_failed) {
         const int signal = WTERMSIG(end.status);
-        end_with(this_process() + " was killed (signal " + std::to_string(signal) + ", "
-                 + ::sigdescr_np(signal) + "); there is no answer");
+        const char* const name = ::sigdescr_np(signal); // those of real time have none
+        end_with(this_process() + " was killed (signal " + std::to_string(signal)
+                 + (name == nullptr ? "" : std::string(", ") + name) + "); there is no answer");
     }
     if (has_started) {
         ::_exit(WEXITSTATUS(end.status));
