@@ -407,12 +407,6 @@ void check_text(const std::string& line, const Expected& expected, const OpenedA
     pass(text, " (");
 }
 
-class NoProgress : public talcmp::ProgressListener {
-  public:
-    void begin(std::uint64_t /*total_bytes*/) override {}
-    void advance(std::uint64_t /*bytes*/) override {}
-};
-
 talcmp::NamedArray named(const MemoryFile& file) {
     return {file.path(), talcmp::open_array_file(file.path())->open("")};
 }
@@ -425,7 +419,7 @@ struct Operand {
 void check_question(const Operand& first, const Operand& second, const talcmp::Question& question) {
     const Expected expected = expected_answer(first.array, second.array, question);
     talcmp::AllBoxes boxes;
-    NoProgress progress;
+    talcmp::NoProgress progress;
     const auto comparison =
         talcmp::compare(named(first.file), named(second.file), {}, question, boxes, progress);
     require(comparison.difference == expected.difference, "the arrays differ as is expected");

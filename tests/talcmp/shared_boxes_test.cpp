@@ -126,7 +126,7 @@ class Processes : public testing::TestWithParam<std::size_t> {
   private:
     talcmp::Comparison one(const ReadOf& read, const Access access, const std::size_t process) {
         SharedBoxes boxes(exchange_, process, GetParam());
-        NoListener listener;
+        talcmp::NoProgress listener;
         return talcmp::compare(
             {"a", std::make_unique<Bytes>(Shape{length}, read(process), Order::c, access)},
             {"b", std::make_unique<Bytes>(Shape{length}, zeros)}, {}, question_, boxes, listener);

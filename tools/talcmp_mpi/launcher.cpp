@@ -1,5 +1,7 @@
 #include "launcher.h"
 
+#include "environment.h"
+
 #include <algorithm>
 #include <array>
 #include <cstdlib>
@@ -61,8 +63,7 @@ bool is_device(const std::string& path) {
 } // namespace
 
 Descriptor shown_by_launcher(const int descriptor) {
-    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing changes the environment.
-    if (std::getenv("OMPI_COMM_WORLD_RANK") == nullptr && std::getenv("PMIX_RANK") == nullptr) {
+    if (environment("OMPI_COMM_WORLD_RANK").empty() && environment("PMIX_RANK").empty()) {
         return Descriptor(::dup(descriptor));
     }
     const std::string path =

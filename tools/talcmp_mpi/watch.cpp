@@ -1,5 +1,6 @@
 #include "watch.h"
 
+#include "environment.h"
 #include "shown.h"
 
 #include <algorithm>
@@ -25,13 +26,6 @@ namespace talcmp {
 namespace {
 
 constexpr int trouble = 2;
-
-// Empty if the variable is not set.
-std::string environment(const char* const variable) {
-    // NOLINTNEXTLINE(concurrency-mt-unsafe): there is one thread.
-    const char* const value = std::getenv(variable);
-    return value == nullptr ? "" : value;
-}
 
 // The number of this rank as whatever starts ranks tells it; empty if nothing does.
 std::string rank_from_environment() {

@@ -10,12 +10,6 @@
 
 using Source = std::unique_ptr<talcmp::ArraySource>;
 
-class NoListener : public talcmp::ProgressListener {
-  public:
-    void begin(std::uint64_t /*total_bytes*/) override {}
-    void advance(std::uint64_t /*bytes*/) override {}
-};
-
 inline talcmp::Comparison compare_arrays(Source first, Source second,
                                          const talcmp::Question& question,
                                          talcmp::ProgressListener& listener) {
@@ -26,7 +20,7 @@ inline talcmp::Comparison compare_arrays(Source first, Source second,
 
 inline talcmp::Comparison compare_arrays(Source first, Source second,
                                          const talcmp::Question& question) {
-    NoListener listener;
+    talcmp::NoProgress listener;
     return compare_arrays(std::move(first), std::move(second), question, listener);
 }
 

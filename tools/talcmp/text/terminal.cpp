@@ -1,21 +1,11 @@
 #include "terminal.h"
 
-#include <cstdlib>
+#include "environment.h"
 
 #include <sys/ioctl.h>
 #include <unistd.h>
 
 namespace talcmp {
-namespace {
-
-// Empty if the variable is not set.
-std::string environment(const char* const variable) {
-    // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing changes the environment.
-    const char* const value = std::getenv(variable);
-    return value == nullptr ? "" : value;
-}
-
-} // namespace
 
 Terminal Terminal::of(const int descriptor) {
     const bool is_terminal = ::isatty(descriptor) == 1;

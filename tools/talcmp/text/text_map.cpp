@@ -1,5 +1,6 @@
 #include "text_map.h"
 
+#include "environment.h"
 #include "looks.h"
 #include "ticks.h"
 
@@ -7,7 +8,6 @@
 #include <array>
 #include <cctype>
 #include <cstddef>
-#include <cstdlib>
 #include <string_view>
 #include <vector>
 
@@ -259,13 +259,12 @@ class MapText {
 
 CharacterSet character_set_of_environment() {
     for (const char* const variable : {"LC_ALL", "LC_CTYPE", "LANG"}) {
-        // NOLINTNEXTLINE(concurrency-mt-unsafe): nothing changes the environment.
-        const char* const value = std::getenv(variable);
-        if (value == nullptr || *value == '\0') {
+        const std::string value = environment(variable);
+        if (value.empty()) {
             continue;
         }
         std::string name;
-        for (const char each : std::string_view(value)) {
+        for (const char each : value) {
             name += static_cast<char>(std::tolower(static_cast<unsigned char>(each)));
         }
         const bool is_utf8 =
