@@ -73,7 +73,7 @@ talreal tolerance_from(const std::string& text) {
 
 double relative_from(const std::string& text) {
     const auto error = real_from("--relative", text);
-    if (!error || !(*error > 0 && *error < 1)) {
+    if (!error || !is_relative_error(*error)) {
         throw UsageError("--relative takes an error between 0 and 1, such as 1e-9, not '" + text
                          + "'");
     }
@@ -81,9 +81,8 @@ double relative_from(const std::string& text) {
 }
 
 double absolute_from(const std::string& text) {
-    constexpr double most = 1e300; // so that no sum of it and a difference overflows
     const auto error = real_from("--absolute", text);
-    if (!error || !(*error >= 0 && *error <= most)) {
+    if (!error || !is_absolute_error(*error)) {
         throw UsageError("--absolute takes an error from 0 to 1e300, such as 1e-12, not '" + text
                          + "'");
     }
@@ -152,8 +151,6 @@ const std::vector<Option>& options() {
 
 // What the words mean.
 CommandLine command_line_of(const Words& words) {
-    constexpr std::size_t most_differences = 1000000; // each thread holds so many in memory
-    constexpr unsigned most_threads = 64;
     CommandLine line;
     line.json = has(words, "--json");
     line.quiet = has(words, "--quiet");

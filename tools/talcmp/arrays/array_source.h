@@ -61,6 +61,9 @@ class ArraySource {
     // `elements`. Throws Trouble.
     virtual void read(std::uint64_t first, std::uint64_t count, void* elements) = 0;
 
+    // All elements by their positions, aligned, if they are in memory and need not be read.
+    virtual const void* in_memory() const { return nullptr; }
+
     // The extents of the blocks, one after another from index 0, that have to be read whole, such
     // as compressed chunks; empty if elements can be read by their positions. An array in blocks is
     // in C order, may be read in any order, and is read by `read_slab` alone.

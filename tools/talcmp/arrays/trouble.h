@@ -26,4 +26,9 @@ class NotNumbers : public Trouble {
     using Trouble::Trouble;
 };
 
+class OutOfMemory : public Trouble {
+  public:
+    using Trouble::Trouble;
+};
+
 } // namespace talcmp

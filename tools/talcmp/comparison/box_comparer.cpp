@@ -39,9 +39,8 @@ bool BoxPlan::is_beyond(const Box& box, const std::uint64_t bound) const {
 // ---- BoxComparer
 
 BoxComparer::BoxComparer(const BoxPlan& plan)
-    : plan_(plan),
-      buffer1_(new unsigned char[plan.traversal().largest_box() * plan.first().type().size]),
-      buffer2_(new unsigned char[plan.traversal().largest_box() * plan.second().type().size]),
+    : plan_(plan), buffer1_(room_for(Side::first, plan.first())),
+      buffer2_(room_for(Side::second, plan.second())),
       mask_(plan.mask() == nullptr ? nullptr : new unsigned char[plan.traversal().largest_box()]),
       chosen_(plan.question()), counter_(plan.tolerance()),
       maps_(plan.maps(), plan.traversal(), column_major(plan.first(), plan.second())),
@@ -51,7 +50,7 @@ std::uint64_t BoxComparer::compare(const Box& box) {
     // So few that what is chosen stays in the first cache.
     constexpr std::size_t at_once = 2048;
     read(box);
-    const Pairs pairs(plan_.first().type(), buffer1_.get(), plan_.second().type(), buffer2_.get(),
+    const Pairs pairs(plan_.first().type(), elements1_, plan_.second().type(), elements2_,
                       box.count);
     const std::size_t length = plan_.chooses() ? at_once : box.count;
     for (std::size_t begin = 0; begin < box.count; begin += length) {
@@ -75,20 +74,38 @@ void BoxComparer::compare(const Pairs& asked, const Pairs& stored, const Box& bo
     }
 }
 
-void BoxComparer::read(const Box& box) {
+// None for elements that are compared where they are.
+std::unique_ptr<unsigned char[]> BoxComparer::room_for(const Side side,
+                                                       const ArraySource& source) const {
     const Traversal& traversal = plan_.traversal();
+    return traversal.in_memory(side, source, traversal.box(0)) != nullptr
+               ? nullptr
+               : std::unique_ptr<unsigned char[]>(
+                   new unsigned char[traversal.largest_box() * source.type().size]);
+}
+
+const void* BoxComparer::read(const Side side, ArraySource& source, const Box& box,
+                              unsigned char* const buffer) const {
+    if (buffer == nullptr) {
+        return plan_.traversal().in_memory(side, source, box);
+    }
+    plan_.traversal().read(side, source, box, buffer);
+    return buffer;
+}
+
+void BoxComparer::read(const Box& box) {
     const auto read_second = [&] {
-        traversal.read(Side::second, plan_.second(), box, buffer2_.get());
+        elements2_ = read(Side::second, plan_.second(), box, buffer2_.get());
     };
     // A side that can be read only once may have to be decompressed: each side gets a thread.
     const bool side_by_side = !plan_.first().random_access() && !plan_.second().random_access();
     auto second = std::async(side_by_side ? std::launch::async | std::launch::deferred
                                           : std::launch::deferred,
                              read_second);
-    traversal.read(Side::first, plan_.first(), box, buffer1_.get());
+    elements1_ = read(Side::first, plan_.first(), box, buffer1_.get());
     second.get();
     if (plan_.mask() != nullptr) {
-        traversal.read(Side::mask, *plan_.mask(), box, mask_.get());
+        plan_.traversal().read(Side::mask, *plan_.mask(), box, mask_.get());
     }
 }
 

@@ -86,7 +86,9 @@ class BoxComparer {
     const Findings& findings() const { return findings_; }
 
   private:
+    std::unique_ptr<unsigned char[]> room_for(Side side, const ArraySource& source) const;
     void read(const Box& box);
+    const void* read(Side side, ArraySource& source, const Box& box, unsigned char* buffer) const;
     void compare(const Pairs& asked, const Pairs& stored, const Box& box);
     void find_different(const Pairs& asked, const Pairs& stored, const Box& box);
 
@@ -99,6 +101,8 @@ class BoxComparer {
     std::unique_ptr<unsigned char[]> buffer1_;
     std::unique_ptr<unsigned char[]> buffer2_;
     std::unique_ptr<unsigned char[]> mask_;
+    const void* elements1_ = nullptr; // of the box that is compared: in the buffers or in memory
+    const void* elements2_ = nullptr;
     ChosenPairs chosen_;
     PairCounter counter_;
     MapFiller maps_;

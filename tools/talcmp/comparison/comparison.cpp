@@ -1,6 +1,7 @@
 #include "comparison.h"
 
 #include "compare_boxes.h"
+#include "conclusion.h"
 #include "layout.h"
 #include "shape_text.h"
 #include "temporary_copy.h"
@@ -28,71 +29,6 @@ ArrayFacts facts_of(const NamedArray& array, const View& view) {
     return {
         array.name, &array.source->type(),        array.source->type_name(), array.source->shape(),
         view.shape, array.source->fortran_order()};
-}
-
-// ---- From what was found to what is reported
-
-// Asks about many pairs at once, if no report has done so before.
-void find_samenesses(const BoxPlan& plan, std::vector<FoundPair>& pairs) {
-    const ElementType& type1 = plan.first().type();
-    const ElementType& type2 = plan.second().type();
-    constexpr std::size_t at_once = 4096;
-    std::vector<unsigned char> elements1(std::min(pairs.size(), at_once) * type1.size);
-    std::vector<unsigned char> elements2(std::min(pairs.size(), at_once) * type2.size);
-    Allowances allowances(plan.question());
-    DigitSearch search;
-    for (std::size_t begin = 0; begin < pairs.size(); begin += at_once) {
-        const std::size_t count = std::min(at_once, pairs.size() - begin);
-        FoundPair* const first = pairs.data() + begin;
-        for (std::size_t i = 0; i < count; ++i) {
-            std::copy_n(first[i].element1.data(), type1.size, &elements1[i * type1.size]);
-            std::copy_n(first[i].element2.data(), type2.size, &elements2[i * type2.size]);
-        }
-        if (allowances.any()) {
-            allowances.apply(type1, elements1.data(), type2, elements2.data(), count);
-        }
-        const auto& found =
-            search.search(Pairs(type1, elements1.data(), type2, elements2.data(), count));
-        for (std::size_t i = 0; i < count; ++i) {
-            first[i].sameness = sameness_of(found, i);
-        }
-    }
-}
-
-Place place_of(const BoxPlan& plan, const FoundPair& pair) {
-    const ElementType& type1 = plan.first().type();
-    const ElementType& type2 = plan.second().type();
-    FoundPair asked = pair;
-    Allowances allowances(plan.question());
-    if (allowances.any()) {
-        allowances.apply(type1, asked.element1.data(), type2, asked.element2.data(), 1);
-    }
-    const Pairs pairs(type1, asked.element1.data(), type2, asked.element2.data(), 1);
-    return {plan.index_of(pair.number), pair.element1, pair.element2,
-            verdict_on(pairs, 0, *pair.sameness)};
-}
-
-std::vector<Place> places_of(const BoxPlan& plan, std::vector<FoundPair> pairs) {
-    if (!plan.question().report) {
-        find_samenesses(plan, pairs);
-    }
-    std::vector<Place> places;
-    places.reserve(pairs.size());
-    for (const FoundPair& pair : pairs) {
-        places.push_back(place_of(plan, pair));
-    }
-    return places;
-}
-
-Report report_on(const BoxPlan& plan, const Totals& totals) {
-    Report report;
-    report.totals = totals;
-    report.all_digits = all_digits(plan.first().type(), plan.second().type());
-    report.smallest_tolerance = smallest_tolerance(totals, report.all_digits);
-    if (totals.worst) {
-        report.worst_place = place_of(plan, *totals.worst);
-    }
-    return report;
 }
 
 // ---- The elements
@@ -206,42 +142,28 @@ void compare_elements(SelectedArrays arrays, const Question& question, BoxSupply
         if (!supply.leads()) {
             return;
         }
-        result.all_ignored = findings.totals.ignored == traversal.pair_count();
-        result.places = places_of(plan, findings.first.in_order());
-        if (question.report) {
-            result.report = report_on(plan, findings.totals);
-        }
+        conclude(
+            findings, traversal.pair_count(),
+            [&](const std::uint64_t number) { return plan.index_of(number); }, question, result);
     } catch (const std::bad_alloc&) {
-        throw Trouble(arrays.first.name, memory_text(plan, arrays.second.name, threads));
+        throw OutOfMemory(arrays.first.name, memory_text(plan, arrays.second.name, threads));
     }
 }
 
-// For arrays of one shape.
-void compare_contents(SelectedArrays arrays, const Question& question, BoxSupply& supply,
-                      ProgressListener& progress, Comparison& result) {
-    if (question.report) {
-        result.report.emplace();
+// Alone, or as one of several processes.
+void compare_divided(SelectedArrays arrays, const Question& question, BoxSupply& supply,
+                     ProgressListener& progress, Comparison& result) {
+    AllBoxes undivided;
+    const bool divided = !supply.is_shared() || is_divisible(arrays);
+    if (!divided && !supply.leads()) {
+        return;
     }
-    result.has_elements = has_elements(arrays.view1.shape);
-    const bool types_differ =
-        question.strict_type && result.array1.stored_type != result.array2.stored_type;
-    if (result.has_elements && (!types_differ || question.report)) {
-        AllBoxes undivided;
-        const bool divided = !supply.is_shared() || is_divisible(arrays);
-        if (divided || supply.leads()) {
-            BoxSupply& boxes = divided ? supply : undivided;
-            try {
-                compare_elements(std::move(arrays), question, boxes, progress, result);
-            } catch (...) {
-                boxes.abandon();
-                throw;
-            }
-        }
-    }
-    if (types_differ) {
-        result.difference = Difference::type;
-    } else if (question.report ? result.report->totals.differing != 0 : !result.places.empty()) {
-        result.difference = Difference::elements;
+    BoxSupply& boxes = divided ? supply : undivided;
+    try {
+        compare_elements(std::move(arrays), question, boxes, progress, result);
+    } catch (...) {
+        boxes.abandon();
+        throw;
     }
 }
 
@@ -263,21 +185,15 @@ Comparison compare(NamedArray first, NamedArray second, NamedArray mask, const Q
                    BoxSupply& supply, ProgressListener& progress) {
     const View view1 = selected(first, question);
     const View view2 = selected(second, question);
-    Comparison result;
-    result.array1 = facts_of(first, view1);
-    result.array2 = facts_of(second, view2);
-    result.tolerance = tolerance_for(question, first.source->type(), second.source->type());
+    Comparison result = begin_comparison(facts_of(first, view1), facts_of(second, view2), question);
     View mask_view;
     if (mask.source != nullptr) {
         check_mask(mask, first);
         mask_view = selected(mask, question);
     }
-    // Not by the records' dimensions, which are 32-bit: those of a file may be larger.
-    if (view1.shape != view2.shape) {
-        result.difference = Difference::shape;
-    } else {
-        compare_contents({first, second, mask, view1, view2, mask_view}, question, supply, progress,
-                         result);
+    if (depends_on_elements(result, question)) {
+        compare_divided({first, second, mask, view1, view2, mask_view}, question, supply, progress,
+                        result);
     }
     for (const NamedArray* const array : {&first, &second, &mask}) {
         if (array->source != nullptr && supply.leads()) {

@@ -66,6 +66,8 @@ class FirstPairs {
         }
     }
 
+    std::size_t limit() const { return limit_; }
+
     std::vector<FoundPair> in_order() const {
         std::vector<FoundPair> sorted = pairs_;
         std::sort_heap(sorted.begin(), sorted.end(), earlier);

@@ -13,10 +13,23 @@
 
 namespace talcmp {
 
+// The most that a question may ask for.
+inline constexpr std::size_t most_differences = 1000000; // each thread holds so many in memory
+inline constexpr unsigned most_threads = 64;
+
+constexpr bool is_relative_error(const double error) {
+    return 0 < error && error < 1;
+}
+
+// At most 1e300, so that no sum of it and a difference overflows.
+constexpr bool is_absolute_error(const double error) {
+    return 0 <= error && error <= 1e300;
+}
+
 struct Question {
     talreal tolerance = 0;          // binary digits
-    std::optional<double> relative; // the tolerance as an error, between 0 and 1, instead
-    std::optional<double> absolute; // the error, at most 1e300, up to which elements are the same
+    std::optional<double> relative; // the tolerance as an error instead
+    std::optional<double> absolute; // the error up to which elements are the same
     bool equal_nan = false;         // whether a NaN is the same as a NaN
     bool strict_type = false;       // whether arrays of different element types differ
     Selection selection;            // what is compared of each array

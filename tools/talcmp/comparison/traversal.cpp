@@ -234,6 +234,13 @@ Slab Traversal::slab(const Side side, const Shape& shape, const Box& box) const 
     return slab;
 }
 
+const void* Traversal::in_memory(const Side side, const ArraySource& source, const Box& box) const {
+    const auto* const elements = static_cast<const unsigned char*>(source.in_memory());
+    return elements == nullptr || !is_linear()
+               ? nullptr
+               : elements + position(side, box) * source.type().size;
+}
+
 void Traversal::read(const Side side, ArraySource& source, const Box& box,
                      void* const elements) const {
     if (!source.block().empty()) {

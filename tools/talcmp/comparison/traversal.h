@@ -56,6 +56,9 @@ class Traversal {
     // `largest_box()` of them.
     void read(Side side, ArraySource& source, const Box& box, void* elements) const;
 
+    // Where these elements are in memory; null if they have to be read.
+    const void* in_memory(Side side, const ArraySource& source, const Box& box) const;
+
     std::size_t largest_box() const { return largest_box_; }
 
   private:

@@ -2,7 +2,6 @@
 
 #include "number_text.h"
 #include "shape_text.h"
-#include "wording.h"
 
 #include <algorithm>
 #include <array>
@@ -52,15 +51,15 @@ std::string tolerance_text(const Comparison& comparison, const Question& questio
     return text + (question.equal_nan ? "; NaNs are equal" : "");
 }
 
-std::string smallest_tolerance_text(const Comparison& comparison) {
+std::string smallest_tolerance_text(const Comparison& comparison, const Spelling spelling) {
     const Report& report = *comparison.report;
     if (report.smallest_tolerance) {
-        return "--tol " + std::to_string(*report.smallest_tolerance);
+        return option_text(*report.smallest_tolerance, spelling);
     }
     const bool none_at_all = report.totals.needed_from_one > most_digits;
     const std::string below =
         none_at_all ? "" : " below all " + std::to_string(report.all_digits) + " digits";
-    return "none" + below + "; " + reason_of_no_tolerance(comparison);
+    return "none" + below + "; " + reason_of_no_tolerance(comparison, spelling);
 }
 
 std::string largest_text(const double difference) {
@@ -93,7 +92,7 @@ std::string histogram(const DigitCounts& counts, const Terminal& terminal) {
 } // namespace
 
 std::string report_text(const Comparison& comparison, const Question& question,
-                        const Terminal& terminal) {
+                        const Terminal& terminal, const Spelling spelling) {
     std::string text;
     text += line("first array", array_text(comparison.array1));
     text += line("second array", array_text(comparison.array2));
@@ -111,15 +110,15 @@ std::string report_text(const Comparison& comparison, const Question& question,
     }
     text += line("differing", share_text(totals.differing, totals.pairs));
     if (!comparison.places.empty()) {
-        text += line("first place", place_text(comparison, comparison.places.front()));
+        text += line("first place", place_text(comparison, comparison.places.front(), spelling));
     }
     if (const auto& worst = comparison.report->worst_place) {
-        text += line("worst place", place_text(comparison, *worst));
+        text += line("worst place", place_text(comparison, *worst, spelling));
     }
     text += line("largest difference", digits_text(totals.worst_digits) + " binary digits");
     text += line("absolute difference", largest_text(totals.largest.absolute));
     text += line("relative difference", largest_text(totals.largest.relative));
-    text += line("smallest tolerance", smallest_tolerance_text(comparison));
+    text += line("smallest tolerance", smallest_tolerance_text(comparison, spelling));
     text += line("NaNs", two(totals.values1.nans, totals.values2.nans));
     text += line("infinities", two(totals.values1.infinities, totals.values2.infinities));
     text +=

@@ -30,13 +30,6 @@ std::string summary_text(const Summary& summary) {
     return text + (summary.stopped ? "; stopped at the first difference" : "");
 }
 
-// Why two arrays are the same though no numbers are.
-std::string remark_on(const Comparison& comparison) {
-    return !comparison.has_elements ? " (no elements)"
-           : comparison.all_ignored ? " (all pairs ignored)"
-                                    : "";
-}
-
 } // namespace
 
 void TextAnswers::print(const Outcome& outcome) {
@@ -51,7 +44,7 @@ void TextAnswers::print(const Outcome& outcome) {
     } else if (command_line_.verbose || command_line_.report) {
         print_line(shown(outcome.first) + " " + shown(outcome.second) + " "
                    + terminal_.coloured("are the same", Colour::green)
-                   + remark_on(outcome.comparison));
+                   + remark_on_sameness(outcome.comparison));
     }
     const bool compared =
         outcome.kind == Outcome::Kind::same || outcome.kind == Outcome::Kind::different;
