@@ -1,5 +1,7 @@
 #include "stored_type.h"
 
+#include "widest_vectors.h"
+
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
@@ -30,47 +32,22 @@ template <typename Bits>
     }
 }
 
-[[gnu::always_inline]] inline void reverse_each_here(unsigned char* const parts,
-                                                     const std::size_t bytes,
-                                                     const std::size_t part_size) {
-    static_assert(largest_element_size == 2 * sizeof(std::uint64_t),
-                  "there is a case for each size");
-    switch (part_size) {
-    case sizeof(std::uint16_t):
-        return reverse_each_as<std::uint16_t>(parts, bytes);
-    case sizeof(std::uint32_t):
-        return reverse_each_as<std::uint32_t>(parts, bytes);
-    default:
-        return reverse_each_as<std::uint64_t>(parts, bytes);
+// SSE2 cannot reverse a whole vector by one instruction.
+struct ReverseEach {
+    [[gnu::always_inline]] void operator()(unsigned char* const parts, const std::size_t bytes,
+                                           const std::size_t part_size) const {
+        static_assert(largest_element_size == 2 * sizeof(std::uint64_t),
+                      "there is a case for each size");
+        switch (part_size) {
+        case sizeof(std::uint16_t):
+            return reverse_each_as<std::uint16_t>(parts, bytes);
+        case sizeof(std::uint32_t):
+            return reverse_each_as<std::uint32_t>(parts, bytes);
+        default:
+            return reverse_each_as<std::uint64_t>(parts, bytes);
+        }
     }
-}
-
-#if defined(__x86_64__)
-
-// Whole vectors at once, which SSE2 cannot reverse by one instruction.
-[[gnu::target("avx2")]] void reverse_each_by_avx2(unsigned char* const parts,
-                                                  const std::size_t bytes,
-                                                  const std::size_t part_size) {
-    reverse_each_here(parts, bytes, part_size);
-}
-
-void reverse_each(unsigned char* const parts, const std::size_t bytes,
-                  const std::size_t part_size) {
-    if (static_cast<bool>(__builtin_cpu_supports("avx2"))) {
-        reverse_each_by_avx2(parts, bytes, part_size);
-    } else {
-        reverse_each_here(parts, bytes, part_size);
-    }
-}
-
-#else
-
-void reverse_each(unsigned char* const parts, const std::size_t bytes,
-                  const std::size_t part_size) {
-    reverse_each_here(parts, bytes, part_size);
-}
-
-#endif
+};
 
 // ---- Types that the module does not have
 
@@ -146,8 +123,9 @@ void* room_for_stored(const StoredType& type, void* const elements, const std::s
 void decode(const StoredType& type, void* const elements, const std::size_t count) {
     if (type.bytes_swapped) {
         const std::size_t part_size = std::min(type.size, type.type->part_size);
-        reverse_each(static_cast<unsigned char*>(room_for_stored(type, elements, count)),
-                     count * type.size, part_size);
+        in_widest_vectors(ReverseEach(),
+                          static_cast<unsigned char*>(room_for_stored(type, elements, count)),
+                          count * type.size, part_size);
     }
     if (type.widen != nullptr) {
         type.widen(elements, count);

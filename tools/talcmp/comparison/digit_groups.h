@@ -9,14 +9,14 @@
 
 namespace talcmp {
 
-// Sorts pairs by the two powers of two that |x - y| / max(|x|, |y|), as computed, is between.
+// Sorts pairs by the two powers of two that |x - y| / max(|x|, |y|) is between, for |x - y| as it
+// is computed.
 //
-// A whole tolerance compares that quotient with a power of two. The computed quotient is strictly
-// between two neighbouring powers of two only if the exact one is, as rounding takes no number past
-// a power of two. So all pairs of such a group are the same under the same whole tolerances from 1
-// on. A quotient that is a power of two may be a rounded one: the module is asked about each such
-// pair, and about NaNs and infinities. The groups only say which pairs are alike; the answers are
-// the module's.
+// A whole tolerance compares that quotient with a power of two. So all pairs whose quotients are
+// strictly between the same two neighbouring powers are the same under the same whole tolerances
+// from 1 on. The module is asked about each pair whose quotient is a power of two, whose difference
+// is below the normal numbers, or that has a NaN or an infinity. The groups only say which pairs
+// are alike; the answers are the module's.
 class DigitGroups {
   public:
     using Group = std::uint8_t;

@@ -78,6 +78,7 @@ class DigitSearch {
     const Result& search(const Pairs& pairs);
 
   private:
+    void count_groups();
     void ask_about_groups(const Pairs& pairs);
     void ask_about_stretch(const Pairs& pairs, std::size_t begin, std::size_t count);
     void ask_about(const Pairs& pairs, std::size_t i);

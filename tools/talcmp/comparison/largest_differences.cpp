@@ -1,6 +1,7 @@
 #include "largest_differences.h"
 
 #include "element_parts.h"
+#include "widest_vectors.h"
 
 #include <algorithm>
 #include <array>
@@ -44,42 +45,20 @@ constexpr std::size_t at_once = 512;
     return *std::max_element(larger_ones.begin(), larger_ones.end()) > 0;
 }
 
-[[gnu::always_inline]] inline void add_here(const double* const x, const double* const y,
-                                            const std::size_t count, LargestDifferences& largest) {
-    for (std::size_t begin = 0; begin < count; begin += at_once) {
-        const std::size_t end = std::min(count, begin + at_once);
-        if (end < begin + at_once || may_be_larger(x + begin, y + begin, largest)) {
-            for (std::size_t i = begin; i < end; ++i) {
-                take(x[i], y[i], std::fabs(x[i] - y[i]), largest);
+struct AddReals {
+    [[gnu::always_inline]] void operator()(const double* const x, const double* const y,
+                                           const std::size_t count,
+                                           LargestDifferences& largest) const {
+        for (std::size_t begin = 0; begin < count; begin += at_once) {
+            const std::size_t end = std::min(count, begin + at_once);
+            if (end < begin + at_once || may_be_larger(x + begin, y + begin, largest)) {
+                for (std::size_t i = begin; i < end; ++i) {
+                    take(x[i], y[i], std::fabs(x[i] - y[i]), largest);
+                }
             }
         }
     }
-}
-
-#if defined(__x86_64__)
-
-[[gnu::target("avx2")]] void add_by_avx2(const double* const x, const double* const y,
-                                         const std::size_t count, LargestDifferences& largest) {
-    add_here(x, y, count, largest);
-}
-
-void add_reals(const double* const x, const double* const y, const std::size_t count,
-               LargestDifferences& largest) {
-    if (static_cast<bool>(__builtin_cpu_supports("avx2"))) {
-        add_by_avx2(x, y, count, largest);
-    } else {
-        add_here(x, y, count, largest);
-    }
-}
-
-#else
-
-void add_reals(const double* const x, const double* const y, const std::size_t count,
-               LargestDifferences& largest) {
-    add_here(x, y, count, largest);
-}
-
-#endif
+};
 
 void add_sums(const double* const x, const double* const x_rests, const double* const y,
               const double* const y_rests, const std::size_t count, LargestDifferences& largest) {
@@ -111,7 +90,7 @@ void DifferenceMeter::add_part(const Pairs& pairs, const int part, LargestDiffer
     const double* const y_rests =
         whole ? rests_of(pairs.type2(), elements2, count, rests2_) : nullptr;
     if (x_rests == nullptr && y_rests == nullptr) {
-        add_reals(x, y, count, largest);
+        in_widest_vectors(AddReals(), x, y, count, largest);
     } else {
         add_sums(x, x_rests, y, y_rests, count, largest);
     }

@@ -2,6 +2,7 @@
 
 #include "taldata_array_element_types.h"
 #include "to_type.h"
+#include "widest_vectors.h"
 
 #include <algorithm>
 #include <array>
@@ -23,25 +24,27 @@ bool is_negative_zero(const T part) {
 }
 
 // Whether all are finite and nonzero, so that nothing is to be counted.
-template <typename T>
-bool all_ordinary(const T* const parts, const std::size_t count) {
-    // Numbers side by side, so that compilers make vector instructions of them.
-    constexpr std::size_t lanes = 8;
-    std::array<T, lanes> special = {};
-    const auto is_special = [](const T part) {
-        const T magnitude = std::fabs(part);
-        return ((magnitude > 0) & (magnitude <= std::numeric_limits<T>::max())) ? T{0} : T{1};
-    };
-    for (std::size_t i = 0; i < count / lanes; ++i) {
-        for (std::size_t lane = 0; lane < lanes; ++lane) {
-            special[lane] += is_special(parts[lanes * i + lane]);
+struct AllOrdinary {
+    template <typename T>
+    [[gnu::always_inline]] bool operator()(const T* const parts, const std::size_t count) const {
+        // Numbers side by side, so that compilers make vector instructions of them.
+        constexpr std::size_t lanes = 128 / sizeof(T);
+        std::array<T, lanes> special = {};
+        const auto is_special = [](const T part) {
+            const T magnitude = std::fabs(part);
+            return ((magnitude > 0) & (magnitude <= std::numeric_limits<T>::max())) ? T{0} : T{1};
+        };
+        for (std::size_t i = 0; i < count / lanes; ++i) {
+            for (std::size_t lane = 0; lane < lanes; ++lane) {
+                special[lane] += is_special(parts[lanes * i + lane]);
+            }
         }
+        for (std::size_t i = count / lanes * lanes; i < count; ++i) {
+            special[0] += is_special(parts[i]);
+        }
+        return special == std::array<T, lanes>{};
     }
-    for (std::size_t i = count / lanes * lanes; i < count; ++i) {
-        special[0] += is_special(parts[i]);
-    }
-    return special == std::array<T, lanes>{};
-}
+};
 
 template <typename T>
 ValueCounts counts_of(const T part) {
@@ -61,13 +64,13 @@ ValueCounts count_as(const void* const elements, const std::size_t count) {
     ValueCounts counts;
     if constexpr (!std::is_integral_v<T>) {
         using Part = to_real_type_t<T>;
-        constexpr std::size_t stretch = 256;
+        constexpr std::size_t stretch = 1024;
         constexpr std::size_t parts_of_each = is_complex_v<T> ? 2 : 1;
         const auto* const values = static_cast<const T*>(elements);
         for (std::size_t begin = 0; begin < count; begin += stretch) {
             const std::size_t end = std::min(count, begin + stretch);
             const auto* const parts = reinterpret_cast<const Part*>(values + begin);
-            if (!all_ordinary(parts, (end - begin) * parts_of_each)) {
+            if (!in_widest_vectors(AllOrdinary(), parts, (end - begin) * parts_of_each)) {
                 for (std::size_t i = begin; i < end; ++i) {
                     add(counts, counts_of(values[i]));
                 }
