@@ -6,6 +6,7 @@ Draws a new seed in every run and prints it; the environment variable TALNUMERIC
 and TALNUMERICARRAY_ROUNDS how often each kind of array is drawn.
 """
 
+import collections
 import fractions
 import glob
 import math
@@ -227,7 +228,7 @@ class EveryTypeAndShape(NumpyFiles):
         self.assertEqual(float(report["largest_relative_difference"]), largest[1])
         self.assertEqual(report["differing"], len(expected))
         self.assertEqual({bar["digits"]: bar["pairs"] for bar in report["histogram"]},
-                         {digit: printed.count(digit) for digit in printed})
+                         collections.Counter(printed))
         smallest = max(smallest_tolerance(x, y) for x, y in pairs) if expected else 0
         real = compared_type(ours, theirs)
         none = smallest >= (all_digits(real) if real else NEVER)
