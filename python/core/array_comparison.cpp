@@ -46,23 +46,20 @@ auto without_lock(const py::object& callback, const Action& action) {
 
 // ---- The mask
 
-struct Mask {
-    py::array array; // keeps the elements that `source` reads
-    NamedArray source;
-};
-
-Mask mask_of(const CallOptions& options) {
+std::optional<py::array> mask_of(const CallOptions& options) {
     if (options.ignore.is_none()) {
-        return {};
+        return std::nullopt;
     }
-    Mask mask;
-    mask.array = array_of(options.ignore, "ignore");
-    if (mask.array.dtype().kind() != 'b') {
-        throw py::type_error("ignore has elements of type " + type_text(mask.array.dtype())
+    const py::array mask = array_of(options.ignore, "ignore");
+    if (mask.dtype().kind() != 'b') {
+        throw py::type_error("ignore has elements of type " + type_text(mask.dtype())
                              + "; it takes an array of booleans, True where nothing is compared");
     }
-    mask.source = source_of(mask.array, "ignore");
     return mask;
+}
+
+NamedArray source_of_mask(const std::optional<py::array>& mask, const bool by_fortran_positions) {
+    return mask ? source_of(*mask, "ignore", by_fortran_positions) : NamedArray{};
 }
 
 // ---- One call of the module
@@ -121,24 +118,32 @@ Comparison compare_arrays(const py::array& first, const py::array& second,
                                   + std::to_string(array->ndim()));
         }
     }
-    NamedArray source1 = source_of(first, options.name1);
-    NamedArray source2 = source_of(second, options.name2);
-    Mask mask = mask_of(options);
-    return without_lock(options.progress, [&](ProgressListener& progress) {
+    const bool fortran1 = is_in_fortran_order(first);
+    const bool fortran2 = is_in_fortran_order(second);
+    const auto mask = mask_of(options);
+    const bool all_fortran = fortran1 && fortran2 && (!mask || is_in_fortran_order(*mask));
+    NamedArray source1 = source_of(first, options.name1, all_fortran);
+    NamedArray source2 = source_of(second, options.name2, all_fortran);
+    NamedArray ignored = source_of_mask(mask, all_fortran);
+    Comparison comparison = without_lock(options.progress, [&](ProgressListener& progress) {
         AllBoxes all;
-        return compare(std::move(source1), std::move(source2), std::move(mask.source), question,
-                       all, progress);
+        return compare(std::move(source1), std::move(source2), std::move(ignored), question, all,
+                       progress);
     });
+    comparison.array1.fortran_order = fortran1;
+    comparison.array2.fortran_order = fortran2;
+    return comparison;
 }
 
 Findings compare_blocks(const py::array& first, const py::array& second,
                         const CallOptions& options) {
     const NamedArray source1 = source_of(first, options.name1);
     const NamedArray source2 = source_of(second, options.name2);
-    const Mask mask = mask_of(options);
+    const auto mask = mask_of(options);
+    const NamedArray source3 = source_of_mask(mask, false);
     ArraySource& array1 = *source1.source;
     ArraySource& array2 = *source2.source;
-    ArraySource* const ignored = mask.source.source.get();
+    ArraySource* const ignored = source3.source.get();
     return without_lock(options.progress, [&](ProgressListener& progress) {
         const View view1 = select(array1, {});
         const View view2 = select(array2, {});

@@ -3,7 +3,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
-#include <optional>
+#include <numeric>
 
 namespace talcmp {
 namespace {
@@ -29,27 +29,25 @@ bool is_packed(const MemoryLayout& layout, const std::size_t size, const bool fi
     return true;
 }
 
-// The axis along which elements are closest together; none if all elements are one.
-std::optional<std::size_t> fastest_axis(const Shape& shape,
-                                        const std::vector<std::int64_t>& strides) {
-    std::optional<std::size_t> fastest;
-    for (std::size_t axis = 0; axis < shape.size(); ++axis) {
-        const std::int64_t stride = std::abs(strides[axis]);
-        if (shape[axis] > 1 && stride != 0 && (!fastest || stride <= std::abs(strides[*fastest]))) {
-            fastest = axis;
-        }
-    }
-    return fastest;
-}
-
-// Some cache lines along the fastest axis, so that few lines are read for each element that a slab
-// wants of them; single elements where the last index varies fastest anyway.
+// Some cache lines along the axes that vary fastest in memory, so that few lines are read for each
+// element that a slab wants of them. Along the last axis slabs are long anyway.
 Shape block_of(const MemoryLayout& layout) {
-    constexpr std::uint64_t lines = 64;
-    Shape block(layout.shape.size(), 1);
-    const auto fastest = fastest_axis(layout.shape, layout.strides);
-    if (fastest && *fastest + 1 != block.size()) {
-        block[*fastest] = lines;
+    const Shape& shape = layout.shape;
+    Shape block(shape.size(), 1);
+    std::vector<std::size_t> axes(shape.size());
+    std::iota(axes.begin(), axes.end(), std::size_t{0});
+    std::stable_sort(axes.begin(), axes.end(), [&](const std::size_t one, const std::size_t other) {
+        return std::abs(layout.strides[one]) < std::abs(layout.strides[other]);
+    });
+    std::uint64_t room = 64;
+    for (const std::size_t axis : axes) {
+        if (axis + 1 == axes.size()) {
+            break;
+        }
+        if (layout.strides[axis] != 0) {
+            block[axis] = std::min(room, shape[axis]);
+            room /= block[axis];
+        }
     }
     return block;
 }
@@ -127,10 +125,16 @@ void copy_axes(const std::size_t size, unsigned char* to, const unsigned char* f
 
 } // namespace
 
-MemoryArray::MemoryArray(const StoredType& stored, const MemoryLayout& layout)
+bool is_in_fortran_order(const MemoryLayout& layout, const std::size_t size) {
+    return has_elements(layout.shape) && !is_packed(layout, size, false)
+           && is_packed(layout, size, true);
+}
+
+MemoryArray::MemoryArray(const StoredType& stored, const MemoryLayout& layout,
+                         const bool by_fortran_positions)
     : stored_(stored), layout_(layout) {
     const bool c_order = !has_elements(layout_.shape) || is_packed(layout_, stored_.size, false);
-    fortran_order_ = !c_order && is_packed(layout_, stored_.size, true);
+    fortran_order_ = by_fortran_positions && is_in_fortran_order(layout_, stored_.size);
     if (!c_order && !fortran_order_) {
         block_ = block_of(layout_);
     }

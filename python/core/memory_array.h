@@ -19,12 +19,16 @@ struct MemoryLayout {
     std::vector<std::int64_t> strides; // bytes from index to index: of any sign, or 0
 };
 
-// The elements stay where they are, and are there as long as the source is used. Those that are in
-// C or Fortran order without gaps are read by their positions; all others in slabs, so that only a
-// slab is copied at a time.
+// Whether the first index varies fastest, without gaps, and the elements are not in C order too.
+bool is_in_fortran_order(const MemoryLayout& layout, std::size_t element_size);
+
+// The elements stay where they are, and are there as long as the source is used. Those in C order
+// without gaps are read by their positions; all others in slabs, as if they were in C order, so
+// that only a slab is copied at a time. Those in Fortran order may be read by their positions too,
+// if all arrays of a comparison are.
 class MemoryArray : public ArraySource {
   public:
-    MemoryArray(const StoredType& stored, const MemoryLayout& layout);
+    MemoryArray(const StoredType& stored, const MemoryLayout& layout, bool by_fortran_positions);
 
     const ElementType& type() const override { return *stored_.type; }
     std::string type_name() const override { return stored_.name; }
@@ -34,6 +38,7 @@ class MemoryArray : public ArraySource {
     void read(std::uint64_t first, std::uint64_t count, void* elements) override;
     const void* in_memory() const override;
     const Shape& block() const override { return block_; }
+    bool has_whole_blocks() const override { return false; }
     void read_slab(const Slab& slab, void* elements) override;
 
   private:

@@ -101,8 +101,10 @@ bool is_swapped(const char byte_order) {
     return byte_order == '<' || byte_order == '>';
 }
 
-Shape shape_of(const py::array& array) {
-    return {array.shape(), array.shape() + array.ndim()};
+MemoryLayout layout_of(const py::array& array) {
+    return {static_cast<const unsigned char*>(array.data()),
+            {array.shape(), array.shape() + array.ndim()},
+            {array.strides(), array.strides() + array.ndim()}};
 }
 
 } // namespace
@@ -141,11 +143,14 @@ StoredType stored_type_of(const py::dtype& type, const std::string& name) {
     refuse(name, "has elements of type " + type_text(type) + "; " + advice_on(type));
 }
 
-NamedArray source_of(const py::array& array, const std::string& name) {
-    const MemoryLayout layout = {static_cast<const unsigned char*>(array.data()),
-                                 shape_of(array),
-                                 {array.strides(), array.strides() + array.ndim()}};
-    return {name, std::make_unique<MemoryArray>(stored_type_of(array.dtype(), name), layout)};
+bool is_in_fortran_order(const py::array& array) {
+    return is_in_fortran_order(layout_of(array), static_cast<std::size_t>(array.itemsize()));
+}
+
+NamedArray source_of(const py::array& array, const std::string& name,
+                     const bool by_fortran_positions) {
+    return {name, std::make_unique<MemoryArray>(stored_type_of(array.dtype(), name),
+                                                layout_of(array), by_fortran_positions)};
 }
 
 ArrayFacts facts_of(const py::dtype& type, Shape shape, Shape selected_shape,

@@ -22,8 +22,13 @@ std::string type_text(const pybind11::dtype& type);
 // a type that can be compared. `name` is that of the array.
 StoredType stored_type_of(const pybind11::dtype& type, const std::string& name);
 
-// The array as a source of elements, which does not keep it alive.
-NamedArray source_of(const pybind11::array& array, const std::string& name);
+// Whether `numpy.save` would store the array in Fortran order.
+bool is_in_fortran_order(const pybind11::array& array);
+
+// The array as a source of elements, which does not keep it alive. `by_fortran_positions` is for
+// arrays of which all that are compared, and the mask, are in Fortran order.
+NamedArray source_of(const pybind11::array& array, const std::string& name,
+                     bool by_fortran_positions = false);
 
 // What is reported about an array of a type and shape.
 ArrayFacts facts_of(const pybind11::dtype& type, Shape shape, Shape selected_shape,

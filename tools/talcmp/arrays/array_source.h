@@ -64,13 +64,16 @@ class ArraySource {
     // All elements by their positions, aligned, if they are in memory and need not be read.
     virtual const void* in_memory() const { return nullptr; }
 
-    // The extents of the blocks, one after another from index 0, that have to be read whole, such
-    // as compressed chunks; empty if elements can be read by their positions. An array in blocks is
+    // The extents of the blocks, one after another from index 0, that are best read whole, such as
+    // compressed chunks; empty if elements can be read by their positions. An array in blocks is
     // in C order, may be read in any order, and is read by `read_slab` alone.
     virtual const Shape& block() const {
         static const Shape none;
         return none;
     }
+
+    // Whether a part of a block takes as long to read as all of it.
+    virtual bool has_whole_blocks() const { return !block().empty(); }
 
     // Reads the elements of a slab, in C order, to `elements`. Throws Trouble.
     virtual void read_slab(const Slab& /*slab*/, void* /*elements*/) { assert(!"not in blocks"); }

@@ -78,7 +78,7 @@ std::array<bool, 3> copies_needed(const SelectedArrays& arrays) {
         return !linear && !array.source->random_access();
     };
     const bool mask_in_blocks =
-        arrays.mask.source != nullptr && !arrays.mask.source->block().empty();
+        arrays.mask.source != nullptr && arrays.mask.source->has_whole_blocks();
     return {needs_copy(arrays.first), blocks_clash(arrays) || needs_copy(arrays.second),
             arrays.mask.source != nullptr && (mask_in_blocks || needs_copy(arrays.mask))};
 }

@@ -33,7 +33,7 @@ BlockGrid common_grid(const BlockGrid& one, const BlockGrid& other, const std::u
     return {extent, 0};
 }
 
-// Along one axis of views of which one is in blocks.
+// Along one axis, wherever views that are not in blocks are cut.
 BlockGrid grid_of(const View& first, const View& second, const std::size_t axis) {
     constexpr BlockGrid anywhere = {1, 0};
     return common_grid(first.blocks.empty() ? anywhere : first.blocks[axis],
@@ -52,7 +52,8 @@ std::uint64_t smallest_box(const View& first, const View& second) {
 
 Traversal::Traversal(const View& first, const View& second, const bool column_major,
                      const std::size_t element_size, const View* const mask)
-    : in_blocks_(!first.blocks.empty() || !second.blocks.empty()) {
+    : in_blocks_(!first.blocks.empty() || !second.blocks.empty()
+                 || (mask != nullptr && !mask->blocks.empty())) {
     const Views views = {&first, &second, mask == nullptr ? &first : mask};
     for (std::size_t side = 0; side < views.size(); ++side) {
         offset_[side] = views[side]->offset;

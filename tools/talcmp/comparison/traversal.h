@@ -31,7 +31,7 @@ std::uint64_t smallest_box(const View& first, const View& second);
 class Traversal {
   public:
     // `first` and `second` have one shape, which has elements; so has the mask, if there is one.
-    // Only the two arrays may be stored in blocks. Boxes and the pairs in them are in column-major
+    // The mask's blocks may be cut by boxes. Boxes and the pairs in them are in column-major
     // order if both arrays are stored that way, else in row-major order.
     Traversal(const View& first, const View& second, bool column_major, std::size_t element_size,
               const View* mask = nullptr);
@@ -81,7 +81,7 @@ class Traversal {
 
     std::vector<Axis> axes_; // outermost first
     std::array<std::uint64_t, 3> offset_ = {};
-    bool in_blocks_; // whether one of the arrays is
+    bool in_blocks_; // whether one of them is
     std::uint64_t pair_count_ = 1;
     std::uint64_t box_count_ = 1;
     std::size_t largest_box_ = 1;
