@@ -12,7 +12,7 @@ import unittest
 
 import numpy as np
 
-from ranks import Folder, MarkedRun, read_bytes, run_alone, run_ranks, run_tests, talcmp_mpi
+from ranks import SETTINGS, Folder, MarkedRun, read_bytes, run_alone, run_ranks, run_tests, talcmp_mpi
 
 try:
     import h5py
@@ -23,6 +23,9 @@ except ImportError:
 SEED = int(os.environ.get("TALNUMERICARRAY_SEED", random.randrange(2**32)))
 print(f"seed {SEED}", file=sys.stderr)
 MIB = 2**20
+# Open MPI need not look for fast networks here, which takes longer than most runs; other tests of
+# talcmp-mpi let it.
+SETTINGS["OMPI_MCA_pml"] = "ob1"
 SOME_RANKS = 3  # most of what is compared is compared by so many
 # Of many pairs those up to 32 MiB are compared by one rank each; all ranks share what is larger.
 LARGE = 40 * MIB
