@@ -238,9 +238,9 @@ CallOptions CallOptionsReader::finish() && {
     return std::move(options_);
 }
 
-CallOptions call_options(const char* const function, const py::dict& arguments) {
+CallOptions call_options(const char* const function, const py::dict& given) {
     CallOptionsReader reader(function);
-    for (const auto& [name, value] : arguments) {
+    for (const auto& [name, value] : given) {
         reader.take(name, value);
     }
     return std::move(reader).finish();

@@ -36,6 +36,6 @@ class CallOptionsReader {
     bool has_tolerance_ = false;
 };
 
-CallOptions call_options(const char* function, const pybind11::dict& arguments);
+CallOptions call_options(const char* function, const pybind11::dict& given);
 
 } // namespace talcmp

@@ -62,7 +62,7 @@ py::tuple histogram_fields(const DigitCounts& counts) {
             bars.append(py::make_tuple(digits_of(static_cast<int>(i)), counts[i]));
         }
     }
-    return py::tuple(bars);
+    return bars;
 }
 
 py::object difference_kind(const Difference difference) {

@@ -4,6 +4,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <numeric>
+#include <utility>
 
 namespace talcmp {
 namespace {
@@ -130,11 +131,10 @@ bool is_in_fortran_order(const MemoryLayout& layout, const std::size_t size) {
            && is_packed(layout, size, true);
 }
 
-MemoryArray::MemoryArray(const StoredType& stored, const MemoryLayout& layout,
-                         const bool by_fortran_positions)
-    : stored_(stored), layout_(layout) {
+MemoryArray::MemoryArray(StoredType stored, MemoryLayout layout, const bool by_fortran_positions)
+    : stored_(std::move(stored)), layout_(std::move(layout)),
+      fortran_order_(by_fortran_positions && is_in_fortran_order(layout_, stored_.size)) {
     const bool c_order = !has_elements(layout_.shape) || is_packed(layout_, stored_.size, false);
-    fortran_order_ = by_fortran_positions && is_in_fortran_order(layout_, stored_.size);
     if (!c_order && !fortran_order_) {
         block_ = block_of(layout_);
     }

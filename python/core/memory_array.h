@@ -28,7 +28,7 @@ bool is_in_fortran_order(const MemoryLayout& layout, std::size_t element_size);
 // if all arrays of a comparison are.
 class MemoryArray : public ArraySource {
   public:
-    MemoryArray(const StoredType& stored, const MemoryLayout& layout, bool by_fortran_positions);
+    MemoryArray(StoredType stored, MemoryLayout layout, bool by_fortran_positions);
 
     const ElementType& type() const override { return *stored_.type; }
     std::string type_name() const override { return stored_.name; }
@@ -44,7 +44,7 @@ class MemoryArray : public ArraySource {
   private:
     StoredType stored_;
     MemoryLayout layout_;
-    bool fortran_order_ = false;
+    bool fortran_order_;
     Shape block_; // empty if the elements are read by their positions
 };
 

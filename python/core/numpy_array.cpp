@@ -30,7 +30,7 @@ bool is_masked(const py::handle object) {
 
 // The name of the package that defines the object's type.
 std::string package_of(const py::handle object) {
-    const py::object type = py::reinterpret_borrow<py::object>(py::type::handle_of(object));
+    const auto type = py::reinterpret_borrow<py::object>(py::type::handle_of(object));
     const auto module = py::str(py::getattr(type, "__module__", py::str("")));
     const auto name = static_cast<std::string>(module);
     return name.substr(0, name.find('.'));

@@ -78,10 +78,11 @@ void BoxComparer::compare(const Pairs& asked, const Pairs& stored, const Box& bo
 std::unique_ptr<unsigned char[]> BoxComparer::room_for(const Side side,
                                                        const ArraySource& source) const {
     const Traversal& traversal = plan_.traversal();
-    return traversal.in_memory(side, source, traversal.box(0)) != nullptr
-               ? nullptr
-               : std::unique_ptr<unsigned char[]>(
-                   new unsigned char[traversal.largest_box() * source.type().size]);
+    if (traversal.in_memory(side, source, traversal.box(0)) != nullptr) {
+        return nullptr;
+    }
+    const std::size_t size = traversal.largest_box() * source.type().size;
+    return std::unique_ptr<unsigned char[]>(new unsigned char[size]);
 }
 
 const void* BoxComparer::read(const Side side, ArraySource& source, const Box& box,

@@ -90,7 +90,7 @@ struct SortParts {
         // Some at a time as numbers as wide as the reals, and only then as bytes: in one loop,
         // compilers run out of registers.
         constexpr std::size_t at_once = 128;
-        std::array<BitsOf<Real>, at_once> wide;
+        std::array<BitsOf<Real>, at_once> wide = {};
         std::size_t begin = 0;
         for (; begin + at_once <= count; begin += at_once) {
             for (std::size_t i = 0; i < at_once; ++i) {
