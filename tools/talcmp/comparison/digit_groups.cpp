@@ -27,13 +27,6 @@ template <typename Real>
     return bits;
 }
 
-template <typename Real>
-[[gnu::always_inline]] inline Real real_of(const BitsOf<Real> bits) {
-    Real value = 0;
-    std::memcpy(&value, &bits, sizeof value);
-    return value;
-}
-
 // Without branches, so that compilers make vector instructions of it. The bits of two positive
 // normal numbers are ordered as the numbers are. Their difference has, above those of the
 // significand, the exponent of the power of two that is not above the quotient: one is borrowed if
