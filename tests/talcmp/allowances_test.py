@@ -13,11 +13,10 @@ from fractions import Fraction
 
 import numpy as np
 
-from support.talcmp_command import Folder, document_of, read_bytes, run, run_tests, summary
+from support.talcmp_command import EMULATED, Folder, document_of, read_bytes, run, run_tests, summary
 
 SEED = int(os.environ.get("TALNUMERICARRAY_SEED", random.randrange(2**32)))
 REALS_AND_INTEGERS = "i1 u1 i2 u2 i4 u4 i8 u8 f4 f8 c8 c16".split()
-EMULATED = any("qemu" in argument for argument in sys.argv)
 print(f"seed {SEED}", file=sys.stderr)
 
 
