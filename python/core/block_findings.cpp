@@ -122,12 +122,25 @@ Findings unpacked_findings(const py::tuple& state) {
 
 // ---- Functions
 
+void check_blocks(const py::array& block1, const py::array& block2, const std::size_t strides) {
+    const auto rank = static_cast<std::size_t>(block1.ndim());
+    if (block1.ndim() != block2.ndim()
+        || !std::equal(block1.shape(), block1.shape() + rank, block2.shape())) {
+        throw py::value_error("first and second are blocks of different shapes");
+    }
+    if (strides != rank) {
+        throw py::value_error("there are strides for " + std::to_string(strides)
+                              + " axes, but blocks have " + std::to_string(rank));
+    }
+}
+
 Findings find(const py::object& object1, const py::object& object2, const std::uint64_t first,
               std::vector<std::uint64_t> strides, const py::kwargs& arguments) {
     CallOptions options = call_options("find", arguments);
     options.question.report = true;
     const py::array block1 = array_of(object1, options.name1);
     const py::array block2 = array_of(object2, options.name2);
+    check_blocks(block1, block2, strides.size());
     const Findings findings = compare_blocks(block1, block2, options);
     return in_whole(findings, {first, std::move(strides)},
                     {block1.shape(), block1.shape() + block1.ndim()}, options.question.differences);

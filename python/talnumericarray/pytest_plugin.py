@@ -55,7 +55,7 @@ class _ColouredFailure:
         self._failure.toterminal(_ColouringWriter(writer) if writer.hasmarkup else writer)
 
 
-@pytest.hookimpl(hookwrapper=True)
+@pytest.hookimpl(hookwrapper=True)  # type: ignore[misc]
 def pytest_runtest_makereport(
     item: pytest.Item, call: "pytest.CallInfo[None]"
 ) -> Generator[None, Any, None]:
