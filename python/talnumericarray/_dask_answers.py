@@ -2,16 +2,13 @@
 
 from __future__ import annotations
 
+import inspect
 import itertools
-from concurrent.futures import CancelledError
 from typing import Any, Callable, Dict, List, Optional, Sequence, Tuple
 
 import dask
-import dask.local
-import dask.multiprocessing
 import dask.threaded
-from dask.base import DaskMethodsMixin, get_scheduler, tokenize
-from dask.callbacks import Callback
+from dask.base import DaskMethodsMixin, tokenize
 from dask.highlevelgraph import HighLevelGraph
 from dask.optimization import cull, fuse
 
@@ -109,64 +106,53 @@ class LazySame(Lazy):
     """A bool, which compute() returns. It stops at the first block that differs."""
 
     def compute(self, **options: Any) -> Any:
-        get = get_scheduler(
-            collections=[self], scheduler=options.get("scheduler"), get=options.get("get")
-        )
-        client: Any = getattr(get, "__self__", None)
-        by_client = hasattr(client, "scheduler_info") and not client.asynchronous
-        # Without the tree they run in row-major order; there are none if this was persisted.
-        leaves = list(filter(_is_leaf, self._graph))
-        if not leaves or not (by_client or getattr(get, "func", get) in _LOCAL_SCHEDULERS):
+        stopping = self._stopping_at_difference()
+        if stopping is None:
             return super().compute(**options)
-        is_optimized = options.get("optimize_graph", True)
-        graph = self.__dask_optimize__(self._graph, leaves) if is_optimized else self._graph
-        dasks_own = ("scheduler", "get", "traverse", "optimize_graph")
-        others = {name: value for name, value in options.items() if name not in dasks_own}
-        return (_all_by_client if by_client else _all_here)(get, graph, leaves, others)
+        try:
+            answer = stopping.compute(**options)
+        except DifferenceFound:
+            return False
+        return _awaited(answer) if inspect.isawaitable(answer) else answer
+
+    def _stopping_at_difference(self) -> Optional["_AllBlocks"]:
+        """The same with an error instead of False, which ends the computation at once under all
+        schedulers; None if there are no blocks to compare.
+        """
+        tasks = dict(self._graph.layers[self._key])
+        leaves = list(filter(_is_leaf, tasks))
+        if not leaves:
+            return None
+        key = f"{self._key}-or-stop"
+        graph = {(_LEAF + key, number): (_true_or_stop, tasks[leaf, number]) for leaf, number in leaves}
+        layers, needs = dict(self._graph.layers), dict(self._graph.dependencies)
+        del layers[self._key]
+        layers[key], needs[key] = graph, needs.pop(self._key)
+        return _AllBlocks(HighLevelGraph(layers, needs), key, self.pairs_of_blocks)
 
 
-def _all_by_client(
-    get: Callable[..., Any], graph: Any, leaves: List[Any], options: Dict[str, Any]
-) -> bool:
-    from distributed import as_completed
+class _AllBlocks(Lazy):
+    """Without a tree, so that blocks are compared in row-major order."""
 
-    futures = get(graph, leaves, sync=False, **options)
+    def __dask_keys__(self) -> List[Any]:
+        return list(self._graph.layers[self._key])
+
+    def __dask_postcompute__(self) -> Any:
+        return all, ()
+
+
+class DifferenceFound(Exception):
+    """Not the user's to see, but in a cluster's log."""
+
+
+def _true_or_stop(is_same: bool) -> bool:
+    if not is_same:
+        raise DifferenceFound("two blocks differ, which ends the comparison")
+    return True
+
+
+async def _awaited(answer: Any) -> Any:
     try:
-        for _, is_same in as_completed(futures, with_results=True):
-            if isinstance(is_same, CancelledError):
-                raise is_same
-            if not is_same:
-                return False
-        return True
-    finally:
-        # Cancelled, they would take with them what another result needs.
-        for future in futures:
-            future.release()
-
-
-def _all_here(
-    get: Callable[..., Any], graph: Any, leaves: List[Any], options: Dict[str, Any]
-) -> bool:
-    # In the call: what is registered may be taken by another thread's computation.
-    callbacks = [*Callback.active, (None, None, None, _stop_at_difference, None)]
-    try:
-        return all(get(graph, leaves, callbacks=callbacks, **options))
-    except _DifferenceFound:
+        return await answer
+    except DifferenceFound:
         return False
-
-
-_LOCAL_SCHEDULERS = (
-    dask.local.get_async,
-    dask.local.get_sync,
-    dask.multiprocessing.get,
-    dask.threaded.get,
-)
-
-
-class _DifferenceFound(Exception):
-    pass
-
-
-def _stop_at_difference(key: Any, result: Any, *_: Any) -> None:
-    if _is_leaf(key) and result is False:
-        raise _DifferenceFound
