@@ -2,9 +2,10 @@
 
 from __future__ import annotations
 
-from typing import Any, Dict, Hashable, Iterator, Tuple
+from typing import Any, Dict, Hashable, Iterator, Optional, Tuple
 
 import numpy
+import pandas
 import xarray
 
 from talnumericarray import _core
@@ -12,8 +13,10 @@ from talnumericarray._comparison import Comparison, compare
 
 
 def assert_same(first: Any, second: Any, /, **options: Any) -> None:
-    """Raises an AssertionError unless both have the same variables, and each of these is the same
-    in both; the text names the variables. Attributes are not compared.
+    """Raises an AssertionError unless both have the same variables and coordinates, and each of these
+    has the same dimensions and is the same in both; the text names all that differ. Numbers are
+    compared as the options say, text and dates exactly; attributes and the names of data arrays are
+    not compared.
     """
     __tracebackhide__ = True
     names = options.pop("names", None) or ("first", "second")
@@ -74,8 +77,31 @@ def _problem(
         comparison = _comparison(first.data, second.data, options)
         if comparison is not None:
             yield comparison
-    elif not first.equals(second):
-        yield f"{names[0]} and {names[1]} differ, and are no numbers: {first.dtype}, {second.dtype}"
+    else:
+        difference = _other_difference(first, second)
+        if difference is not None:
+            yield f"{names[0]} and {names[1]} differ: {difference}"
+
+
+def _other_difference(first: xarray.Variable, second: xarray.Variable) -> Optional[str]:
+    """Of two variables that are not both of numbers."""
+    if first.shape != second.shape:
+        return f"shapes {first.shape} and {second.shape}"
+    if first.dtype.kind != second.dtype.kind:
+        return f"types {first.dtype} and {second.dtype}"
+    values1, values2 = first.values, second.values
+    # None, NaN and "not a time" are the same as themselves.
+    differs = (values1 != values2) & ~(pandas.isnull(values1) & pandas.isnull(values2))
+    if not differs.any():
+        return None
+    index = tuple(numpy.argwhere(differs)[0].tolist())
+    return f"{list(index)}: {_shown(values1[index])} and {_shown(values2[index])}"
+
+
+def _shown(value: Any) -> str:
+    if isinstance(value, (numpy.datetime64, numpy.timedelta64)):
+        return str(value)
+    return repr(value.item() if isinstance(value, numpy.generic) else value)
 
 
 def _is_number(variable: xarray.Variable) -> bool:
@@ -85,7 +111,7 @@ def _is_number(variable: xarray.Variable) -> bool:
     )
 
 
-def _comparison(first: Any, second: Any, options: Dict[str, Any]) -> "Comparison | None":
+def _comparison(first: Any, second: Any, options: Dict[str, Any]) -> Optional[Comparison]:
     """None if the two are the same."""
     if hasattr(first, "dask") or hasattr(second, "dask"):
         import talnumericarray.dask
