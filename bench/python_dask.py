@@ -2,9 +2,9 @@
 """Times comparisons of Dask arrays: python_dask.py [--quick]; PYTHONPATH has the package.
 
 Prints rows as JSON, each with a "name" and the best of some repetitions:
-- "build", "optimize", "compare, threads", "same, threads" and "sum, threads": microseconds a block, of
-  arrays with small blocks; the sum is that of one of the arrays, by Dask alone. "compare" and "same"
-  include what "optimize" takes, but not "build".
+- "build", "optimize", "compare, threads", "same, threads" and "sum, threads": microseconds a block,
+  of arrays with small blocks; the sum is that of one of the arrays, by Dask alone. "compare" and
+  "same" include what "optimize" takes, but not "build".
 - "one worker" and "two workers": seconds for `compare` of two Zarr stores, each worker a process
   with one thread; "bytes" of both arrays.
 - "ratio": how many times faster two workers are.

@@ -42,7 +42,7 @@ class Lazy(DaskMethodsMixin):  # type: ignore[misc]
         merge: Callable[[List[Any]], Any],
         conclude: Callable[[Optional[Any]], Any],
     ) -> Any:
-        """`conclude` is called with the results of all leaves merged; with None if there are none."""
+        """`conclude` is called with the leaves' results merged; with None if there are none."""
         token = tokenize(cls.__name__, problem.arrays, problem.conclusion)
         level: List[Any] = [(_LEAF + token, i) for i in range(len(leaves))]
         graph: Graph = dict(zip(level, leaves))
@@ -124,7 +124,9 @@ class LazySame(Lazy):
         if not leaves:
             return None
         key = f"{self._key}-or-stop"
-        graph = {(_LEAF + key, number): (_true_or_stop, tasks[leaf, number]) for leaf, number in leaves}
+        graph = {
+            (_LEAF + key, number): (_true_or_stop, tasks[leaf, number]) for leaf, number in leaves
+        }
         layers, needs = dict(self._graph.layers), dict(self._graph.dependencies)
         del layers[self._key]
         layers[key], needs[key] = graph, needs.pop(self._key)

@@ -13,10 +13,10 @@ from talnumericarray._comparison import Comparison, compare
 
 
 def assert_same(first: Any, second: Any, /, **options: Any) -> None:
-    """Raises an AssertionError unless both have the same variables and coordinates, and each of these
-    has the same dimensions and is the same in both; the text names all that differ. Numbers are
-    compared as the options say, text and dates exactly; attributes and the names of data arrays are
-    not compared.
+    """Raises an AssertionError unless both have the same variables and coordinates, and each of
+    these has the same dimensions and is the same in both; the text names all that differ. Numbers
+    are compared as the options say, text and dates exactly; attributes and the names of data arrays
+    are not compared.
     """
     __tracebackhide__ = True
     names = options.pop("names", None) or ("first", "second")

@@ -104,6 +104,7 @@ def assert_same(first: Any, second: Any, /, **options: "Unpack[CompareOptions]")
     >>> td.assert_same(a, a.rechunk(300))
     """
     __tracebackhide__ = True
-    alone: Any = {name: value for name, value in options.items() if name not in ("max_places", "names")}
+    of_report = ("max_places", "names")
+    alone: Any = {name: value for name, value in options.items() if name not in of_report}
     if not same(first, second, **alone).compute():
         raise NotSameError(compare(first, second, **options).compute())

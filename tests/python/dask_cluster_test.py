@@ -78,7 +78,8 @@ class Stores(NamedTuple):
 def stores(tmp_path_factory: pytest.TempPathFactory) -> Stores:
     folder = tmp_path_factory.mktemp("stores")
     names = ("first", "second")
-    stores = Stores(*(tuple(str(folder / f"{n}.{kind}") for n in names) for kind in ("zarr", "npy")))
+    kinds = ("zarr", "npy")
+    stores = Stores(*(tuple(str(folder / f"{name}.{kind}") for name in names) for kind in kinds))
     size = BLOCKS * BLOCK
     for which in (0, 1):
         blocks = BLOCK // (which + 1)
@@ -109,7 +110,8 @@ def test_blocks_do_not_pile_up_in_workers(client: Any, stores: Stores) -> None:
     assert td.same(*(array[:BLOCK] for array in stores.lazy()), equal_nan=True).compute() is False
     assert td.compare(*stores.lazy()).compute().pairs == BLOCKS * BLOCK
     after = client.run(peak_memory)
-    print("peak memory in MiB:", [b >> 20 for b in before.values()], [a >> 20 for a in after.values()])
+    for when, peaks in (("before", before), ("after", after)):
+        print(f"peak memory {when}, in MiB:", [peak >> 20 for peak in peaks.values()])
     assert len(after) == 2
     if IS_LARGE:
         assert sum(array.nbytes for array in stores.lazy()) > 4 * 2 * MEMORY_LIMIT

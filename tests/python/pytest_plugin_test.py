@@ -42,10 +42,11 @@ REPORT = tna.compare(
 
 
 def output_of(folder: Path, *options: str) -> str:
-    (folder / "test_arrays.py").write_text(TESTS)
+    test = folder / "test_arrays.py"
+    test.write_text(TESTS)
     paths = [path for path in sys.path if path]
     run = subprocess.run(
-        [sys.executable, "-m", "pytest", "-p", "no:cacheprovider", "-q", *options, "test_arrays.py"],
+        [sys.executable, "-m", "pytest", "-q", "-p", "no:cacheprovider", *options, test.name],
         cwd=folder,
         env={**os.environ, "PYTHONPATH": os.pathsep.join(paths), "COLUMNS": "100"},
         stdout=subprocess.PIPE,
