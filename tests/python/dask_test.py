@@ -134,6 +134,18 @@ def test_answers_are_those_for_whole_arrays(scheduler: str, seeds: List[int]) ->
     assert min(differing, len(seeds) - differing, empty) >= len(seeds) // 10
 
 
+@pytest.mark.parametrize("slices", ["1:,::-2", (3, slice(None, 1, -1)), "...,1::2", (-2, ..., 1)])
+@pytest.mark.parametrize("squeeze", [False, True])
+def test_places_are_those_in_the_whole_array(slices: Any, squeeze: bool) -> None:
+    first = np.arange(120.0).reshape(5, 6, 4)
+    second = first + 1
+    options: Dict[str, Any] = {"slices": slices, "squeeze": squeeze, "max_places": 1000}
+    whole = tna.compare(first, second, **options)
+    blocks = da.from_array(first, chunks=(2, 4, 3)), da.from_array(second, chunks=(3, 2, 2))
+    assert len(whole.places) == whole.pairs > 5
+    assert td.compare(*blocks, **options).compute() == whole
+
+
 def values_of(comparison: tna.Comparison) -> List[str]:
     places = [*comparison.places, *([comparison.worst] if comparison.worst else [])]
     return [repr((place.first, place.second)) for place in places]
