@@ -1,6 +1,7 @@
 #include "allowances.h"
 
 #include "element_parts.h"
+#include "two_sum.h"
 
 #include <algorithm>
 #include <array>
@@ -11,18 +12,6 @@ namespace talcmp {
 namespace {
 
 // ---- Exact sums (Shewchuk, Adaptive precision floating-point arithmetic, 1997)
-
-struct TwoSum {
-    double sum;
-    double error; // what rounding took from the sum; exact unless the sum overflows
-};
-
-TwoSum two_sum(const double a, const double b) {
-    const double sum = a + b;
-    const double b_part = sum - a;
-    const double a_part = sum - b_part;
-    return {sum, (a - a_part) + (b - b_part)};
-}
 
 // The sign of the exact sum. Grows an expansion whose components do not overlap, in ascending order
 // of magnitude: the last one that is not zero has the sign of all.

@@ -1,12 +1,15 @@
 #include "largest_differences.h"
 
 #include "element_parts.h"
+#include "two_sum.h"
 #include "widest_vectors.h"
 
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstddef>
+#include <cstdint>
+#include <cstring>
 #include <limits>
 
 namespace talcmp {
@@ -60,12 +63,33 @@ struct AddReals {
     }
 };
 
+// The exact sum of x, -y and the rests, rounded once. What is left of the larger sum and the rests
+// is rounded to an odd number, which keeps the last rounding from taking it for a tie (Boldo and
+// Melquiond, Emulation of FMA and correctly rounded sums, 2008).
+double difference_of_sums(const double x, const double y, const double rests) {
+    const TwoSum whole = two_sum(x, -y);
+    if (!std::isfinite(whole.sum)) {
+        return whole.sum;
+    }
+    const TwoSum left = two_sum(whole.error, rests);
+    double odd = left.sum;
+    if (left.error != 0) {
+        std::uint64_t bits = 0;
+        std::memcpy(&bits, &odd, sizeof bits);
+        if (bits % 2 == 0) {
+            odd = std::nextafter(
+                odd, std::copysign(std::numeric_limits<double>::infinity(), left.error));
+        }
+    }
+    return whole.sum + odd;
+}
+
 void add_sums(const double* const x, const double* const x_rests, const double* const y,
               const double* const y_rests, const std::size_t count, LargestDifferences& largest) {
     for (std::size_t i = 0; i < count; ++i) {
         const double rests =
             (x_rests == nullptr ? 0 : x_rests[i]) - (y_rests == nullptr ? 0 : y_rests[i]);
-        take(x[i], y[i], std::fabs((x[i] - y[i]) + rests), largest);
+        take(x[i], y[i], std::fabs(difference_of_sums(x[i], y[i], rests)), largest);
     }
 }
 
