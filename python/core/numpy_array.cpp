@@ -96,9 +96,9 @@ constexpr std::array<type_t, own_types> ids = {0,
                                                id_of<std::complex<float>>,
                                                id_of<std::complex<double>>};
 
-// NumPy writes this machine's byte order as '='.
+// NumPy usually writes this machine's byte order as '=', but not for types that come from ctypes.
 bool is_swapped(const char byte_order) {
-    return byte_order == '<' || byte_order == '>';
+    return byte_order == (__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__ ? '>' : '<');
 }
 
 MemoryLayout layout_of(const py::array& array) {
