@@ -17,9 +17,18 @@ std::string shown_value(const py::handle value) {
     return static_cast<std::string>(py::repr(value));
 }
 
+std::string refusal(const std::string& argument, const std::string& takes, const py::handle value) {
+    return argument + " takes " + takes + ", not " + shown_value(value);
+}
+
 [[noreturn]] void refuse(const std::string& argument, const std::string& takes,
                          const py::handle value) {
-    throw py::value_error(argument + " takes " + takes + ", not " + shown_value(value));
+    throw py::value_error(refusal(argument, takes, value));
+}
+
+[[noreturn]] void refuse_type(const std::string& argument, const std::string& takes,
+                              const py::handle value) {
+    throw py::type_error(refusal(argument, takes, value));
 }
 
 // ---- Values
@@ -27,12 +36,14 @@ std::string shown_value(const py::handle value) {
 double real_from(const char* const argument, const std::string& takes, const py::handle value) {
     const double real = PyFloat_AsDouble(value.ptr());
     if (real == -1 && PyErr_Occurred() != nullptr) {
-        if (PyErr_ExceptionMatches(PyExc_TypeError) != 0) {
-            PyErr_Clear();
-            throw py::type_error(std::string(argument) + " takes " + takes + ", not "
-                                 + shown_value(value));
+        const py::error_already_set error;
+        if (error.matches(PyExc_TypeError)) {
+            refuse_type(argument, takes, value);
         }
-        throw py::error_already_set();
+        if (error.matches(PyExc_OverflowError)) {
+            refuse(argument, takes, value);
+        }
+        throw error;
     }
     if (std::isnan(real)) {
         refuse(argument, takes, value);
@@ -49,7 +60,11 @@ bool flag_from(const py::handle value) {
 }
 
 // As near as 64 bits come, as in Python's own slices.
-std::int64_t index_from(const py::handle value) {
+std::int64_t index_from(const char* const argument, const std::string& takes,
+                        const py::handle value) {
+    if (PyIndex_Check(value.ptr()) == 0) {
+        refuse_type(argument, takes, value);
+    }
     const auto index = py::reinterpret_steal<py::object>(PyNumber_Index(value.ptr()));
     if (!index) {
         throw py::error_already_set();
@@ -63,25 +78,32 @@ std::int64_t index_from(const py::handle value) {
 
 template <typename Number>
 Number number_from(const char* const argument, const Number most, const py::handle value) {
-    const std::int64_t number = index_from(value);
+    const std::string takes = "a whole number from 1 to " + std::to_string(most);
+    const std::int64_t number = index_from(argument, takes, value);
     if (number < 1 || number > static_cast<std::int64_t>(most)) {
-        refuse(argument, "a number from 1 to " + std::to_string(most), value);
+        refuse(argument, takes, value);
     }
     return static_cast<Number>(number);
 }
 
 // ---- Slices
 
+std::int64_t slice_index_from(const py::handle value) {
+    return index_from("slices",
+                      "integers, slices and '...' as in an index, or a text such as \"0:10,:,3\"",
+                      value);
+}
+
 AxisRange range_from(const py::handle item) {
     AxisRange range;
     if (!PySlice_Check(item.ptr())) {
-        range.start = index_from(item);
+        range.start = slice_index_from(item);
         range.one_index = true;
         return range;
     }
     const auto bound = [&](const char* const name) -> std::optional<std::int64_t> {
         const py::object value = item.attr(name);
-        return value.is_none() ? std::nullopt : std::optional(index_from(value));
+        return value.is_none() ? std::nullopt : std::optional(slice_index_from(value));
     };
     range.start = bound("start");
     range.stop = bound("stop");
@@ -118,6 +140,20 @@ Selection selection_from(const py::handle value) {
     return selection_from_items(py::isinstance<py::tuple>(value)
                                     ? py::reinterpret_borrow<py::tuple>(value)
                                     : py::make_tuple(value));
+}
+
+// ---- Names
+
+std::pair<std::string, std::string> names_from(const py::handle value) {
+    const bool is_pair = (PyTuple_Check(value.ptr()) != 0 || PyList_Check(value.ptr()) != 0)
+                         && PySequence_Size(value.ptr()) == 2;
+    if (is_pair) {
+        const auto names = py::reinterpret_borrow<py::sequence>(value);
+        if (py::isinstance<py::str>(names[0]) && py::isinstance<py::str>(names[1])) {
+            return {names[0].cast<std::string>(), names[1].cast<std::string>()};
+        }
+    }
+    refuse_type("names", "two texts", value);
 }
 
 // ---- Arguments by their names
@@ -183,15 +219,13 @@ constexpr std::array arguments = {
     Argument{"progress",
              [](CallOptions& options, const py::handle value) {
                  if (PyCallable_Check(value.ptr()) == 0) {
-                     throw py::type_error("progress takes a function of two numbers, not "
-                                          + shown_value(value));
+                     refuse_type("progress", "a function of two numbers", value);
                  }
                  options.progress = py::reinterpret_borrow<py::object>(value);
              }},
     Argument{"names",
              [](CallOptions& options, const py::handle value) {
-                 std::tie(options.name1, options.name2) =
-                     value.cast<std::pair<std::string, std::string>>();
+                 std::tie(options.name1, options.name2) = names_from(value);
              }},
 };
 

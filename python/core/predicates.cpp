@@ -93,6 +93,7 @@ bool same(const py::handle object1, const py::handle object2, const CallOptions&
     }
     CallOptions any_place = options;
     any_place.question.only_whether = true;
+    any_place.question.differences = 1;
     return compare_arrays(first, second, any_place).difference == Difference::none;
 }
 
