@@ -151,23 +151,23 @@ def compare(first: Any, second: Any, /, **options: "Unpack[CompareOptions]") -> 
 
     >>> import talnumericarray as tna
     >>> print(tna.compare([0.5, 1.0], [0.5, 1.0 + 2**-50]))
-    first and second differ: [1]: 1.0 and 1.0000000000000009 (the same from tol=4 on)
+    first and second differ: [1]: 1 and 1.0000000000000009 (the same from tol=3 on)
       first array           float64 (2,)
       second array          float64 (2,)
       tolerance             0 binary digits
       pairs                 2
       differing             1 (50 %)
-      first place           [1]: 1.0 and 1.0000000000000009 (the same from tol=4 on)
-      worst place           [1]: 1.0 and 1.0000000000000009 (the same from tol=4 on)
-      largest difference    4 binary digits
+      first place           [1]: 1 and 1.0000000000000009 (the same from tol=3 on)
+      worst place           [1]: 1 and 1.0000000000000009 (the same from tol=3 on)
+      largest difference    3 binary digits
       absolute difference   at most 8.881784197001252e-16
       relative difference   at most 8.881784197001244e-16
-      smallest tolerance    tol=4
+      smallest tolerance    tol=3
       NaNs                  0 and 0
       infinities            0 and 0
       negative zeros        0 and 0
       digits that differ, number of pairs
                   0 1 #############################################################
-                  4 1 #############################################################
+                  3 1 #############################################################
     """
     return comparison_of(_core.compare(first, second, **options))
