@@ -100,9 +100,9 @@ bool same(const py::handle object1, const py::handle object2, const CallOptions&
 bool equivalent(const py::handle object1, const py::handle object2) {
     const py::array first = array_of(object1, "first");
     const py::array second = array_of(object2, "second");
-    return stored_type_of(first.dtype(), "first").name
-               == stored_type_of(second.dtype(), "second").name
-           && first.ndim() == second.ndim()
+    const StoredType type1 = stored_type_of(first.dtype(), "first");
+    const StoredType type2 = stored_type_of(second.dtype(), "second");
+    return type1.name == type2.name && first.ndim() == second.ndim()
            && std::equal(first.shape(), first.shape() + first.ndim(), second.shape());
 }
 
