@@ -134,8 +134,9 @@ PyCFunction as_c_function(Function* const function) {
 
 void add(py::module_& module, PyMethodDef& definition) {
     const py::object name = module.attr("__name__");
-    module.add_object(definition.ml_name, py::reinterpret_steal<py::object>(
-                                              PyCFunction_NewEx(&definition, nullptr, name.ptr())));
+    // Of a function that is bound to the module, inspect.signature leaves out $module.
+    module.add_object(definition.ml_name, py::reinterpret_steal<py::object>(PyCFunction_NewEx(
+                                              &definition, module.ptr(), name.ptr())));
 }
 
 } // namespace

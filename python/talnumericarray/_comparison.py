@@ -124,18 +124,16 @@ class Comparison:
 def comparison_of(fields: "dict[str, Any]") -> Comparison:
     """A comparison from what the compiled part has found."""
     worst = fields["worst"]
-    return Comparison(
-        **{
-            **fields,
-            "first": ArrayFacts(*fields["first"]),
-            "second": ArrayFacts(*fields["second"]),
-            "places": tuple(Place(*place) for place in fields["places"]),
-            "worst": None if worst is None else Place(*worst),
-            "first_values": ValueCounts(*fields["first_values"]),
-            "second_values": ValueCounts(*fields["second_values"]),
-            "histogram": tuple(Bar(*bar) for bar in fields["histogram"]),
-        }
-    )
+    objects: "dict[str, Any]" = {
+        "first": ArrayFacts(*fields["first"]),
+        "second": ArrayFacts(*fields["second"]),
+        "places": tuple(Place(*place) for place in fields["places"]),
+        "worst": None if worst is None else Place(*worst),
+        "first_values": ValueCounts(*fields["first_values"]),
+        "second_values": ValueCounts(*fields["second_values"]),
+        "histogram": tuple(Bar(*bar) for bar in fields["histogram"]),
+    }
+    return Comparison(**{**fields, **objects})
 
 
 @shows(CompareOptions)

@@ -1,6 +1,6 @@
 """The compiled part of talnumericarray."""
 
-from typing import Any, Callable, Dict, List, Optional, SupportsFloat, Tuple, Union, final
+from typing import Any, Callable, Dict, List, Optional, Sequence, SupportsFloat, Tuple, Union, final
 
 from numpy import dtype
 from numpy.typing import ArrayLike
@@ -29,7 +29,7 @@ def compare(first: Any, second: Any, /, **kwargs: Any) -> Dict[str, Any]: ...
 class Findings: ...
 
 def find(
-    first: Any, second: Any, number: int, strides: List[int], /, **kwargs: Any
+    first: Any, second: Any, number: int, strides: Sequence[int], /, **kwargs: Any
 ) -> Findings: ...
 def merge(parts: List[Findings], /) -> Findings: ...
 def conclude(

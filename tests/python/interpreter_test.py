@@ -299,6 +299,11 @@ except KeyboardInterrupt:
                                   "tna.assert_same(first, second, threads=1)",
                                   "tna.same(first[::-1], second, progress=lambda *_: None)"])
 def test_interrupt(call):
+    # On a busy machine, a process may have to wait for its turn; not each time.
+    assert min(seconds_to_end(call) for _ in range(3)) < (1 if SANITIZED else 0.1)
+
+
+def seconds_to_end(call):
     with subprocess.Popen([sys.executable, "-c", INTERRUPTED.format(path=sys.path, call=call)],
                           stdout=subprocess.PIPE, text=True) as process:
         assert process.stdout.readline() == "begins\n"
@@ -307,7 +312,7 @@ def test_interrupt(call):
         process.send_signal(signal.SIGINT)
         ended = float(process.stdout.readline())
     assert process.returncode == 0
-    assert ended - sent < (1 if SANITIZED else 0.1)
+    return ended - sent
 
 
 # ---- What is returned
