@@ -45,7 +45,8 @@ def assert_same(first: Any, second: Any, /, **options: "Unpack[CompareOptions]")
 
         _xarray.assert_same(first, second, **options)
         return
-    if not _core.same(first, second, **options):
+    checked: "dict[str, Any]" = {**options}
+    if not _core.same(first, second, **checked):
         raise NotSameError(compare(first, second, **options))
 
 
