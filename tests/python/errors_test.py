@@ -192,8 +192,8 @@ def test_compare_takes_two_arrays_by_position():
 
 
 def test_none_stands_for_the_default():
-    everything = dict.fromkeys(["tol", "relative", "absolute", "equal_nan", "strict_type", "squeeze",
-                                "slices", "ignore", "threads", "progress"])
+    everything = dict.fromkeys(["tol", "relative", "absolute", "equal_nan", "strict_type",
+                                "squeeze", "slices", "ignore", "threads", "progress"])
     assert tna.same(ARRAY, ARRAY, **everything) is True
     assert tna.compare(ARRAY, ARRAY, max_places=None, names=None, **everything) \
         == tna.compare(ARRAY, ARRAY)

@@ -1,5 +1,5 @@
-"""The package as a guest of the interpreter: references, threads, processes, signals, callbacks, and
-the objects that it returns."""
+"""The package as a guest of the interpreter: references, threads, processes, signals, callbacks,
+and the objects that it returns."""
 
 import copy
 import gc
@@ -294,7 +294,8 @@ except KeyboardInterrupt:
 """
 
 
-@pytest.mark.parametrize("call", ["tna.same(first, second)", "tna.compare(first, second, threads=1)",
+@pytest.mark.parametrize("call", ["tna.same(first, second)",
+                                  "tna.compare(first, second, threads=1)",
                                   "tna.compare(first, second, threads=2)",
                                   "tna.assert_same(first, second, threads=1)",
                                   "tna.same(first[::-1], second, progress=lambda *_: None)"])

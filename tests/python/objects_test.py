@@ -169,7 +169,8 @@ def views():
             "transposed": (values.T, values.T.copy()),
             "other byte order": (values, values.astype(">f8")),
             "other type": (values.astype("f2"), values.astype("f2").astype("f4")),
-            "unaligned": (np.frombuffer(b"-" + values.tobytes(), "f8", values.size, 1), values.ravel()),
+            "unaligned": (np.frombuffer(b"-" + values.tobytes(), "f8", values.size, 1),
+                          values.ravel()),
             "mask in another order": (values, values.copy())}
 
 

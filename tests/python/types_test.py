@@ -73,7 +73,8 @@ def test_help_shows_all_keywords():
     same = list(_options.SameOptions.__annotations__)
     assert list(inspect.signature(tna.same).parameters) == arrays + same
     for function in (tna.compare, tna.assert_same):
-        assert list(inspect.signature(function).parameters) == arrays + same + ["max_places", "names"]
+        parameters = list(inspect.signature(function).parameters)
+        assert parameters == arrays + same + ["max_places", "names"]
 
 
 def test_everything_public_is_documented():
