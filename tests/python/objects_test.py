@@ -203,4 +203,3 @@ print(resource.getrusage(resource.RUSAGE_SELF).ru_maxrss - before)
     traced, resident = map(int, output.split())
     assert traced < 200_000
     assert resident < 14_000  # KiB; the smaller arrays have 16 MB
-    assert tracemalloc.is_tracing() is False
