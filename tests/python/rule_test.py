@@ -6,6 +6,7 @@ import random
 import warnings
 
 import numpy as np
+import pytest
 from hypothesis import HealthCheck, assume, given, settings
 from hypothesis import strategies as st
 
@@ -89,3 +90,25 @@ def test_every_pair_of_types():
             first, second = drawn_arrays.arrays(rng, type1, type2, (3, 7))
             check(drawn_arrays.stored(rng, first), drawn_arrays.stored(rng, second),
                   {"tol": rng.choice([0, 1, 10, 52]), "max_places": 100}, {})
+
+
+@pytest.mark.parametrize("dtype", ["f4", "f8"])
+def test_differences_of_every_size(dtype):
+    """From one unit to more than all digits, of numbers of all magnitudes, side by side: also of
+    the smallest ones, whose differences have no more digits."""
+    info = np.finfo(dtype)
+    smallest = float(info.smallest_normal)
+    bases = [smallest * factor for factor in (0.25, 0.75, 1, 1.5, 2, 3.75, 2.0**10, 2.0**info.nmant)]
+    bases += [1.0, 1.75, float(info.max) / 4]
+    first = np.repeat(np.array(bases, dtype), info.nmant + 2)
+    bits = first.view(f"u{first.itemsize}")
+    steps = np.tile([1 << step for step in range(info.nmant + 2)], len(bases)).astype(bits.dtype)
+    for second in ((bits + steps).view(dtype), (bits + steps // 2 * 3).view(dtype)):
+        for options in ({"max_places": 10000}, {"tol": info.nmant // 2, "max_places": 10000}):
+            check(first, second, options, {})
+        check(-second * dtype_complex(dtype), -first * dtype_complex(dtype), options, {})
+
+
+def dtype_complex(dtype):
+    """The imaginary unit, so that products are exact."""
+    return np.array(1j, {"f4": "c8", "f8": "c16"}[dtype])
