@@ -179,3 +179,15 @@ def test_units_in_the_last_place(dtype, bits, scale):
 def test_equivalent(first, second, expected):
     assert tna.equivalent(first, second) is expected
     assert tna.equivalent(second, first) is expected
+
+
+@pytest.mark.parametrize("dtype, tolerance", [("f8", 52.5), ("f4", 23.5)])
+def test_tolerance_that_leaves_less_than_one_digit(dtype, tolerance):
+    """The answer does not depend on what the thread compared before: 1 and 2.5 differ by 1.5, where
+    2^-0.5 times the larger is 1.77."""
+    first, second = np.array([1, 1], dtype), np.array([2.5, 1], dtype)
+    for compared in (lambda: tna.same(first, second, tol=tolerance),
+                     lambda: tna.same(first[::-1], second[::-1], tol=tolerance),
+                     lambda: tna.compare(first, second, tol=tolerance).same):
+        assert not tna.same(first, second, tol=3)  # this tolerance is the last one
+        assert compared() is True
