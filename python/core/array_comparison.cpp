@@ -151,7 +151,8 @@ Findings compare_blocks(const py::array& first, const py::array& second,
         const Traversal traversal(view1, view2, column_major(array1, array2),
                                   std::max(array1.type().size, array2.type().size),
                                   ignored == nullptr ? nullptr : &ignored_view);
-        const BoxPlan plan(traversal, array1, array2, ignored, options.question, {});
+        const DifferenceMaps no_maps;
+        const BoxPlan plan(traversal, array1, array2, ignored, options.question, no_maps);
         AllBoxes all;
         return compare_boxes(plan, thread_count(plan), all, progress);
     });

@@ -26,6 +26,8 @@ class BoxPlan {
     // `mask` may be null.
     BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second, ArraySource* mask,
             const Question& question, const DifferenceMaps& maps);
+    BoxPlan(const Traversal& traversal, ArraySource& first, ArraySource& second, ArraySource* mask,
+            const Question& question, DifferenceMaps&& maps) = delete; // would be gone too soon
 
     const Traversal& traversal() const { return traversal_; }
     ArraySource& first() const { return first_; }
