@@ -1,5 +1,5 @@
-# Debian packages by CPack: libtalnumericarray-dev, talcmp and, if it is built, talcmp-mpi, for
-# whatever architecture is built.
+# Debian packages by CPack: libtalnumericarray-dev, talcmp and, if they are built, talcmp-mpi and
+# python3-talnumericarray, for whatever architecture is built.
 
 find_program(TALNUMERICARRAY_DPKG_ARCHITECTURE dpkg-architecture)
 if(NOT TALNUMERICARRAY_DPKG_ARCHITECTURE)
@@ -70,6 +70,27 @@ if(TARGET talcmp_mpi)
 talcmp-mpi says what talcmp says about arrays in files, and has the same options. It divides the work
 between the processes that mpirun or srun starts, on one computer or on several that see the same
 files.")
+endif()
+
+if(TARGET talnumericarray_python)
+  list(APPEND CPACK_COMPONENTS_ALL Python)
+  get_directory_property(minor DIRECTORY python DEFINITION Python3_VERSION_MINOR)
+  math(EXPR next_minor "${minor} + 1")
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-talnumericarray)
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
+  # The compiled part is for one version of Python.
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
+      "python3 (>= 3.${minor}), python3 (<< 3.${next_minor}), python3-numpy")
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SHLIBDEPS ON)
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SUGGESTS "python3-dask, python3-pytest, python3-xarray")
+  # They compile the modules, and remove what Python has made of them, as Debian's packages do.
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/debian_python/postinst
+                                                ${CMAKE_CURRENT_LIST_DIR}/debian_python/prerm)
+  set(CPACK_COMPONENT_PYTHON_DESCRIPTION
+      "Compare NumPy arrays exactly
+The Python package talnumericarray says whether two arrays of numbers are the same, where they differ
+and by how much, under a tolerance in binary digits. It compares NumPy's, Dask's and xarray's arrays,
+and has an assertion for pytest.")
 endif()
 
 include(CPack)

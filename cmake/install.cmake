@@ -1,6 +1,7 @@
 # What `cmake --install` lays down: the library, in the component Development, talcmp, in the
-# component Runtime, and talcmp-mpi, if it is built, in the component Mpi. None of it contains the
-# prefix, which may be moved afterwards, unless CMAKE_INSTALL_LIBDIR is absolute.
+# component Runtime, and, if they are built, talcmp-mpi, in the component Mpi, and the Python package,
+# in the component Python. None of it contains the prefix, which may be moved afterwards, unless
+# CMAKE_INSTALL_LIBDIR is absolute.
 
 option(TALNUMERICARRAY_DEBIAN_PACKAGES "Lay files down as Debian does, and let CPack package them"
        OFF)
@@ -107,4 +108,34 @@ if(TARGET talcmp_mpi)
   talnumericarray_install_manual(Mpi ${PROJECT_SOURCE_DIR}/tools/talcmp_mpi/talcmp-mpi.1)
   talnumericarray_install(Mpi ${CMAKE_INSTALL_DATADIR}/doc/talcmp-mpi
                           ${PROJECT_SOURCE_DIR}/docs/mpi.md ${PROJECT_SOURCE_DIR}/docs/mpi.svg)
+endif()
+
+# ---- The Python package
+
+if(TARGET talnumericarray_python)
+  # Where its interpreter looks, below the prefix. Debian's finds what it has itself in a folder for
+  # all versions, and what is installed locally in one for its own.
+  foreach(variable SITEARCH VERSION_MAJOR VERSION_MINOR)
+    get_directory_property(python_${variable} DIRECTORY python DEFINITION Python3_${variable})
+  endforeach()
+  if(TALNUMERICARRAY_DEBIAN_PACKAGES)
+    set(python_folder lib/python3/dist-packages)
+  elseif(python_SITEARCH MATCHES "lib[^/]*/python[0-9.]+/site-packages$")
+    set(python_folder ${CMAKE_MATCH_0})
+  else()
+    set(python_folder lib/python${python_VERSION_MAJOR}.${python_VERSION_MINOR}/dist-packages)
+  endif()
+  set(TALNUMERICARRAY_PYTHON_FOLDER ${python_folder}
+      CACHE STRING "Where the Python package is installed, below the prefix unless it is absolute")
+  set(package_folder ${TALNUMERICARRAY_PYTHON_FOLDER}/talnumericarray)
+  install(TARGETS talnumericarray_python LIBRARY DESTINATION ${package_folder} COMPONENT Python)
+  get_directory_property(modules DIRECTORY python DEFINITION modules)
+  list(TRANSFORM modules PREPEND ${PROJECT_SOURCE_DIR}/python/)
+  talnumericarray_install(Python ${package_folder} ${modules})
+  set(metadata talnumericarray-${PROJECT_VERSION}.dist-info)
+  talnumericarray_install(Python ${TALNUMERICARRAY_PYTHON_FOLDER}/${metadata}
+                          ${PROJECT_BINARY_DIR}/python/${metadata}/METADATA
+                          ${PROJECT_SOURCE_DIR}/python/entry_points.txt)
+  talnumericarray_install(Python ${CMAKE_INSTALL_DATADIR}/doc/python3-talnumericarray
+                          ${PROJECT_SOURCE_DIR}/docs/python.md)
 endif()

@@ -23,6 +23,7 @@ py::dict compare(const py::object& object1, const py::object& object2,
 
 PYBIND11_MODULE(_core, module) {
     module.doc() = "The compiled part of talnumericarray.";
+    module.attr("__version__") = TALNUMERICARRAY_VERSION;
     talcmp::add_predicates(module);
     module.def("compare", compare, py::arg("first"), py::arg("second"), py::pos_only(),
                "The fields of talnumericarray.Comparison for two arrays.");

@@ -23,7 +23,7 @@ from talnumericarray._comparison import (
     ValueCounts,
     compare,
 )
-from talnumericarray._core import equivalent, same
+from talnumericarray._core import __version__, equivalent, same
 
 __all__ = [
     "ArrayFacts",
@@ -37,8 +37,6 @@ __all__ = [
     "equivalent",
     "same",
 ]
-
-__version__ = "0.1.0"
 
 # What is shown of them, and pickled, does not say where they are kept.
 for _public in (ArrayFacts, Bar, Comparison, NotSameError, Place, ValueCounts, assert_same, compare):

@@ -7,6 +7,8 @@ from numpy.typing import ArrayLike
 
 from talnumericarray._options import Index
 
+__version__: str
+
 def same(
     first: Any,
     second: Any,
