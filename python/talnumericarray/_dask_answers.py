@@ -4,13 +4,15 @@ from __future__ import annotations
 
 import inspect
 import itertools
+import pickle
 from typing import Any, Callable, Dict, List, Optional, Sequence, Tuple
 
 import dask
 import dask.threaded
 from dask.base import DaskMethodsMixin, tokenize
 from dask.highlevelgraph import HighLevelGraph
-from dask.optimization import cull, fuse
+from dask.core import istask
+from dask.optimization import cull, fuse, inline
 
 from talnumericarray._dask_blocks import Problem
 
@@ -75,7 +77,12 @@ class Lazy(DaskMethodsMixin):  # type: ignore[misc]
     @staticmethod
     def __dask_optimize__(graph: Any, keys: Any, **_: Any) -> Graph:
         """Loads what a single task compares in that task, so that no blocks wait in memory."""
-        tasks, dependencies = cull(dict(graph), keys)
+        tasks, _dependencies = cull(dict(graph), keys)
+        # What all tasks need, such as an opened store, is sent from worker to worker. Where one of
+        # them dies meanwhile, Distributed (as of 2022.12) may wait for it for ever, so that each
+        # task gets its own if that is small.
+        sources = [key for key, value in tasks.items() if not istask(value) and _is_small(value)]
+        tasks, dependencies = cull(inline(tasks, sources, inline_constants=False), keys)
         kept = [*dask.core.flatten(keys), *filter(_is_leaf, tasks)]
         fused, _dependencies = fuse(tasks, kept, dependencies, ave_width=4, rename_keys=False)
         return dict(fused)
@@ -92,6 +99,33 @@ class Lazy(DaskMethodsMixin):  # type: ignore[misc]
 
     def __bool__(self) -> bool:
         raise TypeError("nothing has been compared yet; call .compute()")
+
+
+class _TooLarge(Exception):
+    pass
+
+
+class _Room:
+    """A file that only counts what is written, and has room for little."""
+
+    def __init__(self, room: int) -> None:
+        self._room = room
+
+    def write(self, data: Any) -> int:
+        size = memoryview(data).nbytes
+        self._room -= size
+        if self._room < 0:
+            raise _TooLarge
+        return size
+
+
+def _is_small(value: Any) -> bool:
+    """Whether few bytes are sent for an object."""
+    try:
+        pickle.Pickler(_Room(4096), protocol=5).dump(value)
+    except Exception:  # too large, or what raises as it cannot be pickled
+        return False
+    return True
 
 
 def _only(results: Sequence[Any]) -> Any:

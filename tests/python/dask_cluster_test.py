@@ -9,8 +9,10 @@ from __future__ import annotations
 import contextlib
 import os
 import signal
+from concurrent.futures import ThreadPoolExecutor
+from concurrent.futures import TimeoutError as FutureTimeout
 from pathlib import Path
-from typing import Any, Iterator, List, NamedTuple, Tuple
+from typing import Any, Callable, Iterator, List, NamedTuple, Tuple
 
 import dask
 import dask.array as da
@@ -49,13 +51,6 @@ def two_workers(folder: Path) -> Iterator[Any]:
 @pytest.fixture(scope="module")
 def client(tmp_path_factory: pytest.TempPathFactory) -> Iterator[Any]:
     with two_workers(tmp_path_factory.mktemp("workers")) as client:
-        yield client
-
-
-@pytest.fixture()
-def mortal(tmp_path: Path) -> Iterator[Any]:
-    """Of a cluster of its own, as one of its workers may not come back."""
-    with two_workers(tmp_path / "workers") as client:
         yield client
 
 
@@ -233,28 +228,49 @@ def deadly(array: Any, where: int, flag: Path) -> Any:
     return da.concatenate(blocks)
 
 
+def answer_though_a_worker_dies(
+    folder: Path, lazy_of: Callable[[Path], Any], compute: Callable[[Any, Any], Any]
+) -> Any:
+    """What `compute(client, lazy)` returns. Distributed 2022.12 itself may wait for ever for what a
+    dead worker had, in one run of twenty: another cluster is tried then.
+    """
+    for attempt in range(4):
+        flag = folder / f"died{attempt}"
+        # Closed after the cluster, at whose end a call that hangs is cancelled.
+        with ThreadPoolExecutor(1) as pool, two_workers(folder / f"workers{attempt}") as client:
+            answer = pool.submit(compute, client, lazy_of(flag))
+            with contextlib.suppress(FutureTimeout, TimeoutError):
+                result = answer.result(TIMEOUT)
+                assert flag.exists()
+                return result
+    return pytest.fail("no cluster answered")
+
+
 def test_reports_are_those_for_whole_arrays_though_a_worker_dies(
-    mortal: Any, stores: Stores, tmp_path: Path
+    stores: Stores, tmp_path: Path
 ) -> None:
-    first, second = stores.lazy()
     options = {"tol": 20, "max_places": 30}
     expected = tna.compare(*stores.whole(), **options)
     assert expected.differing > 2 * BLOCKS
     assert expected.pairs == BLOCKS * BLOCK
-    flag = tmp_path / "died"
-    lazy = td.compare(deadly(first, BLOCKS // 2, flag), second, **options)
-    assert lazy.pairs_of_blocks == 2 * BLOCKS
-    found = mortal.compute(lazy).result(timeout=TIMEOUT)
-    assert flag.exists()
+
+    def lazy_of(flag: Path) -> Any:
+        first, second = stores.lazy()
+        lazy = td.compare(deadly(first, BLOCKS // 2, flag), second, **options)
+        assert lazy.pairs_of_blocks == 2 * BLOCKS
+        return lazy
+
+    found = answer_though_a_worker_dies(
+        tmp_path, lazy_of, lambda client, lazy: client.compute(lazy).result()
+    )
     assert found.text == expected.text
     assert found == expected
 
 
-@pytest.mark.parametrize("alone", [False, True])
-def test_the_same_is_found_though_a_worker_dies(
-    mortal: Any, stores: Stores, tmp_path: Path, alone: bool
-) -> None:
-    first, _ = stores.lazy()
-    same = td.same(deadly(first, 3, tmp_path / "died"), first)
-    assert (same.compute() if alone else mortal.compute(same).result(timeout=TIMEOUT)) is True
-    assert (tmp_path / "died").exists()
+def test_the_same_is_found_though_a_worker_dies(stores: Stores, tmp_path: Path) -> None:
+    def lazy_of(flag: Path) -> Any:
+        first, _ = stores.lazy()
+        return td.same(deadly(first, 3, flag), first)
+
+    is_same = answer_though_a_worker_dies(tmp_path, lazy_of, lambda _, lazy: lazy.compute())
+    assert is_same is True
