@@ -46,9 +46,12 @@ def bars_of_calls(calls):
                    TRACED_BAR)
     yield Measured("same, 10^7 elements, more memory of the process, MiB", row["grown"] / 2**20,
                    GROWN_BAR)
-    yield Measured("compare to same, 10^7 elements", calls.ratio(10**7, "compare", "same"),
-                   COMPARE_BAR)
-    yield Measured("compare to same, 10^6 elements", calls.ratio(10**6, "compare", "same"))
+    yield Measured("compare to same, 10^7 elements, both by one thread",
+                   calls.ratio(10**7, "compare", "same"), COMPARE_BAR)
+    yield Measured("compare to same, 10^7 elements, both by all threads",
+                   calls.ratio(10**7, "compare, all threads", "same, all threads"), COMPARE_BAR)
+    yield Measured("compare to same, 10^6 elements, both by one thread",
+                   calls.ratio(10**6, "compare", "same"))
 
 
 def time_text(seconds):
@@ -78,16 +81,41 @@ def views_table(calls):
     return table(("function", "arrays", "time", "memory, MiB"), rows)
 
 
+DASK = {
+    "build": "building the graph of `compare`",
+    "optimize": "optimising it",
+    "compare, threads": "`compare` by two threads",
+    "same, threads": "`same` by two threads",
+    "sum, threads": "for comparison: Dask's own sum of one of the arrays",
+}
+
+
+def dask_table(rows):
+    times = {row["name"]: row["microseconds_a_block"] for row in rows if "blocks" in row}
+    return table(("what", "time a block, µs"),
+                 [(text, f"{times[name]:.0f}") for name, text in DASK.items()])
+
+
+def workers_table(rows):
+    seconds = {row["name"]: row["seconds"] for row in rows if "seconds" in row}
+    one, two = seconds["one worker"], seconds["two workers"]
+    return table(("workers", "time, s", "of one"),
+                 [("one", f"{one:.2f}", "1"), ("two", f"{two:.2f}", f"{two / one:.2f}")])
+
+
 def main():
     if len(sys.argv) != 3:
         sys.exit("usage: python_report.py RESULTS DOCUMENTS")
     results, documents = map(Path, sys.argv[1:])
     calls = Calls(read(results, "python_calls"))
+    dask_rows = read(results, "python_dask")
     measured = list(bars_of_calls(calls))
     renew_blocks(documents / "performance.md", {
         "bars of Python": bars_table(measured),
         "Python": calls_table(calls),
         "views in Python": views_table(calls),
+        "Dask": dask_table(dask_rows),
+        "workers": workers_table(dask_rows),
     })
     print_bars(measured)
 

@@ -94,18 +94,19 @@ const DigitSearch::Result& DigitSearch::search(const Pairs& pairs) {
 }
 
 // Neighbours are often of one group, and a count is not read again as soon as it is written: each
-// of four neighbours has counts of its own.
+// of eight neighbours has counts of its own.
 void DigitSearch::count_groups() {
-    constexpr std::size_t lanes = 4;
+    constexpr std::size_t lanes = 8;
     std::array<std::array<std::uint64_t, DigitGroups::count>, lanes> counts = {};
-    const std::vector<Class>& groups = result_.class_of;
-    const std::size_t whole = groups.size() / lanes * lanes;
+    const Class* const groups = result_.class_of.data();
+    const std::size_t size = result_.class_of.size();
+    const std::size_t whole = size / lanes * lanes;
     for (std::size_t i = 0; i < whole; i += lanes) {
         for (std::size_t lane = 0; lane < lanes; ++lane) {
             ++counts[lane][groups[i + lane]];
         }
     }
-    for (std::size_t i = whole; i < groups.size(); ++i) {
+    for (std::size_t i = whole; i < size; ++i) {
         ++counts[0][groups[i]];
     }
     for (const auto& count : counts) {
