@@ -63,18 +63,20 @@ def functions_of(tna, first, near):
     }
 
 
-def seconds_of(functions, turns, calls):
-    """The least of many turns for each; one turn is `calls` calls of each function."""
+def seconds_of(functions, turns, repetitions=2, calls=1):
+    """The least for each. In a turn each function is timed some times after another, so that it
+    finds in the caches what it leaves there; each time is that of `calls` calls.
+    """
     best = dict.fromkeys(functions, float("inf"))
     for function in functions.values():
         assert function(), "the answer is wrong"
     for _ in range(turns):
         for name, function in functions.items():
-            function()  # so that all find in the caches what they leave there
-            start = time.perf_counter()
-            for _ in range(calls):
-                function()
-            best[name] = min(best[name], (time.perf_counter() - start) / calls)
+            for _ in range(repetitions):
+                start = time.perf_counter()
+                for _ in range(calls):
+                    function()
+                best[name] = min(best[name], (time.perf_counter() - start) / calls)
     return best
 
 
@@ -112,13 +114,13 @@ def main():
 
     module_calls = ModuleCalls(library)
     rows = []
-    for count, turns, calls in (10, 200, 200), (10**6, 200, 1), (10**7, 15, 1):
+    for count, turns, repetitions, calls in ((10, 200, 1, 200), (10**6, 40, 5, 1),
+                                             (10**7, 15, 2, 1)):
         first, near = near_arrays(count)
         functions = functions_of(tna, first, near)
-        repeated = calls if count == 10 else 1
-        functions["C++"] = module_calls.function(first, near, repeated)
-        best = seconds_of(functions, 2 if quick else turns, 1 if quick else calls)
-        best["C++"] /= repeated
+        functions["C++"] = module_calls.function(first, near, calls)
+        best = seconds_of(functions, 2 if quick else turns, repetitions, calls)
+        best["C++"] /= calls
         for name, function in functions.items():
             memory = memory_of(function) if count == 10**7 and name != "C++" else {}
             rows.append({"count": count, "name": name, "seconds": best[name], **memory})
@@ -138,7 +140,7 @@ def main():
         "numpy.allclose, both turned round":
             lambda: np.allclose(first[::-1, ::-1], near[::-1, ::-1], rtol=RELATIVE, atol=0),
     }
-    for name, seconds in seconds_of(views, 2 if quick else 15, 1).items():
+    for name, seconds in seconds_of(views, 2 if quick else 15).items():
         rows.append({"count": side * side, "name": name, "seconds": seconds,
                      **memory_of(views[name])})
     json.dump({"numpy": np.__version__, "rows": rows}, sys.stdout, indent=1)

@@ -36,14 +36,15 @@ std::string refusal(const std::string& argument, const std::string& takes, const
 double real_from(const char* const argument, const std::string& takes, const py::handle value) {
     const double real = PyFloat_AsDouble(value.ptr());
     if (real == -1 && PyErr_Occurred() != nullptr) {
-        const py::error_already_set error;
-        if (error.matches(PyExc_TypeError)) {
+        if (PyErr_ExceptionMatches(PyExc_TypeError) != 0) {
+            PyErr_Clear();
             refuse_type(argument, takes, value);
         }
-        if (error.matches(PyExc_OverflowError)) {
+        if (PyErr_ExceptionMatches(PyExc_OverflowError) != 0) {
+            PyErr_Clear();
             refuse(argument, takes, value);
         }
-        throw error;
+        throw py::error_already_set();
     }
     if (std::isnan(real)) {
         refuse(argument, takes, value);
