@@ -14,6 +14,8 @@ False
 True
 """
 
+from typing import TYPE_CHECKING, Any
+
 from talnumericarray._assertions import NotSameError, assert_same
 from talnumericarray._comparison import (
     ArrayFacts,
@@ -24,6 +26,9 @@ from talnumericarray._comparison import (
     compare,
 )
 from talnumericarray._core import __version__, equivalent, same
+
+if TYPE_CHECKING:
+    from talnumericarray import dask as dask
 
 __all__ = [
     "ArrayFacts",
@@ -41,3 +46,12 @@ __all__ = [
 # What is shown of them, and pickled, does not say where they are kept.
 for _public in (ArrayFacts, Bar, Comparison, NotSameError, Place, ValueCounts, assert_same, compare):
     _public.__module__ = "talnumericarray"
+
+
+def __getattr__(name: str) -> Any:
+    """Imports `talnumericarray.dask`, and so Dask, where it is used first."""
+    if name != "dask":
+        raise AttributeError(f"module {__name__!r} has no attribute {name!r}")
+    import importlib
+
+    return importlib.import_module("talnumericarray.dask")

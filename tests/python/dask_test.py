@@ -4,6 +4,8 @@ from __future__ import annotations
 
 import pickle
 import random
+import subprocess
+import sys
 import threading
 from typing import Any, Dict, List, Tuple
 
@@ -454,3 +456,17 @@ def test_assert_same_computes_at_once() -> None:
     assert str(caught.value) == expected.text
     assert caught.value.comparison == expected
     td.assert_same(first, other, ignore=first == 50)
+
+
+def test_dask_is_imported_where_it_is_used_first() -> None:
+    program = (
+        "import sys; import talnumericarray as tna; assert 'dask' not in sys.modules; "
+        "import numpy; print(tna.dask.same(numpy.ones(3), numpy.ones(3)).compute()); tna.other"
+    )
+    done = subprocess.run(
+        [sys.executable, "-c", program], capture_output=True, text=True, check=False
+    )
+    assert done.stdout == "True\n"
+    assert done.stderr.splitlines()[-1] == (
+        "AttributeError: module 'talnumericarray' has no attribute 'other'"
+    )
