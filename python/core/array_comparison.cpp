@@ -64,7 +64,7 @@ NamedArray source_of_mask(const std::optional<py::array>& mask, const bool by_fo
 
 // ---- One call of the module
 
-constexpr py::ssize_t most_dimensions = 32; // of NumPy's arrays
+constexpr py::ssize_t most_dimensions = 32; // of arrays of NumPy 1
 using Dimensions = std::array<talint, most_dimensions>;
 
 // Whether `TalNumericArray_sameQ` may be asked about all elements in the order of memory.
@@ -165,9 +165,9 @@ std::optional<bool> same_at_once(const py::array& first, const py::array& second
     const type_t id1 = id_of_elements(first);
     const type_t id2 = id_of_elements(second);
     const py::ssize_t count = first.size();
-    const bool suitable = id1 != 0 && id2 != 0 && !asks_for_more(question) && 0 < count
-                          && count <= most_elements && have_one_shape(first, second)
-                          && in_one_order(first, second);
+    const bool suitable = id1 != 0 && id2 != 0 && !asks_for_more(question)
+                          && first.ndim() <= most_dimensions && 0 < count && count <= most_elements
+                          && have_one_shape(first, second) && in_one_order(first, second);
     if (!suitable) {
         return std::nullopt;
     }
