@@ -16,11 +16,12 @@ True
 
 from typing import TYPE_CHECKING, Any
 
-from talnumericarray._assertions import NotSameError, assert_same
+from talnumericarray._assertions import assert_same
 from talnumericarray._comparison import (
     ArrayFacts,
     Bar,
     Comparison,
+    NotSameError,
     Place,
     ValueCounts,
     compare,

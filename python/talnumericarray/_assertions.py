@@ -6,22 +6,11 @@ import sys
 from typing import TYPE_CHECKING, Any
 
 from talnumericarray import _core
-from talnumericarray._comparison import Comparison, compare
+from talnumericarray._comparison import NotSameError, compare
 from talnumericarray._options import CompareOptions, shows
 
 if TYPE_CHECKING:
     from typing_extensions import Unpack
-
-
-class NotSameError(AssertionError):
-    """Two arrays are not the same; its text is the report."""
-
-    def __init__(self, comparison: Comparison) -> None:
-        super().__init__(comparison)
-        self.comparison = comparison
-
-    def __str__(self) -> str:
-        return str(self.comparison)
 
 
 @shows(CompareOptions)

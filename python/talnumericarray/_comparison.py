@@ -1,4 +1,4 @@
-"""What a comparison finds: `compare`, and the immutable objects that it returns."""
+"""What a comparison finds: `compare`, and the immutable objects that it returns, also in an error."""
 
 from __future__ import annotations
 
@@ -119,6 +119,17 @@ class Comparison:
 
     def __bool__(self) -> bool:
         raise TypeError("a comparison is neither true nor false; ask for its .same")
+
+
+class NotSameError(AssertionError):
+    """Two arrays are not the same; its text is the report."""
+
+    def __init__(self, comparison: Comparison) -> None:
+        super().__init__(comparison)
+        self.comparison = comparison
+
+    def __str__(self) -> str:
+        return str(self.comparison)
 
 
 def comparison_of(fields: "dict[str, Any]") -> Comparison:

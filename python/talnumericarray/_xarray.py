@@ -9,7 +9,7 @@ import pandas
 import xarray
 
 from talnumericarray import _core
-from talnumericarray._comparison import Comparison, compare
+from talnumericarray._comparison import Comparison, NotSameError, compare
 
 
 def assert_same(first: Any, second: Any, /, **options: Any) -> None:
@@ -24,8 +24,6 @@ def assert_same(first: Any, second: Any, /, **options: Any) -> None:
     if not problems:
         return
     if len(problems) == 1 and isinstance(problems[0], Comparison):
-        from talnumericarray._assertions import NotSameError
-
         raise NotSameError(problems[0])
     raise AssertionError("\n".join(str(problem) for problem in problems))
 

@@ -18,7 +18,7 @@ import functools
 from typing import TYPE_CHECKING, Any, List, Optional
 
 from talnumericarray import _core
-from talnumericarray._assertions import NotSameError
+from talnumericarray._comparison import NotSameError
 from talnumericarray._dask_answers import LazyComparison, LazySame
 from talnumericarray._dask_blocks import Problem
 from talnumericarray._options import CompareOptions, SameOptions, shows

@@ -12,7 +12,7 @@ from typing import Any, Generator
 
 import pytest
 
-from talnumericarray._assertions import NotSameError
+from talnumericarray._comparison import NotSameError
 
 _BAR = re.compile(r"^(E +(?:\d+|more than all) +\d+ )(#+)$")
 
