@@ -45,10 +45,13 @@ def output_of(folder: Path, *options: str) -> str:
     test = folder / "test_arrays.py"
     test.write_text(TESTS)
     paths = [path for path in sys.path if path]
+    # These make pytest print more, or in other colours.
+    others = ("BUILD_NUMBER", "CI", "FORCE_COLOR", "NO_COLOR", "PYTEST_ADDOPTS", "PY_COLORS")
+    inherited = {name: value for name, value in os.environ.items() if name not in others}
     run = subprocess.run(
         [sys.executable, "-m", "pytest", "-q", "-p", "no:cacheprovider", *options, test.name],
         cwd=folder,
-        env={**os.environ, "PYTHONPATH": os.pathsep.join(paths), "COLUMNS": "100"},
+        env={**inherited, "PYTHONPATH": os.pathsep.join(paths), "COLUMNS": "100"},
         stdout=subprocess.PIPE,
         stderr=subprocess.STDOUT,
         text=True,
