@@ -52,6 +52,15 @@ double real_from(const char* const argument, const std::string& takes, const py:
     return real;
 }
 
+double error_from(const char* const argument, const char* const takes,
+                  bool (*const is_valid)(double), const py::handle value) {
+    const double error = real_from(argument, takes, value);
+    if (!is_valid(error)) {
+        refuse(argument, takes, value);
+    }
+    return error;
+}
+
 bool flag_from(const py::handle value) {
     const int truth = PyObject_IsTrue(value.ptr());
     if (truth < 0) {
@@ -173,21 +182,15 @@ constexpr std::array arguments = {
              }},
     Argument{"relative",
              [](CallOptions& options, const py::handle value) {
-                 constexpr const char* takes = "an error between 0 and 1, such as 1e-9";
-                 const double error = real_from("relative", takes, value);
-                 if (!is_relative_error(error)) {
-                     refuse("relative", takes, value);
-                 }
-                 options.question.relative = error;
+                 options.question.relative =
+                     error_from("relative", "an error between 0 and 1, such as 1e-9",
+                                is_relative_error, value);
              }},
     Argument{"absolute",
              [](CallOptions& options, const py::handle value) {
-                 constexpr const char* takes = "an error from 0 to 1e300, such as 1e-12";
-                 const double error = real_from("absolute", takes, value);
-                 if (!is_absolute_error(error)) {
-                     refuse("absolute", takes, value);
-                 }
-                 options.question.absolute = error;
+                 options.question.absolute =
+                     error_from("absolute", "an error from 0 to 1e300, such as 1e-12",
+                                is_absolute_error, value);
              }},
     Argument{"equal_nan",
              [](CallOptions& options, const py::handle value) {
