@@ -98,7 +98,8 @@ inline T certain_divisor(const T tol) noexcept {
     if (!nesk::recall_factor(tol, tolfactor)) {
         return 0;
     }
-    return 1 / tolfactor * (1 + 8 * std::numeric_limits<T>::epsilon()) + 1;
+    constexpr T slack = 1 + 8 * std::numeric_limits<T>::epsilon();
+    return 1 / tolfactor * slack + 1;
 }
 
 // ---- One pair
@@ -150,6 +151,7 @@ inline T converted(const From number) noexcept {
 
 template <typename T>
 inline bool certainly_same_reals(equality /*bound*/, const T x, const T y) noexcept {
+    static_assert(std::is_floating_point_v<T>, "a conversion may make different integers equal");
     return x == y;
 }
 
