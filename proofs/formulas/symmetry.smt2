@@ -20,13 +20,8 @@
              (nan_stays factor (diff y x) (larger y x))))
 
 (define-fun same ((a T) (b T)) Bool (= (compare_impl tol factor remembered a b) the_same))
-(define-fun makes_factor ((a T) (b T)) Bool
-  (and (not (fp.eq a b)) (not (fp.isZero a)) (not (fp.isZero b))
-       (= (fp.lt a zero) (fp.lt b zero)) (not (fp.leq tol zero)) (not (fp.geq tol bits))
-       (not (fp.eq (diff a b) (larger a b))) (not remembered)
-       (not (far_apart (diff a b) (larger a b)))))
 (define-fun claim_same () Bool (= (same x y) (same y x)))
-(define-fun claim_factor () Bool (= (makes_factor x y) (makes_factor y x)))
+(define-fun claim_factor () Bool (= (makes_factor tol remembered x y) (makes_factor tol remembered y x)))
 (define-fun claim_order () Bool
   (=> (not (or (fp.isNaN x) (fp.isNaN y)))
       (= (compare_impl tol factor remembered x y)

@@ -9,5 +9,5 @@
   (passes fused divisor (difference x y) (fp.abs y)))
 
 (define-fun slack () T
-  (plus one ((_ to_fp $exponent_bits $significand_bits) RNE $eight_epsilon)))
+  (fp.add RNE one ((_ to_fp $exponent_bits $significand_bits) RNE $eight_epsilon)))
 (define-fun certain_divisor ((factor T)) T (plus (times (over one factor) slack) one))

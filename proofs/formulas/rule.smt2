@@ -29,3 +29,10 @@
   (ite (fp.leq tol zero) (ite (fp.lt y x) above below)
   (ite (fp.geq tol bits) the_same
     (by_factor factor remembered x y))))))))
+
+; Whether a factor is made for this pair.
+(define-fun makes_factor ((tol T) (remembered Bool) (x T) (y T)) Bool
+  (and (not (fp.eq x y)) (not (fp.isZero x)) (not (fp.isZero y))
+       (= (fp.lt x zero) (fp.lt y zero)) (not (fp.leq tol zero)) (not (fp.geq tol bits))
+       (not (fp.eq (diff x y) (larger x y))) (not remembered)
+       (not (far_apart (diff x y) (larger x y)))))

@@ -1,6 +1,5 @@
 (declare-const x T)
 (declare-const y T)
-(define-fun finite ((a T)) Bool (not (or (fp.isNaN a) (fp.isInfinite a))))
 ; Pairs that the factor decides: two nonzero numbers of one sign.
 (define-fun of_one_sign () Bool
   (and (not (fp.isZero x)) (not (fp.isZero y)) (not (fp.isNaN x)) (not (fp.isNaN y))
