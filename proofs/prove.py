@@ -13,6 +13,7 @@ The parts, all of them by default:
 `--all` also proves the code at more levels of optimisation, and looks for what agrees with each claim.
 """
 
+import collections
 import concurrent.futures
 import itertools
 import os
@@ -34,6 +35,9 @@ COMPILATIONS = [("x86-64", "-O1"), ("x86-64", "-O2"), ("x86-64", "-O3"), ("arm",
 TESTS_OF_ELEMENTS = [("x86-64", "-O1"), ("x86-64", "-O2")]
 MORE_COMPILATIONS = [("x86-64", "-Os"), ("arm", "-O1"), ("arm", "-O3"), ("aarch64", "-O1"),
                      ("aarch64", "-O3")]
+# How many functions there have to be, so that none is lost before it is proved.
+FUNCTIONS = {"compare_reals": 2, "compare_integers": 64, "same": 144, "divisor_of": 2,
+             "element_type": 1, "certain": 78}
 SLOW = 5
 
 
@@ -63,6 +67,9 @@ def queries_of(compilation, everything):
     functions = modules.functions(*compilation)
     label = " ".join(compilation)
     found, wrong, count = {}, [], 0
+    names = collections.Counter(name.partition("<")[0] for name in functions.names)
+    wrong += [f"{label}: {names[kind]} functions {kind}, not {expected}"
+              for kind, expected in FUNCTIONS.items() if names[kind] != expected]
     for name in functions.names:
         # The element test is the rule and conversions, on any platform.
         if name.startswith("same<") and compilation not in TESTS_OF_ELEMENTS and not everything:

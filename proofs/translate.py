@@ -285,6 +285,8 @@ INTEGER_PREDICATES = {"eq": ("=", False, False), "ne": ("=", False, True),
 CONVERSIONS = {"sitofp": "real_of_signed", "uitofp": "real_of_unsigned", "fptrunc": "real_of_real",
                "fpext": "real_of_real"}
 FLAGS = ("nuw", "nsw", "inbounds", "exact", "volatile", "tail", "notail", "musttail")
+# What would let a call of a function round as it likes; before a type these are no type.
+RELAXED = {"fast", "nnan", "ninf", "nsz", "arcp", "contract", "afn", "reassoc"}
 LONGEST_PATH = 1000000
 
 
@@ -764,6 +766,9 @@ class Translation:
         if not found:
             raise Unknown("a call of a function that only the program knows")
         name = found[1].strip('"')
+        changed = RELAXED.intersection(instruction.text[:found.start()].split())
+        if changed:
+            raise Unknown(f"arithmetic that is {' and '.join(sorted(changed))}")
         reader = self.reader(instruction.text[found.end():])
         arguments = []
         while reader.peek() != ")":
