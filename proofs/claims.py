@@ -111,6 +111,8 @@ class Claim:
             arithmetic = ("arithmetic" if exactly else
                           "sums_arithmetic" if self.sums else "any_arithmetic")
             lines += [formulas(name) for name in ("real_type", arithmetic, "rule", "certainty")]
+            # Functions of the C library.
+            lines += ["(declare-fun power (T T) T)", "(declare-fun shifted (T (_ BitVec 32)) T)"]
         for name, sort in self.inputs.items():
             printer.name(t.variable(name, sort))
         names = {name: printer.name(term) for name, term in self.code.items()}
@@ -156,18 +158,18 @@ def cache_memory(kind):
     return translate.Memory("cache", cells)
 
 
-def of_slot(name, kind):
+def of_slot(name):
     """The text of what the slot in use holds."""
     slot = "((_ extract 2 1) state)"
     found = f"{name}3"
     for k in (2, 1, 0):
         found = f"(ite (= {slot} (_ bv{k} 2)) {name}{k} {found})"
-    return f"(real {found})" if kind else found
+    return f"(real {found})"
 
 
 def remembered(tol, again="state"):
     """Whether the factor is: in the slot in use, which nobody writes, and still in use after."""
-    return (f"(and (fp.eq {tol} {of_slot('lasttol', True)})"
+    return (f"(and (fp.eq {tol} {of_slot('lasttol')})"
             f" (= {again} (bvand state #xfffffffe)))")
 
 
@@ -213,7 +215,22 @@ class Functions:
                 memory.cells[(2 * slot + 2) * size] = t.bits_of(made)
             return made
 
-        return {"new_factor": new_factor}
+        def modf(path, tol, pointer):
+            """Gives the fraction, and stores the whole number."""
+            path.done["split"] = t.bits_of(tol)
+            whole = real_variable("whole", real)
+            path.memory[pointer.object].store(t.value_of(pointer.offset), t.bits_of(whole))
+            return real_variable("fraction", real)
+
+        def pow_(path, base, exponent):
+            del path
+            return t.Term("power", [base, exponent], base.sort)
+
+        def ldexp(path, number_, shift):
+            del path
+            return t.Term("shifted", [number_, shift], number_.sort)
+
+        return {"new_factor": new_factor, "modf": modf, "pow": pow_, "ldexp": ldexp}
 
 
 # ---- What each function is claimed to be
@@ -251,7 +268,7 @@ def of_compare_reals(functions, name, arguments):
     outcome = functions.translated(name, [real_variable(v, kind) for v in ("tol", "x", "y")], {},
                                    real=kind, interrupted=True)
     is_remembered = remembered("(real tol)", "state_read_2")
-    factor = f"(ite {is_remembered} {of_slot('factor', True)} (real made_factor))"
+    factor = f"(ite {is_remembered} {of_slot('factor')} (real made_factor))"
     verdict = ("((_ sign_extend 24) (compare_impl (real tol)"
                f" {factor} {is_remembered} (real x) (real y)))")
     made = f"(makes_factor (real tol) {is_remembered} (real x) (real y))"
@@ -313,7 +330,7 @@ def same_reals(real, tol, part, x_name, y_name):
                 f" {converted(part_type(y_name), real, f'y{k}')}")
 
     is_remembered = remembered(tol)
-    factor = f"(ite {is_remembered} {of_slot('factor', True)} (real made_factor))"
+    factor = f"(ite {is_remembered} {of_slot('factor')} (real made_factor))"
     if part == 1:
         made = f"(makes_factor {tol} {is_remembered} {elements(0)})"
         is_remembered = f"(or {is_remembered} (and {made} (not (fp.isNaN {tol}))))"
@@ -340,13 +357,77 @@ def of_divisor(functions, name, arguments):
     # Subnormal results are flushed, but subnormal operands are not taken for zero.
     flushes = ("(= (bvand control_word #x00008040) #x00008000)" if functions.platform == "x86-64"
                else "false")
-    factor = of_slot("factor", True)
+    factor = of_slot("factor")
     tol = "(real tol)"
     statement = (
         f"(ite (or (not (fp.gt {tol} zero)) {flushes}) zero (ite (fp.geq {tol} bits) one"
         f" (ite {remembered(tol, 'state_read_2')} (certain_divisor {factor}) zero)))")
     return [Claim(name, f"(= code {statement})", {"code": outcome["result"]}, inputs, kind),
             *defined(name, outcome, inputs, kind)]
+
+
+def of_factor(functions, name, arguments):
+    """Of functions of the C library only what they are called with is known."""
+    kind, = arguments
+    width = t.bits(t.width_of(REALS[kind]))
+    inputs = dict.fromkeys(("tol", "whole", "fraction"), width)
+    outcome = functions.translated(name, [real_variable("tol", kind)], {}, kind)
+    return [Claim(name, f"(= code {factor_formula(kind)})", {"code": outcome["result"]}, inputs, kind),
+            Claim(name, "(= split tol)", {"split": outcome["split"]}, inputs, kind),
+            *defined(name, outcome, inputs, kind)]
+
+
+def factor_formula(kind):
+    """2^(tol - bits), of the whole number and the fraction of a tolerance; a whole number beyond 2^20
+    counts as that."""
+    limit = f"((_ to_fp {REALS[kind][1]} {REALS[kind][2]}) RNE 1048576.0)"
+    whole = (f"(ite (fp.lt (real whole) {limit})"
+             f" (ite (fp.gt (real whole) (fp.neg {limit})) (real whole) (fp.neg {limit})) {limit})")
+    shift = f"(bvsub ((_ fp.to_sbv 32) RTZ {whole}) (_ bv{REALS[kind][2]} 32))"
+    power = "(ite (fp.isZero (real fraction)) one (power (fp.add RNE one one) (real fraction)))"
+    return f"(shifted {power} {shift})"
+
+
+def of_remember(functions, name, arguments):
+    """If no handler comes between: the slot in use, or the next one if that is being written, has the
+    tolerance and the factor, the others what they had, and the count is one more."""
+    kind, = arguments
+    width = t.bits(t.width_of(REALS[kind]))
+    inputs = {**dict.fromkeys(("tol", "made_factor"), width), **cache_inputs(kind)}
+    outcome = functions.translated(name, [real_variable(v, kind) for v in inputs if v in (
+        "tol", "made_factor")], {}, kind)
+    return [*cache_claims(name, outcome, "made_factor", inputs, kind),
+            *defined(name, outcome, inputs, kind)]
+
+
+def of_new_factor(functions, name, arguments):
+    """It gives the factor, and remembers it as `remember` does."""
+    kind, = arguments
+    width = t.bits(t.width_of(REALS[kind]))
+    inputs = {**dict.fromkeys(("tol", "whole", "fraction"), width), **cache_inputs(kind)}
+    outcome = functions.translated(name, [real_variable("tol", kind)], {}, kind)
+    return [Claim(name, f"(= code {factor_formula(kind)})", {"code": outcome["result"]}, inputs, kind),
+            Claim(name, "(= split tol)", {"split": outcome["split"]}, inputs, kind),
+            *cache_claims(name, outcome, factor_formula(kind), inputs, kind),
+            *defined(name, outcome, inputs, kind)]
+
+
+def cache_claims(name, outcome, factor, inputs, kind):
+    """What is in memory afterwards; `factor` is an input or a formula."""
+    size = t.width_of(REALS[kind]) // 8
+    after = {"state_after": outcome["cache_0"]}
+    for slot in range(4):
+        after[f"lasttol_after{slot}"] = outcome[f"cache_{(2 * slot + 1) * size}"]
+        after[f"factor_after{slot}"] = outcome[f"cache_{(2 * slot + 2) * size}"]
+    factor = f"(real {factor})" if factor in inputs else factor
+    used = "(bvadd ((_ extract 2 1) state) (concat #b0 ((_ extract 0 0) state)))"
+    slots = " ".join(
+        f"(ite (= {used} (_ bv{slot} 2))"
+        f" (and (= lasttol_after{slot} tol) (= (real factor_after{slot}) {factor}))"
+        f" (and (= lasttol_after{slot} lasttol{slot}) (= factor_after{slot} factor{slot})))"
+        for slot in range(4))
+    state = (f"(= state_after (concat (bvadd ((_ extract 31 3) state) (_ bv1 29)) {used} #b0))")
+    return [Claim(name, f"(and {state} {slots})", after, inputs, kind)]
 
 
 def of_element_type(functions, name, arguments):
@@ -544,5 +625,6 @@ def replaced(term, replacements):
 OF_KIND = {
     "compare_reals": of_compare_reals, "compare_integers": of_compare_integers, "same": of_same,
     "certain": of_certain, "divisor_of": of_divisor, "element_type": of_element_type,
+    "factor_of": of_factor, "new_factor": of_new_factor, "remember": of_remember,
     "block": of_block, "short_prefix": of_short_prefix,
 }

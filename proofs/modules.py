@@ -16,6 +16,10 @@ def functions(platform, level):
     """Those about which there are claims, compiled for a platform at a level of optimisation."""
     module = translate.Module(compiled.representation([*PLATFORMS[platform], level], "code.cpp"))
     names = map(compiled.name_of, compiled.demangled(module.functions))
-    found = {name: symbol for name, symbol in zip(names, module.functions)
-             if name.partition("<")[0] in claims.OF_KIND}
+    found = {}
+    for name, symbol in zip(names, module.functions):
+        qualified, bracket, rest = name.partition("<")
+        kind = qualified.rpartition("::")[2]
+        if kind in claims.OF_KIND:
+            found[kind + bracket + rest] = symbol
     return claims.Functions(module, found, platform)

@@ -36,7 +36,8 @@ TESTS_OF_ELEMENTS = [("x86-64", "-O1"), ("x86-64", "-O2")]
 MORE_COMPILATIONS = [("x86-64", "-Os"), ("arm", "-O1"), ("arm", "-O3"), ("aarch64", "-O1"),
                      ("aarch64", "-O3")]
 # How many functions there have to be, so that none is lost before it is proved.
-FUNCTIONS = {"compare_reals": 2, "compare_integers": 64, "same": 144, "divisor_of": 2,
+FUNCTIONS = {"compare_reals": 2, "compare_integers": 64, "same": 144, "divisor_of": 2, "factor_of": 2, "new_factor": 2,
+             "remember": 2,
              "element_type": 1, "certain": 78}
 SLOW = 5
 

@@ -393,6 +393,11 @@ def converted(op, a, sort):
     return Term(op, [a], sort)
 
 
+def signed_of_real(a, width):
+    """The integer that is nearest towards zero."""
+    return Term("fp.to_sbv", [a], bits(width))
+
+
 def compared_reals(op, a, b):
     """fp.eq, fp.lt or fp.leq."""
     return Term(op, [a, b], BOOL)
@@ -480,6 +485,8 @@ class Printer:
             to = f"{'to_fp_unsigned' if op == 'real_of_unsigned' else 'to_fp'} {sort[1]} {sort[2]}"
             direction = "" if op == "from_bits" else f"{self.direction} "
             return f"((_ {to}) {direction}{names[0]})"
+        if op == "fp.to_sbv":
+            return f"((_ fp.to_sbv {sort[1]}) RTZ {names[0]})"
         if op == "umax":
             return f"(ite (bvult {names[0]} {names[1]}) {names[1]} {names[0]})"
         if op == "scaled":

@@ -360,7 +360,7 @@ class Translation:
                     value = self.returned(frame, instruction)
                     path.frames.pop()
                     if not path.frames:
-                        return {**path.done, "result": value}
+                        return path.done if value is None else {**path.done, "result": value}
                     if frame.result:
                         path.frames[-1].values[frame.result] = value
                 elif instruction.opcode == "br":
@@ -623,6 +623,15 @@ class Translation:
         width = self.width(kind[2] if kind[0] == "vector" else kind)
         return t.by_lanes(lambda a: t.truncated(a, width), value)
 
+    def do_fptosi(self, path, frame, reader, instruction):
+        del instruction
+        value, kind = self.conversion(frame, reader)
+        least, above = (t.from_bits(real_bits(number, value.sort))
+                        for number in (-2.0 ** (kind[1] - 1), 2.0 ** (kind[1] - 1)))
+        self.require(path, t.conjunction(t.compared_reals("fp.leq", least, value),
+                                         t.compared_reals("fp.lt", value, above)))
+        return t.signed_of_real(value, kind[1])
+
     def do_bitcast(self, path, frame, reader, instruction):
         del path, instruction
         value, kind = self.conversion(frame, reader)
@@ -754,10 +763,25 @@ class Translation:
         value = self.typed_operand(frame, reader)
         pointer = self.typed_operand(frame, reader)
         memory = path.memory.get(pointer.object)
-        if memory is None or not memory.name.startswith("local"):
+        if memory is None or memory.name in ("x", "y"):
             raise Unknown(f"a store to {pointer.object}")
         del instruction
-        memory.store(known(pointer.offset), as_bits(value))
+        if t.is_constant(pointer.offset):
+            memory.store(known(pointer.offset), as_bits(value))
+        else:
+            self.store_at_index(path, pointer, memory, as_bits(value))
+        path.done.update({f"{memory.name}_{begin}": cell for begin, cell in memory.cells.items()
+                          if memory.name == "cache"})
+
+    def store_at_index(self, path, pointer, memory, value):
+        """To any of the cells of this size, as the offset says; it has to be one of them."""
+        places = []
+        for begin, cell in memory.cells.items():
+            if cell.sort == value.sort:
+                is_here = t.compared("=", pointer.offset, t.constant(begin, 64))
+                places.append(is_here)
+                memory.cells[begin] = t.choice(is_here, value, cell)
+        self.require(path, t.disjunction(*places))
 
     # ---- Calls
 
@@ -855,7 +879,10 @@ def real_constant(token, kind):
     """A single is written as the double of its value."""
     bits = (int(token, 16) if token.startswith("0x")
             else struct.unpack("<Q", struct.pack("<d", float(token)))[0])
-    if kind == t.SINGLE:
-        value = struct.unpack("<d", struct.pack("<Q", bits))[0]
-        return t.from_bits(t.constant(struct.unpack("<I", struct.pack("<f", value))[0], 32))
-    return t.from_bits(t.constant(bits, 64))
+    return t.from_bits(real_bits(struct.unpack("<d", struct.pack("<Q", bits))[0], kind))
+
+
+def real_bits(value, kind):
+    """The bits of a number that is one of the type's."""
+    to, of = ("<f", "<I") if kind == t.SINGLE else ("<d", "<Q")
+    return t.constant(struct.unpack(of, struct.pack(to, value))[0], t.width_of(kind))
