@@ -103,16 +103,20 @@ def test_nothing_leaks(number):
                 assert error is not None and isinstance(raised, error)
         gc.collect()
 
+    def grown():
+        tracemalloc.start()
+        repeat(50)
+        before = tracemalloc.get_traced_memory()[0], sys.getallocatedblocks()
+        repeat(300)
+        after = tracemalloc.get_traced_memory()[0], sys.getallocatedblocks()
+        tracemalloc.stop()
+        return after[0] - before[0], after[1] - before[1]
+
     repeat(50)
-    tracemalloc.start()
-    repeat(50)
-    before = tracemalloc.get_traced_memory()[0]
-    blocks = sys.getallocatedblocks()
-    repeat(300)
-    after = tracemalloc.get_traced_memory()[0]
-    tracemalloc.stop()
-    assert after - before < 3000
-    assert sys.getallocatedblocks() - blocks < 100
+    # A leak grows every time; caches and threads that end late may grow once.
+    found = [grown() for _ in range(3)]
+    assert min(size for size, _ in found) < 3000, found
+    assert min(blocks for _, blocks in found) < 100, found
 
 
 def test_arrays_outlive_the_caller():
